@@ -1,0 +1,329 @@
+#include "jobs/ZELServerTransformationManager.h"
+
+#include <cstdint>
+#include <cstdio>
+#include <string>
+#include <vector>
+
+#include <zelserverapi/ZELServerStringDict.h>
+
+#include "api/StringDict.h"
+#include "api/ZELServerString.h"
+#include "api/ZELServerStringArray.h"
+#include "api/conversions.h"
+#include "api/message_numbers.h"
+#include "api/status.h"
+#include "transport/LocalFile.h"
+#include "transport/command.h"
+#include "transport/xml_text_util.h"
+
+namespace zel {
+namespace {
+
+constexpr const char* kJobRequest = "JOB_REQUEST";
+
+// The two texts every job-running operation sends, trimmed of spaces.
+struct JobInput {
+    std::string keyword;
+    std::string request;
+};
+
+// Only the space character: tabs and line ends are part of what the server is given.
+std::string trimSpaces(const std::string& text)
+{
+    const std::size_t first = text.find_first_not_of(' ');
+    if (first == std::string::npos) {
+        return std::string();
+    }
+    return text.substr(first, text.find_last_not_of(' ') - first + 1);
+}
+
+bool unusable(const std::string& trimmed)
+{
+    return trimmed.empty() || trimmed.find('\0') != std::string::npos;
+}
+
+// Checks keyword and request text before anything is sent. `keywordParameter` is the name the
+// failure reports for the keyword: the submit and transact paths have always named it differently.
+IZELServerStatus* checkJobInput(const IZELServerString& keyword, const IZELServerString& requestText,
+                                const char* keywordParameter, JobInput& input)
+{
+    const std::string keywordGiven = toStdString(keyword);
+    const std::string requestGiven = toStdString(requestText);
+    input.keyword = trimSpaces(keywordGiven);
+    input.request = trimSpaces(requestGiven);
+    if (unusable(input.keyword)) {
+        return makeStatus(msg::kInvalidArgument, std::vector<std::string>{keywordParameter, keywordGiven});
+    }
+    if (unusable(input.request)) {
+        return makeStatus(msg::kInvalidArgument, std::vector<std::string>{"request", requestGiven});
+    }
+    return nullptr;
+}
+
+// The server reads job IDs as signed 32-bit numbers, so the top half of the range goes out negative.
+std::string jobIdText(unsigned jobId)
+{
+    return formatSigned(static_cast<std::int32_t>(jobId));
+}
+
+std::string elementBytes(const IZELServerStringArray& list, unsigned index)
+{
+    ZELServerString value;
+    list.getElement(index, value);
+    return value.str();
+}
+
+// What a job request object hands the manager; read afresh for every operation.
+struct RequestParts {
+    ZELServerString keyword;
+    ZELServerString text;
+    ZELServerStringArray directives;
+    ZELServerStringArray notifications;
+
+    explicit RequestParts(const IZELServerTransformationRequest& request)
+    {
+        request.getKeyword(keyword);
+        request.getRequestText(text);
+        request.getDirectives(directives);
+        request.getNotifications(notifications);
+    }
+};
+
+}  // namespace
+
+// ---- Base: transact -------------------------------------------------------------------------------
+
+ZELServerBaseTransformationManager::~ZELServerBaseTransformationManager()
+{
+    channel_ = nullptr;
+}
+
+IZELServerStatus* ZELServerBaseTransformationManager::transactJob(const IZELServerTransformationRequest& request,
+                                                                  IZELServerTransformationResult& result)
+{
+    const RequestParts parts(request);
+    ZELServerString resultText;
+    IZELServerStatus* status = transact(parts.keyword, parts.text, parts.directives, parts.notifications, resultText);
+    if (status == nullptr) {
+        result.parse(resultText);
+    }
+    return status;
+}
+
+IZELServerStatus* ZELServerBaseTransformationManager::transactJobString(const IZELServerString& keyword,
+                                                                        const IZELServerString& requestText,
+                                                                        const IZELServerStringArray& directives,
+                                                                        IZELServerString& resultText)
+{
+    return transact(keyword, requestText, directives, ZELServerStringArray(), resultText);
+}
+
+IZELServerStatus* ZELServerBaseTransformationManager::transact(const IZELServerString& keyword,
+                                                               const IZELServerString& requestText,
+                                                               const IZELServerStringArray& directives,
+                                                               const IZELServerStringArray& notifications,
+                                                               IZELServerString& resultText)
+{
+    JobInput input;
+    if (IZELServerStatus* invalid = checkJobInput(keyword, requestText, "keyword", input)) {
+        return invalid;
+    }
+    Command command(*channel_, kJobRequest);
+    command.add("keyword", input.keyword).add("request", input.request);
+    // The lists are only handed over: the result-port exchange writes them itself, behind the
+    // result port and host it adds.
+    if (command.ready()) {
+        command.request().appendDirectives(directives);
+        command.request().appendNotifications(notifications);
+    }
+    IZELServerStatus* status = command.send(kResultPortRequest);
+    // Also after a failure: whatever the server answered is the caller's only clue.
+    const std::string body = command.body();
+    resultText.set(body.data(), static_cast<unsigned>(body.size()));
+    return status;
+}
+
+// ---- Manager: forwarding --------------------------------------------------------------------------
+
+IZELServerStatus* ZELServerTransformationManager::transactJob(const IZELServerTransformationRequest& request,
+                                                              IZELServerTransformationResult& result)
+{
+    return ZELServerBaseTransformationManager::transactJob(request, result);
+}
+
+IZELServerStatus* ZELServerTransformationManager::transactJobString(const IZELServerString& keyword,
+                                                                    const IZELServerString& requestText,
+                                                                    const IZELServerStringArray& directives,
+                                                                    IZELServerString& resultText)
+{
+    return ZELServerBaseTransformationManager::transactJobString(keyword, requestText, directives, resultText);
+}
+
+// ---- Submission and scheduling --------------------------------------------------------------------
+
+IZELServerStatus* ZELServerTransformationManager::submitJob(const IZELServerTransformationRequest& request,
+                                                            unsigned& jobId)
+{
+    const RequestParts parts(request);
+    return submit(parts.keyword, parts.text, parts.directives, &parts.notifications, jobId);
+}
+
+IZELServerStatus* ZELServerTransformationManager::submitJobString(const IZELServerString& keyword,
+                                                                  const IZELServerString& requestText,
+                                                                  const IZELServerStringArray& directives,
+                                                                  unsigned& jobId)
+{
+    return submit(keyword, requestText, directives, nullptr, jobId);
+}
+
+IZELServerStatus* ZELServerTransformationManager::submit(const IZELServerString& keyword,
+                                                         const IZELServerString& requestText,
+                                                         const IZELServerStringArray& directives,
+                                                         const IZELServerStringArray* notifications, unsigned& jobId)
+{
+    JobInput input;
+    if (IZELServerStatus* invalid = checkJobInput(keyword, requestText, "subsectionName", input)) {
+        return invalid;
+    }
+    // Unlike the transact path, the keyword goes out as the caller gave it; only the check trims it.
+    Command command(*channel(), kJobRequest);
+    command.add("keyword", keyword).add("request", input.request).addList("directives", directives);
+    if (notifications != nullptr) {
+        for (unsigned i = 1; i < notifications->entries(); i += 2) {
+            command.add("notificationMsg", elementBytes(*notifications, i - 1) + ":" + elementBytes(*notifications, i));
+        }
+    }
+    if (IZELServerStatus* status = command.send(kPlainRequestAlias)) {
+        return status;
+    }
+    // A reply without a number leaves the caller's value; a number followed by other text is taken.
+    std::uint32_t id = jobId;
+    storeUInt32(command.body(), id);
+    jobId = id;
+    return nullptr;
+}
+
+IZELServerStatus* ZELServerTransformationManager::scheduleJob(const IZELServerTransformationRequest& request,
+                                                              unsigned secondsFromNow, unsigned& jobId)
+{
+    ZELServerString keyword;
+    ZELServerString text;
+    ZELServerStringArray directives;
+    request.getKeyword(keyword);
+    request.getRequestText(text);
+    request.getDirectives(directives);
+    return scheduleJobString(keyword, text, secondsFromNow, directives, jobId);
+}
+
+IZELServerStatus* ZELServerTransformationManager::scheduleJobString(const IZELServerString& keyword,
+                                                                    const IZELServerString& requestText,
+                                                                    unsigned secondsFromNow,
+                                                                    const IZELServerStringArray& directives,
+                                                                    unsigned& jobId)
+{
+    ZELServerStringDict merged = toStringDict(directives);
+    merged.insert("secondsFromNow", decimalText(secondsFromNow));
+    ZELServerStringArray scheduled;
+    appendPairs(merged, scheduled);
+    return submitJobString(keyword, requestText, scheduled, jobId);
+}
+
+// ---- Abort and results ----------------------------------------------------------------------------
+
+IZELServerStatus* ZELServerTransformationManager::abortJob(unsigned jobId)
+{
+    Command command(*channel(), "ABORT_JOB_REQUEST");
+    command.add("jobID", jobIdText(jobId));
+    return command.send();
+}
+
+IZELServerStatus* ZELServerTransformationManager::getJobResultString(unsigned jobId, unsigned& found,
+                                                                     IZELServerString& resultText)
+{
+    Command command(*channel(), "GET_JOB_RESULT_STRING");
+    command.add("jobID", jobIdText(jobId));
+    if (IZELServerStatus* status = command.send()) {
+        return status;
+    }
+    // The server answers "null" for a job it has no result for; any other text, also an empty one,
+    // is the result.
+    const std::string body = command.body();
+    if (body == "null") {
+        found = 0;
+        return nullptr;
+    }
+    found = 1;
+    resultText.set(body.data(), static_cast<unsigned>(body.size()));
+    return nullptr;
+}
+
+IZELServerStatus* ZELServerTransformationManager::getJobResult(unsigned jobId, unsigned& found,
+                                                               IZELServerTransformationResult& result)
+{
+    ZELServerString text;
+    IZELServerStatus* status = getJobResultString(jobId, found, text);
+    if (status == nullptr) {
+        result.parse(text);
+    }
+    return status;
+}
+
+// ---- Log files ------------------------------------------------------------------------------------
+
+IZELServerStatus* ZELServerTransformationManager::logFileExists(unsigned jobId, unsigned& exists)
+{
+    Command command(*channel(), "LOG_FILEEXISTS");
+    command.add("jobID", jobIdText(jobId));
+    if (IZELServerStatus* status = command.send()) {
+        return status;
+    }
+    // A reply that is no boolean leaves the flag as it was; the exchange itself succeeded.
+    command.response().readBoolean(exists);
+    return nullptr;
+}
+
+IZELServerStatus* ZELServerTransformationManager::getLogFileInfo(unsigned jobId, IZELServerLogFileInfo& info,
+                                                                 unsigned& found)
+{
+    found = 0;
+    Command command(*channel(), "LOG_GET_FILEINFO");
+    command.add("jobID", jobIdText(jobId));
+    if (IZELServerStatus* status = command.send()) {
+        return status;
+    }
+    if (command.response().readLogFileInfo(info) == 0) {
+        found = 1;
+    }
+    return nullptr;
+}
+
+IZELServerStatus* ZELServerTransformationManager::getLogFile(unsigned jobId, const IZELServerString& localPath,
+                                                             unsigned& success)
+{
+    const std::string path = toStdString(localPath);
+    // Opened before anything is sent, so that a path that cannot be written costs no exchange.
+    LocalFile check(path, LocalFile::Mode::Write);
+    if (!check.isOpen()) {
+        return makeStatus(msg::kLocalFileWrite, path);
+    }
+    Command command(*channel(), "LOG_GET_FILE");
+    // The client never asks the server to check the log's checksum.
+    command.add("jobID", jobIdText(jobId)).add("logFileCRCCheckingEnabled", "false");
+    if (IZELServerStatus* status = command.transfer(path, kDownload)) {
+        return status;
+    }
+    unsigned answer = 0;
+    if (command.response().readBoolean(answer) != 0) {
+        return nullptr;
+    }
+    success = answer;
+    if (answer == 0) {
+        // Closed first: some systems refuse to delete a file that is still open.
+        check.close();
+        std::remove(path.c_str());
+    }
+    return nullptr;
+}
+
+}  // namespace zel

@@ -1,0 +1,100 @@
+#include "platform/environment.h"
+
+#ifndef WIN32_LEAN_AND_MEAN
+#define WIN32_LEAN_AND_MEAN
+#endif
+#ifndef NOMINMAX
+#define NOMINMAX
+#endif
+#include <windows.h>
+
+#include <cstdlib>
+#include <vector>
+
+namespace zel::platform {
+namespace {
+
+// The module file name is read into a fixed buffer of 1024 bytes, as the installers of the product
+// family never place the libraries deeper than that.
+constexpr DWORD kModuleNameBufferSize = 1024;
+
+std::string moduleFileName(const char* moduleName) {
+    HMODULE module = ::GetModuleHandleA(moduleName);
+    if (module == nullptr) {
+        return std::string();
+    }
+    char buffer[kModuleNameBufferSize] = {};
+    const DWORD length = ::GetModuleFileNameA(module, buffer, kModuleNameBufferSize);
+    if (length == 0 || length >= kModuleNameBufferSize) {
+        return std::string();
+    }
+    return std::string(buffer, length);
+}
+
+}  // namespace
+
+std::optional<std::string> getEnvironmentVariable(const char* name) {
+    std::vector<char> buffer(2048);
+    for (;;) {
+        ::SetLastError(ERROR_SUCCESS);
+        const DWORD length =
+            ::GetEnvironmentVariableA(name, buffer.data(), static_cast<DWORD>(buffer.size()));
+        if (length == 0) {
+            // Zero is both "not defined" and "defined but empty"; only the error code tells them
+            // apart.
+            if (::GetLastError() == ERROR_ENVVAR_NOT_FOUND) {
+                return std::nullopt;
+            }
+            return std::string();
+        }
+        if (length < buffer.size()) {
+            return std::string(buffer.data(), length);
+        }
+        // Too small: the result is the size needed, terminating NUL included.
+        buffer.resize(length);
+    }
+}
+
+bool setEnvironmentVariable(const char* name, const std::string& value) {
+    return ::SetEnvironmentVariableA(name, value.c_str()) != FALSE;
+}
+
+void putRuntimeEnvironmentEntry(char* entry) { ::_putenv(entry); }
+
+std::string libraryModulePath() { return moduleFileName(kLibraryModuleName); }
+
+std::string frameworkModulePath() { return moduleFileName(kFrameworkModuleName); }
+
+bool findFirstFile(const std::string& pattern) {
+    WIN32_FIND_DATAA data{};
+    HANDLE found = ::FindFirstFileA(pattern.c_str(), &data);
+    if (found == INVALID_HANDLE_VALUE) {
+        return false;
+    }
+    ::FindClose(found);
+    return true;
+}
+
+std::string readMachineRegistryString(const char* keyPath, const char* valueName) {
+    HKEY key = nullptr;
+    if (::RegOpenKeyExA(HKEY_LOCAL_MACHINE, keyPath, 0, KEY_QUERY_VALUE, &key) != ERROR_SUCCESS) {
+        return std::string();
+    }
+    std::string result;
+    DWORD type = 0;
+    DWORD size = 0;
+    if (::RegQueryValueExA(key, valueName, nullptr, &type, nullptr, &size) == ERROR_SUCCESS &&
+        (type == REG_SZ || type == REG_EXPAND_SZ) && size > 0) {
+        std::vector<char> buffer(size + 1, '\0');
+        if (::RegQueryValueExA(key, valueName, nullptr, &type,
+                               reinterpret_cast<BYTE*>(buffer.data()), &size) == ERROR_SUCCESS) {
+            // The stored text may or may not carry its terminating NUL.
+            buffer[size] = '\0';
+            result = buffer.data();
+        }
+    }
+    ::RegCloseKey(key);
+    return result;
+}
+
+}  // namespace zel::platform

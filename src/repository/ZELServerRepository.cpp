@@ -1,0 +1,437 @@
+#include "repository/ZELServerRepository.h"
+
+#include <filesystem>
+#include <optional>
+#include <system_error>
+
+#include "api/ZELServerString.h"
+#include "api/ZELServerStringArray.h"
+#include "api/message_numbers.h"
+#include "api/status.h"
+#include "repository/attribute_binding.h"
+#include "repository/reply_readers.h"
+#include "repository/text_out.h"
+#include "sharedresources/temporary_file.h"
+
+namespace zel {
+namespace {
+
+namespace fs = std::filesystem;
+
+constexpr AttributeBinding<RepositoryFields> kRepositoryAttributes[] = {
+    {"name", &RepositoryFields::name},
+    {"description", &RepositoryFields::description},
+};
+
+// The client never asks the server to check a transferred file against a CRC, whatever the file
+// transfer itself sends.
+constexpr const char* kNoCrcCheck = "false";
+
+// The directive list of the views that list everything, whatever the caller's directives say.
+ZELServerStringArray allObjects() { return ZELServerStringArray({"enableFilter", "All"}); }
+
+// The registrations list differs: a missing filter means all, and "WORKSPACE_NAME" narrows the list
+// to one workspace. Nullopt for an unknown filter value.
+std::optional<ZELServerStringArray> registrationFilterOf(const ZELServerStringDict* directives)
+{
+    if (directives == nullptr) {
+        return allObjects();
+    }
+    std::string filter = "All";
+    if (directives->contains("ENABLE_FILTER")) {
+        filter = enableFilterFor(*directives);
+        if (filter.empty()) {
+            return std::nullopt;
+        }
+    }
+    ZELServerStringArray pairs({"enableFilter", filter});
+    if (const std::string* workspace = directives->find("WORKSPACE_NAME")) {
+        pairs.append("workspaceName");
+        pairs.append(*workspace);
+    }
+    return pairs;
+}
+
+std::string bodyOf(const IZELServerResponse& response)
+{
+    std::string body;
+    response.getBody(body);
+    return body;
+}
+
+// Size of a received file; 0 when it cannot be told, which counts as empty.
+std::uintmax_t receivedSize(const std::string& path)
+{
+    std::error_code error;
+    const std::uintmax_t size = fs::file_size(path, error);
+    return error ? 0 : size;
+}
+
+// A rename cannot cross file systems, and the temporary directory often lies on another one than
+// the destination; the contents are then copied across.
+bool moveOnto(TemporaryFile& received, const std::string& destination)
+{
+    if (received.moveTo(destination)) {
+        return true;
+    }
+    std::error_code error;
+    fs::copy_file(received.path(), destination, fs::copy_options::overwrite_existing, error);
+    return !error;
+}
+
+// The item arrives in a temporary file first, so that a failed or empty transfer never replaces
+// what the destination held.
+IZELServerStatus* downloadItem(Command& command, const std::string& itemName, const std::string& destination,
+                               unsigned& received, IZELServerProgressListener* progress)
+{
+    const std::string directory = TemporaryFile::directoryFor("");
+    std::optional<TemporaryFile> file = TemporaryFile::createIn(directory);
+    if (!file) {
+        const std::string pattern = std::string(TemporaryFile::kPrefix) + "XXXXXX" + TemporaryFile::kSuffix;
+        return makeStatus(msg::kLocalFileWrite, (fs::path(directory) / pattern).string());
+    }
+    if (IZELServerStatus* status = command.transfer(file->path(), kDownload, progress)) {
+        return status;
+    }
+    command.response().readBoolean(received);
+    if (receivedSize(file->path()) < 1) {
+        return makeStatus(msg::kEmptyDownload, itemName);
+    }
+    if (!moveOnto(*file, destination)) {
+        return makeStatus(msg::kLocalFileWrite, destination);
+    }
+    return nullptr;
+}
+
+// A resource is received straight into its destination: no temporary file and no size check.
+IZELServerStatus* downloadResource(Command& command, const std::string& destination, unsigned& received,
+                                   IZELServerProgressListener* progress)
+{
+    if (IZELServerStatus* status = command.transfer(destination, kDownload, progress)) {
+        return status;
+    }
+    command.response().readBoolean(received);
+    return nullptr;
+}
+
+}  // namespace
+
+ZELServerRepository::ZELServerRepository(IZELServerChannel* channel, const IZELServerString& name,
+                                         const IZELServerString& description)
+    : channel_(channel)
+{
+    fields_.name = toStdString(name);
+    fields_.description = toStdString(description);
+}
+
+void ZELServerRepository::getName(IZELServerString& out) const { copyText(fields_.name, out); }
+void ZELServerRepository::getDescription(IZELServerString& out) const { copyText(fields_.description, out); }
+
+bool ZELServerRepository::readFrom(const XmlElement& element)
+{
+    readAttributes(element, fields_, kRepositoryAttributes);
+    return true;
+}
+
+CheckedCommand ZELServerRepository::on(const char* keyword) const
+{
+    CheckedCommand command(channel_, keyword);
+    command.add("repositoryName", fields_.name);
+    return command;
+}
+
+// ---- Items ------------------------------------------------------------------------------------------
+
+IZELServerStatus* ZELServerRepository::itemExists(const IZELServerString& itemName, unsigned& exists)
+{
+    return on("REP_ITEMEXISTS")
+        .require(itemName).allowedName(itemName)
+        .add("itemName", itemName)
+        .askFlag(exists);
+}
+
+IZELServerStatus* ZELServerRepository::getItem(const IZELServerString& itemName, const IZELServerString& destinationPath,
+                                               unsigned& received, IZELServerProgressListener* listener)
+{
+    received = 0;
+    const std::string item = toStdString(itemName);
+    const std::string destination = toStdString(destinationPath);
+    return on("REP_GET_ITEM")
+        .require(itemName).require(destinationPath).allowedName(itemName)
+        .add("itemName", item).add("itemFileCRCCheckingEnabled", kNoCrcCheck)
+        .run([&](Command& command) { return downloadItem(command, item, destination, received, listener); });
+}
+
+IZELServerStatus* ZELServerRepository::getItem(const IZELServerString& itemName, const IZELServerString& destinationPath,
+                                               unsigned& received)
+{
+    return getItem(itemName, destinationPath, received, nullptr);
+}
+
+IZELServerStatus* ZELServerRepository::addItem(const IZELServerString& itemName, const IZELServerString& sourcePath,
+                                               IZELServerProgressListener* listener)
+{
+    return on("REP_ADD_ITEM")
+        .require(itemName).require(sourcePath).allowedName(itemName)
+        .add("itemName", itemName).add("itemFileCRCCheckingEnabled", kNoCrcCheck)
+        .upload(sourcePath, listener);
+}
+
+IZELServerStatus* ZELServerRepository::addItem(const IZELServerString& itemName, const IZELServerString& sourcePath)
+{
+    return addItem(itemName, sourcePath, nullptr);
+}
+
+// Only emptiness is checked here, unlike addItem: an item already on the server is replaced under
+// whatever name it has.
+IZELServerStatus* ZELServerRepository::updateItem(const IZELServerString& itemName, const IZELServerString& sourcePath,
+                                                  IZELServerProgressListener* listener)
+{
+    return on("REP_UPDATE_ITEM")
+        .require(itemName).require(sourcePath)
+        .add("itemName", itemName).add("itemFileCRCCheckingEnabled", kNoCrcCheck)
+        .upload(sourcePath, listener);
+}
+
+IZELServerStatus* ZELServerRepository::updateItem(const IZELServerString& itemName, const IZELServerString& sourcePath)
+{
+    return updateItem(itemName, sourcePath, nullptr);
+}
+
+IZELServerStatus* ZELServerRepository::removeItem(const IZELServerString& itemName, unsigned& removed)
+{
+    return on("REP_REMOVE_ITEM")
+        .require(itemName).allowedName(itemName)
+        .add("itemName", itemName)
+        .askFlag(removed);
+}
+
+// ---- Item resources ---------------------------------------------------------------------------------
+
+IZELServerStatus* ZELServerRepository::itemResourceExists(const IZELServerString& itemName,
+                                                          const IZELServerString& resourceName, unsigned& exists)
+{
+    return on("REP_ITEMRESOURCEEXISTS")
+        .require(itemName).require(resourceName).allowedName(itemName).allowedName(resourceName)
+        .add("itemName", itemName).add("resourceName", resourceName)
+        .askFlag(exists);
+}
+
+IZELServerStatus* ZELServerRepository::getItemResource(const IZELServerString& itemName,
+                                                       const IZELServerString& resourceName,
+                                                       const IZELServerString& destinationPath, unsigned& received,
+                                                       IZELServerProgressListener* listener)
+{
+    received = 0;
+    const std::string destination = toStdString(destinationPath);
+    return on("REP_GET_ITEMRESOURCE")
+        .require(itemName).require(resourceName).require(destinationPath)
+        .allowedName(itemName).allowedName(resourceName)
+        .add("itemName", itemName).add("resourceName", resourceName).add("resourceFileCRCCheckingEnabled", kNoCrcCheck)
+        .run([&](Command& command) { return downloadResource(command, destination, received, listener); });
+}
+
+IZELServerStatus* ZELServerRepository::getItemResource(const IZELServerString& itemName,
+                                                       const IZELServerString& resourceName,
+                                                       const IZELServerString& destinationPath, unsigned& received)
+{
+    return getItemResource(itemName, resourceName, destinationPath, received, nullptr);
+}
+
+// Only the item name is checked: the resource name goes to the server as given.
+IZELServerStatus* ZELServerRepository::getItemResourceView(const IZELServerString& itemName,
+                                                           const IZELServerString& resourceName,
+                                                           IZELServerResource& resource, unsigned& found)
+{
+    return on("REP_GET_ITEMRESOURCEVIEW")
+        .require(itemName)
+        .add("itemName", itemName).add("resourceName", resourceName)
+        .askObject(found, [&](const IZELServerResponse& response) { return response.readResource(resource); });
+}
+
+IZELServerStatus* ZELServerRepository::addItemResource(const IZELServerString& itemName,
+                                                       const IZELServerString& resourceName,
+                                                       const IZELServerString& sourcePath,
+                                                       IZELServerProgressListener* listener)
+{
+    return on("REP_ADD_ITEMRESOURCE")
+        .require(itemName).require(resourceName).require(sourcePath)
+        .allowedName(itemName).allowedName(resourceName).distinct(resourceName, itemName)
+        .add("itemName", itemName).add("resourceName", resourceName).add("resourceFileCRCCheckingEnabled", kNoCrcCheck)
+        .upload(sourcePath, listener);
+}
+
+IZELServerStatus* ZELServerRepository::addItemResource(const IZELServerString& itemName,
+                                                       const IZELServerString& resourceName,
+                                                       const IZELServerString& sourcePath)
+{
+    return addItemResource(itemName, resourceName, sourcePath, nullptr);
+}
+
+IZELServerStatus* ZELServerRepository::updateItemResource(const IZELServerString& itemName,
+                                                          const IZELServerString& resourceName,
+                                                          const IZELServerString& sourcePath,
+                                                          IZELServerProgressListener* listener)
+{
+    return on("REP_UPDATE_ITEMRESOURCE")
+        .require(itemName).require(resourceName).require(sourcePath)
+        .allowedName(itemName).allowedName(resourceName).distinct(resourceName, itemName)
+        .add("itemName", itemName).add("resourceName", resourceName).add("resourceFileCRCCheckingEnabled", kNoCrcCheck)
+        .upload(sourcePath, listener);
+}
+
+IZELServerStatus* ZELServerRepository::updateItemResource(const IZELServerString& itemName,
+                                                          const IZELServerString& resourceName,
+                                                          const IZELServerString& sourcePath)
+{
+    return updateItemResource(itemName, resourceName, sourcePath, nullptr);
+}
+
+IZELServerStatus* ZELServerRepository::removeItemResource(const IZELServerString& itemName,
+                                                          const IZELServerString& resourceName, unsigned& removed)
+{
+    return on("REP_REMOVE_ITEMRESOURCE")
+        .require(itemName).require(resourceName).allowedName(itemName).allowedName(resourceName)
+        .add("itemName", itemName).add("resourceName", resourceName)
+        .askFlag(removed);
+}
+
+// ---- Views ------------------------------------------------------------------------------------------
+
+IZELServerStatus* ZELServerRepository::getWorkspaceSummariesView(const ZELServerStringDict* directives,
+                                                                 IZELServerVector<IZELServerWorkspaceSummary>& summaries)
+{
+    const ZELServerStringArray filter = enableFilterList(directives);
+    return on("REP_GET_WORKSPACESUMMARIESVIEW")
+        .require(filter.entries() >= 2)
+        .addList("directives", filter)
+        .askList([&](const IZELServerResponse& response) { return readWorkspaceSummariesReply(bodyOf(response), summaries); });
+}
+
+IZELServerStatus* ZELServerRepository::getWorkspacesView(const ZELServerStringDict* directives,
+                                                         IZELServerVector<IZELServerWorkspace>& workspaces)
+{
+    const ZELServerStringArray filter = enableFilterList(directives);
+    return on("REP_GET_WORKSPACESVIEW")
+        .require(filter.entries() >= 2)
+        .addList("directives", filter)
+        .askList([&](const IZELServerResponse& response) { return response.readWorkspaces(workspaces); });
+}
+
+IZELServerStatus* ZELServerRepository::getWorkspaceView(const IZELServerString& workspaceName,
+                                                        IZELServerWorkspace& workspace, unsigned& found)
+{
+    return on("REP_GET_WORKSPACEVIEW")
+        .require(workspaceName)
+        .add("workspaceName", workspaceName)
+        .askObject(found, [&](const IZELServerResponse& response) { return response.readWorkspace(workspace); });
+}
+
+// The directives of this view and the three below are not read: the server lists everything.
+IZELServerStatus* ZELServerRepository::getCustomFormatsView(const ZELServerStringDict* /*directives*/,
+                                                            IZELServerVector<IZELServerCustomFormat>& customFormats)
+{
+    return on("REP_GET_CUSTOMFORMATSVIEW")
+        .addList("directives", allObjects())
+        .askList([&](const IZELServerResponse& response) { return response.readCustomFormats(customFormats); });
+}
+
+IZELServerStatus* ZELServerRepository::getCustomFormatView(const IZELServerString& customFormatName,
+                                                           IZELServerCustomFormat& customFormat, unsigned& found)
+{
+    return on("REP_GET_CUSTOMFORMATVIEW")
+        .require(customFormatName)
+        .add("customFormatName", customFormatName)
+        .askObject(found, [&](const IZELServerResponse& response) { return response.readCustomFormat(customFormat); });
+}
+
+IZELServerStatus* ZELServerRepository::getCustomTransformersView(
+    const ZELServerStringDict* /*directives*/, IZELServerVector<IZELServerCustomTransformer>& customTransformers)
+{
+    return on("REP_GET_CUSTOMTRANSFORMERSVIEW")
+        .addList("directives", allObjects())
+        .askList([&](const IZELServerResponse& response) { return response.readCustomTransformers(customTransformers); });
+}
+
+IZELServerStatus* ZELServerRepository::getCustomTransformerView(const IZELServerString& customTransformerName,
+                                                                IZELServerCustomTransformer& customTransformer,
+                                                                unsigned& found)
+{
+    return on("REP_GET_CUSTOMTRANSFORMERVIEW")
+        .require(customTransformerName)
+        .add("customTransformerName", customTransformerName)
+        .askObject(found, [&](const IZELServerResponse& response) { return response.readCustomTransformer(customTransformer); });
+}
+
+// Nothing is checked here, not even the item name, which goes to the server as given.
+IZELServerStatus* ZELServerRepository::getItemResourcesView(const IZELServerString& itemName,
+                                                            const ZELServerStringDict* /*directives*/,
+                                                            IZELServerVector<IZELServerResource>& resources)
+{
+    return on("REP_GET_ITEMRESOURCESVIEW")
+        .add("itemName", itemName)
+        .addList("directives", allObjects())
+        .askList([&](const IZELServerResponse& response) { return response.readResources(resources); });
+}
+
+IZELServerStatus* ZELServerRepository::getTemplatesView(const ZELServerStringDict* /*directives*/,
+                                                        IZELServerVector<IZELServerTemplate>& templates)
+{
+    return on("REP_GET_TEMPLATESVIEW")
+        .addList("directives", allObjects())
+        .askList([&](const IZELServerResponse& response) { return response.readTemplates(templates); });
+}
+
+IZELServerStatus* ZELServerRepository::getTemplateView(const IZELServerString& templateName, IZELServerTemplate& templ,
+                                                       unsigned& found)
+{
+    return on("REP_GET_TEMPLATEVIEW")
+        .require(templateName)
+        .add("templateName", templateName)
+        .askObject(found, [&](const IZELServerResponse& response) { return response.readTemplate(templ); });
+}
+
+// ---- Workspace registrations ------------------------------------------------------------------------
+
+IZELServerStatus* ZELServerRepository::getWorkspaceServices(const ZELServerStringDict* directives,
+                                                            IZELServerVector<IZELServerWorkspaceService>& workspaceServices)
+{
+    const std::optional<ZELServerStringArray> filter = registrationFilterOf(directives);
+    IZELServerChannel* channel = channel_;
+    return on("REP_GET_WORKSPACESERVICES")
+        .require(filter.has_value())
+        .addList("directives", filter.value_or(ZELServerStringArray()))
+        .askList([&](const IZELServerResponse& response) {
+            return readWorkspaceServicesReply(bodyOf(response), channel, workspaceServices);
+        });
+}
+
+IZELServerStatus* ZELServerRepository::workspaceServiceExists(const IZELServerString& workspaceName,
+                                                              const IZELServerString& serviceName, unsigned& exists)
+{
+    return on("REP_WORKSPACESERVICEEXISTS")
+        .require(workspaceName).require(serviceName)
+        .add("workspaceName", workspaceName).add("serviceName", serviceName)
+        .askFlag(exists);
+}
+
+IZELServerStatus* ZELServerRepository::registerWorkspaceService(const IZELServerString& workspaceName,
+                                                                const IZELServerString& serviceName)
+{
+    return on("REP_REGISTER_WORKSPACESERVICE")
+        .require(workspaceName).require(serviceName)
+        .add("workspaceName", workspaceName).add("serviceName", serviceName)
+        .send();
+}
+
+IZELServerStatus* ZELServerRepository::deregisterWorkspaceService(const IZELServerString& workspaceName,
+                                                                  const IZELServerString& serviceName,
+                                                                  unsigned& deregistered)
+{
+    return on("REP_DEREGISTER_WORKSPACESERVICE")
+        .require(workspaceName).require(serviceName)
+        .add("workspaceName", workspaceName).add("serviceName", serviceName)
+        .askFlag(deregistered);
+}
+
+}  // namespace zel

@@ -1,0 +1,79 @@
+#pragma once
+// One shared resource (mount point) and the "SR_" file commands inside it, over the channel it was
+// made or read with.
+
+#include <initializer_list>
+#include <string>
+#include <utility>
+
+#include <zelserverapi/IZELServerMountPoint.h>
+
+#include "api/heap.h"
+#include "transport/IZELServerChannel.h"
+
+namespace zel {
+
+class Command;
+class XmlElement;
+
+class ZELServerMountPoint final : public IZELServerMountPoint, public HeapObject {
+public:
+    // `channel` is borrowed and must outlive every command; a mount point without a channel answers
+    // every command with 393622.
+    explicit ZELServerMountPoint(IZELServerChannel* channel) : channel_(channel) {}
+    ~ZELServerMountPoint() override = default;
+    ZELServerMountPoint(const ZELServerMountPoint&) = delete;
+    ZELServerMountPoint& operator=(const ZELServerMountPoint&) = delete;
+
+    // Rebinds the mount point to the channel of the reply that describes it.
+    void bind(IZELServerChannel* channel) { channel_ = channel; }
+    IZELServerChannel* channel() const { return channel_; }
+
+    void getName(IZELServerString& out) const override;
+    void getDisplayName(IZELServerString& out) const override;
+    void getDescription(IZELServerString& out) const override;
+
+    IZELServerStatus* exists(const IZELServerPath& path, unsigned& present) override;
+    IZELServerStatus* download(const IZELServerPath& source, const IZELServerString& localTarget, unsigned& received,
+                               IZELServerProgressListener* listener) override;
+    IZELServerStatus* upload(const IZELServerString& localSource, const IZELServerPath& destination,
+                             IZELServerProgressListener* listener) override;
+    IZELServerStatus* copy(const IZELServerPath& source, const IZELServerPath& destination) override;
+    IZELServerStatus* move(const IZELServerPath& source, const IZELServerPath& destination) override;
+    IZELServerStatus* getFileInfo(const IZELServerPath& path, unsigned flags, IZELServerFileInfo& info) override;
+    IZELServerStatus* getFileInfo(const IZELServerPath& path, IZELServerFileInfo& info) override;
+    IZELServerStatus* list(const IZELServerPath& path, unsigned depth,
+                           IZELServerVector<IZELServerFileInfo>& entries) override;
+    IZELServerStatus* list(const IZELServerPath& path, IZELServerVector<IZELServerFileInfo>& entries) override;
+    IZELServerStatus* makeDirectory(const IZELServerPath& path) override;
+    IZELServerStatus* remove(const IZELServerPath& path, unsigned& removed) override;
+    unsigned reserved() const override { return 0; }
+    IZELServerPath* createPath(const IZELServerString& absolutePath) override;
+    IZELServerPath* createPath(const IZELServerString& directoryPath, const IZELServerString& name) override;
+    void releaseObject(IZELServerPath* path) override;
+    void readFromXML(const xercesc_3_2::DOMElement& element) override;
+
+    // Replaces the name, display name and description with the attributes "name", "displayname" and
+    // "description" of a "SHAREDRESOURCE" element (absent ones read as empty).
+    void readFrom(const XmlElement& element);
+
+private:
+    using PathValue = std::pair<const char*, const IZELServerPath*>;
+
+    // "srName" and then each path as a "PATH" document, in the order given. Null, or the status of a
+    // path that cannot be written (then nothing may be sent).
+    IZELServerStatus* addValues(Command& command, std::initializer_list<PathValue> paths) const;
+    // A command whose only answer is its status.
+    IZELServerStatus* statusCommand(const char* keyword, std::initializer_list<PathValue> paths);
+    // A command whose answer is the body "true" or "false", read into `flag`.
+    IZELServerStatus* flagCommand(const char* keyword, const IZELServerPath& path, unsigned& flag);
+    // One "SR_LIST" reply read into `entries` (which the reader clears first).
+    IZELServerStatus* listOnce(const IZELServerPath& path, IZELServerVector<IZELServerFileInfo>& entries);
+
+    IZELServerChannel* channel_;
+    std::string name_;
+    std::string displayName_;
+    std::string description_;
+};
+
+}  // namespace zel

@@ -1,0 +1,98 @@
+#include "sharedresources/temporary_file.h"
+
+#include <cerrno>
+#include <cstdio>
+#include <filesystem>
+#include <random>
+#include <system_error>
+#include <utility>
+
+namespace zel {
+namespace {
+
+namespace fs = std::filesystem;
+
+// Names are guessed, so a crowded directory costs a few more tries; past this many something other
+// than a name clash is wrong.
+constexpr int kAttempts = 100;
+
+std::string randomLetters(std::mt19937& generator)
+{
+    static constexpr char kAlphabet[] = "abcdefghijklmnopqrstuvwxyzABCDEFGHIJKLMNOPQRSTUVWXYZ0123456789";
+    std::uniform_int_distribution<std::size_t> pick(0, sizeof kAlphabet - 2);
+    std::string letters(6, '\0');
+    for (char& letter : letters) {
+        letter = kAlphabet[pick(generator)];
+    }
+    return letters;
+}
+
+// Creates the file only when no file of that name exists ("x": exclusive creation), which is what
+// makes the name ours even when another process guesses the same one.
+enum class Creation { Created, Exists, Failed };
+
+Creation createExclusively(const std::string& path)
+{
+    errno = 0;
+    std::FILE* file = std::fopen(path.c_str(), "wbx");
+    if (file == nullptr) {
+        return errno == EEXIST ? Creation::Exists : Creation::Failed;
+    }
+    return std::fclose(file) == 0 ? Creation::Created : Creation::Failed;
+}
+
+}  // namespace
+
+std::optional<TemporaryFile> TemporaryFile::createIn(const std::string& directory)
+{
+    const fs::path folder = directory.empty() ? fs::path(".") : fs::path(directory);
+    std::random_device seed;
+    std::mt19937 generator(seed());
+    for (int attempt = 0; attempt < kAttempts; ++attempt) {
+        const std::string path = (folder / (kPrefix + randomLetters(generator) + kSuffix)).string();
+        switch (createExclusively(path)) {
+            case Creation::Created:
+                return TemporaryFile(path);
+            case Creation::Exists:
+                continue;
+            case Creation::Failed:
+                return std::nullopt;
+        }
+    }
+    return std::nullopt;
+}
+
+std::string TemporaryFile::directoryFor(const std::string& target)
+{
+    if (!target.empty()) {
+        return fs::path(target).parent_path().string();
+    }
+    std::error_code error;
+    const fs::path folder = fs::temp_directory_path(error);
+    return error ? std::string() : folder.string();
+}
+
+TemporaryFile::TemporaryFile(TemporaryFile&& other) noexcept : path_(std::exchange(other.path_, std::string()))
+{
+}
+
+TemporaryFile::~TemporaryFile()
+{
+    if (!path_.empty()) {
+        std::error_code ignored;
+        fs::remove(path_, ignored);
+    }
+}
+
+bool TemporaryFile::moveTo(const std::string& target)
+{
+    std::error_code error;
+    fs::rename(path_, target, error);
+    if (error) {
+        return false;
+    }
+    path_.clear();
+    return true;
+}
+
+}  // namespace zel

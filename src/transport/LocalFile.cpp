@@ -1,0 +1,121 @@
+#include "transport/LocalFile.h"
+
+#include <zlib.h>
+
+#include <memory>
+#include <utility>
+
+namespace zel {
+
+namespace {
+
+// Large enough that the checksum pass costs few system calls, small enough to sit on the heap once.
+constexpr std::size_t kCrcBlockSize = 256 * 1024;
+
+std::ios::openmode openModeOf(LocalFile::Mode mode)
+{
+    return mode == LocalFile::Mode::Read ? std::ios::in | std::ios::binary
+                                         : std::ios::out | std::ios::trunc | std::ios::binary;
+}
+
+}  // namespace
+
+LocalFile::LocalFile(std::string path, Mode mode) : path_(std::move(path)), mode_(mode)
+{
+    stream_.open(path_, openModeOf(mode_));
+}
+
+std::optional<std::uint64_t> LocalFile::size()
+{
+    if (!isOpen()) {
+        return std::nullopt;
+    }
+    stream_.clear();
+    stream_.seekg(0, std::ios::end);
+    const std::streamoff end = stream_.tellg();
+    if (!stream_ || end < 0 || !rewind()) {
+        stream_.clear();
+        return std::nullopt;
+    }
+    return static_cast<std::uint64_t>(end);
+}
+
+bool LocalFile::rewind()
+{
+    if (!isOpen()) {
+        return false;
+    }
+    stream_.clear();
+    stream_.seekg(0, std::ios::beg);
+    return static_cast<bool>(stream_);
+}
+
+std::optional<std::size_t> LocalFile::read(char* buffer, std::size_t count)
+{
+    if (!isOpen() || mode_ != Mode::Read) {
+        return std::nullopt;
+    }
+    stream_.read(buffer, static_cast<std::streamsize>(count));
+    const auto got = static_cast<std::size_t>(stream_.gcount());
+    if (stream_.bad()) {
+        return std::nullopt;
+    }
+    // A short read sets failbit together with eofbit; that is the end of the file, not an error.
+    if (stream_.eof()) {
+        stream_.clear();
+    } else if (stream_.fail()) {
+        return std::nullopt;
+    }
+    return got;
+}
+
+bool LocalFile::write(const char* data, std::size_t count)
+{
+    if (!isOpen() || mode_ != Mode::Write) {
+        return false;
+    }
+    stream_.write(data, static_cast<std::streamsize>(count));
+    return static_cast<bool>(stream_);
+}
+
+bool LocalFile::close()
+{
+    if (!isOpen()) {
+        return false;
+    }
+    if (mode_ == Mode::Write) {
+        stream_.flush();
+    }
+    const bool good = !stream_.bad() && !(mode_ == Mode::Write && stream_.fail());
+    stream_.close();
+    return good && !stream_.fail();
+}
+
+std::optional<std::uint32_t> LocalFile::crc32() const
+{
+    std::ifstream input(path_, std::ios::in | std::ios::binary);
+    if (!input) {
+        return std::nullopt;
+    }
+    const std::unique_ptr<char[]> block(new (std::nothrow) char[kCrcBlockSize]);
+    if (!block) {
+        return std::nullopt;
+    }
+    uLong crc = ::crc32(0L, Z_NULL, 0);
+    for (;;) {
+        input.read(block.get(), static_cast<std::streamsize>(kCrcBlockSize));
+        const auto got = static_cast<uInt>(input.gcount());
+        if (input.bad()) {
+            return std::nullopt;
+        }
+        crc = ::crc32(crc, reinterpret_cast<const Bytef*>(block.get()), got);
+        if (input.eof()) {
+            return static_cast<std::uint32_t>(crc);
+        }
+        if (input.fail()) {
+            return std::nullopt;
+        }
+    }
+}
+
+}  // namespace zel

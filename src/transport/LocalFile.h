@@ -1,0 +1,60 @@
+#pragma once
+// A local file that travels with a command: its path and an open binary stream. The caller opens it
+// for reading (upload) or writing (download) before anything is sent, so a bad path is reported
+// while the connection is still in step. The stream is closed by close() or the destructor.
+
+#include <cstddef>
+#include <cstdint>
+#include <fstream>
+#include <optional>
+#include <string>
+
+#include "api/heap.h"
+
+namespace zel {
+
+class LocalFile : public HeapObject {
+public:
+    enum class Mode {
+        Read,   // an existing file, from its start
+        Write,  // created, or emptied when it exists
+    };
+
+    LocalFile(std::string path, Mode mode);
+    ~LocalFile() = default;
+
+    LocalFile(const LocalFile&) = delete;
+    LocalFile& operator=(const LocalFile&) = delete;
+
+    // Whether the stream opened (and has not been closed since).
+    bool isOpen() const { return stream_.is_open(); }
+    const std::string& path() const { return path_; }
+    Mode mode() const { return mode_; }
+
+    // The size in bytes, found by seeking the stream to its end; the stream is left at the start.
+    // Nullopt when the stream is closed or cannot seek.
+    std::optional<std::uint64_t> size();
+
+    // Puts the stream back at the start. False when it cannot.
+    bool rewind();
+
+    // Reads up to `count` bytes; fewer only at the end of the file. Nullopt on a read error.
+    std::optional<std::size_t> read(char* buffer, std::size_t count);
+
+    // Writes all `count` bytes. False on a write error.
+    bool write(const char* data, std::size_t count);
+
+    // Flushes and closes the stream. False when the last bytes could not be written out.
+    bool close();
+
+    // CRC-32 (the zlib and zip checksum) of the file as it lies on disk, read afresh through its
+    // path and independent of the open stream. Nullopt when the file cannot be read.
+    std::optional<std::uint32_t> crc32() const;
+
+private:
+    std::string path_;
+    Mode mode_;
+    std::fstream stream_;
+};
+
+}  // namespace zel

@@ -1,0 +1,72 @@
+#pragma once
+// XmlReader: parses one reply body held in memory into a DOM document and hands out its document
+// element. The reading helpers of xml_navigation.h take it from there.
+//
+// The parser is hardened because replies come from the network: it loads no external DTD, resolves
+// no external entity (any attempt fails the parse), and stops entity expansion after a small limit
+// (ordinary character and predefined entity references are not counted). It has no validator and no
+// grammar pool.
+//
+// A reader parses one document. It holds a reference to the XML library (xml_platform.h) from its
+// first parse until it is destroyed; destroying it releases the document, the parser and then the
+// reference.
+
+#include <memory>
+#include <string_view>
+
+#include <xercesc/framework/MemBufInputSource.hpp>
+#include <xercesc/parsers/XercesDOMParser.hpp>
+#include <xercesc/util/SecurityManager.hpp>
+#include <zelserverapi/IZELServerStatus.h>
+
+#include "api/heap.h"
+#include "transport/xml_element.h"
+#include "transport/xml_entity_refusal.h"
+#include "transport/xml_error_collector.h"
+#include "transport/xml_node_list.h"
+#include "transport/xml_platform.h"
+
+namespace zel {
+
+class XmlReader : public HeapObject {
+public:
+    // Entity references (other than the predefined ones) one document may expand.
+    static constexpr XMLSize_t kEntityExpansionLimit = 100;
+
+    XmlReader() = default;
+    ~XmlReader();
+    XmlReader(const XmlReader&) = delete;
+    XmlReader& operator=(const XmlReader&) = delete;
+
+    // Parses `text` (read in place; it need only live during the call). Null on success, after
+    // which rootOf() is the document element. Status 393620 when the XML library cannot start, or
+    // with the parser's message when the text is not a well-formed document (an empty text
+    // included), asks for an external entity or exceeds the expansion limit. Once a reader has
+    // parsed (successfully or not) it is busy, and later calls return null without parsing.
+    [[nodiscard]] IZELServerStatus* parse(std::string_view text);
+
+    // The parsed document's element, owned by the reader; null before a successful parse.
+    XmlElement* rootOf() const noexcept { return root_; }
+    bool busy() const noexcept { return busy_; }
+
+    // True while some reader holds the XML library because it parsed; cleared when the last such
+    // reader is destroyed.
+    static bool readerInitialisedLibrary() noexcept;
+
+private:
+    IZELServerStatus* parseText(std::string_view text);
+    void releaseAll() noexcept;
+
+    XmlPlatformRef platform_;  // first member: the library stays up until everything below is gone
+    bool busy_ = false;
+    bool countedAsReader_ = false;
+    XmlEntityRefusal refusal_;
+    XmlErrorCollector errors_;
+    xercesc::SecurityManager security_;
+    std::unique_ptr<xercesc::XercesDOMParser> parser_;
+    std::unique_ptr<xercesc::MemBufInputSource> source_;
+    ZELServerDOMNodeList elements_;
+    XmlElement* root_ = nullptr;
+};
+
+}  // namespace zel

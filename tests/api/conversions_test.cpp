@@ -1,0 +1,243 @@
+#include <gtest/gtest.h>
+
+#include <cstdint>
+#include <optional>
+#include <string>
+#include <vector>
+
+#include "api/conversions.h"
+
+namespace {
+
+using zel::NumberReading;
+
+template <class T>
+struct WholeCase {
+    std::string text;
+    bool read;
+    bool complete;
+    T value;  // compared when `read`
+};
+
+template <class T, class Reader>
+void checkTable(const std::vector<WholeCase<T>>& cases, Reader reader)
+{
+    for (const auto& c : cases) {
+        SCOPED_TRACE("text \"" + c.text + "\"");
+        const NumberReading<T> reading = reader(c.text);
+        EXPECT_EQ(reading.read, c.read);
+        EXPECT_EQ(reading.complete, c.complete);
+        if (c.read) {
+            EXPECT_EQ(reading.value, c.value);
+        }
+        EXPECT_EQ(reading.whole().has_value(), c.complete);
+    }
+}
+
+TEST(UnsignedConversion, DecimalHexFractionAndBlanks)
+{
+    checkTable<std::uint32_t>({
+        {"0", true, true, 0},
+        {"17", true, true, 17},
+        {"   17", true, true, 17},
+        {"\t17", true, true, 17},
+        {"17   ", true, true, 17},
+        {" 0x1F ", true, true, 31},
+        {"0X1f", true, true, 31},
+        {"0xabcdef", true, true, 0xABCDEF},
+        {"0x1F.00", true, true, 31},
+        {"010", true, true, 10},  // no octal
+        {"12.000", true, true, 12},
+        {"12.", true, true, 12},
+        {"12.0   ", true, true, 12},
+        {"+5", true, true, 5},
+        {"4294967295", true, true, 4294967295u},
+        {"0xFFFFFFFF", true, true, 4294967295u},
+        {"0000000000004294967295", true, true, 4294967295u},
+    }, zel::readUInt32);
+}
+
+TEST(UnsignedConversion, RejectsWhatFollowsTheNumberButKeepsTheNumberRead)
+{
+    checkTable<std::uint32_t>({
+        {"12.5", true, false, 12},
+        {"12.05", true, false, 12},
+        {"12. 0", true, false, 12},
+        {"12 .0", true, false, 12},
+        {"12abc", true, false, 12},
+        {"1 2", true, false, 1},
+        {"1x5", true, false, 1},
+        {"0x", true, false, 0},
+        {"0xg", true, false, 0},
+        {"-0x1F", true, false, 0},  // a sign hides the x from the base choice
+        {"12..0", true, false, 12},
+    }, zel::readUInt32);
+}
+
+TEST(UnsignedConversion, FailsWithoutANumberOrOnOverflow)
+{
+    checkTable<std::uint32_t>({
+        {"", false, false, 0},
+        {"   ", false, false, 0},
+        {"abc", false, false, 0},
+        {".0", false, false, 0},
+        {"-", false, false, 0},
+        {"x1", false, false, 0},
+        {"4294967296", false, false, 0},
+        {"0x100000000", false, false, 0},
+        {"99999999999999999999999999", false, false, 0},
+        {"-4294967296", false, false, 0},
+    }, zel::readUInt32);
+}
+
+TEST(UnsignedConversion, PlainReaderWrapsANegativeNumber)
+{
+    checkTable<std::uint32_t>({
+        {"-1", true, true, 4294967295u},
+        {"-0", true, true, 0},
+        {"-4294967295", true, true, 1},
+        {" -2 ", true, true, 4294967294u},
+    }, zel::readUInt32);
+}
+
+TEST(UnsignedConversion, AnyBaseReaderRefusesAMinusAtOnce)
+{
+    checkTable<std::uint32_t>({
+        {"-1", false, false, 0},
+        {"  -1", false, false, 0},
+        {"-0", false, false, 0},
+        {"+7", true, true, 7},
+        {" 0x10", true, true, 16},
+        {"12.00 ", true, true, 12},
+        {"12.5", true, false, 12},
+        {"4294967295", true, true, 4294967295u},
+        {"4294967296", false, false, 0},
+        {"", false, false, 0},
+    }, zel::readUInt32AnyBase);
+}
+
+TEST(UnsignedConversion, SixtyFourBitLimits)
+{
+    checkTable<std::uint64_t>({
+        {"18446744073709551615", true, true, UINT64_MAX},
+        {"0xFFFFFFFFFFFFFFFF", true, true, UINT64_MAX},
+        {"4294967296", true, true, 4294967296ull},
+        {"18446744073709551616", false, false, 0},
+        {"0x10000000000000000", false, false, 0},
+        {"-1", true, true, UINT64_MAX},
+    }, zel::readUInt64);
+}
+
+TEST(SignedConversion, TimeoutTexts)
+{
+    checkTable<std::int64_t>({
+        {"   3600", true, true, 3600},
+        {"3600.000", true, true, 3600},
+        {"3600.5", true, false, 3600},
+        {"0x10", true, true, 16},
+        {"abc", false, false, 0},
+        {"", false, false, 0},
+        {"-5", true, true, -5},
+        {"+5 ", true, true, 5},
+        {"9223372036854775807", true, true, INT64_MAX},
+        {"-9223372036854775808", true, true, INT64_MIN},
+        {"0x7FFFFFFFFFFFFFFF", true, true, INT64_MAX},
+        {"9223372036854775808", false, false, 0},
+        {"-9223372036854775809", false, false, 0},
+        {"0x8000000000000000", false, false, 0},
+    }, zel::readInt64);
+}
+
+TEST(UnsignedConversion, ConvenienceFormsGiveOnlyWholeConversions)
+{
+    EXPECT_EQ(zel::toUInt32(" 0x1F "), 31u);
+    EXPECT_FALSE(zel::toUInt32("12.5").has_value());
+    EXPECT_FALSE(zel::toUInt32AnyBase("-1").has_value());
+    EXPECT_EQ(zel::toUInt64("12.0"), 12u);
+    EXPECT_EQ(zel::toInt64("-12.0"), -12);
+    EXPECT_FALSE(zel::toInt64("3600.5").has_value());
+}
+
+TEST(UnsignedConversion, StoreWritesTheNumberBeforeCheckingWhatFollows)
+{
+    std::uint32_t out = 99;
+    EXPECT_TRUE(zel::storeUInt32(" 7 ", out));
+    EXPECT_EQ(out, 7u);
+
+    out = 99;
+    EXPECT_FALSE(zel::storeUInt32("12abc", out));
+    EXPECT_EQ(out, 12u);
+
+    out = 99;
+    EXPECT_FALSE(zel::storeUInt32("abc", out));
+    EXPECT_EQ(out, 99u);
+
+    EXPECT_FALSE(zel::storeUInt32("", out));
+    EXPECT_EQ(out, 99u);
+
+    EXPECT_FALSE(zel::storeUInt32("4294967296", out));
+    EXPECT_EQ(out, 99u);
+}
+
+TEST(BooleanConversion, FirstLetterThenNumber)
+{
+    const struct {
+        std::string text;
+        std::optional<bool> expected;
+    } cases[] = {
+        {"yes", true}, {"Yes", true}, {"y", true}, {"T", true}, {"true", true}, {"tomato", true},
+        {"No", false}, {"n", false}, {"F", false}, {"false", false}, {"never", false},
+        {"0", false}, {"00", false}, {"0.0", false}, {"-0", false}, {"+0.000", false}, {" 0 ", false},
+        {"1", true}, {"2.5", true}, {"-3", true}, {".5", true}, {"5.", true}, {"0.001", true}, {" 1", true},
+        {"99999999999999999999999999999", true},
+        {"maybe", std::nullopt}, {"", std::nullopt}, {"  ", std::nullopt}, {".", std::nullopt},
+        {"+", std::nullopt}, {"1.2.3", std::nullopt}, {"10abc", std::nullopt}, {"1e3", std::nullopt},
+        {" yes", std::nullopt},  // the letter rule looks at the very first character only
+    };
+    for (const auto& c : cases) {
+        SCOPED_TRACE("text \"" + c.text + "\"");
+        EXPECT_EQ(zel::toBoolean(c.text), c.expected);
+        EXPECT_EQ(zel::toBooleanOrFalse(c.text), c.expected.value_or(false));
+    }
+}
+
+TEST(FloatConversion, OrdinaryDecimalNotationOnly)
+{
+    const struct {
+        std::string text;
+        std::optional<float> expected;
+    } cases[] = {
+        {"1.5", 1.5f}, {" -2.25 ", -2.25f}, {"+0.5", 0.5f}, {"1e3", 1000.0f}, {".25", 0.25f}, {"7", 7.0f},
+        {"", std::nullopt}, {"abc", std::nullopt}, {"inf", std::nullopt}, {"-inf", std::nullopt},
+        {"nan", std::nullopt}, {"infinity", std::nullopt}, {"1.5x", std::nullopt}, {"+-1", std::nullopt},
+        {"1e39", std::nullopt}, {"0x1p3", std::nullopt}, {"-", std::nullopt}, {"1 2", std::nullopt},
+    };
+    for (const auto& c : cases) {
+        SCOPED_TRACE("text \"" + c.text + "\"");
+        EXPECT_EQ(zel::toFloat(c.text), c.expected);
+    }
+}
+
+TEST(DecimalText, WritesIntegersAndTruthValues)
+{
+    EXPECT_EQ(zel::decimalText(std::int64_t{0}), "0");
+    EXPECT_EQ(zel::decimalText(std::int64_t{-1}), "-1");
+    EXPECT_EQ(zel::decimalText(INT64_MIN), "-9223372036854775808");
+    EXPECT_EQ(zel::decimalText(UINT64_MAX), "18446744073709551615");
+    EXPECT_EQ(zel::decimalText(4294967295u), "4294967295");
+    EXPECT_EQ(zel::decimalText(static_cast<long>(-42)), "-42");
+    EXPECT_STREQ(zel::booleanText(true), "true");
+    EXPECT_STREQ(zel::booleanText(false), "false");
+}
+
+TEST(DecimalText, RoundTripsThroughTheReaders)
+{
+    for (const std::int64_t value : {INT64_MIN, std::int64_t{-3600}, std::int64_t{0}, INT64_MAX}) {
+        EXPECT_EQ(zel::toInt64(zel::decimalText(value)), value);
+    }
+    for (const std::uint32_t value : {0u, 1u, 4294967295u}) {
+        EXPECT_EQ(zel::toUInt32(zel::decimalText(value)), value);
+    }
+}
+
+}  // namespace

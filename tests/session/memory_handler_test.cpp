@@ -1,0 +1,162 @@
+// The out-of-memory entry point. The routine ends the process, so every report is checked in a
+// death test: the sink appends what it is given to a file, which the test reads once the child
+// process has gone.
+
+#include <gtest/gtest.h>
+#include <unistd.h>
+#include <zelserverapi/zelserverapi.h>
+
+#include <cstdio>
+#include <filesystem>
+#include <fstream>
+#include <string>
+
+#include "api/heap.h"
+
+namespace fs = std::filesystem;
+
+namespace {
+
+const std::string kReport =
+    "Insufficient memory available -- error code was 12. Offending plug-in is '";
+
+// Appends "<severity>|<message>\n" to a file per message. With `failWhileWriting` set it runs out
+// of memory itself while writing, the way a host's log can when the whole process is short.
+class FileSink : public IZELLogSink {
+public:
+    explicit FileSink(std::string path, bool failWhileWriting = false)
+        : path_(std::move(path)), failWhileWriting_(failWhileWriting) {}
+
+    void setSeverityThreshold(int severity) override { threshold_ = severity; }
+    int getSeverityThreshold() const override { return threshold_; }
+    void flush() override {}
+    void logMessageString(const char* message, int severity) override {
+        if (std::FILE* file = std::fopen(path_.c_str(), "ab")) {
+            std::fprintf(file, "%d|%s\n", severity, message);
+            std::fclose(file);
+        }
+        if (failWhileWriting_) {
+            zel::heap::failNextAllocations(1);
+            zel::heap::allocate(64);
+        }
+    }
+
+private:
+    std::string path_;
+    bool failWhileWriting_;
+    int threshold_ = 0;
+};
+
+class MemoryHandler : public ::testing::Test {
+protected:
+    MemoryHandler() {
+        std::string pattern = (fs::temp_directory_path() / "zel-oom-XXXXXX").string();
+        const int fd = ::mkstemp(pattern.data());
+        if (fd >= 0) {
+            ::close(fd);
+        }
+        path_ = pattern;
+    }
+    ~MemoryHandler() override {
+        std::error_code ignored;
+        fs::remove(path_, ignored);
+        zel::heap::setFailureRoutine(nullptr);
+    }
+
+    std::string recorded() const {
+        std::ifstream file(path_, std::ios::binary);
+        return std::string((std::istreambuf_iterator<char>(file)),
+                           std::istreambuf_iterator<char>());
+    }
+
+    static void exhaust() {
+        zel::heap::failNextAllocations(1);
+        zel::heap::allocate(32);
+    }
+
+    std::string path_;
+};
+
+TEST_F(MemoryHandler, ReportsOnceThroughTheSinkAndExitsWithOne) {
+    EXPECT_EXIT(
+        {
+            FileSink sink(path_);
+            DllSetMemoryErrorHandler(&sink, "converter");
+            exhaust();
+        },
+        ::testing::ExitedWithCode(1), "");
+    EXPECT_EQ(recorded(), "3|" + kReport + "converter'\n");
+}
+
+TEST_F(MemoryHandler, LongNameIsCutToTwoHundredCharacters) {
+    const std::string name = std::string(199, 'a') + "bc" + std::string(49, 'd');
+    ASSERT_EQ(name.size(), 250u);
+    EXPECT_EXIT(
+        {
+            FileSink sink(path_);
+            DllSetMemoryErrorHandler(&sink, name.c_str());
+            exhaust();
+        },
+        ::testing::ExitedWithCode(1), "");
+    EXPECT_EQ(recorded(), "3|" + kReport + std::string(199, 'a') + "b'\n");
+}
+
+TEST_F(MemoryHandler, NameOfExactlyTwoHundredCharactersIsKept) {
+    const std::string name(200, 'n');
+    EXPECT_EXIT(
+        {
+            FileSink sink(path_);
+            DllSetMemoryErrorHandler(&sink, name.c_str());
+            exhaust();
+        },
+        ::testing::ExitedWithCode(1), "");
+    EXPECT_EQ(recorded(), "3|" + kReport + name + "'\n");
+}
+
+TEST_F(MemoryHandler, NullNameIsReportedEmpty) {
+    EXPECT_EXIT(
+        {
+            FileSink sink(path_);
+            DllSetMemoryErrorHandler(&sink, "earlier name");
+            DllSetMemoryErrorHandler(&sink, nullptr);
+            exhaust();
+        },
+        ::testing::ExitedWithCode(1), "");
+    EXPECT_EQ(recorded(), "3|" + kReport + "'\n");
+}
+
+TEST_F(MemoryHandler, SecondReportIsNotSentButTheProcessStillExitsWithOne) {
+    EXPECT_EXIT(
+        {
+            // The sink's own allocation fails while it writes the first report.
+            FileSink sink(path_, true);
+            DllSetMemoryErrorHandler(&sink, "p");
+            exhaust();
+        },
+        ::testing::ExitedWithCode(1), "");
+    EXPECT_EQ(recorded(), "3|" + kReport + "p'\n");
+}
+
+TEST_F(MemoryHandler, WithoutASinkNothingIsReportedAndTheProcessExitsWithOne) {
+    EXPECT_EXIT(
+        {
+            DllSetMemoryErrorHandler(nullptr, "quiet");
+            exhaust();
+        },
+        ::testing::ExitedWithCode(1), "");
+    EXPECT_EQ(recorded(), "");
+}
+
+TEST_F(MemoryHandler, ReturnsThePreviousRoutine) {
+    const ZELMemoryFailureRoutine own = [](int) {};
+    EXPECT_EQ(zel::heap::setFailureRoutine(own), nullptr);
+
+    EXPECT_EQ(DllSetMemoryErrorHandler(nullptr, "first"), own);
+    const ZELMemoryFailureRoutine library = DllSetMemoryErrorHandler(nullptr, "second");
+    EXPECT_NE(library, nullptr);
+    EXPECT_NE(library, own);
+    // The heap now holds the library's routine, the same one the second call handed back.
+    EXPECT_EQ(zel::heap::setFailureRoutine(nullptr), library);
+}
+
+}  // namespace

@@ -1,0 +1,221 @@
+// The wire bytes without a socket: frames, the command payload, reply splitting, file headers,
+// acknowledgements and the classification of the server's error texts.
+
+#include "transport/wire_format.h"
+
+#include <cstdint>
+#include <optional>
+#include <string>
+
+#include <gtest/gtest.h>
+
+#include "support/fake_server.h"
+
+namespace zel::wire {
+namespace {
+
+using namespace std::string_literals;
+using zeltest::printable;
+
+TEST(WireFrame, PrefixIsBigEndianLengthFollowedByThePayload) {
+    struct Case {
+        std::string payload;
+        std::string prefix;
+    };
+    const Case cases[] = {
+        {"", "\0\0\0\0"s},
+        {"abc", "\0\0\0\x03"s},
+        {"a\0b"s, "\0\0\0\x03"s},
+        {std::string(255, 'x'), "\0\0\0\xFF"s},
+        {std::string(256, 'x'), "\0\0\x01\x00"s},
+        {std::string(70000, 'x'), "\0\x01\x11\x70"s},
+    };
+    for (const Case& c : cases) {
+        const std::optional<std::string> frame = encodeFrame(c.payload);
+        ASSERT_TRUE(frame) << c.payload.size();
+        EXPECT_EQ(*frame, c.prefix + c.payload) << c.payload.size();
+    }
+}
+
+TEST(WireFrame, DecodesEveryBitOfThePrefix) {
+    struct Case {
+        unsigned char prefix[4];
+        std::uint32_t length;
+    };
+    const Case cases[] = {
+        {{0, 0, 0, 0}, 0},
+        {{0, 0, 0, 0x46}, 70},
+        {{0x01, 0x02, 0x03, 0x04}, 0x01020304u},
+        {{0x80, 0, 0, 0}, 0x80000000u},
+        {{0xFF, 0xFF, 0xFF, 0xFF}, 0xFFFFFFFFu},
+        {{0, 0x01, 0x11, 0x70}, 70000},
+    };
+    for (const Case& c : cases) {
+        EXPECT_EQ(decodeLength(c.prefix), c.length);
+    }
+}
+
+TEST(WireFrame, CommandFrameOfTheFirstHandshake) {
+    const std::string text = "SERVER_SESSION_INIT\0clientID=\0userID=ann\0userPassword=pw1"s;
+    const std::optional<std::string> frame = encodeCommandFrame(text);
+    ASSERT_TRUE(frame);
+    EXPECT_EQ(*frame, "\x00\x00\x00\x46"
+                      "APIVERSION=1\0SERVER_SESSION_INIT\0clientID=\0userID=ann\0userPassword=pw1"s)
+        << printable(*frame);
+}
+
+TEST(WireFrame, FixedPayloads) {
+    EXPECT_EQ(versionHeader(), "APIVERSION=1\0"s);
+    EXPECT_EQ(acknowledgement(), "SUCCESS\0ready_to_transfer"s);
+    EXPECT_EQ(noFileReply(), "SUCCESS\0false"s);
+    EXPECT_EQ(encodeCommandFrame(""), "\0\0\0\x0D" "APIVERSION=1\0"s);
+}
+
+TEST(WireReply, SplitsIntoStatusWordAndBody) {
+    struct Case {
+        const char* name;
+        std::string payload;
+        std::optional<Reply> expected;
+    };
+    const Case cases[] = {
+        {"plain", "SUCCESS\0<R/>"s, Reply{"SUCCESS", "<R/>"}},
+        {"error", "ERROR\0oops"s, Reply{"ERROR", "oops"}},
+        {"any word", "MAYBE\0x"s, Reply{"MAYBE", "x"}},
+        {"leading NULs skipped", "\0\0SUCCESS\0a"s, Reply{"SUCCESS", "a"}},
+        {"body keeps its NULs", "SUCCESS\0a\0b\0"s, Reply{"SUCCESS", "a\0b\0"s}},
+        {"body starting with NUL kept verbatim", "SUCCESS\0\0x"s, Reply{"SUCCESS", "\0x"s}},
+        {"blank body counts", "ERROR\0 "s, Reply{"ERROR", " "}},
+        {"no NUL", "SUCCESS"s, std::nullopt},
+        {"nothing after the NUL", "SUCCESS\0"s, std::nullopt},
+        {"only NULs after the word", "SUCCESS\0\0\0"s, std::nullopt},
+        {"empty payload", ""s, std::nullopt},
+        {"only a NUL", "\0"s, std::nullopt},
+    };
+    for (const Case& c : cases) {
+        const std::optional<Reply> reply = splitReply(c.payload);
+        ASSERT_EQ(reply.has_value(), c.expected.has_value()) << c.name;
+        if (reply) {
+            EXPECT_EQ(reply->status, c.expected->status) << c.name;
+            EXPECT_EQ(reply->body, c.expected->body) << c.name << ": " << printable(reply->body);
+        }
+    }
+}
+
+TEST(WireFileHeader, Encodes) {
+    EXPECT_EQ(encodeFileHeader({0, 0}), "fileLength=0\0fileCRC=0"s);
+    EXPECT_EQ(encodeFileHeader({12, 3421780262u}), "fileLength=12\0fileCRC=3421780262"s);
+    EXPECT_EQ(encodeFileHeader({0xFFFFFFFFu, 0xFFFFFFFFu}), "fileLength=4294967295\0fileCRC=4294967295"s);
+}
+
+TEST(WireFileHeader, Parses) {
+    struct Case {
+        const char* name;
+        std::string payload;
+        HeaderParse outcome;
+        std::uint32_t length = 0;
+        std::uint32_t crc = 0;
+    };
+    const Case cases[] = {
+        {"decimal", "fileLength=12\0fileCRC=34"s, HeaderParse::Header, 12, 34},
+        {"zero", "fileLength=0\0fileCRC=0"s, HeaderParse::Header, 0, 0},
+        {"largest", "fileLength=4294967295\0fileCRC=4294967295"s, HeaderParse::Header, 0xFFFFFFFFu, 0xFFFFFFFFu},
+        {"hexadecimal", "fileLength=0x1F\0fileCRC=0XfF"s, HeaderParse::Header, 31, 255},
+        {"leading zero is not octal", "fileLength=010\0fileCRC=1"s, HeaderParse::Header, 10, 1},
+        {"blanks around", "fileLength=  7 \0fileCRC=\t8  "s, HeaderParse::Header, 7, 8},
+        {"all-zero fraction", "fileLength=7.000\0fileCRC=8."s, HeaderParse::Header, 7, 8},
+        {"plus sign", "fileLength=+7\0fileCRC=8"s, HeaderParse::Header, 7, 8},
+        {"prefixes cut by length", "XXXXXXXXXXX5\0YYYYYYYY6"s, HeaderParse::Header, 5, 6},
+        {"leading NULs skipped", "\0\0fileLength=3\0fileCRC=4"s, HeaderParse::Header, 3, 4},
+        {"length overflows", "fileLength=4294967296\0fileCRC=1"s, HeaderParse::Unusable},
+        {"crc overflows", "fileLength=1\0fileCRC=0x100000000"s, HeaderParse::Unusable},
+        {"empty length", "fileLength=\0fileCRC=1"s, HeaderParse::Unusable},
+        {"blank length", "fileLength=  \0fileCRC=1"s, HeaderParse::Unusable},
+        {"empty crc", "fileLength=1\0fileCRC="s, HeaderParse::Unusable},
+        {"trailing text", "fileLength=12abc\0fileCRC=1"s, HeaderParse::Unusable},
+        {"real fraction", "fileLength=7.5\0fileCRC=1"s, HeaderParse::Unusable},
+        {"minus sign", "fileLength=-1\0fileCRC=1"s, HeaderParse::Unusable},
+        {"length part shorter than its prefix", "short\0fileCRC=1"s, HeaderParse::Unusable},
+        {"crc part shorter than its prefix", "fileLength=1\0CRC=1"s, HeaderParse::Unusable},
+        {"more fields behind the crc", "fileLength=1\0fileCRC=1\0junk"s, HeaderParse::Unusable},
+        {"a plain reply", "SUCCESS\0false"s, HeaderParse::Unusable},
+        {"an error reply", "ERROR\0no such file"s, HeaderParse::Unusable},
+        {"no NUL", "fileLength=12"s, HeaderParse::NotTwoParts},
+        {"nothing after the NUL", "fileLength=12\0"s, HeaderParse::NotTwoParts},
+        {"empty", ""s, HeaderParse::NotTwoParts},
+    };
+    for (const Case& c : cases) {
+        const FileHeaderReading reading = parseFileHeader(c.payload);
+        EXPECT_EQ(reading.outcome, c.outcome) << c.name;
+        if (c.outcome == HeaderParse::Header) {
+            EXPECT_EQ(reading.header.length, c.length) << c.name;
+            EXPECT_EQ(reading.header.crc, c.crc) << c.name;
+        }
+    }
+}
+
+TEST(WireFileHeader, RoundTrips) {
+    for (const FileHeader header : {FileHeader{0, 0}, FileHeader{1, 0xCBF43926u}, FileHeader{0xFFFFFFFFu, 7}}) {
+        const FileHeaderReading reading = parseFileHeader(encodeFileHeader(header));
+        ASSERT_EQ(reading.outcome, HeaderParse::Header);
+        EXPECT_EQ(reading.header.length, header.length);
+        EXPECT_EQ(reading.header.crc, header.crc);
+    }
+}
+
+TEST(WireServerError, ClassifiesByPrefixAtTheVeryStart) {
+    struct Case {
+        std::string body;
+        ServerErrorKind kind;
+        std::string message;
+    };
+    const Case cases[] = {
+        {"Authentication Error: bad password", ServerErrorKind::Authentication, "bad password"},
+        {"Authorization Error: no rights", ServerErrorKind::Authorization, "no rights"},
+        {"Authentication Error: ", ServerErrorKind::Authentication, ""},
+        {"Authorization Error: Authentication Error: x", ServerErrorKind::Authorization, "Authentication Error: x"},
+        {"Failed. Authentication Error: x", ServerErrorKind::Plain, "Failed. Authentication Error: x"},
+        {" Authorization Error: x", ServerErrorKind::Plain, " Authorization Error: x"},
+        {"authorization error: x", ServerErrorKind::Plain, "authorization error: x"},
+        {"Authorization Error:x", ServerErrorKind::Plain, "Authorization Error:x"},
+        {"Authentication Error", ServerErrorKind::Plain, "Authentication Error"},
+        {"disk full", ServerErrorKind::Plain, "disk full"},
+        {"", ServerErrorKind::Plain, ""},
+        {"a\0b"s, ServerErrorKind::Plain, "a\0b"s},
+    };
+    for (const Case& c : cases) {
+        const ServerError error = classifyServerError(c.body);
+        EXPECT_EQ(error.kind, c.kind) << printable(c.body);
+        EXPECT_EQ(error.message, c.message) << printable(c.body);
+    }
+    EXPECT_EQ(static_cast<unsigned>(ServerErrorKind::Plain), 0u);
+    EXPECT_EQ(static_cast<unsigned>(ServerErrorKind::Authentication), 1u);
+    EXPECT_EQ(static_cast<unsigned>(ServerErrorKind::Authorization), 2u);
+}
+
+TEST(WireAcknowledgement, OnlyTheExactReadyReplyLetsATransferGoOn) {
+    struct Case {
+        std::string payload;
+        AckOutcome outcome;
+        std::string body;
+    };
+    const Case cases[] = {
+        {"SUCCESS\0ready_to_transfer"s, AckOutcome::Ready, ""},
+        {"\0SUCCESS\0ready_to_transfer"s, AckOutcome::Ready, ""},
+        {"SUCCESS\0ready_to_transfer "s, AckOutcome::Refused, "ready_to_transfer "},
+        {"SUCCESS\0ready_to_transfer\0"s, AckOutcome::Refused, "ready_to_transfer\0"s},
+        {"SUCCESS\0false"s, AckOutcome::Refused, "false"},
+        {"success\0ready_to_transfer"s, AckOutcome::Refused, "ready_to_transfer"},
+        {"ERROR\0Authorization Error: no"s, AckOutcome::Refused, "Authorization Error: no"},
+        {"SUCCESS"s, AckOutcome::NotTwoParts, ""},
+        {"SUCCESS\0"s, AckOutcome::NotTwoParts, ""},
+        {""s, AckOutcome::NotTwoParts, ""},
+    };
+    for (const Case& c : cases) {
+        const AckReading ack = readAcknowledgement(c.payload);
+        EXPECT_EQ(ack.outcome, c.outcome) << printable(c.payload);
+        EXPECT_EQ(ack.body, c.body) << printable(c.payload);
+    }
+}
+
+}  // namespace
+}  // namespace zel::wire
