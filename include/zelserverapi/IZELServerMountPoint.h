@@ -63,14 +63,14 @@ public:
     // Keeps its place in the table; always returns 0.
     virtual unsigned reserved() const = 0;
 
-    // Paths are written relative to the resource ("in/2024/data.csv"). The whole (absolute) path of
-    // a path is always its directory path joined with its name by exactly one "/": a "/" that the
-    // directory path ends with or the name starts with is not doubled, and an empty directory path
-    // (the top of the resource) gives the name alone.
+    // Paths are rooted at the resource: "/in/2024/data.csv" is the file data.csv in the folder in/2024
+    // of the resource. The whole (absolute) path of a path is always its directory path joined with
+    // its name by exactly one "/": a "/" that the directory path ends with or the name starts with is
+    // not doubled, so an empty directory path (the top of the resource) gives "/name".
     //
     // A path from a whole path inside the resource: the name is the text behind its last "/", the
     // directory path the text before it (empty when there is no "/"); the whole path is then joined
-    // from these two as above ("in/a.csv" stays "in/a.csv", "/a.csv" becomes "a.csv"). Null when
+    // from these two as above ("/in/a.csv" stays "/in/a.csv", "a.csv" becomes "/a.csv"). Null when
     // memory is exhausted. Release it with releaseObject.
     virtual IZELServerPath* createPath(const IZELServerString& absolutePath) = 0;
     // A path from a directory path and a name, both kept as given; the whole path joins them as above

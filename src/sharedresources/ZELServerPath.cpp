@@ -35,11 +35,7 @@ ZELServerPath* ZELServerPath::fromParts(std::string_view directoryPath, std::str
 
 std::string ZELServerPath::joinPath(std::string_view directoryPath, std::string_view name)
 {
-    // The server takes a path with a leading "/" for one outside the resource, so a file at the top
-    // of the resource must come out as its bare name.
-    if (directoryPath.empty()) {
-        return std::string(name);
-    }
+    // Paths are rooted at the resource: a file at its top has the whole path "/name".
     while (!directoryPath.empty() && directoryPath.back() == '/') {
         directoryPath.remove_suffix(1);
     }

@@ -29,7 +29,7 @@ public:
 
     // The directory path and the name with exactly one "/" between them: a "/" that the directory
     // ends with or the name starts with is not doubled. An empty directory path (the resource itself)
-    // gives the name alone.
+    // gives "/name".
     static std::string joinPath(std::string_view directoryPath, std::string_view name);
 
     void getName(IZELServerString& out) const override;

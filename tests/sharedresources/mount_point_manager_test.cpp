@@ -47,7 +47,7 @@ TEST_F(MountPointManagerTest, GetSharedResourcesListsThemAndTheyTalkThroughTheSa
 {
     server.exchange(command("SR_GET_SHAREDRESOURCES"), zeltest::reply("SUCCESS", kTwoResources))
         .exchange(command("SR_MAKE", {{"srName", "OUT"},
-                                      {"srPath", xmlDocument("SR_MAKE", R"(<PATH abspath="new" dirpath="" name="new"/>)")}}),
+                                      {"srPath", xmlDocument("SR_MAKE", R"(<PATH abspath="/new" dirpath="" name="new"/>)")}}),
                   zeltest::reply("SUCCESS", "true"));
     signIn();
     const MountPoints mountPoints(makeMountPointVector());
@@ -95,7 +95,7 @@ TEST_F(MountPointManagerTest, GetSharedResourceFillsTheMountPointAndBindsIt)
                     zeltest::reply("SUCCESS", R"(<SR_GET_SHAREDRESOURCE><SHAREDRESOURCE name="DATA" displayname="Input data" )"
                                               R"(description="d"/></SR_GET_SHAREDRESOURCE>)"))
         .exchange(command("SR_EXISTS", {{"srName", "DATA"},
-                                        {"srPath", xmlDocument("SR_EXISTS", R"(<PATH abspath="a" dirpath="" name="a"/>)")}}),
+                                        {"srPath", xmlDocument("SR_EXISTS", R"(<PATH abspath="/a" dirpath="" name="a"/>)")}}),
                   zeltest::reply("SUCCESS", "true"));
     signIn();
     const std::unique_ptr<IZELServerMountPoint> mountPoint(makeMountPoint(nullptr));

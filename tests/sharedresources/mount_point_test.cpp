@@ -80,7 +80,7 @@ private:
 std::string fileInfoElement(const std::string& type, const std::string& size, const std::string& directory,
                             const std::string& name)
 {
-    const std::string absolute = directory.empty() ? name : directory + "/" + name;
+    const std::string absolute = directory + "/" + name;
     return R"(<FILEINFO filetype=")" + type + R"(" size=")" + size + R"(" date="2024-05-01T12:00:00Z">)" +
            R"(<PATH name=")" + name + R"(" dirpath=")" + directory + R"(" abspath=")" + absolute + R"("/></FILEINFO>)";
 }
@@ -136,7 +136,7 @@ protected:
     }
     static Bytes listCommand(const std::string& directory, const std::string& name)
     {
-        return pathCommand("SR_LIST", "srPath", name, directory, directory.empty() ? name : directory + "/" + name);
+        return pathCommand("SR_LIST", "srPath", name, directory, directory + "/" + name);
     }
     static Bytes downloadCommand()
     {
@@ -174,7 +174,7 @@ protected:
 TEST_F(MountPointTest, ExistsSendsTheResourceNameAndThePathDocument)
 {
     server.exchange(pathCommand("SR_EXISTS", "srPath", "a.csv", "in", "in/a.csv"), zeltest::reply("SUCCESS", "true"))
-        .exchange(pathCommand("SR_EXISTS", "srPath", "b.csv", "", "b.csv"), zeltest::reply("SUCCESS", "false"));
+        .exchange(pathCommand("SR_EXISTS", "srPath", "b.csv", "", "/b.csv"), zeltest::reply("SUCCESS", "false"));
     signIn();
     unsigned present = 0;
     StatusPtr status(mountPoint->exists(*path("in/a.csv"), present));
@@ -199,9 +199,9 @@ TEST_F(MountPointTest, RemoveSendsSrDeleteAndReadsTheAnswer)
 
 TEST_F(MountPointTest, OutFlagsReadZeroAfterAFailureOrAnAnswerThatIsNoBoolean)
 {
-    server.exchange(pathCommand("SR_EXISTS", "srPath", "x", "", "x"), zeltest::reply("ERROR", "no rights"))
-        .exchange(pathCommand("SR_DELETE", "srPath", "x", "", "x"), zeltest::reply("ERROR", "no rights"))
-        .exchange(pathCommand("SR_EXISTS", "srPath", "x", "", "x"), zeltest::reply("SUCCESS", "yes"));
+    server.exchange(pathCommand("SR_EXISTS", "srPath", "x", "", "/x"), zeltest::reply("ERROR", "no rights"))
+        .exchange(pathCommand("SR_DELETE", "srPath", "x", "", "/x"), zeltest::reply("ERROR", "no rights"))
+        .exchange(pathCommand("SR_EXISTS", "srPath", "x", "", "/x"), zeltest::reply("SUCCESS", "yes"));
     signIn();
     unsigned present = 7;
     StatusPtr status(mountPoint->exists(*path("x"), present));
@@ -297,8 +297,8 @@ TEST_F(MountPointTest, GetFileInfoWithFlagsIsRefusedBeforeAnythingIsSent)
 
 TEST_F(MountPointTest, GetFileInfoOfAReplyWithoutADescriptionIsUnreadable)
 {
-    server.exchange(pathCommand("SR_GET", "srPath", "a", "", "a"), zeltest::reply("SUCCESS", "<SR_GET/>"))
-        .exchange(pathCommand("SR_GET", "srPath", "a", "", "a"), zeltest::reply("SUCCESS", "true"));
+    server.exchange(pathCommand("SR_GET", "srPath", "a", "", "/a"), zeltest::reply("SUCCESS", "<SR_GET/>"))
+        .exchange(pathCommand("SR_GET", "srPath", "a", "", "/a"), zeltest::reply("SUCCESS", "true"));
     signIn();
     ZELServerFileInfo info;
     StatusPtr status(mountPoint->getFileInfo(*path("a"), info));

@@ -75,13 +75,13 @@ TEST_P(PathFromWholePath, SplitsAtTheLastSlash)
 INSTANTIATE_TEST_SUITE_P(
     Texts, PathFromWholePath,
     ::testing::Values(WholePathCase{"in/2024/data.csv", {"data.csv", "in/2024", "in/2024/data.csv"}},
-                      WholePathCase{"data.csv", {"data.csv", "", "data.csv"}},
-                      WholePathCase{"/data.csv", {"data.csv", "", "data.csv"}},
+                      WholePathCase{"data.csv", {"data.csv", "", "/data.csv"}},
+                      WholePathCase{"/data.csv", {"data.csv", "", "/data.csv"}},
                       WholePathCase{"/in/data.csv", {"data.csv", "/in", "/in/data.csv"}},
                       WholePathCase{"in/", {"", "in", "in/"}},
                       WholePathCase{"a//b", {"b", "a/", "a/b"}},
-                      WholePathCase{"in\\data.csv", {"in\\data.csv", "", "in\\data.csv"}},
-                      WholePathCase{"", {"", "", ""}}));
+                      WholePathCase{"in\\data.csv", {"in\\data.csv", "", "/in\\data.csv"}},
+                      WholePathCase{"", {"", "", "/"}}));
 
 struct PartsCase {
     const char* directory;
@@ -107,7 +107,7 @@ INSTANTIATE_TEST_SUITE_P(Texts, PathFromParts,
                                            PartsCase{"in/2024/", "data.csv", "in/2024/data.csv"},
                                            PartsCase{"in", "/data.csv", "in/data.csv"},
                                            PartsCase{"in//", "//data.csv", "in/data.csv"},
-                                           PartsCase{"", "data.csv", "data.csv"},
+                                           PartsCase{"", "data.csv", "/data.csv"},
                                            PartsCase{"/", "data.csv", "/data.csv"},
                                            PartsCase{"in", "", "in/"}));
 

@@ -42,6 +42,8 @@ TEST_F(Paths, NormalisesAndMapsEveryComponent) {
       {"sub\\x\\y", "sub/x/y"},
       {"missing/deeper/still", "missing/deeper/still"},
       {"a..b/..c", "a..b/..c"},
+      {"/sub/file.txt", "sub/file.txt"},
+      {"/", ""},
   };
   for (const Case& c : cases) {
     zelserverd::AreaPath path;

@@ -28,9 +28,9 @@ std::string SharedArea::resolve(std::string_view clientPath, AreaPath& out) cons
   // Clients on Windows write backslashes; on this side both separate components.
   for (char& c : text)
     if (c == '\\') c = '/';
-  if (!text.empty() && text.front() == '/')
-    return "absolute path '" + std::string(clientPath) + "' is not allowed";
-  if (text.size() >= 2 && text[1] == ':')
+  // Paths are rooted at the area: a leading "/" names the area's top, as the client's path objects
+  // write it. Paths of the host itself (a network share, a drive letter) are never taken.
+  if (text.rfind("//", 0) == 0 || (text.size() >= 2 && text[1] == ':'))
     return "absolute path '" + std::string(clientPath) + "' is not allowed";
   std::vector<std::string> components;
   for (const std::string& part : split(text, '/')) {

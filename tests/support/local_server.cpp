@@ -1,0 +1,113 @@
+#include "support/local_server.h"
+
+#include <cerrno>
+#include <csignal>
+#include <cstdlib>
+#include <filesystem>
+#include <fstream>
+
+#include <fcntl.h>
+#include <poll.h>
+#include <spawn.h>
+#include <sys/wait.h>
+#include <unistd.h>
+
+extern char** environ;
+
+namespace zeltest {
+
+namespace {
+
+constexpr int kStartTimeoutMs = 10000;
+
+// Reads one line from `fd` within the time-out; empty when none came.
+std::string readLine(int fd, int timeoutMs)
+{
+    std::string line;
+    char c = 0;
+    while (true) {
+        pollfd entry{fd, POLLIN, 0};
+        if (::poll(&entry, 1, timeoutMs) <= 0)
+            return {};
+        if (::read(fd, &c, 1) != 1)
+            return {};
+        if (c == '\n')
+            return line;
+        line += c;
+    }
+}
+
+}  // namespace
+
+LocalServer::LocalServer(const std::string& executable, const std::string& configText)
+{
+    char pattern[] = "/tmp/zel-e2e-XXXXXX";
+    if (::mkdtemp(pattern) == nullptr) {
+        failure_ = "cannot make a temporary directory";
+        return;
+    }
+    directory_ = pattern;
+    std::ofstream(directory_ + "/zelserverd.conf") << configText;
+    start(executable);
+}
+
+void LocalServer::start(const std::string& executable)
+{
+    int out[2];
+    if (::pipe(out) != 0) {
+        failure_ = "cannot make a pipe";
+        return;
+    }
+    posix_spawn_file_actions_t actions;
+    posix_spawn_file_actions_init(&actions);
+    posix_spawn_file_actions_adddup2(&actions, out[1], STDOUT_FILENO);
+    posix_spawn_file_actions_addclose(&actions, out[0]);
+    posix_spawn_file_actions_addopen(&actions, STDERR_FILENO, (directory_ + "/server.log").c_str(),
+                                     O_WRONLY | O_CREAT | O_TRUNC, 0600);
+    const std::string data = directory_ + "/data";
+    const std::string config = directory_ + "/zelserverd.conf";
+    const char* argv[] = {executable.c_str(), "--data", data.c_str(), "--listen", "127.0.0.1:0",
+                          "--config", config.c_str(), nullptr};
+    const int spawned = ::posix_spawn(&pid_, executable.c_str(), &actions, nullptr,
+                                      const_cast<char* const*>(argv), environ);
+    posix_spawn_file_actions_destroy(&actions);
+    ::close(out[1]);
+    if (spawned != 0) {
+        pid_ = -1;
+        ::close(out[0]);
+        failure_ = "cannot start " + executable;
+        return;
+    }
+    const std::string line = readLine(out[0], kStartTimeoutMs);
+    ::close(out[0]);
+    const std::string prefix = "listening on 127.0.0.1:";
+    if (line.rfind(prefix, 0) != 0) {
+        failure_ = "the server did not report its port (got '" + line + "')";
+        return;
+    }
+    port_ = static_cast<std::uint16_t>(std::atoi(line.c_str() + prefix.size()));
+}
+
+int LocalServer::stop()
+{
+    if (pid_ <= 0)
+        return -1;
+    ::kill(pid_, SIGTERM);
+    int status = 0;
+    while (::waitpid(pid_, &status, 0) < 0 && errno == EINTR) {
+    }
+    pid_ = -1;
+    return WIFEXITED(status) ? WEXITSTATUS(status) : -1;
+}
+
+LocalServer::~LocalServer()
+{
+    stop();
+    // ZEL_E2E_KEEP keeps the data directory and the server's log for a look after a failure.
+    if (!directory_.empty() && std::getenv("ZEL_E2E_KEEP") == nullptr) {
+        std::error_code ignored;
+        std::filesystem::remove_all(directory_, ignored);
+    }
+}
+
+}  // namespace zeltest
