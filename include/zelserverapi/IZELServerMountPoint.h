@@ -32,8 +32,8 @@ public:
     // The temporary file, "wb-tmp-XXXXXX.tmp" with the X replaced to make the name unique, is made in
     // the target's folder; with an empty `localTarget` it is made in the system's folder for
     // temporary files, and the file stays there under its temporary name. `received` is the server's
-    // answer: 0 when the server sent no file; the target is then left as it was and no temporary file
-    // remains. 393624 when the temporary file cannot be made (with the target, or the folder
+    // answer: 0 when the server sent no file, and the target is then replaced by an empty file
+    // like after any completed exchange. 393624 when the temporary file cannot be made (with the target, or the folder
     // for an empty target), before anything is sent, or when it cannot be moved onto the target.
     // `listener` (owned by the caller, may be null) follows the transfer.
     virtual IZELServerStatus* download(const IZELServerPath& source, const IZELServerString& localTarget, unsigned& received, IZELServerProgressListener* listener) = 0;

@@ -132,12 +132,9 @@ IZELServerStatus* ZELServerMountPoint::download(const IZELServerPath& source, co
     if (IZELServerStatus* status = command.transfer(temporary->path(), kDownload, listener)) {
         return status;  // the temporary file goes with `temporary`; the target was never touched
     }
-    // The channel answers "false" for a server that sent no file header, and then the temporary
-    // file holds nothing the server sent: an existing target must not be emptied by it.
-    const bool noFile = command.response().readBoolean(received) == 0 && received == 0;
-    if (noFile) {
-        return nullptr;
-    }
+    // A server that sent no file is answered "false" by the channel; the (empty) temporary file still
+    // takes the target's place, as a completed exchange always does here.
+    command.response().readBoolean(received);
     if (target.empty()) {
         temporary->keep();
         return nullptr;

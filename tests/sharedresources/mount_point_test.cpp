@@ -444,7 +444,7 @@ TEST_F(MountPointTest, ADownloadCutShortDeletesTheTemporaryFileAndLeavesTheTarge
     EXPECT_TRUE(server.verify());
 }
 
-TEST_F(MountPointTest, ADownloadWithoutAFileLeavesTheTargetAlone)
+TEST_F(MountPointTest, ADownloadWithoutAFileStillReplacesTheTarget)
 {
     const std::string target = file("r.csv", "old content");
     server.exchange(downloadCommand(), zeltest::reply("ERROR", "cannot open 'out/r.csv'"));
@@ -453,7 +453,7 @@ TEST_F(MountPointTest, ADownloadWithoutAFileLeavesTheTargetAlone)
     const StatusPtr status(mountPoint->download(*path("out/r.csv"), ZELServerString(target), received, nullptr));
     EXPECT_EQ(status, nullptr) << describe(status.get());
     EXPECT_EQ(received, 0u);
-    EXPECT_EQ(slurp(target), "old content");
+    EXPECT_EQ(slurp(target), "") << "the completed exchange moves its temporary file onto the target";
     EXPECT_TRUE(temporaryFiles(dir).empty());
     EXPECT_TRUE(server.verify());
 }

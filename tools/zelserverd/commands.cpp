@@ -20,7 +20,7 @@ std::map<std::string_view, CommandSpec> buildTable() {
   std::map<std::string_view, CommandSpec> table;
   for (auto family : {sessionCommands, securityCommands, sharedResourceCommands, jobCommands,
                       repositoryCommands})
-    for (const CommandSpec& spec : family()) table.emplace(spec.keyword, spec);
+    for (const CommandSpec& entry : family()) table.emplace(entry.keyword, entry);
   return table;
 }
 
@@ -33,16 +33,16 @@ const CommandSpec* findCommand(std::string_view keyword) {
 }
 
 Reply dispatch(CommandContext& context) {
-  const CommandSpec* spec = findCommand(context.request.keyword);
-  if (!spec) return Reply::error("unknown command \"" + context.request.keyword + "\"");
-  if (spec->needsSignIn) {
+  const CommandSpec* entry = findCommand(context.request.keyword);
+  if (!entry) return Reply::error("unknown command \"" + context.request.keyword + "\"");
+  if (entry->needsSignIn) {
     if (!context.session.principal)
       return Reply::authentication("sign in with SERVER_SESSION_INIT first");
-    if ((context.principal().rights & spec->right) != spec->right)
+    if ((context.principal().rights & entry->right) != entry->right)
       return Reply::authorization("user '" + context.principal().user +
-                                  "' may not run " + std::string(spec->keyword));
+                                  "' may not run " + std::string(entry->keyword));
   }
-  return spec->handler(context);
+  return entry->handler(context);
 }
 
 }  // namespace zelserverd
