@@ -7,6 +7,7 @@ packages=(
   libxerces-c-dev zlib1g-dev
   libgtest-dev libgmock-dev libbenchmark-dev
   libpugixml-dev libsqlite3-dev
+  libcli11-dev nlohmann-json3-dev
 )
 
 missing=()
