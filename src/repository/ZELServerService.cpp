@@ -30,13 +30,20 @@ constexpr AttributeBinding<ServiceFields> kServiceAttributes[] = {
 }  // namespace
 
 ZELServerService::ZELServerService(IZELServerChannel* channel, std::string name, std::string displayName,
-                                   std::string description, std::string urlPattern)
+                                   std::string description, std::string urlPattern, bool enabled,
+                                   bool workspaceRegistration, bool customFormatRegistration,
+                                   bool customTransformerRegistration, bool templateRegistration)
     : channel_(channel)
 {
     fields_.name = std::move(name);
     fields_.displayName = std::move(displayName);
     fields_.description = std::move(description);
     fields_.urlPattern = std::move(urlPattern);
+    fields_.enabled = enabled;
+    fields_.workspaceRegistration = workspaceRegistration;
+    fields_.customFormatRegistration = customFormatRegistration;
+    fields_.customTransformerRegistration = customTransformerRegistration;
+    fields_.templateRegistration = templateRegistration;
 }
 
 void ZELServerService::getName(IZELServerString& out) const { copyText(fields_.name, out); }

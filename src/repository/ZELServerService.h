@@ -34,8 +34,11 @@ class ZELServerService final : public IZELServerService, public ServicePayloadFi
 public:
     // `channel` is borrowed (null: the commands fail with 393622 once their arguments pass).
     explicit ZELServerService(IZELServerChannel* channel) : channel_(channel) {}
+    // The full form: the four texts and the five flags (enabled, then registrations of workspaces,
+    // custom formats, custom transformers and templates).
     ZELServerService(IZELServerChannel* channel, std::string name, std::string displayName, std::string description,
-                     std::string urlPattern);
+                     std::string urlPattern, bool enabled, bool workspaceRegistration, bool customFormatRegistration,
+                     bool customTransformerRegistration, bool templateRegistration);
     ZELServerService(const ZELServerService&) = delete;
     ZELServerService& operator=(const ZELServerService&) = delete;
     ~ZELServerService() override = default;

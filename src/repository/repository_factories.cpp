@@ -20,8 +20,9 @@ IZELServerService* makeService(IZELServerChannel* channel, const IZELServerStrin
                                const IZELServerString& displayName, const IZELServerString& description,
                                const IZELServerString& urlPattern)
 {
+    // A new service from the session is enabled and takes workspaces, and nothing else, until told.
     return new ZELServerService(channel, toStdString(name), toStdString(displayName), toStdString(description),
-                                toStdString(urlPattern));
+                                toStdString(urlPattern), true, true, false, false, false);
 }
 
 IZELServerService* makeService(IZELServerChannel* channel) { return new ZELServerService(channel); }

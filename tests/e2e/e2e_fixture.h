@@ -4,8 +4,12 @@
 
 #include <gtest/gtest.h>
 
+#include <chrono>
+#include <fstream>
 #include <memory>
+#include <sstream>
 #include <string>
+#include <thread>
 #include <vector>
 
 #include <zelserverapi/interfaces.h>
@@ -17,8 +21,30 @@ namespace zeltest {
 
 inline const char* kE2eConfig =
     "[user ann]\npassword = pw-ann\nroles = admin\n"
+    "[server]\nworkers = 4\n"
     "[user bob]\npassword = pw-bob\nroles = user\n"
+    "[user vic]\npassword = pw-vic\nroles = viewer\n"
+    "[role outsider]\nrights = tokens\n"
+    "[user zed]\npassword = pw-zed\nroles = outsider\n"
     "[sharedresource DATA]\npath = shared\n";
+
+inline std::string readAll(const std::string& path)
+{
+    std::ifstream in(path, std::ios::binary);
+    std::ostringstream text;
+    text << in.rdbuf();
+    return text.str();
+}
+
+inline void writeFile(const std::string& path, const std::string& content)
+{
+    std::ofstream(path, std::ios::binary) << content;
+}
+
+// Job status codes of IZELServerTransformationResult::getJobStatus.
+enum JobStatus : unsigned {
+    kQueued = 1, kDelayed = 2, kInProcess = 4, kAborted = 6, kSucceeded = 7, kServiceFailed = 8, kJobFailed = 9
+};
 
 // A session of the library; strings made for a test are released before the session goes.
 class Client {
@@ -64,11 +90,57 @@ public:
     unsigned take(IZELServerStatus* status)
     {
         lastMessage_ = status ? status->getMessage() : "";
+        lastCode_ = status ? status->getCode() : 0;
         const unsigned number = status ? status->getMessageNumber() : 0;
         session_->destroyStatus(&status);
         return number;
     }
     const std::string& lastMessage() const { return lastMessage_; }
+    // The kind of the last status: 1 authentication, 2 authorization, 0 anything else.
+    unsigned lastCode() const { return lastCode_; }
+
+    // Adds a repository (when missing) and fetches it; owned by the caller (destroyRepository).
+    IZELServerRepository* repository(const std::string& name)
+    {
+        IZELServerRepositoryManager* manager = session_->getRepositoryManager();
+        unsigned exists = 0;
+        take(manager->repositoryExists(text(name), exists));
+        if (!exists)
+            take(manager->addRepository(text(name), text("")));
+        IZELServerRepository* repository = session_->createRepository();
+        unsigned found = 0;
+        take(manager->getRepository(text(name), *repository, found));
+        return repository;
+    }
+
+    // Polls a job's result until it has ended or `seconds` passed; the last job status code.
+    unsigned waitForJob(unsigned id, IZELServerTransformationResult& result, int seconds = 30)
+    {
+        IZELServerTransformationManager* jobs = session_->getTransformationManager();
+        const auto deadline = std::chrono::steady_clock::now() + std::chrono::seconds(seconds);
+        unsigned status = kQueued;
+        while (std::chrono::steady_clock::now() < deadline) {
+            unsigned found = 0;
+            if (take(jobs->getJobResult(id, found, result)) != 0)
+                return 0;
+            status = 0;
+            result.getJobStatus(status);
+            if (found && status != kQueued && status != kInProcess && status != kDelayed)
+                return status;
+            std::this_thread::sleep_for(std::chrono::milliseconds(50));
+        }
+        return status;
+    }
+
+    // The shared resource of that name, or null; owned by the caller (destroyMountPoint).
+    IZELServerMountPoint* area(const std::string& name)
+    {
+        IZELServerMountPoint* area = session_->createMountPoint();
+        unsigned found = 0;
+        if (take(session_->getMountPointManager()->getSharedResource(text(name), *area, found)) != 0 || !found)
+            session_->destroyMountPoint(&area);
+        return area;
+    }
 
 private:
     struct Releaser {
@@ -80,6 +152,7 @@ private:
     IZELServerConnectionInfo* info_ = nullptr;
     std::vector<std::unique_ptr<IZELServerString, Releaser>> strings_;
     std::string lastMessage_;
+    unsigned lastCode_ = 0;
 };
 
 class EndToEnd : public ::testing::Test {
@@ -89,6 +162,8 @@ protected:
         server = std::make_unique<LocalServer>(ZEL_TEST_ZELSERVERD, kE2eConfig);
         ASSERT_EQ(server->failure(), "");
     }
+
+    std::string local(const std::string& name) const { return server->directory() + "/" + name; }
 
     std::unique_ptr<LocalServer> server;
 };

@@ -18,14 +18,6 @@ const char* kWorkspace =
     "# @parameter WHO | TEXT | nobody | Whom to greet\n"
     "echo \"Hello $WHO\"\n";
 
-std::string readAll(const std::string& path)
-{
-    std::ifstream in(path, std::ios::binary);
-    std::ostringstream text;
-    text << in.rdbuf();
-    return text.str();
-}
-
 class Tour : public EndToEnd {
 protected:
     void SetUp() override
@@ -34,8 +26,6 @@ protected:
         ASSERT_EQ(client.signIn(server->port(), "ann", "pw-ann"), 0u) << client.lastMessage();
         session = &client.session();
     }
-
-    std::string local(const std::string& name) const { return server->directory() + "/" + name; }
 
     Client client;
     IZELServerSession* session = nullptr;

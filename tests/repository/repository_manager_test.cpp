@@ -123,10 +123,8 @@ TEST_F(ManagerTest, AddAndUpdateSendTheServiceUnderTheAddRoot)
     server.exchange(command("REP_ADD_SERVICE", {{"serviceObject", added}}), success("true"))
         .exchange(command("REP_UPDATE_SERVICE", {{"serviceObject", updated}}), success("true"));
     connect();
-    ZELServerService fresh(channel.get(), "download", "Data Download", "Serves & stores", "/dl/{ws}");
-    fresh.setEnabled(1);
-    fresh.setWorkspaceRegistrationAllowed(1);
-    fresh.setRegistrationAllowed(4, 1);
+    ZELServerService fresh(channel.get(), "download", "Data Download", "Serves & stores", "/dl/{ws}", true, true,
+                           false, false, true);
     EXPECT_EQ(StatusPtr(manager.addService(fresh)), nullptr);
 
     ZELServerService stored(channel.get());

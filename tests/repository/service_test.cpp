@@ -33,7 +33,8 @@ std::vector<unsigned> flagsOf(const IZELServerService& service)
 
 TEST(ServiceSettings, FreshServiceHasTheUnsavedIdAndNoFlags)
 {
-    const ZELServerService service(nullptr, "download", "Data Download", "Serves files", "/svc/{name}");
+    const ZELServerService service(nullptr, "download", "Data Download", "Serves files", "/svc/{name}", false, false,
+                                   false, false, false);
     EXPECT_EQ(service.serviceId(), "-1");
     EXPECT_EQ(service.isEnabled(), 0u);
     EXPECT_EQ(flagsOf(service), (std::vector<unsigned>{0, 0, 0, 0}));
@@ -84,7 +85,7 @@ TEST(ServiceSettings, ReadsTheTenAttributesAndItsProperties)
 
 class ServiceTest : public RepositoryWireTest {
 protected:
-    ZELServerService service{channel.get(), "download", "Data Download", "", ""};
+    ZELServerService service{channel.get(), "download", "Data Download", "", "", false, false, false, false, false};
 };
 
 TEST_F(ServiceTest, RegisterItemRefusesKindsTheServiceDoesNotTakeWithoutSending)

@@ -311,6 +311,20 @@ TEST_F(SessionTest, EveryFactoryMakesAnObjectItsDestroyTakesBack)
     roundTrip<IZELServerVector<IZELServerFileInfo>>(s, &S::createFileInfoVector, &S::destroyFileInfoVector);
 }
 
+TEST_F(SessionTest, ANewServiceIsEnabledAndTakesWorkspacesOnly)
+{
+    IZELServerService* service = session->createService(*text("s"), *text("S"), *text("d"), *text("u"));
+    ASSERT_NE(service, nullptr);
+    EXPECT_EQ(service->isEnabled(), 1u);
+    const unsigned expected[] = {0, 1, 0, 0, 0, 0};  // item types 0 to 5: only workspaces (1)
+    for (unsigned type = 0; type < 6; ++type)
+        EXPECT_EQ(service->isRegistrationAllowed(type), expected[type]) << "item type " << type;
+    IZELServerString* name = text("");
+    service->getUrlPattern(*name);
+    EXPECT_STREQ(name->c_str(), "u");
+    session->destroyService(&service);
+}
+
 TEST_F(SessionTest, TransformationFactoriesComposeTheWorkspacePath)
 {
     IZELServerTransformationRequest* request =

@@ -51,6 +51,12 @@ LocalServer::LocalServer(const std::string& executable, const std::string& confi
     start(executable);
 }
 
+LocalServer::LocalServer(const std::string& executable, const ReuseDirectory& reuse)
+    : directory_(reuse.directory), ownsDirectory_(false)
+{
+    start(executable);
+}
+
 void LocalServer::start(const std::string& executable)
 {
     int out[2];
@@ -63,7 +69,7 @@ void LocalServer::start(const std::string& executable)
     posix_spawn_file_actions_adddup2(&actions, out[1], STDOUT_FILENO);
     posix_spawn_file_actions_addclose(&actions, out[0]);
     posix_spawn_file_actions_addopen(&actions, STDERR_FILENO, (directory_ + "/server.log").c_str(),
-                                     O_WRONLY | O_CREAT | O_TRUNC, 0600);
+                                     O_WRONLY | O_CREAT | O_APPEND, 0600);
     const std::string data = directory_ + "/data";
     const std::string config = directory_ + "/zelserverd.conf";
     const char* argv[] = {executable.c_str(), "--data", data.c_str(), "--listen", "127.0.0.1:0",
@@ -104,7 +110,7 @@ LocalServer::~LocalServer()
 {
     stop();
     // ZEL_E2E_KEEP keeps the data directory and the server's log for a look after a failure.
-    if (!directory_.empty() && std::getenv("ZEL_E2E_KEEP") == nullptr) {
+    if (ownsDirectory_ && !directory_.empty() && std::getenv("ZEL_E2E_KEEP") == nullptr) {
         std::error_code ignored;
         std::filesystem::remove_all(directory_, ignored);
     }

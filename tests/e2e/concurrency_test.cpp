@@ -1,0 +1,106 @@
+// Sixteen sessions on sixteen threads at once, each with its own items, files and job; afterwards
+// every one of them finds all of its own work intact.
+
+#include <atomic>
+
+#include "e2e/e2e_fixture.h"
+
+namespace zeltest {
+namespace {
+
+constexpr int kSessions = 16;
+
+// One thread's work; failures are collected as text because gtest assertions belong on the main thread.
+std::string work(std::uint16_t port, const std::string& dir, int n)
+{
+    const std::string tag = "t" + std::to_string(n);
+    Client client;
+    if (client.signIn(port, "ann", "pw-ann") != 0)
+        return tag + ": sign-in: " + client.lastMessage();
+    IZELServerSession& session = client.session();
+    std::string failures;
+    auto check = [&](bool ok, const std::string& what) {
+        if (!ok)
+            failures += tag + ": " + what + " (" + client.lastMessage() + ")\n";
+        return ok;
+    };
+
+    const std::string workspace = "#!/bin/sh\n# @parameter MARK | TEXT | none\necho \"mark $MARK\"\n";
+    const std::string itemFile = dir + "/" + tag + ".zlw";
+    writeFile(itemFile, workspace);
+    IZELServerRepository* repository = client.repository("crowd");
+    check(client.take(repository->addItem(client.text(tag + ".zlw"), client.text(itemFile))) == 0, "addItem");
+
+    IZELServerMountPoint* area = client.area("DATA");
+    if (!area) {
+        session.destroyRepository(&repository);
+        return failures + tag + ": no area\n";
+    }
+    const std::string content(1000 + n * 997, static_cast<char>('a' + n));
+    writeFile(dir + "/" + tag + ".dat", content);
+    IZELServerPath* folder = area->createPath(client.text("/" + tag));
+    IZELServerPath* file = area->createPath(client.text("/" + tag), client.text("data.bin"));
+    check(client.take(area->makeDirectory(*folder)) == 0, "makeDirectory");
+    check(client.take(area->upload(client.text(dir + "/" + tag + ".dat"), *file, nullptr)) == 0, "upload");
+
+    IZELServerTransformationRequest* request =
+        session.createTransformationRequest(client.text("zeljob"), client.text("crowd"), client.text(tag + ".zlw"));
+    request->setPublishedParameter(client.text("MARK"), client.text(tag));
+    IZELServerTransformationResult* result = session.createTransformationResult();
+    unsigned id = 0;
+    if (check(client.take(session.getTransformationManager()->submitJob(*request, id)) == 0, "submitJob")) {
+        check(client.waitForJob(id, *result, 60) == kSucceeded, "job result");
+        unsigned success = 0;
+        const std::string logFile = dir + "/" + tag + ".log";
+        check(client.take(session.getTransformationManager()->getLogFile(id, client.text(logFile), success)) == 0,
+              "getLogFile");
+        check(readAll(logFile).find("mark " + tag + "\n") != std::string::npos, "log holds the mark");
+    }
+
+    unsigned received = 0;
+    check(client.take(repository->getItem(client.text(tag + ".zlw"), client.text(itemFile + ".back"), received)) == 0,
+          "getItem");
+    check(readAll(itemFile + ".back") == workspace, "item content");
+    check(client.take(area->download(*file, client.text(dir + "/" + tag + ".back"), received, nullptr)) == 0,
+          "download");
+    check(readAll(dir + "/" + tag + ".back") == content, "shared file content");
+
+    session.destroyTransformationResult(&result);
+    session.destroyTransformationRequest(&request);
+    area->releaseObject(folder);
+    area->releaseObject(file);
+    session.destroyMountPoint(&area);
+    session.destroyRepository(&repository);
+    return failures;
+}
+
+TEST_F(EndToEnd, SixteenSessionsInParallelLoseNothing)
+{
+    {
+        Client setup;
+        ASSERT_EQ(setup.signIn(server->port(), "ann", "pw-ann"), 0u);
+        ASSERT_EQ(setup.take(setup.session().getRepositoryManager()->addRepository(setup.text("crowd"), setup.text(""))),
+                  0u);
+    }
+    std::vector<std::string> failures(kSessions);
+    std::vector<std::thread> threads;
+    for (int n = 0; n < kSessions; ++n)
+        threads.emplace_back([&, n] { failures[n] = work(server->port(), server->directory(), n); });
+    for (std::thread& thread : threads)
+        thread.join();
+    for (const std::string& failure : failures)
+        EXPECT_EQ(failure, "");
+
+    Client audit;
+    ASSERT_EQ(audit.signIn(server->port(), "ann", "pw-ann"), 0u);
+    IZELServerRepository* crowd = audit.repository("crowd");
+    for (int n = 0; n < kSessions; ++n) {
+        unsigned exists = 0;
+        EXPECT_EQ(audit.take(crowd->itemExists(audit.text("t" + std::to_string(n) + ".zlw"), exists)), 0u);
+        EXPECT_EQ(exists, 1u) << n;
+    }
+    audit.session().destroyRepository(&crowd);
+}
+
+}  // namespace
+}  // namespace zeltest

@@ -1,0 +1,110 @@
+#pragma once
+// zelctl run as a child process against zelserverd on a free port, with its standard output and
+// standard error caught in files (so standard error is never a terminal here).
+
+#include <gtest/gtest.h>
+#include <nlohmann/json.hpp>
+
+#include <cstdlib>
+#include <fstream>
+#include <memory>
+#include <sstream>
+#include <string>
+#include <vector>
+
+#include <sys/wait.h>
+
+#include "support/local_server.h"
+
+namespace zeltest {
+
+inline const char* kZelctlConfig =
+    "[user ann]\npassword = pw-ann\nroles = admin\n"
+    "[user bob]\npassword = pw-bob\nroles = viewer\n"
+    "[sharedresource DATA]\npath = shared\n";
+
+inline const char* kGreeter =
+    "#!/bin/sh\n"
+    "# @title Greeter\n"
+    "# @description Says hello\n"
+    "# @parameter WHO | TEXT | nobody | Whom to greet\n"
+    "echo \"Hello $WHO\"\n";
+
+struct Outcome {
+    int status = -1;
+    std::string out;
+    std::string err;
+    nlohmann::json json() const { return nlohmann::json::parse(out); }
+};
+
+inline std::string readFile(const std::string& path)
+{
+    std::ifstream in(path, std::ios::binary);
+    std::ostringstream text;
+    text << in.rdbuf();
+    return text.str();
+}
+
+inline std::string quoted(const std::string& text)
+{
+    std::string result = "'";
+    for (char c : text)
+        result += c == '\'' ? std::string("'\\''") : std::string(1, c);
+    return result + "'";
+}
+
+class Zelctl : public ::testing::Test {
+protected:
+    void SetUp() override
+    {
+        server = std::make_unique<LocalServer>(ZEL_TEST_ZELSERVERD, kZelctlConfig);
+        ASSERT_EQ(server->failure(), "");
+        std::ofstream(local("greet.zlw")) << kGreeter;
+    }
+
+    std::string local(const std::string& name) const { return server->directory() + "/" + name; }
+
+    // zelctl with the given arguments, signed in as `user` unless the arguments sign in otherwise;
+    // `environment` is put before the command for the child alone.
+    Outcome raw(const std::vector<std::string>& arguments, const std::string& environment = "")
+    {
+        std::string command = "cd " + quoted(server->directory()) + " && " + environment + " " + quoted(ZEL_TEST_ZELCTL) +
+                              " --port " + std::to_string(server->port());
+        for (const std::string& argument : arguments)
+            command += " " + quoted(argument);
+        command += " > " + quoted(local("zelctl.out")) + " 2> " + quoted(local("zelctl.err")) + " < /dev/null";
+        const int wait = std::system(command.c_str());
+        Outcome run;
+        run.status = WIFEXITED(wait) ? WEXITSTATUS(wait) : -1;
+        run.out = readFile(local("zelctl.out"));
+        run.err = readFile(local("zelctl.err"));
+        return run;
+    }
+
+    Outcome as(const std::string& user, const std::string& password, std::vector<std::string> arguments)
+    {
+        arguments.insert(arguments.begin(), {"--user", user, "--password", password});
+        return raw(arguments);
+    }
+
+    Outcome ann(const std::vector<std::string>& arguments) { return as("ann", "pw-ann", arguments); }
+
+    // Runs and expects success with nothing on standard error.
+    nlohmann::json annJson(std::vector<std::string> arguments)
+    {
+        arguments.insert(arguments.begin(), "--json");
+        const Outcome run = ann(arguments);
+        EXPECT_EQ(run.status, 0) << run.err;
+        EXPECT_EQ(run.err, "");
+        try {
+            return run.json();
+        } catch (const std::exception&) {
+            ADD_FAILURE() << "not JSON: " << run.out;
+            return {};
+        }
+    }
+
+    std::unique_ptr<LocalServer> server;
+};
+
+}  // namespace zeltest

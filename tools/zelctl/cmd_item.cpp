@@ -1,0 +1,219 @@
+// item and resource: the files of a repository and the resource files that belong to an item.
+
+#include <filesystem>
+
+#include "progress.h"
+#include "repository.h"
+
+namespace zelctl {
+
+namespace {
+
+// Adds one row per item of one kind. Workspaces, custom formats, custom transformers and
+// templates share their getters, so one template reads all four.
+template <typename Item, typename Create, typename Destroy, typename View>
+Outcome collect(Context& context, const char* kind, Create create, Destroy destroy, View view, nlohmann::ordered_json& rows)
+{
+    IZELServerVector<Item>* items = create();
+    if (items == nullptr)
+        return complaint("out of memory for the list");
+    Outcome failure = context.connection.check(view(*items));
+    for (unsigned i = 0; !failure && i < items->entries(); ++i) {
+        const Item& item = *items->element(i);
+        rows.push_back({{"name", context.connection.read([&](IZELServerString& out) { item.getName(out); })},
+                        {"type", kind},
+                        {"title", context.connection.read([&](IZELServerString& out) { item.getTitle(out); })},
+                        {"size", static_cast<long long>(item.getFileSize())}});
+    }
+    destroy(items);
+    return failure;
+}
+
+Outcome list(Context& context, const std::string& name)
+{
+    OpenRepository repository(context.connection);
+    if (Outcome failure = repository.open(name))
+        return failure;
+    IZELServerSession& session = context.connection.session();
+    IZELServerRepository& r = repository.get();
+    nlohmann::ordered_json rows = nlohmann::ordered_json::array();
+    Outcome failure = collect<IZELServerWorkspace>(
+        context, "workspace", [&] { return session.createWorkspaceVector(); },
+        [&](auto* v) { session.destroyWorkspaceVector(&v); }, [&](auto& v) { return r.getWorkspacesView(nullptr, v); },
+        rows);
+    if (!failure)
+        failure = collect<IZELServerCustomFormat>(
+            context, "custom format", [&] { return session.createCustomFormatVector(); },
+            [&](auto* v) { session.destroyCustomFormatVector(&v); },
+            [&](auto& v) { return r.getCustomFormatsView(nullptr, v); }, rows);
+    if (!failure)
+        failure = collect<IZELServerCustomTransformer>(
+            context, "custom transformer", [&] { return session.createCustomTransformerVector(); },
+            [&](auto* v) { session.destroyCustomTransformerVector(&v); },
+            [&](auto& v) { return r.getCustomTransformersView(nullptr, v); }, rows);
+    if (!failure)
+        failure = collect<IZELServerTemplate>(
+            context, "template", [&] { return session.createTemplateVector(); },
+            [&](auto* v) { session.destroyTemplateVector(&v); }, [&](auto& v) { return r.getTemplatesView(nullptr, v); },
+            rows);
+    if (!failure)
+        context.output.print(rows);
+    return failure;
+}
+
+Outcome get(Context& context, const std::string& name, const std::string& item, const std::string& resource,
+            std::string file)
+{
+    OpenRepository repository(context.connection);
+    if (Outcome failure = repository.open(name))
+        return failure;
+    if (file.empty())
+        file = resource.empty() ? item : resource;
+    Connection& c = context.connection;
+    ProgressBar bar(resource.empty() ? item : resource, !context.output.quiet());
+    unsigned received = 0;
+    IZELServerStatus* status =
+        resource.empty()
+            ? repository.get().getItem(c.text(item), c.text(file), received, &bar)
+            : repository.get().getItemResource(c.text(item), c.text(resource), c.text(file), received, &bar);
+    if (Outcome failure = c.check(status))
+        return failure;
+    if (!received)
+        return complaint("nothing received for '" + (resource.empty() ? item : resource) + "'");
+    context.output.confirm({{"item", item}, {"file", file}});
+    return std::nullopt;
+}
+
+Outcome put(Context& context, const std::string& name, const std::string& item, const std::string& file,
+            std::string target, bool update)
+{
+    OpenRepository repository(context.connection);
+    if (Outcome failure = repository.open(name))
+        return failure;
+    if (target.empty())
+        target = std::filesystem::path(file).filename().string();
+    Connection& c = context.connection;
+    IZELServerRepository& r = repository.get();
+    ProgressBar bar(target, !context.output.quiet());
+    IZELServerStatus* status = nullptr;
+    if (item.empty())
+        status = update ? r.updateItem(c.text(target), c.text(file), &bar) : r.addItem(c.text(target), c.text(file), &bar);
+    else
+        status = update ? r.updateItemResource(c.text(item), c.text(target), c.text(file), &bar)
+                        : r.addItemResource(c.text(item), c.text(target), c.text(file), &bar);
+    if (Outcome failure = c.check(status))
+        return failure;
+    context.output.confirm({{"name", target}, {update ? "updated" : "added", true}});
+    return std::nullopt;
+}
+
+Outcome remove(Context& context, const std::string& name, const std::string& item, const std::string& resource)
+{
+    OpenRepository repository(context.connection);
+    if (Outcome failure = repository.open(name))
+        return failure;
+    Connection& c = context.connection;
+    unsigned removed = 0;
+    IZELServerStatus* status = resource.empty() ? repository.get().removeItem(c.text(item), removed)
+                                                : repository.get().removeItemResource(c.text(item), c.text(resource), removed);
+    if (Outcome failure = c.check(status))
+        return failure;
+    const std::string what = resource.empty() ? item : resource;
+    if (!removed)
+        return complaint("no such item or resource '" + what + "'");
+    context.output.confirm({{"name", what}, {"removed", true}});
+    return std::nullopt;
+}
+
+Outcome resources(Context& context, const std::string& name, const std::string& item)
+{
+    OpenRepository repository(context.connection);
+    if (Outcome failure = repository.open(name))
+        return failure;
+    IZELServerSession& session = context.connection.session();
+    IZELServerVector<IZELServerResource>* list = session.createResourceVector();
+    if (list == nullptr)
+        return complaint("out of memory for the list");
+    Outcome failure = context.connection.check(repository.get().getItemResourcesView(context.connection.text(item), nullptr, *list));
+    nlohmann::ordered_json rows = nlohmann::ordered_json::array();
+    for (unsigned i = 0; !failure && i < list->entries(); ++i) {
+        const IZELServerResource& resource = *list->element(i);
+        rows.push_back({{"name", context.connection.read([&](IZELServerString& out) { resource.getName(out); })},
+                        {"description", context.connection.read([&](IZELServerString& out) { resource.getDescription(out); })},
+                        {"size", resource.getFileSize()}});
+    }
+    session.destroyResourceVector(&list);
+    if (!failure)
+        context.output.print(rows);
+    return failure;
+}
+
+struct Arguments {
+    std::string repository;
+    std::string item;
+    std::string resource;
+    std::string file;
+    std::string name;
+    bool update = false;
+};
+
+}  // namespace
+
+void addItemCommands(CLI::App& app, Action& chosen)
+{
+    auto a = std::make_shared<Arguments>();
+
+    auto* item = app.add_subcommand("item", "Items of a repository");
+    item->require_subcommand(1);
+    auto* listCommand = item->add_subcommand("list", "List the items of a repository");
+    listCommand->add_option("REPOSITORY", a->repository)->required();
+    on(listCommand, chosen, [a](Context& c) { return list(c, a->repository); });
+
+    auto* getCommand = item->add_subcommand("get", "Download an item");
+    getCommand->add_option("REPOSITORY", a->repository)->required();
+    getCommand->add_option("ITEM", a->item)->required();
+    getCommand->add_option("-o,--output", a->file, "Local file (default: the item's name)");
+    on(getCommand, chosen, [a](Context& c) { return get(c, a->repository, a->item, "", a->file); });
+
+    auto* putCommand = item->add_subcommand("put", "Upload a file as an item");
+    putCommand->add_option("REPOSITORY", a->repository)->required();
+    putCommand->add_option("FILE", a->file)->required()->check(CLI::ExistingFile);
+    putCommand->add_option("--name", a->name, "Item name (default: the file's name)");
+    putCommand->add_flag("--update", a->update, "Replace an existing item");
+    on(putCommand, chosen, [a](Context& c) { return put(c, a->repository, "", a->file, a->name, a->update); });
+
+    auto* rmCommand = item->add_subcommand("rm", "Remove an item");
+    rmCommand->add_option("REPOSITORY", a->repository)->required();
+    rmCommand->add_option("ITEM", a->item)->required();
+    on(rmCommand, chosen, [a](Context& c) { return remove(c, a->repository, a->item, ""); });
+
+    auto* resource = app.add_subcommand("resource", "Resource files of an item");
+    resource->require_subcommand(1);
+    auto* rlist = resource->add_subcommand("list", "List the resources of an item");
+    rlist->add_option("REPOSITORY", a->repository)->required();
+    rlist->add_option("ITEM", a->item)->required();
+    on(rlist, chosen, [a](Context& c) { return resources(c, a->repository, a->item); });
+
+    auto* rget = resource->add_subcommand("get", "Download a resource");
+    rget->add_option("REPOSITORY", a->repository)->required();
+    rget->add_option("ITEM", a->item)->required();
+    rget->add_option("RESOURCE", a->resource)->required();
+    rget->add_option("-o,--output", a->file, "Local file (default: the resource's name)");
+    on(rget, chosen, [a](Context& c) { return get(c, a->repository, a->item, a->resource, a->file); });
+
+    auto* rput = resource->add_subcommand("put", "Upload a file as a resource of an item");
+    rput->add_option("REPOSITORY", a->repository)->required();
+    rput->add_option("ITEM", a->item)->required();
+    rput->add_option("FILE", a->file)->required()->check(CLI::ExistingFile);
+    rput->add_option("--name", a->name, "Resource name (default: the file's name)");
+    rput->add_flag("--update", a->update, "Replace an existing resource");
+    on(rput, chosen, [a](Context& c) { return put(c, a->repository, a->item, a->file, a->name, a->update); });
+
+    auto* rrm = resource->add_subcommand("rm", "Remove a resource");
+    rrm->add_option("REPOSITORY", a->repository)->required();
+    rrm->add_option("ITEM", a->item)->required();
+    rrm->add_option("RESOURCE", a->resource)->required();
+    on(rrm, chosen, [a](Context& c) { return remove(c, a->repository, a->item, a->resource); });
+}
+
+}  // namespace zelctl

@@ -1,0 +1,229 @@
+// service: the services of the server and the items registered with them.
+
+#include "commands.h"
+
+namespace zelctl {
+
+namespace {
+
+struct Arguments {
+    std::string name;
+    std::string filter = "all";
+    std::optional<std::string> displayName;
+    std::optional<std::string> description;
+    std::optional<std::string> urlPattern;
+    std::optional<bool> enabled;
+    std::optional<bool> workspaces;
+    std::string repository;
+    std::string item;
+};
+
+class Service {
+public:
+    explicit Service(IZELServerSession& session) : session_(session), service_(session.createService()) {}
+    ~Service()
+    {
+        if (service_ != nullptr)
+            session_.destroyService(&service_);
+    }
+    Service(const Service&) = delete;
+    Service& operator=(const Service&) = delete;
+
+    Outcome fetch(Connection& connection, const std::string& name)
+    {
+        if (service_ == nullptr)
+            return complaint("out of memory for the service");
+        unsigned found = 0;
+        if (Outcome failure = connection.check(
+                session_.getRepositoryManager()->getService(connection.text(name), *service_, found)))
+            return failure;
+        if (!found)
+            return complaint("no service '" + name + "'");
+        return std::nullopt;
+    }
+    IZELServerService& get() { return *service_; }
+
+private:
+    IZELServerSession& session_;
+    IZELServerService* service_;
+};
+
+nlohmann::ordered_json describe(Connection& connection, const IZELServerService& service)
+{
+    auto read = [&](void (IZELServerService::*getter)(IZELServerString&) const) {
+        return connection.read([&](IZELServerString& out) { (service.*getter)(out); });
+    };
+    return {{"name", read(&IZELServerService::getName)},
+            {"display name", read(&IZELServerService::getDisplayName)},
+            {"enabled", service.isEnabled() != 0},
+            {"url pattern", read(&IZELServerService::getUrlPattern)},
+            {"workspace registration", service.isWorkspaceRegistrationAllowed() != 0},
+            {"description", read(&IZELServerService::getDescription)}};
+}
+
+Outcome list(Context& context, const std::string& filter)
+{
+    IZELServerSession& session = context.connection.session();
+    IZELServerVector<IZELServerService>* services = session.createServiceVector();
+    if (services == nullptr)
+        return complaint("out of memory for the list");
+    ZELServerStringDict directives;
+    directives.insert("ENABLE_FILTER", filter == "enabled" ? "ENABLED" : filter == "disabled" ? "DISABLED" : "ALL");
+    Outcome failure = context.connection.check(session.getRepositoryManager()->getServices(&directives, *services));
+    nlohmann::ordered_json rows = nlohmann::ordered_json::array();
+    for (unsigned i = 0; !failure && i < services->entries(); ++i)
+        rows.push_back(describe(context.connection, *services->element(i)));
+    session.destroyServiceVector(&services);
+    if (!failure)
+        context.output.print(rows);
+    return failure;
+}
+
+Outcome show(Context& context, const std::string& name)
+{
+    Service service(context.connection.session());
+    if (Outcome failure = service.fetch(context.connection, name))
+        return failure;
+    IZELServerSession& session = context.connection.session();
+    IZELServerVector<IZELServerItem>* items = session.createItemVector();
+    if (items == nullptr)
+        return complaint("out of memory for the list");
+    Outcome failure = context.connection.check(service.get().getRegisteredItems(nullptr, *items));
+    nlohmann::ordered_json json = describe(context.connection, service.get());
+    nlohmann::ordered_json registered = nlohmann::ordered_json::array();
+    for (unsigned i = 0; !failure && i < items->entries(); ++i) {
+        const IZELServerItem& item = *items->element(i);
+        registered.push_back(
+            {{"repository", context.connection.read([&](IZELServerString& out) { item.getRepositoryName(out); })},
+             {"item", context.connection.read([&](IZELServerString& out) { item.getName(out); })}});
+    }
+    session.destroyItemVector(&items);
+    if (failure)
+        return failure;
+    json["registered"] = registered;
+    context.output.print(json);
+    return std::nullopt;
+}
+
+// Applies the options the user gave; the others keep the service's values.
+void apply(Connection& connection, const Arguments& a, IZELServerService& service)
+{
+    if (a.displayName)
+        service.setDisplayName(connection.text(*a.displayName));
+    if (a.description)
+        service.setDescription(connection.text(*a.description));
+    if (a.urlPattern)
+        service.setUrlPattern(connection.text(*a.urlPattern));
+    if (a.enabled)
+        service.setEnabled(*a.enabled ? 1 : 0);
+    if (a.workspaces)
+        service.setWorkspaceRegistrationAllowed(*a.workspaces ? 1 : 0);
+}
+
+Outcome create(Context& context, const Arguments& a)
+{
+    Connection& c = context.connection;
+    IZELServerService* service = c.session().createService(c.text(a.name), c.text(a.displayName.value_or(a.name)),
+                                                           c.text(a.description.value_or("")), c.text(a.urlPattern.value_or("")));
+    if (service == nullptr)
+        return complaint("out of memory for the service");
+    apply(c, a, *service);
+    Outcome failure = c.check(c.session().getRepositoryManager()->addService(*service));
+    c.session().destroyService(&service);
+    if (!failure)
+        context.output.confirm({{"service", a.name}, {"created", true}});
+    return failure;
+}
+
+Outcome update(Context& context, const Arguments& a)
+{
+    Service service(context.connection.session());
+    if (Outcome failure = service.fetch(context.connection, a.name))
+        return failure;
+    apply(context.connection, a, service.get());
+    if (Outcome failure = context.connection.check(context.connection.session().getRepositoryManager()->updateService(service.get())))
+        return failure;
+    context.output.confirm({{"service", a.name}, {"updated", true}});
+    return std::nullopt;
+}
+
+Outcome remove(Context& context, const std::string& name)
+{
+    unsigned removed = 0;
+    if (Outcome failure = context.connection.check(
+            context.connection.session().getRepositoryManager()->removeService(context.connection.text(name), removed)))
+        return failure;
+    if (!removed)
+        return complaint("no service '" + name + "'");
+    context.output.confirm({{"service", name}, {"removed", true}});
+    return std::nullopt;
+}
+
+Outcome registration(Context& context, const Arguments& a, bool add)
+{
+    Service service(context.connection.session());
+    if (Outcome failure = service.fetch(context.connection, a.name))
+        return failure;
+    Connection& c = context.connection;
+    unsigned deregistered = 0;
+    IZELServerStatus* status = add ? service.get().registerItem(c.text(a.repository), c.text(a.item))
+                                   : service.get().deregisterItem(c.text(a.repository), c.text(a.item), deregistered);
+    if (Outcome failure = c.check(status))
+        return failure;
+    if (!add && !deregistered)
+        return complaint("'" + a.item + "' is not registered with '" + a.name + "'");
+    context.output.confirm({{"service", a.name}, {"repository", a.repository}, {"item", a.item}, {add ? "registered" : "deregistered", true}});
+    return std::nullopt;
+}
+
+void addFieldOptions(CLI::App* command, Arguments& a)
+{
+    command->add_option("NAME", a.name)->required();
+    command->add_option("--display-name", a.displayName, "Display name");
+    command->add_option("--description", a.description, "Description");
+    command->add_option("--url-pattern", a.urlPattern, "URL pattern");
+    command->add_option("--enabled", a.enabled, "true or false");
+    command->add_option("--workspace-registration", a.workspaces, "true or false: workspaces may be registered");
+}
+
+}  // namespace
+
+void addServiceCommands(CLI::App& app, Action& chosen)
+{
+    auto a = std::make_shared<Arguments>();
+    auto* service = app.add_subcommand("service", "Services and item registrations");
+    service->require_subcommand(1);
+
+    auto* listCommand = service->add_subcommand("list", "List services");
+    listCommand->add_option("--filter", a->filter, "all, enabled or disabled")
+        ->check(CLI::IsMember({"all", "enabled", "disabled"}));
+    on(listCommand, chosen, [a](Context& c) { return list(c, a->filter); });
+
+    auto* showCommand = service->add_subcommand("show", "Show a service and its registered items");
+    showCommand->add_option("NAME", a->name)->required();
+    on(showCommand, chosen, [a](Context& c) { return show(c, a->name); });
+
+    auto* createCommand = service->add_subcommand("create", "Create a service");
+    addFieldOptions(createCommand, *a);
+    on(createCommand, chosen, [a](Context& c) { return create(c, *a); });
+
+    auto* updateCommand = service->add_subcommand("update", "Change a service");
+    addFieldOptions(updateCommand, *a);
+    on(updateCommand, chosen, [a](Context& c) { return update(c, *a); });
+
+    auto* deleteCommand = service->add_subcommand("delete", "Delete a service");
+    deleteCommand->alias("rm");
+    deleteCommand->add_option("NAME", a->name)->required();
+    on(deleteCommand, chosen, [a](Context& c) { return remove(c, a->name); });
+
+    for (const bool add : {true, false}) {
+        auto* command = service->add_subcommand(add ? "register" : "deregister",
+                                                add ? "Register an item with a service" : "Deregister an item");
+        command->add_option("SERVICE", a->name)->required();
+        command->add_option("REPOSITORY", a->repository)->required();
+        command->add_option("ITEM", a->item)->required();
+        on(command, chosen, [a, add](Context& c) { return registration(c, *a, add); });
+    }
+}
+
+}  // namespace zelctl

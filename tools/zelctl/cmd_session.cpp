@@ -1,0 +1,49 @@
+// whoami and prop: who the server thinks we are, and what it tells about itself.
+
+#include "commands.h"
+
+namespace zelctl {
+
+namespace {
+
+Outcome whoami(Context& context)
+{
+    IZELServerSession& session = context.connection.session();
+    IZELServerIdentity* identity = session.getIdentity();
+    if (identity == nullptr)
+        return complaint("the session has no identity");
+    IZELServerStringArray* roles = session.createStringArray();
+    identity->getRoles(*roles);
+    nlohmann::ordered_json list = nlohmann::ordered_json::array();
+    for (unsigned i = 0; i < roles->entries(); ++i)
+        list.push_back(roles->element(i));
+    session.destroyStringArray(&roles);
+    context.output.print({{"id", context.connection.read([&](IZELServerString& out) { identity->getId(out); })},
+                          {"authenticated", identity->isAuthenticated()},
+                          {"roles", list}});
+    return std::nullopt;
+}
+
+}  // namespace
+
+void addSessionCommands(CLI::App& app, Action& chosen)
+{
+    on(app.add_subcommand("whoami", "Show the signed-in identity and its roles"), chosen, whoami);
+
+    auto* prop = app.add_subcommand("prop", "Show a session property");
+    auto name = std::make_shared<std::string>();
+    prop->add_option("NAME", *name, "Property name, e.g. SERVER_VERSION")->required();
+    on(prop, chosen, [name](Context& context) -> Outcome {
+        IZELServerString& value = context.connection.text();
+        if (Outcome failure = context.connection.check(
+                context.connection.session().getSessionProperty(context.connection.text(*name), value)))
+            return failure;
+        if (context.output.json())
+            context.output.print({{"name", *name}, {"value", value.c_str()}});
+        else
+            context.output.print(std::string(value.c_str()));
+        return std::nullopt;
+    });
+}
+
+}  // namespace zelctl

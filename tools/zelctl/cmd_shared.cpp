@@ -1,0 +1,229 @@
+// sr: shared resources, the server's file areas.
+
+#include <filesystem>
+
+#include "commands.h"
+#include "progress.h"
+
+namespace zelctl {
+
+namespace {
+
+struct Arguments {
+    std::string resource;
+    std::string path = "/";
+    std::string target;
+    std::string file;
+};
+
+// A shared resource looked up by name, with the paths made on it released before it goes.
+class Area {
+public:
+    explicit Area(Connection& connection) : connection_(connection), area_(connection.session().createMountPoint()) {}
+    ~Area()
+    {
+        for (IZELServerPath* path : paths_)
+            area_->releaseObject(path);
+        if (area_ != nullptr)
+            connection_.session().destroyMountPoint(&area_);
+    }
+    Area(const Area&) = delete;
+    Area& operator=(const Area&) = delete;
+
+    Outcome open(const std::string& name)
+    {
+        if (area_ == nullptr)
+            return complaint("out of memory for the shared resource");
+        unsigned found = 0;
+        if (Outcome failure = connection_.check(
+                connection_.session().getMountPointManager()->getSharedResource(connection_.text(name), *area_, found)))
+            return failure;
+        if (!found)
+            return complaint("no shared resource '" + name + "'");
+        return std::nullopt;
+    }
+
+    // Paths are rooted at the resource; a missing leading "/" is added.
+    IZELServerPath& path(const std::string& text)
+    {
+        paths_.push_back(area_->createPath(connection_.text(text.empty() || text[0] != '/' ? "/" + text : text)));
+        return *paths_.back();
+    }
+    IZELServerMountPoint& get() { return *area_; }
+
+private:
+    Connection& connection_;
+    IZELServerMountPoint* area_;
+    std::vector<IZELServerPath*> paths_;
+};
+
+nlohmann::ordered_json describe(Connection& connection, const IZELServerFileInfo& info)
+{
+    return {{"name", connection.read([&](IZELServerString& out) { info.getPath().getName(out); })},
+            {"type", info.isDirectory() ? "dir" : "file"},
+            {"size", info.getSize()},
+            {"date", connection.read([&](IZELServerString& out) { info.getDate(out); })},
+            {"path", connection.read([&](IZELServerString& out) { info.getPath().getAbsolutePath(out); })}};
+}
+
+Outcome resources(Context& context)
+{
+    IZELServerSession& session = context.connection.session();
+    IZELServerVector<IZELServerMountPoint>* areas = session.createMountPointVector();
+    if (areas == nullptr)
+        return complaint("out of memory for the list");
+    Outcome failure = context.connection.check(session.getMountPointManager()->getSharedResources(*areas));
+    nlohmann::ordered_json rows = nlohmann::ordered_json::array();
+    for (unsigned i = 0; !failure && i < areas->entries(); ++i) {
+        const IZELServerMountPoint& area = *areas->element(i);
+        rows.push_back({{"name", context.connection.read([&](IZELServerString& out) { area.getName(out); })},
+                        {"display name", context.connection.read([&](IZELServerString& out) { area.getDisplayName(out); })},
+                        {"description", context.connection.read([&](IZELServerString& out) { area.getDescription(out); })}});
+    }
+    session.destroyMountPointVector(&areas);
+    if (!failure)
+        context.output.print(rows);
+    return failure;
+}
+
+Outcome list(Context& context, const Arguments& a)
+{
+    Area area(context.connection);
+    if (Outcome failure = area.open(a.resource))
+        return failure;
+    IZELServerSession& session = context.connection.session();
+    IZELServerVector<IZELServerFileInfo>* entries = session.createFileInfoVector();
+    if (entries == nullptr)
+        return complaint("out of memory for the list");
+    Outcome failure = context.connection.check(area.get().list(area.path(a.path), *entries));
+    nlohmann::ordered_json rows = nlohmann::ordered_json::array();
+    for (unsigned i = 0; !failure && i < entries->entries(); ++i)
+        rows.push_back(describe(context.connection, *entries->element(i)));
+    session.destroyFileInfoVector(&entries);
+    if (!failure)
+        context.output.print(rows);
+    return failure;
+}
+
+Outcome stat(Context& context, const Arguments& a)
+{
+    Area area(context.connection);
+    if (Outcome failure = area.open(a.resource))
+        return failure;
+    IZELServerSession& session = context.connection.session();
+    IZELServerFileInfo* info = session.createFileInfo();
+    if (info == nullptr)
+        return complaint("out of memory for the file information");
+    Outcome failure = context.connection.check(area.get().getFileInfo(area.path(a.path), *info));
+    if (!failure)
+        context.output.print(describe(context.connection, *info));
+    session.destroyFileInfo(&info);
+    return failure;
+}
+
+// mkdir, rm, cp and mv: one call on the resource each, then a confirmation.
+Outcome change(Context& context, const Arguments& a, const std::string& what)
+{
+    Area area(context.connection);
+    if (Outcome failure = area.open(a.resource))
+        return failure;
+    IZELServerMountPoint& m = area.get();
+    unsigned removed = 1;
+    IZELServerStatus* status = nullptr;
+    if (what == "mkdir")
+        status = m.makeDirectory(area.path(a.path));
+    else if (what == "rm")
+        status = m.remove(area.path(a.path), removed);
+    else if (what == "cp")
+        status = m.copy(area.path(a.path), area.path(a.target));
+    else
+        status = m.move(area.path(a.path), area.path(a.target));
+    if (Outcome failure = context.connection.check(status))
+        return failure;
+    if (!removed)
+        return complaint("no '" + a.path + "' in '" + a.resource + "'");
+    nlohmann::ordered_json json = {{"resource", a.resource}, {"path", a.path}, {"done", what}};
+    if (!a.target.empty())
+        json["target"] = a.target;
+    context.output.confirm(json);
+    return std::nullopt;
+}
+
+Outcome download(Context& context, const Arguments& a)
+{
+    Area area(context.connection);
+    if (Outcome failure = area.open(a.resource))
+        return failure;
+    const std::string file = a.file.empty() ? std::filesystem::path(a.path).filename().string() : a.file;
+    if (file.empty())
+        return complaint("name the local file with -o");
+    ProgressBar bar(file, !context.output.quiet());
+    unsigned received = 0;
+    if (Outcome failure = context.connection.check(area.get().download(area.path(a.path), context.connection.text(file), received, &bar)))
+        return failure;
+    if (!received)
+        return complaint("nothing received for '" + a.path + "'");
+    context.output.confirm({{"resource", a.resource}, {"path", a.path}, {"file", file}});
+    return std::nullopt;
+}
+
+Outcome upload(Context& context, const Arguments& a)
+{
+    Area area(context.connection);
+    if (Outcome failure = area.open(a.resource))
+        return failure;
+    ProgressBar bar(a.file, !context.output.quiet());
+    if (Outcome failure = context.connection.check(area.get().upload(context.connection.text(a.file), area.path(a.path), &bar)))
+        return failure;
+    context.output.confirm({{"resource", a.resource}, {"path", a.path}, {"file", a.file}});
+    return std::nullopt;
+}
+
+}  // namespace
+
+void addSharedResourceCommands(CLI::App& app, Action& chosen)
+{
+    auto a = std::make_shared<Arguments>();
+    auto* sr = app.add_subcommand("sr", "Shared resources");
+    sr->require_subcommand(1);
+
+    on(sr->add_subcommand("list", "List shared resources"), chosen, resources);
+
+    auto* ls = sr->add_subcommand("ls", "List a folder");
+    ls->add_option("RESOURCE", a->resource)->required();
+    ls->add_option("PATH", a->path, "Folder (default: /)");
+    on(ls, chosen, [a](Context& c) { return list(c, *a); });
+
+    auto* statCommand = sr->add_subcommand("stat", "Show a file or folder");
+    statCommand->add_option("RESOURCE", a->resource)->required();
+    statCommand->add_option("PATH", a->path)->required();
+    on(statCommand, chosen, [a](Context& c) { return stat(c, *a); });
+
+    for (const char* what : {"mkdir", "rm"}) {
+        auto* command = sr->add_subcommand(what, std::string(what) == "rm" ? "Remove a file or folder" : "Make a folder");
+        command->add_option("RESOURCE", a->resource)->required();
+        command->add_option("PATH", a->path)->required();
+        on(command, chosen, [a, what](Context& c) { return change(c, *a, what); });
+    }
+    for (const char* what : {"cp", "mv"}) {
+        auto* command = sr->add_subcommand(what, std::string(what) == "cp" ? "Copy within the resource" : "Move within the resource");
+        command->add_option("RESOURCE", a->resource)->required();
+        command->add_option("SOURCE", a->path)->required();
+        command->add_option("TARGET", a->target)->required();
+        on(command, chosen, [a, what](Context& c) { return change(c, *a, what); });
+    }
+
+    auto* getCommand = sr->add_subcommand("get", "Download a file");
+    getCommand->add_option("RESOURCE", a->resource)->required();
+    getCommand->add_option("PATH", a->path)->required();
+    getCommand->add_option("-o,--output", a->file, "Local file (default: the file's name)");
+    on(getCommand, chosen, [a](Context& c) { return download(c, *a); });
+
+    auto* putCommand = sr->add_subcommand("put", "Upload a file");
+    putCommand->add_option("RESOURCE", a->resource)->required();
+    putCommand->add_option("FILE", a->file)->required()->check(CLI::ExistingFile);
+    putCommand->add_option("PATH", a->path)->required();
+    on(putCommand, chosen, [a](Context& c) { return upload(c, *a); });
+}
+
+}  // namespace zelctl

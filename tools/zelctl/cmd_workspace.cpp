@@ -1,0 +1,149 @@
+// workspace: the workspaces of a repository and what one of them asks for and works on.
+
+#include "repository.h"
+
+namespace zelctl {
+
+namespace {
+
+// The server's names for the enable filter.
+std::string filterDirective(const std::string& filter)
+{
+    if (filter == "enabled")
+        return "ENABLED";
+    if (filter == "disabled")
+        return "DISABLED";
+    return "ALL";
+}
+
+Outcome list(Context& context, const std::string& name, const std::string& filter)
+{
+    OpenRepository repository(context.connection);
+    if (Outcome failure = repository.open(name))
+        return failure;
+    IZELServerSession& session = context.connection.session();
+    IZELServerVector<IZELServerWorkspaceSummary>* summaries = session.createWorkspaceSummaryVector();
+    if (summaries == nullptr)
+        return complaint("out of memory for the list");
+    ZELServerStringDict directives;
+    directives.insert("ENABLE_FILTER", filterDirective(filter));
+    Outcome failure = context.connection.check(repository.get().getWorkspaceSummariesView(&directives, *summaries));
+    nlohmann::ordered_json rows = nlohmann::ordered_json::array();
+    for (unsigned i = 0; !failure && i < summaries->entries(); ++i) {
+        const IZELServerWorkspaceSummary& s = *summaries->element(i);
+        auto read = [&](void (IZELServerWorkspaceSummary::*getter)(IZELServerString&) const) {
+            return context.connection.read([&](IZELServerString& out) { (s.*getter)(out); });
+        };
+        rows.push_back({{"name", read(&IZELServerWorkspaceSummary::getName)},
+                        {"title", read(&IZELServerWorkspaceSummary::getTitle)},
+                        {"enabled", s.isEnabled()},
+                        {"description", read(&IZELServerWorkspaceSummary::getDescription)}});
+    }
+    session.destroyWorkspaceSummaryVector(&summaries);
+    if (!failure)
+        context.output.print(rows);
+    return failure;
+}
+
+nlohmann::ordered_json parameters(Connection& connection, IZELServerVector<IZELServerParameter>& list)
+{
+    nlohmann::ordered_json rows = nlohmann::ordered_json::array();
+    for (unsigned i = 0; i < list.entries(); ++i) {
+        const IZELServerParameter& p = *list.element(i);
+        auto read = [&](void (IZELServerParameter::*getter)(IZELServerString&) const) {
+            return connection.read([&](IZELServerString& out) { (p.*getter)(out); });
+        };
+        IZELServerStringArray* options = connection.session().createStringArray();
+        nlohmann::ordered_json choices = nlohmann::ordered_json::array();
+        if (options != nullptr) {
+            p.getOptions(*options);
+            for (unsigned j = 0; j < options->entries(); ++j)
+                choices.push_back(options->element(j));
+            connection.session().destroyStringArray(&options);
+        }
+        rows.push_back({{"name", read(&IZELServerParameter::getName)},
+                        {"type", read(&IZELServerParameter::getType)},
+                        {"default", read(&IZELServerParameter::getDefaultValue)},
+                        {"choices", choices},
+                        {"description", read(&IZELServerParameter::getDescription)}});
+    }
+    return rows;
+}
+
+nlohmann::ordered_json featureTypes(Connection& connection, IZELServerVector<IZELServerFeatureType>& list)
+{
+    nlohmann::ordered_json rows = nlohmann::ordered_json::array();
+    for (unsigned i = 0; i < list.entries(); ++i) {
+        const IZELServerFeatureType& f = *list.element(i);
+        rows.push_back({{"name", connection.read([&](IZELServerString& out) { f.getName(out); })},
+                        {"description", connection.read([&](IZELServerString& out) { f.getDescription(out); })}});
+    }
+    return rows;
+}
+
+nlohmann::ordered_json datasets(Connection& connection, IZELServerVector<IZELServerDataset>& list)
+{
+    nlohmann::ordered_json rows = nlohmann::ordered_json::array();
+    for (unsigned i = 0; i < list.entries(); ++i) {
+        const IZELServerDataset& d = *list.element(i);
+        rows.push_back({{"name", connection.read([&](IZELServerString& out) { d.getName(out); })},
+                        {"format", connection.read([&](IZELServerString& out) { d.getFormat(out); })},
+                        {"location", connection.read([&](IZELServerString& out) { d.getLocation(out); })}});
+    }
+    return rows;
+}
+
+Outcome show(Context& context, const std::string& name, const std::string& workspaceName)
+{
+    OpenRepository repository(context.connection);
+    if (Outcome failure = repository.open(name))
+        return failure;
+    Connection& c = context.connection;
+    IZELServerWorkspace* workspace = c.session().createWorkspace();
+    if (workspace == nullptr)
+        return complaint("out of memory for the workspace");
+    unsigned found = 0;
+    Outcome failure = c.check(repository.get().getWorkspaceView(c.text(workspaceName), *workspace, found));
+    if (!failure && !found)
+        failure = complaint("no workspace '" + workspaceName + "' in '" + name + "'");
+    if (!failure) {
+        IZELServerWorkspace& w = *workspace;
+        context.output.print(
+            {{"name", c.read([&](IZELServerString& out) { w.getName(out); })},
+             {"title", c.read([&](IZELServerString& out) { w.getTitle(out); })},
+             {"description", c.read([&](IZELServerString& out) { w.getDescription(out); })},
+             {"enabled", w.isEnabled()},
+             {"size", w.getFileSize()},
+             {"parameters", parameters(c, w.getParameters())},
+             {"source datasets", datasets(c, w.getSourceDatasets())},
+             {"destination datasets", datasets(c, w.getDestinationDatasets())},
+             {"source feature types", featureTypes(c, w.getSourceFeatureTypes())},
+             {"destination feature types", featureTypes(c, w.getDestinationFeatureTypes())}});
+    }
+    c.session().destroyWorkspace(&workspace);
+    return failure;
+}
+
+}  // namespace
+
+void addWorkspaceCommands(CLI::App& app, Action& chosen)
+{
+    auto repository = std::make_shared<std::string>();
+    auto name = std::make_shared<std::string>();
+    auto filter = std::make_shared<std::string>("all");
+
+    auto* workspace = app.add_subcommand("workspace", "Workspaces of a repository");
+    workspace->require_subcommand(1);
+    auto* listCommand = workspace->add_subcommand("list", "List the workspaces of a repository");
+    listCommand->add_option("REPOSITORY", *repository)->required();
+    listCommand->add_option("--filter", *filter, "all, enabled or disabled")
+        ->check(CLI::IsMember({"all", "enabled", "disabled"}));
+    on(listCommand, chosen, [repository, filter](Context& c) { return list(c, *repository, *filter); });
+
+    auto* showCommand = workspace->add_subcommand("show", "Show parameters, datasets and feature types");
+    showCommand->add_option("REPOSITORY", *repository)->required();
+    showCommand->add_option("WORKSPACE", *name)->required();
+    on(showCommand, chosen, [repository, name](Context& c) { return show(c, *repository, *name); });
+}
+
+}  // namespace zelctl

@@ -1,0 +1,76 @@
+#pragma once
+// The one place where zelctl meets a session: it creates the session, signs in, owns every string
+// it hands out and turns a status into a failure value that main prints as the error line.
+
+#include <zelserverapi/interfaces.h>
+#include <zelserverapi/zelserverapi.h>
+
+#include <memory>
+#include <optional>
+#include <string>
+#include <vector>
+
+namespace zelctl {
+
+// A failure to report: the status's message number (0 for the client's own complaints) and text.
+struct Failure {
+    unsigned number = 0;
+    std::string text;
+};
+using Outcome = std::optional<Failure>;
+
+struct GlobalOptions {
+    std::string host = "127.0.0.1";
+    unsigned short port = 7071;
+    std::string user;
+    std::string password;
+    std::string token;
+    std::string clientId;
+    bool json = false;
+    bool quiet = false;
+};
+
+class Connection {
+public:
+    explicit Connection(const GlobalOptions& options);
+    ~Connection();
+    Connection(const Connection&) = delete;
+    Connection& operator=(const Connection&) = delete;
+
+    // Creates the session and signs in with a token when one is given, with user and password otherwise.
+    Outcome open();
+
+    IZELServerSession& session() { return *session_; }
+    const GlobalOptions& options() const { return options_; }
+
+    // A string owned by the connection, released before the session goes.
+    IZELServerString& text(const std::string& value = "");
+
+    // Nothing for success; the status's number and text otherwise. The status is released either way.
+    Outcome check(IZELServerStatus* status);
+
+    // Reads a value through one of the interface's `get...(IZELServerString&)` calls.
+    template <typename Getter>
+    std::string read(Getter getter)
+    {
+        IZELServerString& out = text();
+        getter(out);
+        return out.c_str();
+    }
+
+private:
+    struct StringReleaser {
+        IZELServerSession* owner;
+        void operator()(IZELServerString* s) const { owner->destroyString(&s); }
+    };
+
+    GlobalOptions options_;
+    IZELServerSession* session_ = nullptr;
+    IZELServerConnectionInfo* info_ = nullptr;
+    std::vector<std::unique_ptr<IZELServerString, StringReleaser>> strings_;
+};
+
+// The parts of NAME=VALUE; nullopt when there is no "=" or the name is empty.
+std::optional<std::pair<std::string, std::string>> splitPair(const std::string& text);
+
+}  // namespace zelctl

@@ -1,0 +1,24 @@
+#pragma once
+// A repository looked up by name, held for the item, resource and workspace commands.
+
+#include "commands.h"
+
+namespace zelctl {
+
+class OpenRepository {
+public:
+    explicit OpenRepository(Connection& connection);
+    ~OpenRepository();
+    OpenRepository(const OpenRepository&) = delete;
+    OpenRepository& operator=(const OpenRepository&) = delete;
+
+    // Looks the repository up; a name the server does not know is a failure.
+    Outcome open(const std::string& name);
+    IZELServerRepository& get() { return *repository_; }
+
+private:
+    Connection& connection_;
+    IZELServerRepository* repository_ = nullptr;
+};
+
+}  // namespace zelctl
