@@ -1,0 +1,112 @@
+#!/usr/bin/env bash
+# A short tour of zelserverapi: installs what is missing, builds, starts the local development server
+# zelserverd on a free loopback port with a throw-away data directory, and walks through the library's
+# areas with the command-line client zelctl. Everything it starts or writes is gone when it ends.
+set -euo pipefail
+
+root="$(cd "$(dirname "${BASH_SOURCE[0]}")/.." && pwd)"
+bin="$root/build/default/bin"
+
+step() { printf '\n== %s\n' "$*"; }
+show() { printf '$ zelctl'; printf ' %q' "$@"; printf '\n'; zelctl "$@"; }
+zelctl() { "$bin/zelctl" --host 127.0.0.1 --port "$port" --user demo "$@"; }
+
+step "Installing missing packages"
+bash "$root/scripts/install-deps.sh"
+
+step "Building (preset default)"
+# Presets are read from the working directory.
+cd "$root"
+cmake --preset default > /dev/null
+cmake --build --preset default
+
+work="$(mktemp -d /tmp/zel-demo-XXXXXX)"
+server_pid=""
+cleanup() {
+  if [ -n "$server_pid" ] && kill -0 "$server_pid" 2>/dev/null; then
+    kill -TERM "$server_pid" 2>/dev/null || true
+    wait "$server_pid" 2>/dev/null || true
+  fi
+  rm -rf "$work"
+}
+trap cleanup EXIT
+
+step "Starting zelserverd"
+# A user of our own with a fresh random password; the file keeps it readable by us only.
+ZEL_PASSWORD="$(od -An -N16 -tx1 /dev/urandom | tr -d ' \n')"
+export ZEL_PASSWORD
+umask 077
+mkdir -p "$work/shared"
+cat > "$work/zelserverd.conf" <<CONF
+[user demo]
+password = $ZEL_PASSWORD
+roles = admin
+
+[sharedresource DATA]
+path = shared
+description = Files for the demo
+CONF
+"$bin/zelserverd" --data "$work/data" --listen 127.0.0.1:0 --config "$work/zelserverd.conf" \
+  > "$work/stdout" 2> "$work/server.log" &
+server_pid=$!
+# The server prints one line once it accepts connections; with port 0 that line names the port.
+line=""
+for _ in $(seq 150); do
+  line="$(head -n 1 "$work/stdout")"
+  [ -n "$line" ] || ! kill -0 "$server_pid" 2>/dev/null && break
+  sleep 0.1
+done
+case "$line" in
+  "listening on "*) port="${line##*:}" ;;
+  *) echo "zelserverd did not start:" >&2; cat "$work/server.log" >&2; exit 1 ;;
+esac
+echo "$line (data in $work/data, user demo with a random password)"
+
+step "Who am I?"
+show whoami
+
+step "Creating the repository 'demo' and uploading the example workspaces"
+show repo create demo --description "Example workspaces"
+for workspace in "$root"/examples/workspaces/*.zlw; do
+  show item put demo "$workspace"
+done
+show item list demo
+
+step "The published parameters of greeting.zlw"
+show workspace show demo greeting.zlw
+
+step "Registering greeting.zlw with a new service"
+show service create greetings --description "Greets people"
+show service register greetings demo greeting.zlw
+
+step "Running a job and waiting for its result (job run)"
+show job run zeljob demo greeting.zlw -p NAME=newcomer -p LANGUAGE=norwegian
+
+step "Submitting a job (job submit), then waiting for it"
+echo '$ zelctl job submit zeljob demo csvsummary.zlw -p COLUMN=population'
+submitted="$(zelctl job submit zeljob demo csvsummary.zlw -p COLUMN=population)"
+echo "$submitted"
+job="$(printf '%s\n' "$submitted" | grep -oE '[0-9]+' | tail -n 1)"
+show job wait "$job"
+
+step "Its result and its log"
+show job result "$job"
+show job log "$job"
+
+step "Putting a file into the shared resource DATA"
+printf 'city,population\nOslo,709000\nBergen,291000\n' > "$work/cities.csv"
+show sr put DATA "$work/cities.csv" /cities.csv
+show sr ls DATA /
+show sr get DATA /cities.csv -o "$work/cities-back.csv"
+cmp "$work/cities.csv" "$work/cities-back.csv" && echo "downloaded copy is identical"
+
+step "A user token for the account demo"
+show token set demo "demo-token-$RANDOM$RANDOM" --timeout 3600
+show token show demo
+
+step "Stopping zelserverd"
+kill -TERM "$server_pid"
+wait "$server_pid" && echo "stopped cleanly"
+server_pid=""
+echo
+echo "Done. Next: the example programs in examples/ (docs/examples.md) and docs/zelserverd.md."
