@@ -1,6 +1,7 @@
 #!/usr/bin/env bash
 # Installs what is missing, then builds and runs the whole suite twice: a normal build and one under
-# AddressSanitizer and UndefinedBehaviorSanitizer.
+# AddressSanitizer and UndefinedBehaviorSanitizer. After the normal build's suite the README's demo
+# tour runs too, so that it is checked on every run.
 set -euo pipefail
 cd "$(dirname "$0")/.."
 
@@ -14,4 +15,9 @@ for preset in "${presets[@]}"; do
   cmake --preset "$preset" >/dev/null
   cmake --build --preset "$preset"
   ctest --preset "$preset"
+  if [ "$preset" = default ]; then
+    echo "== demo tour"
+    bash scripts/demo.sh > build/demo.log 2>&1 || { cat build/demo.log; echo "the demo tour failed"; exit 1; }
+    echo "demo tour passed (output in build/demo.log)"
+  fi
 done
