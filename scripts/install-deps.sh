@@ -1,14 +1,23 @@
 #!/usr/bin/env bash
 # Installs the Debian 12 packages that building and testing need, when any is missing.
+#   install-deps.sh            what the Linux builds need
+#   install-deps.sh windows    that, and the MinGW-w64 cross compilers, Wine, and what building
+#                              GoogleTest and Xerces-C from source for Windows takes
 set -euo pipefail
 
 packages=(
   g++ cmake ninja-build pkg-config binutils
-  libxerces-c-dev zlib1g-dev
+  libxerces-c-dev
   libgtest-dev libgmock-dev libbenchmark-dev
   libpugixml-dev libsqlite3-dev
   libcli11-dev nlohmann-json3-dev
 )
+if [ "${1:-}" = windows ]; then
+  packages+=(
+    g++-mingw-w64-x86-64-posix gcc-mingw-w64-x86-64-posix binutils-mingw-w64-x86-64
+    mingw-w64-x86-64-dev wine wine64 googletest dpkg-dev
+  )
+fi
 
 missing=()
 for p in "${packages[@]}"; do

@@ -1,17 +1,44 @@
 #!/usr/bin/env bash
-# Installs what is missing, then builds and runs the whole suite twice: a normal build and one under
-# AddressSanitizer and UndefinedBehaviorSanitizer. After the normal build's suite the README's demo
-# tour runs too, so that it is checked on every run.
+# Installs what is missing, then builds and runs the whole suite in three builds: a normal one, one
+# under AddressSanitizer and UndefinedBehaviorSanitizer, and zelserverapi.dll for 64-bit Windows
+# with its suite under Wine. After the normal build's suite the README's demo tour runs too, so
+# that it is checked on every run.
+#
+#   test.sh [PRESET...]     default, asan, windows (all three when none is named)
 set -euo pipefail
 cd "$(dirname "$0")/.."
-
-bash scripts/install-deps.sh
 
 presets=("$@")
 [ ${#presets[@]} -gt 0 ] || presets=(default asan)
 
+if [[ " ${presets[*]} " == *" windows "* ]]; then
+  bash scripts/install-deps.sh windows
+else
+  bash scripts/install-deps.sh
+fi
+
+run_windows() {
+  bash scripts/build-xerces-windows.sh
+  # The cross-platform test runs the Windows example against the Linux server.
+  if [ ! -x build/default/bin/zelserverd ]; then
+    cmake --preset default >/dev/null
+    cmake --build --preset default --target zelserverd
+  fi
+  cmake --preset windows >/dev/null
+  cmake --build --preset windows
+  bash scripts/wine-prefix.sh "$PWD/build/windows/wineprefix"
+  local status=0
+  ctest --preset windows || status=$?
+  WINEPREFIX="$PWD/build/windows/wineprefix" wineserver -k 2>/dev/null || true
+  return $status
+}
+
 for preset in "${presets[@]}"; do
   echo "== preset $preset"
+  if [ "$preset" = windows ]; then
+    run_windows
+    continue
+  fi
   cmake --preset "$preset" >/dev/null
   cmake --build --preset "$preset"
   ctest --preset "$preset"

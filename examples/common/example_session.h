@@ -1,10 +1,13 @@
 #pragma once
-// What the example programs share: a signed-in session that releases everything it handed out, and
-// the one way they report a failed call. Only the library's public interface is used.
+// What the example programs share: a signed-in session that releases everything it handed out, the
+// one way they report a failed call, and waiting for a job to end. Only the library's public
+// interface is used.
 
+#include <chrono>
 #include <cstdio>
 #include <cstdlib>
 #include <string>
+#include <thread>
 
 #include <zelserverapi/interfaces.h>
 #include <zelserverapi/zelserverapi.h>
@@ -77,5 +80,28 @@ private:
     IZELServerSession* session_ = nullptr;
     IZELServerConnectionInfo* info_ = nullptr;
 };
+
+// Asks for the job's result until it has ended; false when asking fails or it takes too long.
+inline bool waitForJob(Session& session, unsigned jobId, IZELServerTransformationResult& result)
+{
+    // Job statuses while the job has not ended.
+    constexpr unsigned kSubmitted = 0, kQueued = 1, kDelayed = 2, kInProcess = 4;
+    IZELServerTransformationManager* jobs = session->getTransformationManager();
+    for (int attempt = 0; attempt < 1200; ++attempt) {
+        unsigned found = 0, status = kQueued;
+        if (!session.succeeded(jobs->getJobResult(jobId, found, result)))
+            return false;
+        if (!found) {
+            std::fprintf(stderr, "error: the server does not know job %u\n", jobId);
+            return false;
+        }
+        result.getJobStatus(status);
+        if (status != kSubmitted && status != kQueued && status != kDelayed && status != kInProcess)
+            return true;
+        std::this_thread::sleep_for(std::chrono::milliseconds(100));
+    }
+    std::fprintf(stderr, "error: job %u did not end within two minutes\n", jobId);
+    return false;
+}
 
 }  // namespace example

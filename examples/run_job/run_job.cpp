@@ -5,45 +5,10 @@
 //
 // The job service is "zeljob", the one a server offers unless configured otherwise.
 
-#include <chrono>
 #include <cstdio>
 #include <cstring>
-#include <thread>
 
 #include "../common/example_session.h"
-
-namespace {
-
-// Job statuses while the job has not ended.
-constexpr unsigned kSubmitted = 0, kQueued = 1, kDelayed = 2, kInProcess = 4;
-
-bool stillGoing(unsigned status)
-{
-    return status == kSubmitted || status == kQueued || status == kDelayed || status == kInProcess;
-}
-
-// Asks for the job's result until it has ended; false when asking fails or it takes too long.
-bool waitFor(example::Session& session, unsigned jobId, IZELServerTransformationResult& result)
-{
-    IZELServerTransformationManager* jobs = session->getTransformationManager();
-    for (int attempt = 0; attempt < 1200; ++attempt) {
-        unsigned found = 0, status = kQueued;
-        if (!session.succeeded(jobs->getJobResult(jobId, found, result)))
-            return false;
-        if (!found) {
-            std::fprintf(stderr, "error: the server does not know job %u\n", jobId);
-            return false;
-        }
-        result.getJobStatus(status);
-        if (!stillGoing(status))
-            return true;
-        std::this_thread::sleep_for(std::chrono::milliseconds(100));
-    }
-    std::fprintf(stderr, "error: job %u did not end within two minutes\n", jobId);
-    return false;
-}
-
-}  // namespace
 
 int main(int argc, char** argv)
 {
@@ -74,7 +39,7 @@ int main(int argc, char** argv)
     bool ended = session.succeeded(session->getTransformationManager()->submitJob(*request, jobId));
     if (ended) {
         std::printf("submitted job %u\n", jobId);
-        ended = waitFor(session, jobId, *result);
+        ended = example::waitForJob(session, jobId, *result);
     }
     bool success = false;
     if (ended) {

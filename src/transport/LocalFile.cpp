@@ -1,6 +1,6 @@
 #include "transport/LocalFile.h"
 
-#include <zlib.h>
+#include "transport/crc32.h"
 
 #include <memory>
 #include <utility>
@@ -101,16 +101,16 @@ std::optional<std::uint32_t> LocalFile::crc32() const
     if (!block) {
         return std::nullopt;
     }
-    uLong crc = ::crc32(0L, Z_NULL, 0);
+    Crc32 crc;
     for (;;) {
         input.read(block.get(), static_cast<std::streamsize>(kCrcBlockSize));
-        const auto got = static_cast<uInt>(input.gcount());
+        const auto got = static_cast<std::size_t>(input.gcount());
         if (input.bad()) {
             return std::nullopt;
         }
-        crc = ::crc32(crc, reinterpret_cast<const Bytef*>(block.get()), got);
+        crc.update(block.get(), got);
         if (input.eof()) {
-            return static_cast<std::uint32_t>(crc);
+            return crc.value();
         }
         if (input.fail()) {
             return std::nullopt;

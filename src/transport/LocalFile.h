@@ -47,7 +47,7 @@ public:
     // Flushes and closes the stream. False when the last bytes could not be written out.
     bool close();
 
-    // CRC-32 (the zlib and zip checksum) of the file as it lies on disk, read afresh through its
+    // CRC-32 (see crc32.h) of the file as it lies on disk, read afresh through its
     // path and independent of the open stream. Nullopt when the file cannot be read.
     std::optional<std::uint32_t> crc32() const;
 

@@ -5,6 +5,7 @@
 
 #include <cstdio>
 #include <fstream>
+#include <iterator>
 #include <memory>
 #include <string>
 
@@ -121,7 +122,8 @@ TEST_F(Examples, ListRepositoriesReportsARefusedSignIn)
 
 TEST_F(Examples, ExamplesRefuseAnIncompleteCommandLine)
 {
-    for (const char* program : {ZEL_EXAMPLE_LIST_REPOSITORIES, ZEL_EXAMPLE_RUN_JOB, ZEL_EXAMPLE_UPLOAD_FILE}) {
+    for (const char* program : {ZEL_EXAMPLE_LIST_REPOSITORIES, ZEL_EXAMPLE_PUBLISH_AND_RUN, ZEL_EXAMPLE_RUN_JOB,
+                                ZEL_EXAMPLE_UPLOAD_FILE}) {
         const Outcome outcome = run(std::string(program) + " 127.0.0.1");
         EXPECT_EQ(outcome.status, 2) << program;
         EXPECT_NE(outcome.output.find("usage: "), std::string::npos) << outcome.output;
@@ -155,6 +157,45 @@ TEST_F(Examples, RunJobRefusesAParameterTheWorkspaceDoesNotDeclare)
     EXPECT_EQ(outcome.status, 1);
     EXPECT_EQ(outcome.output.rfind("error ", 0), 0u) << outcome.output;
     EXPECT_EQ(outcome.output.find("submitted"), std::string::npos) << outcome.output;
+}
+
+std::string contentOf(const std::string& path)
+{
+    std::ifstream in(path, std::ios::binary);
+    return std::string((std::istreambuf_iterator<char>(in)), std::istreambuf_iterator<char>());
+}
+
+TEST_F(Examples, PublishAndRunAddsThenReplacesTheItemAndFetchesEachLog)
+{
+    const std::string workspace = server->directory() + "/greet.zlw";
+    std::ofstream(workspace) << kWorkspace;
+    const std::string log = server->directory() + "/job.log";
+    const std::string command = ZEL_EXAMPLE_PUBLISH_AND_RUN + signIn("ann", "pw-ann") + " work " + workspace + " " + log;
+
+    const Outcome first = run(command + " WHO=World");
+    EXPECT_EQ(first.status, 0) << first.output;
+    EXPECT_EQ(first.output.rfind("added repository work\nadded item greet.zlw\nsubmitted job ", 0), 0u) << first.output;
+    EXPECT_NE(first.output.find("succeeded: 0 Translation was successful\nlog of job "), std::string::npos) << first.output;
+    EXPECT_NE(contentOf(log).find("Hello World"), std::string::npos) << contentOf(log);
+
+    // A failing job still has its log fetched, and the same file replaces the item.
+    const Outcome second = run(command + " WHO=Again CODE=3");
+    EXPECT_EQ(second.status, 1) << second.output;
+    EXPECT_EQ(second.output.rfind("updated item greet.zlw\nsubmitted job ", 0), 0u) << second.output;
+    EXPECT_NE(second.output.find("failed: 3"), std::string::npos) << second.output;
+    EXPECT_NE(contentOf(log).find("Hello Again"), std::string::npos) << contentOf(log);
+}
+
+TEST_F(Examples, PublishAndRunStopsBeforeTheJobWhenTheUploadIsRefused)
+{
+    const std::string workspace = server->directory() + "/greet.zlw";
+    std::ofstream(workspace) << kWorkspace;
+    const std::string log = server->directory() + "/job.log";
+    const Outcome outcome = run(ZEL_EXAMPLE_PUBLISH_AND_RUN + signIn("vic", "pw-vic") + " work " + workspace + " " + log);
+    EXPECT_EQ(outcome.status, 1) << outcome.output;
+    EXPECT_EQ(outcome.output.rfind("error 393625: ", 0), 0u) << outcome.output;
+    EXPECT_EQ(outcome.output.find("submitted"), std::string::npos) << outcome.output;
+    EXPECT_FALSE(std::ifstream(log).good());
 }
 
 TEST_F(Examples, UploadFileCreatesTheFolderAndReportsProgress)

@@ -6,7 +6,6 @@
 #include <poll.h>
 #include <sys/socket.h>
 #include <unistd.h>
-#include <zlib.h>
 
 #include <algorithm>
 #include <cerrno>
@@ -241,10 +240,16 @@ Bytes frame(std::string_view payload) {
     return wire;
 }
 
+// Bit by bit, without a table: an independent check on the library's table-driven checksum.
 std::uint32_t crc32(std::string_view data) {
-    uLong crc = ::crc32(0L, Z_NULL, 0);
-    crc = ::crc32(crc, reinterpret_cast<const Bytef*>(data.data()), static_cast<uInt>(data.size()));
-    return static_cast<std::uint32_t>(crc);
+    std::uint32_t crc = 0xFFFFFFFFu;
+    for (const char c : data) {
+        crc ^= static_cast<unsigned char>(c);
+        for (int bit = 0; bit < 8; ++bit) {
+            crc = (crc >> 1) ^ (0xEDB88320u & (0u - (crc & 1u)));
+        }
+    }
+    return ~crc;
 }
 
 // ---- Payload readers --------------------------------------------------------------------------------

@@ -2,6 +2,7 @@
 // and the checksum read afresh from disk.
 
 #include "transport/LocalFile.h"
+#include "transport/crc32.h"
 
 #include <cstdint>
 #include <cstdlib>
@@ -13,23 +14,15 @@
 
 #include <gtest/gtest.h>
 
+#include "support/fake_server.h"
+
 namespace zel {
 namespace {
 
 namespace fs = std::filesystem;
 
-// A bitwise CRC-32 (reflected 0xEDB88320), written out here so that the library's table-driven
-// zlib call is checked against an independent computation.
-std::uint32_t referenceCrc(const std::string& data) {
-    std::uint32_t crc = 0xFFFFFFFFu;
-    for (const char c : data) {
-        crc ^= static_cast<unsigned char>(c);
-        for (int bit = 0; bit < 8; ++bit) {
-            crc = (crc >> 1) ^ (0xEDB88320u & (0u - (crc & 1u)));
-        }
-    }
-    return ~crc;
-}
+// The fake server's bitwise CRC-32 checks the library's table-driven one.
+using zeltest::crc32;
 
 std::string pattern(std::size_t size) {
     std::string data(size, '\0');
@@ -171,7 +164,18 @@ TEST_F(LocalFileTest, ChecksumMatchesTheStandardCrc32) {
     // Longer than any block size the checksum pass could use, and not a multiple of one.
     const std::string big = pattern(1234567);
     LocalFile file(make("big", big), LocalFile::Mode::Read);
-    EXPECT_EQ(file.crc32(), std::optional<std::uint32_t>(referenceCrc(big)));
+    EXPECT_EQ(file.crc32(), std::optional<std::uint32_t>(crc32(big)));
+}
+
+TEST(Crc32Test, PiecesAddUpToTheWhole) {
+    const std::string data = pattern(5000);
+    for (const std::size_t cut : {std::size_t{0}, std::size_t{1}, std::size_t{1023}, std::size_t{4999}}) {
+        Crc32 crc;
+        crc.update(data.data(), cut);
+        crc.update(data.data() + cut, data.size() - cut);
+        EXPECT_EQ(crc.value(), crc32(data)) << "cut at " << cut;
+    }
+    EXPECT_EQ(Crc32().value(), 0u);
 }
 
 TEST_F(LocalFileTest, ChecksumReadsTheFileAfreshThroughItsPath) {
@@ -180,7 +184,7 @@ TEST_F(LocalFileTest, ChecksumReadsTheFileAfreshThroughItsPath) {
     char buffer[2];
     ASSERT_EQ(file.read(buffer, 2), std::optional<std::size_t>(2));
     std::ofstream(path, std::ios::binary | std::ios::app) << "-and-more";
-    EXPECT_EQ(file.crc32(), std::optional<std::uint32_t>(referenceCrc("first-and-more")));
+    EXPECT_EQ(file.crc32(), std::optional<std::uint32_t>(crc32("first-and-more")));
     // The open stream is not disturbed by the checksum pass.
     ASSERT_EQ(file.read(buffer, 2), std::optional<std::size_t>(2));
     EXPECT_EQ(std::string(buffer, 2), "rs");
