@@ -1,11 +1,12 @@
 #pragma once
 // What the example programs share: a signed-in session that releases everything it handed out, the
-// one way they report a failed call, and waiting for a job to end. Only the library's public
+// one way they report a failed call, and following a job to its end. Only the library's public
 // interface is used.
 
 #include <chrono>
 #include <cstdio>
 #include <cstdlib>
+#include <cstring>
 #include <string>
 #include <thread>
 
@@ -81,6 +82,39 @@ private:
     IZELServerConnectionInfo* info_ = nullptr;
 };
 
+enum class Submission { Submitted, Refused, BadParameter };
+
+// Submits the workspace of the repository to the job service "zeljob" with the NAME=VALUE
+// parameters; prints "submitted job N" and sets `jobId` when the server takes it.
+inline Submission submitJob(Session& session, const char* repository, const char* workspace, char** parameters,
+                            int count, unsigned& jobId)
+{
+    Session::String keyword(session, "zeljob"), repositoryText(session, repository), workspaceText(session, workspace);
+    IZELServerTransformationRequest* request =
+        session->createTransformationRequest(*keyword, *repositoryText, *workspaceText);
+    if (request == nullptr)
+        return Submission::Refused;
+    Submission outcome = Submission::Submitted;
+    for (int i = 0; i < count && outcome == Submission::Submitted; ++i) {
+        const char* equals = std::strchr(parameters[i], '=');
+        if (equals == nullptr || equals == parameters[i]) {
+            std::fprintf(stderr, "error: parameter '%s' is not NAME=VALUE\n", parameters[i]);
+            outcome = Submission::BadParameter;
+            break;
+        }
+        Session::String name(session, std::string(parameters[i], static_cast<std::size_t>(equals - parameters[i]))),
+            value(session, equals + 1);
+        request->setPublishedParameter(*name, *value);
+    }
+    if (outcome == Submission::Submitted &&
+        !session.succeeded(session->getTransformationManager()->submitJob(*request, jobId)))
+        outcome = Submission::Refused;
+    session->destroyTransformationRequest(&request);
+    if (outcome == Submission::Submitted)
+        std::printf("submitted job %u\n", jobId);
+    return outcome;
+}
+
 // Asks for the job's result until it has ended; false when asking fails or it takes too long.
 inline bool waitForJob(Session& session, unsigned jobId, IZELServerTransformationResult& result)
 {
@@ -102,6 +136,24 @@ inline bool waitForJob(Session& session, unsigned jobId, IZELServerTransformatio
     }
     std::fprintf(stderr, "error: job %u did not end within two minutes\n", jobId);
     return false;
+}
+
+// Waits for the job to end and prints how it ended ("job N succeeded: NUMBER TEXT"); true when it
+// succeeded.
+inline bool awaitSuccess(Session& session, unsigned jobId)
+{
+    IZELServerTransformationResult* result = session->createTransformationResult();
+    bool succeeded = result != nullptr && waitForJob(session, jobId, *result);
+    if (succeeded) {
+        Session::String message(session);
+        unsigned number = 0;
+        result->getStatusNumber(number);
+        result->getStatusMessage(*message);
+        succeeded = result->isSuccess() != 0;
+        std::printf("job %u %s: %u %s\n", jobId, succeeded ? "succeeded" : "failed", number, message.c_str());
+    }
+    session->destroyTransformationResult(&result);
+    return succeeded;
 }
 
 }  // namespace example

@@ -7,7 +7,6 @@
 // The item takes the workspace file's own name. The job service is "zeljob".
 
 #include <cstdio>
-#include <cstring>
 #include <string>
 
 #include "../common/example_session.h"
@@ -54,51 +53,6 @@ bool publish(example::Session& session, IZELServerRepository& repository, const 
     return uploaded;
 }
 
-// Submits the item as a job with the NAME=VALUE parameters; the job's number goes to `jobId`.
-bool submit(example::Session& session, const char* repository, const std::string& itemName, char** parameters,
-            int count, unsigned& jobId)
-{
-    example::Session::String keyword(session, "zeljob"), repositoryText(session, repository),
-        workspace(session, itemName);
-    IZELServerTransformationRequest* request =
-        session->createTransformationRequest(*keyword, *repositoryText, *workspace);
-    bool good = request != nullptr;
-    for (int i = 0; good && i < count; ++i) {
-        const char* equals = std::strchr(parameters[i], '=');
-        if (equals == nullptr || equals == parameters[i]) {
-            std::fprintf(stderr, "error: parameter '%s' is not NAME=VALUE\n", parameters[i]);
-            good = false;
-            break;
-        }
-        example::Session::String name(session, std::string(parameters[i], static_cast<std::size_t>(equals - parameters[i]))),
-            value(session, equals + 1);
-        request->setPublishedParameter(*name, *value);
-    }
-    if (good)
-        good = session.succeeded(session->getTransformationManager()->submitJob(*request, jobId));
-    session->destroyTransformationRequest(&request);
-    if (good)
-        std::printf("submitted job %u\n", jobId);
-    return good;
-}
-
-// Waits for the job and prints how it ended; true when it succeeded.
-bool awaitSuccess(example::Session& session, unsigned jobId)
-{
-    IZELServerTransformationResult* result = session->createTransformationResult();
-    bool succeeded = result != nullptr && example::waitForJob(session, jobId, *result);
-    if (succeeded) {
-        example::Session::String message(session);
-        unsigned number = 0;
-        result->getStatusNumber(number);
-        result->getStatusMessage(*message);
-        succeeded = result->isSuccess() != 0;
-        std::printf("job %u %s: %u %s\n", jobId, succeeded ? "succeeded" : "failed", number, message.c_str());
-    }
-    session->destroyTransformationResult(&result);
-    return succeeded;
-}
-
 bool downloadLog(example::Session& session, unsigned jobId, const char* logFile)
 {
     example::Session::String target(session, logFile);
@@ -131,12 +85,13 @@ int main(int argc, char** argv)
     unsigned jobId = 0;
     const bool ready = repository != nullptr && openRepository(session, argv[5], *repository) &&
                        publish(session, *repository, itemName, argv[6]) &&
-                       submit(session, argv[5], itemName, argv + 8, argc - 8, jobId);
+                       example::submitJob(session, argv[5], itemName.c_str(), argv + 8, argc - 8, jobId) ==
+                           example::Submission::Submitted;
     session->destroyRepository(&repository);
     if (!ready)
         return 1;
     // The log tells why a job failed, so it is fetched either way.
-    const bool succeeded = awaitSuccess(session, jobId);
+    const bool succeeded = example::awaitSuccess(session, jobId);
     const bool logged = downloadLog(session, jobId, argv[7]);
     return succeeded && logged ? 0 : 1;
 }
