@@ -9,7 +9,7 @@ set -euo pipefail
 cd "$(dirname "$0")/.."
 
 presets=("$@")
-[ ${#presets[@]} -gt 0 ] || presets=(default asan)
+[ ${#presets[@]} -gt 0 ] || presets=(default asan windows)
 
 if [[ " ${presets[*]} " == *" windows "* ]]; then
   bash scripts/install-deps.sh windows

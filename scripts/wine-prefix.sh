@@ -28,4 +28,8 @@ wineserver -w
 
 # Ten minutes of grace after the last program ends covers the pauses between test programs.
 wineserver -p 600
+# The first program of a server session starts Wine's own services, which inherit its output and
+# keep it open for as long as they run: started here, they hold /dev/null instead of the pipe a test
+# run reads a program's output through.
+wine cmd /c exit </dev/null >/dev/null 2>&1
 echo "Wine prefix ready: $prefix"

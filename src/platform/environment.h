@@ -1,6 +1,7 @@
 #pragma once
-// The operating-system services behind home directory discovery: environment variables, the file
-// the library's code was loaded from, file probes and the machine-wide registry. Implemented once
+// The operating-system services behind home directory discovery (environment variables, the file
+// the library's code was loaded from, file probes, the machine-wide registry) and the one file
+// operation the C++ library has no portable form for: creating a file only when it is new. Implemented once
 // for POSIX (platform/posix) and once for Windows (platform/windows).
 
 #include <optional>
@@ -40,6 +41,12 @@ std::string frameworkModulePath();
 // True when a file search for `pattern` finds something. A pattern may end in a "*" wildcard,
 // which then matches anything in the folder (an existing folder always matches).
 bool findFirstFile(const std::string& pattern);
+
+enum class NewFile { Created, Exists, Failed };
+
+// Creates an empty file at `path` only when nothing of that name exists, in one step, so that two
+// processes guessing the same name cannot both have it.
+NewFile createNewFile(const std::string& path);
 
 // Reads a text value under HKEY_LOCAL_MACHINE\keyPath. A missing key or value, or a system without
 // a registry, gives the empty string.

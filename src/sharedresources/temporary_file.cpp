@@ -1,7 +1,7 @@
 #include "sharedresources/temporary_file.h"
 
-#include <cerrno>
-#include <cstdio>
+#include "platform/environment.h"
+
 #include <filesystem>
 #include <random>
 #include <system_error>
@@ -27,20 +27,6 @@ std::string randomLetters(std::mt19937& generator)
     return letters;
 }
 
-// Creates the file only when no file of that name exists ("x": exclusive creation), which is what
-// makes the name ours even when another process guesses the same one.
-enum class Creation { Created, Exists, Failed };
-
-Creation createExclusively(const std::string& path)
-{
-    errno = 0;
-    std::FILE* file = std::fopen(path.c_str(), "wbx");
-    if (file == nullptr) {
-        return errno == EEXIST ? Creation::Exists : Creation::Failed;
-    }
-    return std::fclose(file) == 0 ? Creation::Created : Creation::Failed;
-}
-
 }  // namespace
 
 std::optional<TemporaryFile> TemporaryFile::createIn(const std::string& directory)
@@ -50,12 +36,14 @@ std::optional<TemporaryFile> TemporaryFile::createIn(const std::string& director
     std::mt19937 generator(seed());
     for (int attempt = 0; attempt < kAttempts; ++attempt) {
         const std::string path = (folder / (kPrefix + randomLetters(generator) + kSuffix)).string();
-        switch (createExclusively(path)) {
-            case Creation::Created:
+        // Created only when new: that is what makes the name ours even when another process
+        // guesses the same one.
+        switch (platform::createNewFile(path)) {
+            case platform::NewFile::Created:
                 return TemporaryFile(path);
-            case Creation::Exists:
+            case platform::NewFile::Exists:
                 continue;
-            case Creation::Failed:
+            case platform::NewFile::Failed:
                 return std::nullopt;
         }
     }

@@ -3,8 +3,6 @@
 
 #include "jobs/ZELServerTransformationManager.h"
 
-#include <unistd.h>
-
 #include <filesystem>
 #include <fstream>
 #include <iterator>
@@ -23,6 +21,7 @@
 #include "jobs/ZELServerTransformationResult.h"
 #include "jobs/jobs_factories.h"
 #include "session/ZELServerConnectionInfo.h"
+#include "support/environment.h"
 #include "support/fake_server.h"
 #include "transport/ZELServerTCPIPChannel.h"
 
@@ -524,16 +523,7 @@ protected:
     void SetUp() override
     {
         TransformationManagerWire::SetUp();
-        directory = fs::temp_directory_path() /
-                    ("zel-jobs-" + std::to_string(::getpid()) + "-" +
-                     ::testing::UnitTest::GetInstance()->current_test_info()->name());
-        fs::create_directories(directory);
         path = (directory / "job.log").string();
-    }
-    void TearDown() override
-    {
-        std::error_code ignored;
-        fs::remove_all(directory, ignored);
     }
 
     static std::optional<std::string> contentOf(const std::string& file)
@@ -550,7 +540,8 @@ protected:
         return command("LOG_GET_FILE", {{"jobID", jobId}, {"logFileCRCCheckingEnabled", "false"}});
     }
 
-    fs::path directory;
+    const zeltest::TempDir scratch{"zel-jobs"};
+    const fs::path& directory = scratch.path();
     std::string path;
 };
 

@@ -3,14 +3,11 @@
 // commands it expects (after the handshake, which the fixture scripts first) and then calls
 // connect(). Commands are compared byte for byte, identity document and client identifier included.
 
-#include <stdlib.h>
-
 #include <filesystem>
 #include <fstream>
 #include <iterator>
 #include <memory>
 #include <string>
-#include <system_error>
 
 #include <gtest/gtest.h>
 
@@ -18,6 +15,7 @@
 
 #include "api/ZELServerString.h"
 #include "session/ZELServerConnectionInfo.h"
+#include "support/environment.h"
 #include "support/fake_server.h"
 #include "transport/ZELServerTCPIPChannel.h"
 
@@ -71,20 +69,12 @@ class RepositoryWireTest : public ::testing::Test {
 protected:
     void SetUp() override
     {
-        std::string pattern = (std::filesystem::temp_directory_path() / "zel-repo-XXXXXX").string();
-        ASSERT_NE(::mkdtemp(pattern.data()), nullptr);
-        dir = pattern;
         server.expectFrame(zeltest::request("SERVER_SESSION_INIT",
                                             {{"clientID", ""}, {"userID", "ann"}, {"userPassword", "pw1"}}))
             .sendFrame(success(kSessionDocument));
     }
 
-    void TearDown() override
-    {
-        channel.reset();
-        std::error_code ignored;
-        std::filesystem::remove_all(dir, ignored);
-    }
+    void TearDown() override { channel.reset(); }
 
     // Starts the script and signs in.
     void connect()
@@ -129,7 +119,8 @@ protected:
 
     zeltest::FakeServer server;
     std::unique_ptr<ZELServerTCPIPChannel> channel{new ZELServerTCPIPChannel()};
-    std::filesystem::path dir;
+    const zeltest::TempDir scratch{"zel-repo"};
+    const std::filesystem::path& dir = scratch.path();
 };
 
 }  // namespace zel::repotest

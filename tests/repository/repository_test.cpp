@@ -2,8 +2,6 @@
 // their deliberate exceptions, uploads, the item download through a temporary file, the resource
 // download straight into its destination, and the view filters.
 
-#include <stdlib.h>
-
 #include <filesystem>
 #include <functional>
 #include <optional>
@@ -20,6 +18,7 @@
 #include "repository/ZELServerWorkspace.h"
 #include "repository/repository_objects.h"
 #include "repository_fixture.h"
+#include "support/platform.h"
 
 namespace zel::repotest {
 namespace {
@@ -343,19 +342,7 @@ protected:
         RepositoryTest::SetUp();
         temporary = dir / "tmp";
         fs::create_directory(temporary);
-        if (const char* old = ::getenv("TMPDIR")) {
-            previous = old;
-        }
-        ::setenv("TMPDIR", temporary.c_str(), 1);
-    }
-    void TearDown() override
-    {
-        if (previous) {
-            ::setenv("TMPDIR", previous->c_str(), 1);
-        } else {
-            ::unsetenv("TMPDIR");
-        }
-        RepositoryTest::TearDown();
+        redirected.emplace(temporary);
     }
     bool temporaryIsEmpty() const { return fs::is_empty(temporary); }
 
@@ -366,7 +353,7 @@ protected:
     }
 
     fs::path temporary;
-    std::optional<std::string> previous;
+    std::optional<zeltest::ScopedTemporaryFolder> redirected;
 };
 
 TEST_F(ItemDownloadTest, ReceivedItemReplacesTheDestination)

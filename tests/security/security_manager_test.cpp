@@ -12,7 +12,7 @@
 #include "api/message_numbers.h"
 #include "security/ZELServerUserToken.h"
 #include "security/security_factories.h"
-#include "security/signed_in_channel.h"
+#include "support/signed_in_channel.h"
 
 namespace zel {
 namespace {

@@ -3,15 +3,16 @@
 // process has gone.
 
 #include <gtest/gtest.h>
-#include <unistd.h>
 #include <zelserverapi/zelserverapi.h>
 
 #include <cstdio>
 #include <filesystem>
 #include <fstream>
+#include <optional>
 #include <string>
 
 #include "api/heap.h"
+#include "support/environment.h"
 
 namespace fs = std::filesystem;
 
@@ -47,21 +48,23 @@ private:
     int threshold_ = 0;
 };
 
+// A death test's child is on Windows this program started once more, not a fork, so it runs the
+// fixture again; it finds the parent's report file through the environment instead of making its
+// own.
+constexpr const char* kReportVariable = "ZEL_TEST_OOM_REPORT";
+
 class MemoryHandler : public ::testing::Test {
 protected:
     MemoryHandler() {
-        std::string pattern = (fs::temp_directory_path() / "zel-oom-XXXXXX").string();
-        const int fd = ::mkstemp(pattern.data());
-        if (fd >= 0) {
-            ::close(fd);
+        if (std::optional<std::string> inherited = zeltest::getEnv(kReportVariable)) {
+            path_ = *inherited;
+        } else {
+            folder_.emplace("zel-oom");
+            path_ = (folder_->path() / "report").string();
+            variable_.emplace(kReportVariable, path_);
         }
-        path_ = pattern;
     }
-    ~MemoryHandler() override {
-        std::error_code ignored;
-        fs::remove(path_, ignored);
-        zel::heap::setFailureRoutine(nullptr);
-    }
+    ~MemoryHandler() override { zel::heap::setFailureRoutine(nullptr); }
 
     std::string recorded() const {
         std::ifstream file(path_, std::ios::binary);
@@ -74,6 +77,8 @@ protected:
         zel::heap::allocate(32);
     }
 
+    std::optional<zeltest::TempDir> folder_;
+    std::optional<zeltest::ScopedEnv> variable_;
     std::string path_;
 };
 

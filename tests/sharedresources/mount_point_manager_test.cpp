@@ -10,8 +10,8 @@
 
 #include "api/ZELServerString.h"
 #include "api/message_numbers.h"
-#include "security/signed_in_channel.h"
 #include "sharedresources/sharedresources_factories.h"
+#include "support/signed_in_channel.h"
 
 namespace zel {
 namespace {

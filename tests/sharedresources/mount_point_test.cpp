@@ -3,12 +3,9 @@
 
 #include "sharedresources/ZELServerMountPoint.h"
 
-#include <stdlib.h>
-
 #include <filesystem>
 #include <fstream>
 #include <memory>
-#include <optional>
 #include <string>
 #include <vector>
 
@@ -17,10 +14,12 @@
 #include "api/ZELServerString.h"
 #include "api/ZELServerVector.h"
 #include "api/message_numbers.h"
-#include "security/signed_in_channel.h"
 #include "sharedresources/ZELServerFileInfo.h"
 #include "sharedresources/shared_resource_readers.h"
 #include "sharedresources/sharedresources_factories.h"
+#include "support/environment.h"
+#include "support/platform.h"
+#include "support/signed_in_channel.h"
 
 namespace zel {
 namespace {
@@ -49,32 +48,6 @@ public:
     void position(unsigned bytes) override { calls.push_back("at " + std::to_string(bytes)); }
     void finish() override { calls.push_back("finish"); }
     std::vector<std::string> calls;
-};
-
-// Sets an environment variable for one test and puts the old value back.
-class ScopedEnvironment {
-public:
-    ScopedEnvironment(const char* name, const std::string& value) : name_(name)
-    {
-        if (const char* old = ::getenv(name)) {
-            old_ = old;
-        }
-        ::setenv(name, value.c_str(), 1);
-    }
-    ~ScopedEnvironment()
-    {
-        if (old_) {
-            ::setenv(name_, old_->c_str(), 1);
-        } else {
-            ::unsetenv(name_);
-        }
-    }
-    ScopedEnvironment(const ScopedEnvironment&) = delete;
-    ScopedEnvironment& operator=(const ScopedEnvironment&) = delete;
-
-private:
-    const char* name_;
-    std::optional<std::string> old_;
 };
 
 std::string fileInfoElement(const std::string& type, const std::string& size, const std::string& directory,
@@ -106,17 +79,9 @@ protected:
     void SetUp() override
     {
         SignedInChannelTest::SetUp();
-        std::string pattern = (fs::temp_directory_path() / "zel-mountpoint-XXXXXX").string();
-        ASSERT_NE(::mkdtemp(pattern.data()), nullptr);
-        dir = pattern;
         ASSERT_EQ(readMountPointReply(R"(<R><SHAREDRESOURCE name="DATA" displayname="Data" description=""/></R>)",
                                       channel.get(), *mountPoint),
                   0);
-    }
-    void TearDown() override
-    {
-        std::error_code ignored;
-        fs::remove_all(dir, ignored);
     }
 
     PathPtr path(const char* whole) { return PathPtr(mountPoint->createPath(ZELServerString(whole)), PathDeleter(*mountPoint)); }
@@ -166,7 +131,8 @@ protected:
     }
 
     std::unique_ptr<IZELServerMountPoint> mountPoint{makeMountPoint(channel.get())};
-    fs::path dir;
+    const zeltest::TempDir scratch{"zel-mountpoint"};
+    const fs::path& dir = scratch.path();
 };
 
 // ---- Commands with a flag ---------------------------------------------------------------------------
@@ -462,7 +428,7 @@ TEST_F(MountPointTest, ADownloadWithAnEmptyTargetKeepsTheFileUnderItsTemporaryNa
 {
     const fs::path temporaryFolder = dir / "tmp";
     fs::create_directory(temporaryFolder);
-    const ScopedEnvironment tmpdir("TMPDIR", temporaryFolder.string());
+    const zeltest::ScopedTemporaryFolder redirected(temporaryFolder);
     server.exchange(downloadCommand(), zeltest::fileHeader(5, zeltest::crc32("hello")))
         .expectFrame(zeltest::readyAck())
         .sendRaw("hello")

@@ -1,18 +1,11 @@
 #include "support/fake_server.h"
 
-#include <arpa/inet.h>
-#include <fcntl.h>
-#include <netinet/in.h>
-#include <poll.h>
-#include <sys/socket.h>
-#include <unistd.h>
-
 #include <algorithm>
-#include <cerrno>
 #include <charconv>
 #include <cstdio>
-#include <cstring>
 #include <stdexcept>
+
+#include "support/sockets.h"
 
 namespace zeltest {
 
@@ -24,57 +17,9 @@ using Clock = std::chrono::steady_clock;
 constexpr std::uint32_t kMaxFrameLength = 64u << 20;
 constexpr std::size_t kLabelLimit = 48;
 
-class Fd {
-public:
-    Fd() = default;
-    explicit Fd(int fd) : fd(fd) {}
-    ~Fd() { reset(); }
-    Fd(Fd&& other) noexcept : fd(std::exchange(other.fd, -1)) {}
-    Fd& operator=(Fd&& other) noexcept {
-        if (this != &other) {
-            reset(std::exchange(other.fd, -1));
-        }
-        return *this;
-    }
-    Fd(const Fd&) = delete;
-    Fd& operator=(const Fd&) = delete;
-
-    int get() const { return fd; }
-    bool valid() const { return fd >= 0; }
-    int release() { return std::exchange(fd, -1); }
-    void reset(int replacement = -1) {
-        if (fd >= 0) {
-            ::close(fd);
-        }
-        fd = replacement;
-    }
-
-private:
-    int fd = -1;
-};
-
-bool makeNonBlocking(int fd) {
-    const int flags = ::fcntl(fd, F_GETFL);
-    return flags >= 0 && ::fcntl(fd, F_SETFL, flags | O_NONBLOCK) == 0;
-}
-
-// True when fd became ready for `events` before the deadline (errors count as ready: the next call
-// reports them).
-bool waitReady(int fd, short events, Clock::time_point deadline) {
-    for (;;) {
-        const auto left = std::chrono::ceil<std::chrono::milliseconds>(deadline - Clock::now()).count();
-        if (left <= 0) {
-            return false;
-        }
-        pollfd entry{fd, events, 0};
-        const int result = ::poll(&entry, 1, static_cast<int>(left));
-        if (result > 0) {
-            return true;
-        }
-        if (result < 0 && errno != EINTR) {
-            return true;
-        }
-    }
+std::chrono::milliseconds leftUntil(Clock::time_point deadline) {
+    return std::max(std::chrono::ceil<std::chrono::milliseconds>(deadline - Clock::now()),
+                    std::chrono::milliseconds(0));
 }
 
 enum class Io { Ok, Closed, TimedOut, Failed };
@@ -85,10 +30,11 @@ struct IoOutcome {
     int error = 0;
 };
 
-IoOutcome readExact(int fd, char* out, std::size_t count, Clock::time_point deadline) {
+// The socket is non-blocking; waits happen here, bounded by the deadline.
+IoOutcome readExact(const Socket& socket, char* out, std::size_t count, Clock::time_point deadline) {
     IoOutcome outcome;
     while (outcome.done < count) {
-        const ssize_t got = ::recv(fd, out + outcome.done, count - outcome.done, 0);
+        const long got = receiveSome(socket, out + outcome.done, count - outcome.done);
         if (got > 0) {
             outcome.done += static_cast<std::size_t>(got);
             continue;
@@ -97,44 +43,45 @@ IoOutcome readExact(int fd, char* out, std::size_t count, Clock::time_point dead
             outcome.result = Io::Closed;
             return outcome;
         }
-        if (errno == EINTR) {
+        const int error = lastSocketError();
+        if (isInterrupted(error)) {
             continue;
         }
-        if (errno == EAGAIN || errno == EWOULDBLOCK) {
-            if (!waitReady(fd, POLLIN, deadline)) {
+        if (isWouldBlock(error)) {
+            if (!waitReadable(socket, leftUntil(deadline))) {
                 outcome.result = Io::TimedOut;
                 return outcome;
             }
             continue;
         }
         outcome.result = Io::Failed;
-        outcome.error = errno;
+        outcome.error = error;
         return outcome;
     }
     return outcome;
 }
 
-IoOutcome writeAll(int fd, std::string_view data, Clock::time_point deadline) {
+IoOutcome writeAll(const Socket& socket, std::string_view data, Clock::time_point deadline) {
     IoOutcome outcome;
     while (outcome.done < data.size()) {
-        const ssize_t sent =
-            ::send(fd, data.data() + outcome.done, data.size() - outcome.done, MSG_NOSIGNAL);
+        const long sent = sendSome(socket, data.data() + outcome.done, data.size() - outcome.done);
         if (sent > 0) {
             outcome.done += static_cast<std::size_t>(sent);
             continue;
         }
-        if (sent < 0 && errno == EINTR) {
+        const int error = sent < 0 ? lastSocketError() : 0;
+        if (sent < 0 && isInterrupted(error)) {
             continue;
         }
-        if (sent < 0 && (errno == EAGAIN || errno == EWOULDBLOCK)) {
-            if (!waitReady(fd, POLLOUT, deadline)) {
+        if (sent < 0 && isWouldBlock(error)) {
+            if (!waitWritable(socket, leftUntil(deadline))) {
                 outcome.result = Io::TimedOut;
                 return outcome;
             }
             continue;
         }
         outcome.result = Io::Failed;
-        outcome.error = sent < 0 ? errno : 0;
+        outcome.error = error;
         return outcome;
     }
     return outcome;
@@ -151,31 +98,31 @@ std::string explain(const IoOutcome& outcome, std::size_t wanted, const std::str
         case Io::TimedOut:
             return "timed out after " + progress;
         case Io::Failed:
-            return std::string("socket error (") + std::strerror(outcome.error) + ") after " + progress;
+            return "socket error (" + socketErrorText(outcome.error) + ") after " + progress;
     }
     return "unknown outcome";
 }
 
-// Reads whatever is waiting without blocking; used to find bytes that no step consumed.
-Bytes drainWaiting(int fd) {
+// Reads whatever is waiting; used to find bytes that no step consumed. Every socket of the run is
+// non-blocking, so this never waits.
+Bytes drainWaiting(const Socket& socket) {
     Bytes waiting;
     char chunk[4096];
     for (;;) {
-        const ssize_t got = ::recv(fd, chunk, sizeof chunk, MSG_DONTWAIT);
+        const long got = receiveSome(socket, chunk, sizeof chunk);
         if (got > 0) {
             waiting.append(chunk, static_cast<std::size_t>(got));
             continue;
         }
-        if (got < 0 && errno == EINTR) {
+        if (got < 0 && isInterrupted(lastSocketError())) {
             continue;
         }
         return waiting;
     }
 }
 
-bool connectionWaiting(int listenFd) {
-    pollfd entry{listenFd, POLLIN, 0};
-    return ::poll(&entry, 1, 0) > 0 && (entry.revents & POLLIN) != 0;
+bool connectionWaiting(const Socket& listener) {
+    return listener.valid() && waitReadable(listener, std::chrono::milliseconds(0));
 }
 
 std::uint32_t decodeLength(const unsigned char prefix[4]) {
@@ -402,7 +349,7 @@ public:
     // After a clean script: unread bytes on the connection are a failure of the test.
     void closeAfterScript() {
         if (connection.valid()) {
-            const Bytes unread = drainWaiting(connection.get());
+            const Bytes unread = drainWaiting(connection);
             connection.reset();
             if (!unread.empty()) {
                 server.fail("after the last step: the client sent " + std::to_string(unread.size()) +
@@ -485,20 +432,21 @@ private:
     bool acceptConnection() {
         const Clock::time_point until = deadline();
         for (;;) {
-            if (!waitReady(server.listenFd, POLLIN, until)) {
+            if (!waitReadable(server.listener, leftUntil(until))) {
                 return stepFailed("no client connected within " +
                                   std::to_string(server.stepTimeout.count()) + " ms");
             }
-            const int fd = ::accept(server.listenFd, nullptr, nullptr);
-            if (fd >= 0) {
-                connection.reset(fd);
+            Socket accepted = acceptFrom(server.listener);
+            if (accepted.valid()) {
+                connection = std::move(accepted);
                 break;
             }
-            if (errno != EAGAIN && errno != EWOULDBLOCK && errno != EINTR && errno != ECONNABORTED) {
-                return stepFailed(std::string("accept failed: ") + std::strerror(errno));
+            const int error = lastSocketError();
+            if (!isWouldBlock(error) && !isInterrupted(error) && !isConnectionAborted(error)) {
+                return stepFailed("accept failed: " + socketErrorText(error));
             }
         }
-        if (!makeNonBlocking(connection.get())) {
+        if (!setNonBlocking(connection, true)) {
             return stepFailed("cannot make the connection non-blocking");
         }
         everAccepted = true;
@@ -518,7 +466,7 @@ private:
     }
 
     bool closeChecked() {
-        const Bytes unread = drainWaiting(connection.get());
+        const Bytes unread = drainWaiting(connection);
         connection.reset();
         if (!unread.empty()) {
             return stepFailed("the client sent " + std::to_string(unread.size()) +
@@ -530,7 +478,7 @@ private:
     bool readFrame(Bytes& payload) {
         const Clock::time_point until = deadline();
         unsigned char prefix[4];
-        const IoOutcome head = readExact(connection.get(), reinterpret_cast<char*>(prefix), 4, until);
+        const IoOutcome head = readExact(connection, reinterpret_cast<char*>(prefix), 4, until);
         if (head.result != Io::Ok) {
             return stepFailed(explain(head, 4, "the length prefix"));
         }
@@ -541,7 +489,7 @@ private:
                               hexDump(std::string_view(reinterpret_cast<char*>(prefix), 4), 0, 4));
         }
         payload.assign(length, '\0');
-        const IoOutcome body = readExact(connection.get(), payload.data(), length, until);
+        const IoOutcome body = readExact(connection, payload.data(), length, until);
         if (body.result != Io::Ok) {
             payload.resize(body.done);
             server.recordFrame(payload);
@@ -578,7 +526,7 @@ private:
         }
         const std::size_t count = step.kind == Kind::ExpectRaw ? step.count : step.data.size();
         Bytes bytes(count, '\0');
-        const IoOutcome outcome = readExact(connection.get(), bytes.data(), count, deadline());
+        const IoOutcome outcome = readExact(connection, bytes.data(), count, deadline());
         bytes.resize(outcome.done);
         server.recordRaw(bytes);
         if (outcome.result != Io::Ok) {
@@ -595,13 +543,13 @@ private:
             return false;
         }
         char byte = 0;
-        const IoOutcome outcome = readExact(connection.get(), &byte, 1, deadline());
+        const IoOutcome outcome = readExact(connection, &byte, 1, deadline());
         switch (outcome.result) {
             case Io::Closed:
                 connection.reset();
                 return true;
             case Io::Failed:
-                if (outcome.error == ECONNRESET) {
+                if (isConnectionReset(outcome.error)) {
                     connection.reset();
                     return true;
                 }
@@ -612,7 +560,7 @@ private:
             case Io::Ok:
                 break;
         }
-        const Bytes rest = std::string(1, byte) + drainWaiting(connection.get());
+        const Bytes rest = std::string(1, byte) + drainWaiting(connection);
         return stepFailed("the client sent " + std::to_string(rest.size()) +
                           " bytes instead of closing: \"" + printable(rest) + "\"");
     }
@@ -621,7 +569,7 @@ private:
         if (!ensureConnection()) {
             return false;
         }
-        const IoOutcome outcome = writeAll(connection.get(), bytes, deadline());
+        const IoOutcome outcome = writeAll(connection, bytes, deadline());
         if (outcome.result != Io::Ok) {
             return stepFailed("could not send " + what + ": " + explain(outcome, bytes.size(), what));
         }
@@ -643,41 +591,37 @@ private:
     }
 
     bool connectAndSend(std::uint16_t port, const Bytes& payload, const std::string& source) {
-        Fd peer(::socket(AF_INET, SOCK_STREAM | SOCK_NONBLOCK, 0));
-        if (!peer.valid()) {
-            return stepFailed(std::string("socket failed: ") + std::strerror(errno));
+        Socket peer = openTcpSocket();
+        if (!peer.valid() || !setNonBlocking(peer, true)) {
+            return stepFailed("socket failed: " + socketErrorText(lastSocketError()));
         }
         if (!source.empty()) {
-            sockaddr_in local{};
-            local.sin_family = AF_INET;
-            if (::inet_pton(AF_INET, source.c_str(), &local.sin_addr) != 1) {
+            const std::optional<std::uint32_t> local = parseDottedAddress(source);
+            if (!local) {
                 return stepFailed("\"" + source + "\" is not a dotted IPv4 address");
             }
-            if (::bind(peer.get(), reinterpret_cast<const sockaddr*>(&local), sizeof local) != 0) {
-                return stepFailed("cannot leave from " + source + ": " + std::strerror(errno));
+            if (!bindTo(peer, *local, 0)) {
+                return stepFailed("cannot leave from " + source + ": " +
+                                  socketErrorText(lastSocketError()));
             }
         }
-        sockaddr_in address{};
-        address.sin_family = AF_INET;
-        address.sin_port = htons(port);
-        address.sin_addr.s_addr = htonl(INADDR_LOOPBACK);
         const Clock::time_point until = deadline();
-        if (::connect(peer.get(), reinterpret_cast<const sockaddr*>(&address), sizeof address) != 0) {
-            if (errno != EINPROGRESS) {
-                return stepFailed("connect to port " + std::to_string(port) + " failed: " +
-                                  std::strerror(errno));
+        const std::string target = "connect to port " + std::to_string(port);
+        if (!connectTo(peer, kLoopback, port)) {
+            const int error = lastSocketError();
+            if (!isConnectInProgress(error)) {
+                return stepFailed(target + " failed: " + socketErrorText(error));
             }
-            if (!waitReady(peer.get(), POLLOUT, until)) {
-                return stepFailed("connect to port " + std::to_string(port) + " timed out");
+            if (!waitWritable(peer, leftUntil(until))) {
+                return stepFailed(target + " timed out");
             }
-            int error = 0;
-            socklen_t length = sizeof error;
-            if (::getsockopt(peer.get(), SOL_SOCKET, SO_ERROR, &error, &length) != 0 || error != 0) {
-                return stepFailed("connect to port " + std::to_string(port) + " failed: " +
-                                  std::strerror(error));
+            const std::optional<int> outcome = pendingError(peer);
+            if (!outcome || *outcome != 0) {
+                return stepFailed(target + " failed: " +
+                                  socketErrorText(outcome ? *outcome : lastSocketError()));
             }
         }
-        const IoOutcome outcome = writeAll(peer.get(), frame(payload), until);
+        const IoOutcome outcome = writeAll(peer, frame(payload), until);
         if (outcome.result != Io::Ok) {
             return stepFailed("could not send the frame: " +
                               explain(outcome, payload.size() + 4, "the frame"));
@@ -688,30 +632,22 @@ private:
 
     FakeServer& server;
     std::size_t index = 0;
-    Fd connection;
+    Socket connection;
     bool everAccepted = false;
-    std::vector<Fd> callbacks;
+    std::vector<Socket> callbacks;
 };
 
 // ---- The server -------------------------------------------------------------------------------------
 
-FakeServer::FakeServer() {
-    Fd listener(::socket(AF_INET, SOCK_STREAM | SOCK_NONBLOCK, 0));
-    if (!listener.valid()) {
-        throw std::runtime_error(std::string("fake server: socket failed: ") + std::strerror(errno));
+FakeServer::FakeServer() : listener(listenOnLoopback(16)) {
+    std::optional<std::uint16_t> port;
+    if (listener.valid() && setNonBlocking(listener, true)) {
+        port = localPort(listener);
     }
-    sockaddr_in address{};
-    address.sin_family = AF_INET;
-    address.sin_port = 0;
-    address.sin_addr.s_addr = htonl(INADDR_LOOPBACK);
-    socklen_t length = sizeof address;
-    if (::bind(listener.get(), reinterpret_cast<const sockaddr*>(&address), sizeof address) != 0 ||
-        ::listen(listener.get(), 16) != 0 ||
-        ::getsockname(listener.get(), reinterpret_cast<sockaddr*>(&address), &length) != 0) {
-        throw std::runtime_error(std::string("fake server: cannot listen: ") + std::strerror(errno));
+    if (!port) {
+        throw std::runtime_error("fake server: cannot listen: " + socketErrorText(lastSocketError()));
     }
-    listenPort = ntohs(address.sin_port);
-    listenFd = listener.release();
+    listenPort = *port;
 }
 
 FakeServer::~FakeServer() {
@@ -856,12 +792,11 @@ bool FakeServer::finish() {
         changed.notify_all();
         worker.join();
     }
-    if (connectionWaiting(listenFd)) {
+    if (connectionWaiting(listener)) {
         fail("a client connected but no step accepted the connection");
     }
     // Later connects are refused instead of waiting in the backlog of a server nobody serves.
-    ::close(listenFd);
-    listenFd = -1;
+    listener.reset();
     return passed();
 }
 

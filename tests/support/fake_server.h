@@ -37,6 +37,8 @@
 
 #include <gtest/gtest.h>
 
+#include "support/sockets.h"
+
 namespace zeltest {
 
 // A byte string; NUL bytes are ordinary bytes. Write literals with `using namespace
@@ -208,7 +210,7 @@ private:
     void fail(std::string message);
     void runScript();
 
-    int listenFd = -1;
+    Socket listener;
     std::uint16_t listenPort = 0;
     Milliseconds stepTimeout{5000};
     Milliseconds holdTimeout{10000};

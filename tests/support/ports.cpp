@@ -1,35 +1,32 @@
 #include "support/ports.h"
 
-#include <arpa/inet.h>
-#include <netinet/in.h>
-#include <sys/socket.h>
-#include <unistd.h>
-
-#include <cerrno>
-#include <cstring>
+#include <optional>
 #include <stdexcept>
-#include <string>
 
 namespace zeltest {
 
-ClosedPort::ClosedPort() : fd(::socket(AF_INET, SOCK_STREAM, 0)) {
-    sockaddr_in address{};
-    address.sin_family = AF_INET;
-    address.sin_addr.s_addr = htonl(INADDR_LOOPBACK);
-    socklen_t length = sizeof address;
-    if (fd < 0 || ::bind(fd, reinterpret_cast<const sockaddr*>(&address), sizeof address) != 0 ||
-        ::getsockname(fd, reinterpret_cast<sockaddr*>(&address), &length) != 0) {
-        const std::string reason = std::strerror(errno);
-        if (fd >= 0) {
-            ::close(fd);
-        }
-        throw std::runtime_error("closed port: cannot bind: " + reason);
+// Exclusive, so that on Winsock a later socket asking for address reuse cannot bind over it either.
+ClosedPort::ClosedPort() : socket(openTcpSocket()) {
+    std::optional<std::uint16_t> port;
+    if (socket.valid() && setExclusiveAddress(socket) && bindTo(socket, kLoopback, 0)) {
+        port = localPort(socket);
     }
-    number = ntohs(address.sin_port);
+    if (!port) {
+        throw std::runtime_error("closed port: cannot bind: " + socketErrorText(lastSocketError()));
+    }
+    number = *port;
 }
 
-ClosedPort::~ClosedPort() {
-    ::close(fd);
+std::uint16_t releasedPort() {
+    const Socket socket = openTcpSocket();
+    std::optional<std::uint16_t> port;
+    if (socket.valid() && bindTo(socket, kLoopback, 0)) {
+        port = localPort(socket);
+    }
+    if (!port) {
+        throw std::runtime_error("released port: cannot bind: " + socketErrorText(lastSocketError()));
+    }
+    return *port;
 }
 
 }  // namespace zeltest

@@ -1,7 +1,9 @@
 #pragma once
-// Ports for tests that must fail to connect.
+// Ports for tests that must fail to connect or that need a port number nobody holds.
 
 #include <cstdint>
+
+#include "support/sockets.h"
 
 namespace zeltest {
 
@@ -12,7 +14,6 @@ class ClosedPort {
 public:
     // Throws std::runtime_error when no port can be bound.
     ClosedPort();
-    ~ClosedPort();
 
     ClosedPort(const ClosedPort&) = delete;
     ClosedPort& operator=(const ClosedPort&) = delete;
@@ -20,8 +21,13 @@ public:
     std::uint16_t port() const { return number; }
 
 private:
-    int fd = -1;
+    Socket socket;
     std::uint16_t number = 0;
 };
+
+// A loopback port that nothing listens on right now: bound by the system, then released. Another
+// socket may take it before the caller uses it, so callers retry with a fresh one when that matters.
+// Throws std::runtime_error when no port can be bound.
+std::uint16_t releasedPort();
 
 }  // namespace zeltest

@@ -3,11 +3,6 @@
 
 #include "transport/ZELServerTCPIPChannel.h"
 
-#include <arpa/inet.h>
-#include <netinet/in.h>
-#include <sys/socket.h>
-#include <unistd.h>
-
 #include <cstdint>
 #include <filesystem>
 #include <fstream>
@@ -26,7 +21,9 @@
 #include "api/message_numbers.h"
 #include "platform/net.h"
 #include "session/ZELServerConnectionInfo.h"
+#include "support/environment.h"
 #include "support/fake_server.h"
+#include "support/ports.h"
 #include "transport/IZELServerRequest.h"
 #include "transport/IZELServerResponse.h"
 #include "transport/LocalFile.h"
@@ -92,31 +89,9 @@ std::string pattern(std::size_t size) {
     return data;
 }
 
-// A port that nothing listens on right now: bound, read and released again.
-std::uint16_t unusedPort() {
-    const int fd = ::socket(AF_INET, SOCK_STREAM, 0);
-    sockaddr_in address{};
-    address.sin_family = AF_INET;
-    address.sin_addr.s_addr = htonl(INADDR_LOOPBACK);
-    socklen_t length = sizeof address;
-    ::bind(fd, reinterpret_cast<sockaddr*>(&address), sizeof address);
-    ::getsockname(fd, reinterpret_cast<sockaddr*>(&address), &length);
-    ::close(fd);
-    return ntohs(address.sin_port);
-}
-
 class ChannelTest : public ::testing::Test {
 protected:
-    void SetUp() override {
-        std::string templ = (fs::temp_directory_path() / "zel-channel-XXXXXX").string();
-        ASSERT_NE(::mkdtemp(templ.data()), nullptr);
-        dir = templ;
-    }
-    void TearDown() override {
-        channel.reset();
-        std::error_code ignored;
-        fs::remove_all(dir, ignored);
-    }
+    void TearDown() override { channel.reset(); }
 
     InfoPtr passwordInfo(const char* user = "ann", const char* password = "pw1", std::uint16_t port = 0) const {
         return InfoPtr(new ZELServerConnectionInfo(ZELServerString("127.0.0.1"), port != 0 ? port : server.port(),
@@ -158,7 +133,8 @@ protected:
 
     FakeServer server;
     std::unique_ptr<ZELServerTCPIPChannel> channel{new ZELServerTCPIPChannel()};
-    fs::path dir;
+    const zeltest::TempDir scratch{"zel-channel"};
+    const fs::path dir{scratch.path()};
 };
 
 // ---- Sign-in ----------------------------------------------------------------------------------------
@@ -276,7 +252,8 @@ TEST_F(ChannelTest, RefusedOrUnreadableSignIn) {
 // ---- Connection -------------------------------------------------------------------------------------
 
 TEST_F(ChannelTest, ConnectFailureKeepsTheFailedSocketUntilTheNextOpen) {
-    const StatusPtr failed(channel->open(*passwordInfo("ann", "pw1", unusedPort()), nullptr));
+    const zeltest::ClosedPort closed;
+    const StatusPtr failed(channel->open(*passwordInfo("ann", "pw1", closed.port()), nullptr));
     ASSERT_NE(failed, nullptr);
     EXPECT_EQ(failed->getMessageNumber(), msg::kConnectFailed);
     EXPECT_EQ(channel->getIdentity(), nullptr);
@@ -289,7 +266,7 @@ TEST_F(ChannelTest, ConnectFailureKeepsTheFailedSocketUntilTheNextOpen) {
 
     // A failed socket is still a socket to close.
     ZELServerTCPIPChannel other;
-    EXPECT_NE(StatusPtr(other.open(*passwordInfo("ann", "pw1", unusedPort()), nullptr)), nullptr);
+    EXPECT_NE(StatusPtr(other.open(*passwordInfo("ann", "pw1", closed.port()), nullptr)), nullptr);
     EXPECT_EQ(StatusPtr(other.close()), nullptr);
     const StatusPtr second(other.close());
     ASSERT_NE(second, nullptr);
@@ -764,6 +741,8 @@ TEST_F(ChannelTest, DownloadToAPathThatCannotBeWrittenSendsNothing) {
 }
 
 TEST_F(ChannelTest, DownloadThatFailsToWriteStillReadsEverythingThenReports) {
+    // Only POSIX systems have a device that takes the open but refuses every write; Windows has no
+    // file that fails mid-stream on demand.
     if (!fs::exists("/dev/full")) {
         GTEST_SKIP() << "no /dev/full here";
     }
@@ -864,7 +843,7 @@ TEST_F(ChannelTest, ResultPortDirectiveIsSentTwice) {
 }
 
 TEST_F(ChannelTest, ResultPortListensOnTheRequestedPort) {
-    const std::string wanted = std::to_string(unusedPort());
+    const std::string wanted = std::to_string(zeltest::releasedPort());
     server.expectFrame(firstHandshake())
         .sendFrame(signedIn())
         .expectFrameWhere("result-port request on the requested port",

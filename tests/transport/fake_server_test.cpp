@@ -3,19 +3,14 @@
 
 #include "support/fake_server.h"
 
-#include <arpa/inet.h>
-#include <netinet/in.h>
-#include <poll.h>
-#include <sys/socket.h>
-#include <sys/time.h>
-#include <unistd.h>
-
+#include <chrono>
 #include <optional>
 #include <string>
 
 #include <gtest/gtest.h>
 
 #include "support/ports.h"
+#include "support/sockets.h"
 
 using namespace std::string_literals;
 using namespace zeltest;
@@ -25,36 +20,20 @@ namespace {
 // Blocking client with a receive time-out, so that a broken server fails the test instead of hanging.
 class Client {
 public:
-    explicit Client(std::uint16_t port) : fd(::socket(AF_INET, SOCK_STREAM, 0)) {
-        timeval timeout{5, 0};
-        ::setsockopt(fd, SOL_SOCKET, SO_RCVTIMEO, &timeout, sizeof timeout);
-        sockaddr_in address{};
-        address.sin_family = AF_INET;
-        address.sin_port = htons(port);
-        address.sin_addr.s_addr = htonl(INADDR_LOOPBACK);
-        connected = ::connect(fd, reinterpret_cast<sockaddr*>(&address), sizeof address) == 0;
+    explicit Client(std::uint16_t port) : socket(connectToLoopback(port)) {
+        connected = socket.valid() && setReceiveTimeout(socket, std::chrono::seconds(5));
     }
-    ~Client() { close(); }
-    Client(const Client&) = delete;
-    Client& operator=(const Client&) = delete;
 
     bool connected = false;
 
-    void send(std::string_view bytes) {
-        std::size_t done = 0;
-        while (done < bytes.size()) {
-            const ssize_t sent = ::send(fd, bytes.data() + done, bytes.size() - done, MSG_NOSIGNAL);
-            ASSERT_GT(sent, 0) << "send failed";
-            done += static_cast<std::size_t>(sent);
-        }
-    }
+    void send(std::string_view bytes) { ASSERT_TRUE(sendAll(socket, bytes)) << "send failed"; }
 
     // Up to `count` bytes; fewer when the server closed or went quiet.
     Bytes read(std::size_t count) {
         Bytes bytes(count, '\0');
         std::size_t done = 0;
         while (done < count) {
-            const ssize_t got = ::recv(fd, bytes.data() + done, count - done, 0);
+            const long got = receiveSome(socket, bytes.data() + done, count - done);
             if (got <= 0) {
                 break;
             }
@@ -83,49 +62,33 @@ public:
     // True when the server closed the connection (end of stream or reset), not merely went quiet.
     bool seesClose() {
         char byte;
-        const ssize_t got = ::recv(fd, &byte, 1, 0);
-        return got == 0 || (got < 0 && errno == ECONNRESET);
+        const long got = receiveSome(socket, &byte, 1);
+        return got == 0 || (got < 0 && isConnectionReset(lastSocketError()));
     }
 
-    void close() {
-        if (fd >= 0) {
-            ::close(fd);
-            fd = -1;
-        }
-    }
+    void close() { socket.reset(); }
 
 private:
-    int fd;
+    Socket socket;
 };
 
 // A plain listening socket for the connect-back exchange.
 class Listener {
 public:
-    Listener() : fd(::socket(AF_INET, SOCK_STREAM, 0)) {
-        sockaddr_in address{};
-        address.sin_family = AF_INET;
-        address.sin_addr.s_addr = htonl(INADDR_LOOPBACK);
-        socklen_t length = sizeof address;
-        ::bind(fd, reinterpret_cast<sockaddr*>(&address), sizeof address);
-        ::listen(fd, 4);
-        ::getsockname(fd, reinterpret_cast<sockaddr*>(&address), &length);
-        port = ntohs(address.sin_port);
-    }
-    ~Listener() { ::close(fd); }
+    Listener() : socket(listenOnLoopback(4)) { port = localPort(socket).value_or(0); }
 
-    // The accepted descriptor, or -1 when nobody connected within a few seconds.
-    int accept() {
-        pollfd entry{fd, POLLIN, 0};
-        if (::poll(&entry, 1, 5000) != 1) {
-            return -1;
+    // The accepted socket; invalid when nobody connected within a few seconds.
+    Socket accept() {
+        if (!waitReadable(socket, std::chrono::seconds(5))) {
+            return Socket();
         }
-        return ::accept(fd, nullptr, nullptr);
+        return acceptFrom(socket);
     }
 
     std::uint16_t port = 0;
 
 private:
-    int fd;
+    Socket socket;
 };
 
 }  // namespace
@@ -487,18 +450,19 @@ TEST(FakeServerConnectBack, SendsTheResultToThePortNamedInTheRequest) {
                                               {"requesterHost", "127.0.0.1"},
                                               {"requesterResultPort", "1"}})));
     EXPECT_EQ(client.readFrame(), reply("SUCCESS", "queued"));
-    const int peer = results.accept();
-    ASSERT_GE(peer, 0);
+    Socket peer = results.accept();
+    ASSERT_TRUE(peer.valid());
+    ASSERT_TRUE(setReceiveTimeout(peer, std::chrono::seconds(5)));
     char buffer[64];
     std::size_t done = 0;
     while (done < 14) {
-        const ssize_t got = ::recv(peer, buffer + done, sizeof buffer - done, 0);
+        const long got = receiveSome(peer, buffer + done, sizeof buffer - done);
         if (got <= 0) {
             break;
         }
         done += static_cast<std::size_t>(got);
     }
-    ::close(peer);
+    peer.reset();
     EXPECT_EQ(Bytes(buffer, done), frame("job result"));
     EXPECT_TRUE(server.verify());
 }

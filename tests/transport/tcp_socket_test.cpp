@@ -2,11 +2,6 @@
 
 #include "transport/TcpSocket.h"
 
-#include <arpa/inet.h>
-#include <netinet/in.h>
-#include <sys/socket.h>
-#include <unistd.h>
-
 #include <chrono>
 #include <cstring>
 #include <memory>
@@ -17,26 +12,13 @@
 
 #include "support/fake_server.h"
 #include "support/ports.h"
+#include "support/sockets.h"
 
 using namespace std::string_literals;
 using zel::TcpSocket;
 using zeltest::FakeServer;
 
 namespace {
-
-// A port that nothing listens on right now: bound by the system, then released. Another process may
-// take it before the caller does, so callers retry with a fresh one.
-std::uint16_t releasedPort() {
-    const int fd = ::socket(AF_INET, SOCK_STREAM, 0);
-    sockaddr_in address{};
-    address.sin_family = AF_INET;
-    address.sin_addr.s_addr = htonl(INADDR_LOOPBACK);
-    socklen_t length = sizeof address;
-    EXPECT_EQ(::bind(fd, reinterpret_cast<sockaddr*>(&address), sizeof address), 0);
-    EXPECT_EQ(::getsockname(fd, reinterpret_cast<sockaddr*>(&address), &length), 0);
-    ::close(fd);
-    return ntohs(address.sin_port);
-}
 
 // Loopback delivery of a close may lag behind the call that caused it; probe until the connection
 // reads as dead, within a bound.
@@ -235,7 +217,7 @@ TEST(TcpSocketListen, FixedPortCanBeListenedOnAgainWhileTheOldConnectionLingers)
     {
         std::unique_ptr<TcpSocket> owner;
         for (int attempt = 0; attempt < 10; ++attempt) {
-            requested = port = releasedPort();
+            requested = port = zeltest::releasedPort();
             owner = std::make_unique<TcpSocket>(port);
             if (owner->errorCode != zel::SOCK_BIND_FAILED) {
                 break;
@@ -372,8 +354,7 @@ TEST(TcpSocketLocalAddress, WritesTheAddressOnlyWhenItFits) {
     socket.localHostAddress(full, sizeof full);
     const std::string address = full;
     ASSERT_FALSE(address.empty()) << "this machine's host name does not resolve";
-    in_addr parsed{};
-    EXPECT_EQ(::inet_pton(AF_INET, address.c_str(), &parsed), 1) << address;
+    EXPECT_TRUE(zeltest::parseDottedAddress(address).has_value()) << address;
 
     char exact[64];
     std::memset(exact, 'x', sizeof exact);

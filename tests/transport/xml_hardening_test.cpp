@@ -1,23 +1,20 @@
 // Replies come from the network: a hostile one must not make the parser read local files, open
 // connections, or expand entities without bound.
 
-#include <arpa/inet.h>
-#include <netinet/in.h>
-#include <poll.h>
-#include <sys/socket.h>
-#include <unistd.h>
-
 #include <atomic>
-#include <cstdio>
-#include <cstdlib>
+#include <chrono>
+#include <filesystem>
 #include <fstream>
 #include <memory>
+#include <optional>
 #include <string>
 #include <thread>
 
 #include <gtest/gtest.h>
 
 #include "api/message_numbers.h"
+#include "support/environment.h"
+#include "support/sockets.h"
 #include "transport/xml_navigation.h"
 #include "transport/xml_reader.h"
 
@@ -31,26 +28,23 @@ constexpr const char* kSecret = "SECRET-MARKER-7f3a9c";
 // A file holding the secret marker, removed again at the end of the test.
 class SecretFile {
 public:
-    SecretFile() {
-        char name[] = "/tmp/zel_xml_secret_XXXXXX";
-        const int fd = mkstemp(name);
-        if (fd >= 0) {
-            path_ = name;
-            const std::string content = std::string(kSecret) + "\n";
-            ok_ = write(fd, content.data(), content.size()) == static_cast<ssize_t>(content.size());
-            close(fd);
-        }
-    }
-    ~SecretFile() {
-        if (!path_.empty()) {
-            std::remove(path_.c_str());
-        }
+    SecretFile() : path_(folder_.path() / "secret.txt") {
+        std::ofstream out(path_, std::ios::binary);
+        out << kSecret << "\n";
+        ok_ = static_cast<bool>(out.flush());
     }
     bool ok() const { return ok_; }
-    const std::string& path() const { return path_; }
+    // The path as the system writes it (a drive letter and backslashes on Windows).
+    std::string path() const { return path_.string(); }
+    // file:///tmp/... or file:///C:/...
+    std::string url() const {
+        const std::string generic = path_.generic_string();
+        return "file://" + std::string(generic.front() == '/' ? "" : "/") + generic;
+    }
 
 private:
-    std::string path_;
+    zeltest::TempDir folder_{"zel-xml-secret"};
+    std::filesystem::path path_;
     bool ok_ = false;
 };
 
@@ -59,16 +53,11 @@ private:
 // for an answer forever.
 class Tripwire {
 public:
-    Tripwire() {
-        fd_ = socket(AF_INET, SOCK_STREAM, 0);
-        sockaddr_in address{};
-        address.sin_family = AF_INET;
-        address.sin_addr.s_addr = htonl(INADDR_LOOPBACK);
-        address.sin_port = 0;
-        socklen_t length = sizeof address;
-        if (fd_ >= 0 && bind(fd_, reinterpret_cast<sockaddr*>(&address), sizeof address) == 0 &&
-            listen(fd_, 8) == 0 && getsockname(fd_, reinterpret_cast<sockaddr*>(&address), &length) == 0) {
-            port_ = ntohs(address.sin_port);
+    Tripwire() : listener_(zeltest::listenOnLoopback(8)) {
+        const std::optional<std::uint16_t> port =
+            listener_.valid() ? zeltest::localPort(listener_) : std::nullopt;
+        if (port) {
+            port_ = *port;
             watcher_ = std::thread([this] { watch(); });
         }
     }
@@ -77,36 +66,30 @@ public:
         if (watcher_.joinable()) {
             watcher_.join();
         }
-        if (fd_ >= 0) {
-            close(fd_);
-        }
     }
     unsigned port() const { return port_; }
     std::string url(const std::string& path) const {
         return "http://127.0.0.1:" + std::to_string(port_) + path;
     }
-    // A connection completes in the kernel's accept queue even before anyone accepts it, so a poll
+    // A connection completes in the kernel's accept queue even before anyone accepts it, so a look
     // with no wait sees one the watcher has not taken yet.
-    bool touched() const { return connected_ || pending(0); }
+    bool touched() const { return connected_ || pending(std::chrono::milliseconds(0)); }
 
 private:
-    bool pending(int waitMs) const {
-        pollfd p{fd_, POLLIN, 0};
-        return poll(&p, 1, waitMs) > 0 && (p.revents & POLLIN) != 0;
+    bool pending(std::chrono::milliseconds wait) const {
+        return zeltest::waitReadable(listener_, wait);
     }
     void watch() {
         while (!stop_) {
-            if (pending(20)) {
-                const int client = accept(fd_, nullptr, nullptr);
-                if (client >= 0) {
+            if (pending(std::chrono::milliseconds(20))) {
+                if (zeltest::acceptFrom(listener_).valid()) {
                     connected_ = true;
-                    close(client);
                 }
             }
         }
     }
 
-    int fd_ = -1;
+    zeltest::Socket listener_;
     unsigned port_ = 0;
     std::atomic<bool> stop_{false};
     std::atomic<bool> connected_{false};
@@ -129,16 +112,17 @@ Outcome parse(const std::string& body) {
 TEST(XmlHardening, ExternalEntityNamingALocalFileIsNotRead) {
     SecretFile secret;
     ASSERT_TRUE(secret.ok());
-    const std::string& path = secret.path();
+    const std::string path = secret.path();
+    const std::string url = secret.url();
     const struct {
         const char* name;
         std::string body;
     } cases[] = {
-        {"file url", "<!DOCTYPE r [<!ENTITY x SYSTEM \"file://" + path + "\">]><r>&x;</r>"},
+        {"file url", "<!DOCTYPE r [<!ENTITY x SYSTEM \"" + url + "\">]><r>&x;</r>"},
         {"plain path", "<!DOCTYPE r [<!ENTITY x SYSTEM \"" + path + "\">]><r>&x;</r>"},
         {"in an attribute default", "<!DOCTYPE r [<!ENTITY x SYSTEM \"" + path + "\"><!ATTLIST r a CDATA \"&x;\">]><r/>"},
-        {"parameter entity", "<!DOCTYPE r [<!ENTITY % p SYSTEM \"file://" + path + "\"> %p;]><r>x</r>"},
-        {"external subset", "<!DOCTYPE r SYSTEM \"file://" + path + "\"><r>x</r>"},
+        {"parameter entity", "<!DOCTYPE r [<!ENTITY % p SYSTEM \"" + url + "\"> %p;]><r>x</r>"},
+        {"external subset", "<!DOCTYPE r SYSTEM \"" + url + "\"><r>x</r>"},
         {"public identifier", "<!DOCTYPE r [<!ENTITY x PUBLIC \"-//A//B\" \"" + path + "\">]><r>&x;</r>"},
     };
     for (const auto& c : cases) {

@@ -2,9 +2,11 @@
 
 #include <dirent.h>
 #include <dlfcn.h>
+#include <fcntl.h>
 #include <sys/stat.h>
 #include <unistd.h>
 
+#include <cerrno>
 #include <cstdlib>
 #include <vector>
 
@@ -76,6 +78,14 @@ bool findFirstFile(const std::string& pattern) {
     }
     struct stat info {};
     return ::stat(pattern.c_str(), &info) == 0;
+}
+
+NewFile createNewFile(const std::string& path) {
+    const int fd = ::open(path.c_str(), O_WRONLY | O_CREAT | O_EXCL | O_CLOEXEC, 0666);
+    if (fd < 0) {
+        return errno == EEXIST ? NewFile::Exists : NewFile::Failed;
+    }
+    return ::close(fd) == 0 ? NewFile::Created : NewFile::Failed;
 }
 
 std::string readMachineRegistryString(const char* /*keyPath*/, const char* /*valueName*/) {

@@ -18,8 +18,7 @@ namespace {
 // family never place the libraries deeper than that.
 constexpr DWORD kModuleNameBufferSize = 1024;
 
-std::string moduleFileName(const char* moduleName) {
-    HMODULE module = ::GetModuleHandleA(moduleName);
+std::string moduleFileName(HMODULE module) {
     if (module == nullptr) {
         return std::string();
     }
@@ -29,6 +28,26 @@ std::string moduleFileName(const char* moduleName) {
         return std::string();
     }
     return std::string(buffer, length);
+}
+
+std::string moduleFileName(const char* moduleName) {
+    return moduleFileName(::GetModuleHandleA(moduleName));
+}
+
+// Any function of the library itself: the module that contains it is the one the library's code
+// was loaded with.
+void moduleAnchor() {}
+
+// With the library linked into a program there is no module of the library's name; its code then
+// lives in the program, whose folder is the home, as on POSIX.
+std::string moduleHoldingThisCode() {
+    HMODULE module = nullptr;
+    if (!::GetModuleHandleExA(
+            GET_MODULE_HANDLE_EX_FLAG_FROM_ADDRESS | GET_MODULE_HANDLE_EX_FLAG_UNCHANGED_REFCOUNT,
+            reinterpret_cast<LPCSTR>(&moduleAnchor), &module)) {
+        return std::string();
+    }
+    return moduleFileName(module);
 }
 
 }  // namespace
@@ -61,7 +80,10 @@ bool setEnvironmentVariable(const char* name, const std::string& value) {
 
 void putRuntimeEnvironmentEntry(char* entry) { ::_putenv(entry); }
 
-std::string libraryModulePath() { return moduleFileName(kLibraryModuleName); }
+std::string libraryModulePath() {
+    const std::string byName = moduleFileName(kLibraryModuleName);
+    return byName.empty() ? moduleHoldingThisCode() : byName;
+}
 
 std::string frameworkModulePath() { return moduleFileName(kFrameworkModuleName); }
 
@@ -73,6 +95,17 @@ bool findFirstFile(const std::string& pattern) {
     }
     ::FindClose(found);
     return true;
+}
+
+NewFile createNewFile(const std::string& path) {
+    HANDLE file = ::CreateFileA(path.c_str(), GENERIC_WRITE, 0, nullptr, CREATE_NEW,
+                                FILE_ATTRIBUTE_NORMAL, nullptr);
+    if (file == INVALID_HANDLE_VALUE) {
+        const DWORD error = ::GetLastError();
+        return error == ERROR_FILE_EXISTS || error == ERROR_ALREADY_EXISTS ? NewFile::Exists
+                                                                           : NewFile::Failed;
+    }
+    return ::CloseHandle(file) ? NewFile::Created : NewFile::Failed;
 }
 
 std::string readMachineRegistryString(const char* keyPath, const char* valueName) {
