@@ -28,12 +28,13 @@ namespace fs = std::filesystem;
 namespace {
 
 using StatusPtr = std::unique_ptr<IZELServerStatus>;
+using zeltest::ScopedEnv;
 
 const std::string kInternat = "..\\..\\framework\\engine\\internat";
 
-using zeltest::ScopedEnv;
+std::string frame(int line) { return "(" + kInternat + ":" + std::to_string(line) + ")"; }
 
-// A home directory of the test's own; `catalogue` (when given) becomes messages/zelserverapi.msg.
+// A home directory of the test's own; `writeCatalogue` fills messages/zelserverapi.msg.
 class TempHome {
 public:
     void writeCatalogue(const std::string& text) const {
@@ -49,66 +50,55 @@ private:
 
 std::string message(const StatusPtr& status) { return status->getMessage(); }
 
-TEST(ServerStatus, TextsComeFromTheShippedCatalogueWithParametersFilledIn) {
+TEST(ServerStatus, TextsComeFromTheShippedCatalogueWithCodeAndParametersFilledIn) {
     ScopedEnv home("ZEL_SERVERAPI_HOME", nullptr);
-    StatusPtr plain(zel::makeStatus(zel::msg::kConnectFailed));
-    EXPECT_EQ(message(plain), "Could not connect to the server.");
-    EXPECT_EQ(plain->getMessageNumber(), 393601u);
-    EXPECT_EQ(plain->getCode(), 0u);
-
-    StatusPtr one(zel::makeStatus(zel::msg::kSendFailed, "392009"));
-    EXPECT_EQ(message(one), "Sending a request to the server failed (socket error 392009).");
-
-    StatusPtr two(
-        zel::makeStatus(zel::msg::kInvalidArgument, std::vector<std::string>{"keyword", "  "}));
-    EXPECT_EQ(message(two), "The argument \"keyword\" has an invalid value: \"  \".");
-
-    // A parameter is inserted as it is, its own percent signs and slot-like text included.
-    StatusPtr characters(zel::makeStatus(zel::msg::kForbiddenCharacter, "\\/:*?\"<>|&='+%1"));
-    EXPECT_EQ(message(characters),
-              "A name may not contain any of these characters: \\/:*?\"<>|&='+%1");
+    const struct {
+        StatusPtr status;
+        unsigned number;
+        unsigned code;
+        const char* text;
+    } cases[] = {
+        {StatusPtr(zel::makeStatus(zel::msg::kConnectFailed)), 393601, 0,
+         "Could not connect to the server."},
+        {StatusPtr(zel::makeStatus(zel::msg::kSendFailed, "392009")), 393607, 0,
+         "Sending a request to the server failed (socket error 392009)."},
+        {StatusPtr(zel::makeStatus(zel::msg::kInvalidArgument,
+                                   std::vector<std::string>{"keyword", "  "})),
+         393617, 0, "The argument \"keyword\" has an invalid value: \"  \"."},
+        // A parameter is inserted as it is, its own percent signs and slot-like text included.
+        {StatusPtr(zel::makeStatus(zel::msg::kForbiddenCharacter, "\\/:*?\"<>|&='+%1")),
+         393626, 0,
+         "A name may not contain any of these characters: \\/:*?\"<>|&='+%1"},
+        {StatusPtr(zel::makeStatusWithCode(2, zel::msg::kServerError, "Unknown request type")),
+         393625, 2, "Unknown request type"},
+        {StatusPtr(zel::makeStatusWithCode(7, zel::msg::kNotConnected)), 393622, 7,
+         "There is no open connection to close."},
+    };
+    for (const auto& c : cases) {
+        EXPECT_EQ(message(c.status), c.text);
+        EXPECT_EQ(c.status->getMessageNumber(), c.number) << c.text;
+        EXPECT_EQ(c.status->getCode(), c.code) << c.text;
+    }
 }
 
-TEST(ServerStatus, CodeAndNumberFormsCarryTheCode) {
-    StatusPtr withParameter(
-        zel::makeStatusWithCode(2, zel::msg::kServerError, "Unknown request type"));
-    EXPECT_EQ(withParameter->getCode(), 2u);
-    EXPECT_EQ(withParameter->getMessageNumber(), 393625u);
-    EXPECT_EQ(message(withParameter), "Unknown request type");
-
-    StatusPtr bare(zel::makeStatusWithCode(7, zel::msg::kNotConnected));
-    EXPECT_EQ(bare->getCode(), 7u);
-    EXPECT_EQ(bare->getMessageNumber(), 393622u);
-    EXPECT_EQ(message(bare), "There is no open connection to close.");
-}
-
-TEST(ServerStatus, MissingCatalogueGivesTheFallbackText) {
+TEST(ServerStatus, MissingUnreadableOrDamagedCatalogueGivesTheFallbackText) {
     TempHome empty;
-    ScopedEnv home("ZEL_SERVERAPI_HOME", empty.str().c_str());
-    // A framework home holding a good catalogue must not stand in for the library's own.
-    ScopedEnv framework("ZEL_HOME", ZEL_TEST_OUTPUT_DIR);
-
-    StatusPtr status(zel::makeStatus(zel::msg::kRequiredValueMissing));
-    EXPECT_STREQ(status->getMessage(), "Could not load resource: 393619");
-    EXPECT_EQ(status->getMessageNumber(), 393619u);
-    EXPECT_EQ(status->getCode(), 0u);
-    EXPECT_FALSE(zel::messageDatabaseStarted());
-
-    StatusPtr coded(zel::makeStatusWithCode(2, zel::msg::kServerError, "server said no"));
-    EXPECT_STREQ(coded->getMessage(), "Could not load resource: 393625");
-    EXPECT_EQ(coded->getCode(), 2u);
-}
-
-TEST(ServerStatus, UnreadableOrDamagedCatalogueGivesTheFallbackText) {
     TempHome folderInstead;
     fs::create_directories(folderInstead.path() / "messages" / "zelserverapi.msg");
     TempHome damaged;
     damaged.writeCatalogue("393619 fine\nthis line is not a message\n");
+    // A framework home holding a good catalogue must not stand in for the library's own.
+    ScopedEnv framework("ZEL_HOME", ZEL_TEST_OUTPUT_DIR);
 
-    for (const TempHome* bad : {&folderInstead, &damaged}) {
+    for (const TempHome* bad : {&empty, &folderInstead, &damaged}) {
         ScopedEnv home("ZEL_SERVERAPI_HOME", bad->str().c_str());
         StatusPtr status(zel::makeStatus(zel::msg::kRequiredValueMissing));
         EXPECT_STREQ(status->getMessage(), "Could not load resource: 393619") << bad->str();
+        EXPECT_EQ(status->getMessageNumber(), 393619u);
+        StatusPtr coded(zel::makeStatusWithCode(2, zel::msg::kServerError, "server said no"));
+        EXPECT_STREQ(coded->getMessage(), "Could not load resource: 393625") << bad->str();
+        EXPECT_EQ(coded->getCode(), 2u);
+        EXPECT_FALSE(zel::messageDatabaseStarted());
     }
 }
 
@@ -118,7 +108,13 @@ TEST(ServerStatus, NumberWithoutTextGivesTheFallbackText) {
     EXPECT_EQ(status->getMessageNumber(), 393699u);
 }
 
-TEST(ServerStatus, MessageNumbersAreShownWhileTheVariableIsDefined) {
+TEST(ServerStatus, MessageNumbersAreShownOnceTheVariableWasDefined) {
+    {
+        ScopedEnv numbers("ZEL_MSG_NUM_OUTPUT", nullptr);
+        StatusPtr status(zel::makeStatus(zel::msg::kNotConnected));
+        EXPECT_EQ(message(status), "There is no open connection to close.");
+        EXPECT_FALSE(zel::showMessageNumbers());
+    }
     {
         ScopedEnv numbers("ZEL_MSG_NUM_OUTPUT", "");
         StatusPtr status(zel::makeStatus(zel::msg::kNotConnected));
@@ -128,13 +124,6 @@ TEST(ServerStatus, MessageNumbersAreShownWhileTheVariableIsDefined) {
     // The flag is never cleared, even after teardown and with the variable gone.
     StatusPtr later(zel::makeStatus(zel::msg::kConnectFailed));
     EXPECT_EQ(message(later), "393601: Could not connect to the server.");
-}
-
-TEST(ServerStatus, WithoutTheVariableTextsCarryNoNumber) {
-    ScopedEnv numbers("ZEL_MSG_NUM_OUTPUT", nullptr);
-    StatusPtr status(zel::makeStatus(zel::msg::kNotConnected));
-    EXPECT_EQ(message(status), "There is no open connection to close.");
-    EXPECT_FALSE(zel::showMessageNumbers());
 }
 
 TEST(ServerStatus, DestroyingAnyTokenHolderTearsTheDatabaseDown) {
@@ -163,7 +152,6 @@ TEST(ServerStatus, DestroyingAnyTokenHolderTearsTheDatabaseDown) {
     third.reset();
     EXPECT_FALSE(zel::messageDatabaseStarted());
 
-    // Texts made earlier stay as they were.
     temp.writeCatalogue("393619 third text\n");
     StatusPtr fourth(zel::makeStatus(zel::msg::kRequiredValueMissing));
     EXPECT_EQ(message(fourth), "third text");
@@ -204,45 +192,39 @@ TEST(ServerStatus, NullWhenMemoryIsExhausted) {
     EXPECT_EQ(message(next), "Could not connect to the server.");
 }
 
-TEST(Heap, FailureRoutineRunsOnExhaustionAndIsReplaceable) {
+TEST(Heap, FailureRoutineRunsOnEveryExhaustionAndIsReplaceable) {
     static int seenCode = 0;
     const zel::heap::FailureRoutine routine = [](int code) { seenCode = code; };
     EXPECT_EQ(zel::heap::setFailureRoutine(routine), nullptr);
 
     zel::heap::failNextAllocations(2);
-    EXPECT_EQ(zel::heap::allocate(8), nullptr);
-    EXPECT_EQ(seenCode, zel::heap::kOutOfMemory);
-    seenCode = 0;
-    EXPECT_EQ(zel::heap::allocate(8), nullptr);
-    EXPECT_EQ(seenCode, zel::heap::kOutOfMemory);
-
+    for (int i = 0; i < 2; ++i) {
+        seenCode = 0;
+        EXPECT_EQ(zel::heap::allocate(8), nullptr);
+        EXPECT_EQ(seenCode, zel::heap::kOutOfMemory);
+    }
     seenCode = 0;
     void* block = zel::heap::allocate(0);
     EXPECT_NE(block, nullptr);
     EXPECT_EQ(seenCode, 0);
     zel::heap::release(block);
-
     EXPECT_EQ(zel::heap::setFailureRoutine(nullptr), routine);
 }
 
 // ---- StatusInfo
-// ----------------------------------------------------------------------------------
 
-TEST(StatusInfo, DefaultsAndTheLastErrorRecordBeforeAnyFailure) {
+TEST(StatusInfo, DefaultsThenFramesNewestFirstCopiedToTheLastErrorRecord) {
     const zel::StatusInfo defaults;
     EXPECT_EQ(defaults.type(), 16u);
     EXPECT_EQ(defaults.message(), "Internal Error -- No Descriptive Message Available");
     EXPECT_EQ(defaults.stackTrace(), "Internal Error -- No Stack Trace Available");
     EXPECT_EQ(defaults.number(), 0);
     EXPECT_EQ(defaults.flag(), 0);
+    // Before any failure the last-error record holds the defaults.
+    EXPECT_EQ(zel::lastStatusInfo().message(), defaults.message());
+    EXPECT_EQ(zel::lastStatusInfo().stackTrace(), defaults.stackTrace());
+    EXPECT_EQ(zel::lastStatusInfo().number(), 0);
 
-    const zel::StatusInfo last = zel::lastStatusInfo();
-    EXPECT_EQ(last.message(), defaults.message());
-    EXPECT_EQ(last.stackTrace(), defaults.stackTrace());
-    EXPECT_EQ(last.number(), 0);
-}
-
-TEST(StatusInfo, FramesAreNewestFirstAndCopiedToTheLastErrorRecord) {
     zel::StatusInfo info(3, "broken", "f", 7, "a");
     EXPECT_EQ(info.stackTrace(), "f(a:7)");
     EXPECT_EQ(info.number(), -1);
@@ -250,7 +232,6 @@ TEST(StatusInfo, FramesAreNewestFirstAndCopiedToTheLastErrorRecord) {
 
     info.addFrame("g", 9, "b");
     EXPECT_EQ(info.stackTrace(), "g(b:9) - f(a:7)");
-
     const zel::StatusInfo last = zel::lastStatusInfo();
     EXPECT_EQ(last.type(), 3u);
     EXPECT_EQ(last.message(), "broken");
@@ -258,16 +239,13 @@ TEST(StatusInfo, FramesAreNewestFirstAndCopiedToTheLastErrorRecord) {
     EXPECT_EQ(last.number(), -1);
     EXPECT_EQ(last.flag(), 0);
 
-    // Another record's frame replaces the whole last-error record.
+    // Another record's frame replaces the whole last-error record; a frame without a file is the
+    // function alone, one without a function the parenthesised part alone.
     zel::StatusInfo other(16, "other", "h", 1, "");
     EXPECT_EQ(other.stackTrace(), "h");
     EXPECT_EQ(zel::lastStatusInfo().message(), "other");
     EXPECT_EQ(zel::lastStatusInfo().stackTrace(), "h");
-}
-
-TEST(StatusInfo, FramesWithoutAFunctionNameAreTheParenthesisedPartAlone) {
-    zel::StatusInfo info(16, "m", "", 148, kInternat);
-    EXPECT_EQ(info.stackTrace(), "(" + kInternat + ":148)");
+    EXPECT_EQ(zel::StatusInfo(16, "m", "", 148, kInternat).stackTrace(), frame(148));
 }
 
 std::vector<std::string> hookReports;
@@ -280,7 +258,6 @@ TEST(StatusInfo, DiagnosticHookReportsEveryFullyConstructedRecord) {
     zel::StatusInfo info(16, "boom", "f", 7, "a");
     info.addFrame("g", 9, "b");  // frames added later are not reported again
     const zel::StatusInfo defaults;
-
     ASSERT_EQ(hookReports.size(), 1u);
     EXPECT_EQ(hookReports[0], "BADNEWS: boom f(a:7)");
 
@@ -290,7 +267,6 @@ TEST(StatusInfo, DiagnosticHookReportsEveryFullyConstructedRecord) {
 }
 
 // ---- The fill-in routine and the start-up records
-// ------------------------------------------------
 
 TEST(MessageStartup, FillInFillsFromTheFrameworkHomeWhenNoDatabaseExists) {
     TempHome framework;
@@ -307,25 +283,9 @@ TEST(MessageStartup, FillInFillsFromTheFrameworkHomeWhenNoDatabaseExists) {
     // The caller flag keeps slots without a parameter.
     failure.reset(zel::fillInMessage(393617, &parameters, out, true));
     EXPECT_EQ(out, "name=value (%3)");
-
     failure.reset(zel::fillInMessage(393617, nullptr, out, false));
     EXPECT_EQ(out, "= ()");
     zel::destroyMessageDatabase();
-}
-
-TEST(MessageStartup, FillInReportsAFailedStartUpWithLines139And100) {
-    TempHome empty;
-    ScopedEnv override("ZEL_HOME_OVERRIDE", empty.str().c_str());
-
-    std::string out = "untouched";
-    std::unique_ptr<zel::StatusInfo> failure(zel::fillInMessage(393619, nullptr, out, false));
-    ASSERT_NE(failure, nullptr);
-    EXPECT_EQ(out, "untouched");
-    EXPECT_EQ(failure->type(), 16u);
-    EXPECT_NE(failure->message().find("zelserverapi.msg"), std::string::npos) << failure->message();
-    EXPECT_EQ(failure->stackTrace(), "(" + kInternat + ":139) - (" + kInternat + ":100)");
-    EXPECT_EQ(zel::lastStatusInfo().stackTrace(), failure->stackTrace());
-    EXPECT_FALSE(zel::messageDatabaseStarted());
 }
 
 TEST(MessageStartup, FillInReportsAnUnknownNumberWithLine148) {
@@ -338,18 +298,27 @@ TEST(MessageStartup, FillInReportsAnUnknownNumberWithLine148) {
     ASSERT_NE(failure, nullptr);
     EXPECT_EQ(out, "untouched");
     EXPECT_NE(failure->message().find("393618"), std::string::npos) << failure->message();
-    EXPECT_EQ(failure->stackTrace(), "(" + kInternat + ":148)");
+    EXPECT_EQ(failure->stackTrace(), frame(148));
     EXPECT_EQ(failure->number(), -1);
     zel::destroyMessageDatabase();
 }
 
-TEST(MessageStartup, StartUpIsLazyAndRetriedAfterAFailure) {
+TEST(MessageStartup, AFailedStartUpIsReportedWithLines139And100AndRetriedLater) {
     TempHome temp;
+    ScopedEnv override("ZEL_HOME_OVERRIDE", temp.str().c_str());
+    std::string out = "untouched";
+    std::unique_ptr<zel::StatusInfo> failure(zel::fillInMessage(393619, nullptr, out, false));
+    ASSERT_NE(failure, nullptr);
+    EXPECT_EQ(out, "untouched");
+    EXPECT_EQ(failure->type(), 16u);
+    EXPECT_NE(failure->message().find("zelserverapi.msg"), std::string::npos) << failure->message();
+    EXPECT_EQ(failure->stackTrace(), frame(139) + " - " + frame(100));
+    EXPECT_EQ(zel::lastStatusInfo().stackTrace(), failure->stackTrace());
     EXPECT_FALSE(zel::messageDatabaseStarted());
 
-    std::unique_ptr<zel::StatusInfo> failure(zel::startMessageDatabase(temp.str()));
+    failure.reset(zel::startMessageDatabase(temp.str()));
     ASSERT_NE(failure, nullptr);
-    EXPECT_EQ(failure->stackTrace(), "(" + kInternat + ":100)");
+    EXPECT_EQ(failure->stackTrace(), frame(100));
     EXPECT_FALSE(zel::messageDatabaseStarted());
 
     temp.writeCatalogue("1 one\n");
@@ -366,97 +335,66 @@ TEST(MessageStartup, StartUpIsLazyAndRetriedAfterAFailure) {
 }
 
 // ---- The catalogue format
-// ------------------------------------------------------------------------
 
-struct FillCase {
-    const char* name;
-    const char* catalogue;
-    unsigned number;
-    std::vector<std::string> parameters;
-    bool keepUnfilled;
-    bool showNumbers;
-    const char* expected;
-};
-
-void PrintTo(const FillCase& c, std::ostream* os) { *os << c.name; }
-
-class CatalogueFill : public ::testing::TestWithParam<FillCase> {};
-
-TEST_P(CatalogueFill, FillsTheText) {
-    const FillCase& c = GetParam();
-    zel::ZELLocalizedMessageDatabase database;
-    ASSERT_TRUE(database.load(c.catalogue, "test")) << database.getLastErrorMessage();
-    zel::ZELServerStringArray parameters(c.parameters);
-    const zel::ZELROStringArrayWrapper wrapped(&parameters);
-    zel::ZELObsoleteStringImp out;
-    ASSERT_TRUE(
-        database.createFilledInMessage(c.number, &wrapped, &out, c.keepUnfilled, c.showNumbers))
-        << database.getLastErrorMessage();
-    EXPECT_EQ(out.str(), c.expected);
+TEST(Catalogue, FillsTheText) {
+    const struct {
+        const char* catalogue;
+        unsigned number;
+        std::vector<std::string> parameters;
+        bool keepUnfilled;
+        bool showNumbers;
+        const char* expected;
+    } cases[] = {
+        {"5 plain", 5, {}, false, false, "plain"},
+        {"# comment\n\n  \t\n5 after comments\n", 5, {}, false, false, "after comments"},
+        {"5 crlf line\r\n6 next\r\n", 5, {}, false, false, "crlf line"},
+        {"5\t \tblanks before the text are dropped, after it kept  ", 5, {}, false, false,
+         "blanks before the text are dropped, after it kept  "},
+        {"  5 indented number", 5, {}, false, false, "indented number"},
+        {"5 %2 before %1", 5, {"a", "b"}, false, false, "b before a"},
+        {"5 %1%1", 5, {"x"}, false, false, "xx"},
+        {"5 100%% sure, %%1 is not a slot", 5, {"x"}, false, false, "100% sure, %1 is not a slot"},
+        {"5 50% off, %a and %0 stay, so does a last %", 5, {"x"}, false, false,
+         "50% off, %a and %0 stay, so does a last %"},
+        {"5 [%1][%2][%9]", 5, {"x"}, false, false, "[x][][]"},
+        {"5 [%1][%2][%9]", 5, {"x"}, true, false, "[x][%2][%9]"},
+        {"5 %10", 5, {"a"}, false, false, "a0"},  // only nine slots
+        {"5 # not a comment", 5, {}, false, false, "# not a comment"},
+        {"393619 text", 393619, {}, false, true, "393619: text"},
+        {"4294967295 largest", 4294967295u, {}, false, false, "largest"},
+    };
+    for (const auto& c : cases) {
+        SCOPED_TRACE(c.catalogue);
+        zel::ZELLocalizedMessageDatabase database;
+        ASSERT_TRUE(database.load(c.catalogue, "test")) << database.getLastErrorMessage();
+        zel::ZELServerStringArray parameters(c.parameters);
+        const zel::ZELROStringArrayWrapper wrapped(&parameters);
+        zel::ZELObsoleteStringImp out;
+        ASSERT_TRUE(database.createFilledInMessage(c.number, &wrapped, &out, c.keepUnfilled,
+                                                   c.showNumbers))
+            << database.getLastErrorMessage();
+        EXPECT_EQ(out.str(), c.expected);
+    }
 }
 
-INSTANTIATE_TEST_SUITE_P(
-    Format, CatalogueFill,
-    ::testing::Values(
-        FillCase{"Plain", "5 plain", 5, {}, false, false, "plain"},
-        FillCase{"CommentsAndBlankLines",
-                 "# comment\n\n  \t\n5 after comments\n",
-                 5,
-                 {},
-                 false,
-                 false,
-                 "after comments"},
-        FillCase{"CarriageReturns", "5 crlf line\r\n6 next\r\n", 5, {}, false, false, "crlf line"},
-        FillCase{"BlanksAroundTheText",
-                 "5\t \tblanks before the text are dropped, after it kept  ",
-                 5,
-                 {},
-                 false,
-                 false,
-                 "blanks before the text are dropped, after it kept  "},
-        FillCase{"IndentedNumber", "  5 indented number", 5, {}, false, false, "indented number"},
-        FillCase{"SlotsInAnyOrder", "5 %2 before %1", 5, {"a", "b"}, false, false, "b before a"},
-        FillCase{"SlotTwice", "5 %1%1", 5, {"x"}, false, false, "xx"},
-        FillCase{"DoublePercent",
-                 "5 100%% sure, %%1 is not a slot",
-                 5,
-                 {"x"},
-                 false,
-                 false,
-                 "100% sure, %1 is not a slot"},
-        FillCase{"LonePercent",
-                 "5 50% off, %a and %0 stay, so does a last %",
-                 5,
-                 {"x"},
-                 false,
-                 false,
-                 "50% off, %a and %0 stay, so does a last %"},
-        FillCase{"MissingParametersEmpty", "5 [%1][%2][%9]", 5, {"x"}, false, false, "[x][][]"},
-        FillCase{"MissingParametersKept", "5 [%1][%2][%9]", 5, {"x"}, true, false, "[x][%2][%9]"},
-        FillCase{"OnlyNineSlots", "5 %10", 5, {"a"}, false, false, "a0"},
-        FillCase{"HashInsideText", "5 # not a comment", 5, {}, false, false, "# not a comment"},
-        FillCase{"ShowNumbers", "393619 text", 393619, {}, false, true, "393619: text"},
-        FillCase{"LargestNumber", "4294967295 largest", 4294967295u, {}, false, false, "largest"}),
-    [](const ::testing::TestParamInfo<FillCase>& info) { return std::string(info.param.name); });
-
 TEST(Catalogue, MalformedCataloguesAreRefusedWithTheirLine) {
-    struct Bad {
+    const std::string layout = "expected a message number, a blank and a text";
+    const struct {
         const char* text;
-        const char* reason;
-    };
-    const Bad cases[] = {
-        {"5 ok\nfive text\n", "test:2: expected a message number, a blank and a text"},
-        {"5text", "test:1: expected a message number, a blank and a text"},
-        {"5", "test:1: expected a message number, a blank and a text"},
+        std::string reason;
+    } cases[] = {
+        {"5 ok\nfive text\n", "test:2: " + layout},
+        {"5text", "test:1: " + layout},
+        {"5", "test:1: " + layout},
         {"5   \n", "test:1: message 5 has no text"},
         {"5 a\n6 b\n5 c\n", "test:3: message 5 appears twice"},
-        {"4294967296 too large", "test:1: expected a message number, a blank and a text"},
-        {"-5 negative", "test:1: expected a message number, a blank and a text"},
+        {"4294967296 too large", "test:1: " + layout},
+        {"-5 negative", "test:1: " + layout},
     };
-    for (const Bad& bad : cases) {
+    for (const auto& bad : cases) {
         zel::ZELLocalizedMessageDatabase database;
         EXPECT_FALSE(database.load(bad.text, "test")) << bad.text;
-        EXPECT_STREQ(database.getLastErrorMessage(), bad.reason) << bad.text;
+        EXPECT_EQ(database.getLastErrorMessage(), bad.reason) << bad.text;
         EXPECT_EQ(database.size(), 0u) << bad.text;
     }
 }
@@ -488,11 +426,10 @@ TEST(Catalogue, UnknownNumberLeavesTheOutputAlone) {
 // Every number the library raises has a text in the shipped catalogue, with one slot per parameter
 // that the raising places pass, and no slot beyond them.
 TEST(Catalogue, ShippedCatalogueCoversEveryRaisedNumber) {
-    struct Expected {
+    const struct {
         unsigned number;
         unsigned parameters;
-    };
-    const Expected raised[] = {
+    } raised[] = {
         {393601, 0}, {393602, 1}, {393604, 1}, {393607, 1}, {393608, 1}, {393617, 2}, {393618, 0},
         {393619, 0}, {393620, 1}, {393621, 0}, {393622, 0}, {393623, 1}, {393624, 1}, {393625, 1},
         {393626, 1}, {393627, 0}, {393630, 1}, {393631, 0}, {393635, 0}, {393638, 1}, {393639, 0},
@@ -503,29 +440,25 @@ TEST(Catalogue, ShippedCatalogueCoversEveryRaisedNumber) {
     ASSERT_TRUE(shipped.initialize(ZEL_TEST_SOURCE_DIR)) << shipped.getLastErrorMessage();
     EXPECT_EQ(shipped.size(), std::size(raised));
 
-    for (const Expected& e : raised) {
+    for (const auto& e : raised) {
         zel::ZELObsoleteStringImp raw;
-        ASSERT_TRUE(shipped.createFilledInMessage(e.number, nullptr, &raw, true, false))
-            << e.number;
+        ASSERT_TRUE(shipped.createFilledInMessage(e.number, nullptr, &raw, true, false)) << e.number;
         EXPECT_FALSE(raw.str().empty()) << e.number;
         for (unsigned slot = 1; slot <= 9; ++slot) {
             const std::string slotText = std::string("%").append(std::to_string(slot));
-            const bool present = raw.str().find(slotText) != std::string::npos;
-            EXPECT_EQ(present, slot <= e.parameters)
+            EXPECT_EQ(raw.str().find(slotText) != std::string::npos, slot <= e.parameters)
                 << e.number << " slot " << slot << ": " << raw.str();
         }
     }
 }
 
 TEST(Catalogue, BuildCopiesTheShippedCatalogueBesideTheBinaries) {
-    std::ifstream source(fs::path(ZEL_TEST_SOURCE_DIR) / "messages" / "zelserverapi.msg",
-                         std::ios::binary);
-    std::ifstream copy(fs::path(ZEL_TEST_OUTPUT_DIR) / "messages" / "zelserverapi.msg",
-                       std::ios::binary);
-    ASSERT_TRUE(source && copy);
-    const std::string a((std::istreambuf_iterator<char>(source)), std::istreambuf_iterator<char>());
-    const std::string b((std::istreambuf_iterator<char>(copy)), std::istreambuf_iterator<char>());
-    EXPECT_EQ(a, b);
+    const auto read = [](const fs::path& folder) {
+        std::ifstream in(folder / "messages" / "zelserverapi.msg", std::ios::binary);
+        EXPECT_TRUE(in) << folder;
+        return std::string((std::istreambuf_iterator<char>(in)), std::istreambuf_iterator<char>());
+    };
+    EXPECT_EQ(read(ZEL_TEST_SOURCE_DIR), read(ZEL_TEST_OUTPUT_DIR));
 }
 
 }  // namespace

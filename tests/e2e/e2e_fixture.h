@@ -5,6 +5,7 @@
 #include <gtest/gtest.h>
 
 #include <chrono>
+#include <functional>
 #include <fstream>
 #include <memory>
 #include <sstream>
@@ -41,6 +42,11 @@ inline void writeFile(const std::string& path, const std::string& content)
     std::ofstream(path, std::ios::binary) << content;
 }
 
+using Session = IZELServerSession;
+
+// The status number of a request the server answered with an error.
+constexpr unsigned kRefused = 393625;
+
 // Job status codes of IZELServerTransformationResult::getJobStatus.
 enum JobStatus : unsigned {
     kQueued = 1, kDelayed = 2, kInProcess = 4, kAborted = 6, kSucceeded = 7, kServiceFailed = 8, kJobFailed = 9
@@ -58,6 +64,16 @@ public:
     }
 
     IZELServerSession& session() { return *session_; }
+
+    // An object made by the session, destroyed through `destroy` when the owner goes; owners go
+    // before their Client.
+    template <typename T>
+    using Owned = std::unique_ptr<T, std::function<void(T*)>>;
+    template <typename T>
+    Owned<T> own(T* object, void (IZELServerSession::*destroy)(T**))
+    {
+        return Owned<T>(object, [session = session_, destroy](T* p) { (session->*destroy)(&p); });
+    }
 
     IZELServerString& text(const std::string& value = "")
     {
@@ -98,6 +114,15 @@ public:
     const std::string& lastMessage() const { return lastMessage_; }
     // The kind of the last status: 1 authentication, 2 authorization, 0 anything else.
     unsigned lastCode() const { return lastCode_; }
+
+    // Runs an operation that answers through a flag: the flag when it succeeded, else -1. The flag
+    // starts out as 7 (or true), so an answer the operation forgot to set shows.
+    template <typename Flag = unsigned, typename Operation>
+    long flag(Operation operation)
+    {
+        Flag value = static_cast<Flag>(7);
+        return take(operation(value)) == 0 ? static_cast<long>(value) : -1;
+    }
 
     // Adds a repository (when missing) and fetches it; owned by the caller (destroyRepository).
     IZELServerRepository* repository(const std::string& name)
@@ -164,6 +189,14 @@ protected:
     }
 
     std::string local(const std::string& name) const { return server->directory() + "/" + name; }
+
+    // Writes `content` to a local file and adds it to `repository` as the item `name`.
+    unsigned addItem(Client& client, IZELServerRepository& repository, const std::string& name,
+                     const std::string& content)
+    {
+        writeFile(local(name), content);
+        return client.take(repository.addItem(client.text(name), client.text(local(name))));
+    }
 
     std::unique_ptr<LocalServer> server;
 };

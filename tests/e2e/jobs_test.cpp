@@ -6,13 +6,6 @@
 namespace zeltest {
 namespace {
 
-const char* kGreeter =
-    "#!/bin/sh\n"
-    "# @parameter WHO | TEXT | nobody | Whom to greet\n"
-    "echo \"Hello $WHO\"\n";
-const char* kFailing = "#!/bin/sh\necho giving up\nexit 3\n";
-const char* kSleeper = "#!/bin/sh\nsleep 30\n";
-
 class Jobs : public EndToEnd {
 protected:
     void SetUp() override
@@ -22,20 +15,20 @@ protected:
         session = &client.session();
         jobs = session->getTransformationManager();
         IZELServerRepository* repository = client.repository("jobs");
-        for (const auto& [name, content] : {std::pair{"greet.zlw", kGreeter}, {"fail.zlw", kFailing},
-                                            {"sleep.zlw", kSleeper}}) {
-            writeFile(local(name), content);
-            ASSERT_EQ(client.take(repository->addItem(client.text(name), client.text(local(name)))), 0u)
-                << client.lastMessage();
-        }
+        for (const auto& [name, content] :
+             {std::pair{"greet.zlw", "# @parameter WHO | TEXT | nobody | Whom to greet\necho \"Hello $WHO\"\n"},
+              {"fail.zlw", "echo giving up\nexit 3\n"}, {"sleep.zlw", "sleep 30\n"}})
+            ASSERT_EQ(addItem(client, *repository, name, content), 0u) << client.lastMessage();
         session->destroyRepository(&repository);
         result = session->createTransformationResult();
+        none = session->createStringArray();
     }
 
     void TearDown() override
     {
         if (session == nullptr)
             return;
+        session->destroyStringArray(&none);
         session->destroyTransformationResult(&result);
         for (IZELServerTransformationRequest* request : requests)
             session->destroyTransformationRequest(&request);
@@ -50,11 +43,20 @@ protected:
 
     std::string log(unsigned id)
     {
-        unsigned success = 0;
-        EXPECT_EQ(client.take(jobs->getLogFile(id, client.text(local("job.log")), success)), 0u)
+        EXPECT_EQ(client.flag([&](unsigned& f) { return jobs->getLogFile(id, client.text(local("job.log")), f); }), 1)
             << client.lastMessage();
-        EXPECT_EQ(success, 1u);
         return readAll(local("job.log"));
+    }
+
+    // The job's status code and status number as the last result read has them.
+    std::pair<unsigned, unsigned> statusOf(unsigned id)
+    {
+        EXPECT_EQ(client.flag([&](unsigned& f) { return jobs->getJobResult(id, f, *result); }), 1);
+        unsigned status = 0;
+        unsigned number = 0;
+        result->getJobStatus(status);
+        result->getStatusNumber(number);
+        return {status, number};
     }
 
     std::string serviceMessage()
@@ -68,74 +70,49 @@ protected:
     IZELServerSession* session = nullptr;
     IZELServerTransformationManager* jobs = nullptr;
     IZELServerTransformationResult* result = nullptr;
+    IZELServerStringArray* none = nullptr;
     std::vector<IZELServerTransformationRequest*> requests;
 };
 
-TEST_F(Jobs, ASucceedingJobReportsSuccessAndLogsItsOutput)
+TEST_F(Jobs, SucceedingAndFailingJobsReportTheirOutcome)
 {
     IZELServerTransformationRequest& greet = request("greet.zlw");
     greet.setPublishedParameter(client.text("WHO"), client.text("Ann"));
     unsigned id = 0;
     ASSERT_EQ(client.take(jobs->submitJob(greet, id)), 0u) << client.lastMessage();
+    unsigned failing = 0;
+    ASSERT_EQ(client.take(jobs->submitJob(request("fail.zlw"), failing)), 0u) << client.lastMessage();
+
     ASSERT_EQ(client.waitForJob(id, *result), kSucceeded);
     EXPECT_EQ(result->getResultSuccess(), 1u);
     EXPECT_EQ(result->getServiceSuccess(), 1u);
-    unsigned number = 99;
-    EXPECT_EQ(result->getStatusNumber(number), 1u);
-    EXPECT_EQ(number, 0u);
+    EXPECT_EQ(statusOf(id), std::make_pair(unsigned{kSucceeded}, 0u));
     EXPECT_EQ(serviceMessage(), "Translation was successful");
     EXPECT_NE(log(id).find("Hello Ann"), std::string::npos);
+    EXPECT_EQ(client.flag([&](unsigned& f) { return jobs->logFileExists(id, f); }), 1);
+    auto info = client.own(session->createLogFileInfo(), &Session::destroyLogFileInfo);
+    EXPECT_EQ(client.flag([&](unsigned& f) { return jobs->getLogFileInfo(id, *info, f); }), 1) << client.lastMessage();
 
-    unsigned exists = 0;
-    EXPECT_EQ(client.take(jobs->logFileExists(id, exists)), 0u);
-    EXPECT_EQ(exists, 1u);
-    IZELServerLogFileInfo* info = session->createLogFileInfo();
-    unsigned found = 0;
-    EXPECT_EQ(client.take(jobs->getLogFileInfo(id, *info, found)), 0u) << client.lastMessage();
-    EXPECT_EQ(found, 1u);
-    session->destroyLogFileInfo(&info);
-}
-
-TEST_F(Jobs, AWorkspaceExitingNonZeroIsAJobFailureWithItsExitStatus)
-{
-    unsigned id = 0;
-    ASSERT_EQ(client.take(jobs->submitJob(request("fail.zlw"), id)), 0u) << client.lastMessage();
-    ASSERT_EQ(client.waitForJob(id, *result), kJobFailed);
+    ASSERT_EQ(client.waitForJob(failing, *result), kJobFailed);
     EXPECT_EQ(result->isSuccess(), 0u);
     EXPECT_EQ(result->getResultSuccess(), 0u);
     EXPECT_EQ(result->getServiceSuccess(), 1u) << "the service ran; the workspace failed";
-    unsigned number = 0;
-    EXPECT_EQ(result->getStatusNumber(number), 1u);
-    EXPECT_EQ(number, 3u);
-    EXPECT_NE(log(id).find("giving up"), std::string::npos);
+    EXPECT_EQ(statusOf(failing), std::make_pair(unsigned{kJobFailed}, 3u)) << "the exit status";
+    EXPECT_NE(log(failing).find("giving up"), std::string::npos);
 }
 
 TEST_F(Jobs, ARunningJobIsAbortedAndCannotBeAbortedTwice)
 {
     unsigned id = 0;
     ASSERT_EQ(client.take(jobs->submitJob(request("sleep.zlw"), id)), 0u) << client.lastMessage();
-    unsigned status = 0;
-    for (int attempt = 0; attempt < 200 && status != kInProcess; ++attempt) {
-        unsigned found = 0;
-        ASSERT_EQ(client.take(jobs->getJobResult(id, found, *result)), 0u);
-        result->getJobStatus(status);
+    for (int attempt = 0; attempt < 200 && statusOf(id).first != kInProcess; ++attempt)
         std::this_thread::sleep_for(std::chrono::milliseconds(25));
-    }
-    ASSERT_EQ(status, kInProcess);
-
+    ASSERT_EQ(statusOf(id).first, kInProcess);
     ASSERT_EQ(client.take(jobs->abortJob(id)), 0u) << client.lastMessage();
-    unsigned found = 0;
-    ASSERT_EQ(client.take(jobs->getJobResult(id, found, *result)), 0u);
-    EXPECT_EQ(found, 1u);
-    result->getJobStatus(status);
-    EXPECT_EQ(status, kAborted);
-    unsigned number = 0;
-    result->getStatusNumber(number);
-    EXPECT_EQ(number, 1002u);
+    EXPECT_EQ(statusOf(id), std::make_pair(unsigned{kAborted}, 1002u));
     EXPECT_EQ(serviceMessage(), "job aborted by ann");
-
-    EXPECT_EQ(client.take(jobs->abortJob(id)), 393625u) << "an ended job cannot be aborted";
-    EXPECT_EQ(client.take(jobs->abortJob(987654)), 393625u) << "nor an unknown one";
+    EXPECT_EQ(client.take(jobs->abortJob(id)), kRefused) << "an ended job cannot be aborted";
+    EXPECT_EQ(client.take(jobs->abortJob(987654)), kRefused) << "nor an unknown one";
 }
 
 TEST_F(Jobs, ATransactedJobDeliversItsResultThroughTheResultPort)
@@ -150,73 +127,57 @@ TEST_F(Jobs, ATransactedJobDeliversItsResultThroughTheResultPort)
     unsigned id = 0;
     ASSERT_EQ(result->getID(id), 1u);
     EXPECT_NE(log(id).find("Hello Port"), std::string::npos);
+    unsigned submitted = 0;
+    ASSERT_EQ(client.take(jobs->submitJob(greet, submitted)), 0u) << "the same request again";
+    EXPECT_NE(submitted, id);
 
-    IZELServerStringArray* none = session->createStringArray();
     IZELServerString& text = client.text();
-    EXPECT_EQ(client.take(jobs->transactJobString(client.text("zeljob"), client.text("jobs/fail/fail.zlw"), *none, text)),
-              0u) << client.lastMessage();
+    IZELServerString& failing = client.text("jobs/fail/fail.zlw");
+    EXPECT_EQ(client.take(jobs->transactJobString(client.text("zeljob"), failing, *none, text)), 0u)
+        << client.lastMessage();
     EXPECT_NE(std::string(text.c_str(), text.length()).find("jobStatus=JOB_FAILURE"), std::string::npos);
-    session->destroyStringArray(&none);
 }
 
 TEST_F(Jobs, AScheduledJobWaitsDelayedThenRuns)
 {
     unsigned id = 0;
     ASSERT_EQ(client.take(jobs->scheduleJob(request("greet.zlw"), 1, id)), 0u) << client.lastMessage();
-    unsigned found = 0;
-    ASSERT_EQ(client.take(jobs->getJobResult(id, found, *result)), 0u);
-    unsigned status = 0;
-    result->getJobStatus(status);
-    EXPECT_EQ(status, kDelayed);
+    EXPECT_EQ(statusOf(id).first, kDelayed);
     EXPECT_EQ(client.waitForJob(id, *result), kSucceeded);
 
-    IZELServerStringArray* none = session->createStringArray();
     unsigned later = 0;
-    ASSERT_EQ(client.take(jobs->scheduleJobString(client.text("zeljob"), client.text("jobs/greet/greet.zlw"), 1, *none,
-                                                  later)),
-              0u) << client.lastMessage();
-    found = 0;
+    IZELServerString& greet = client.text("jobs/greet/greet.zlw");
+    ASSERT_EQ(client.take(jobs->scheduleJobString(client.text("zeljob"), greet, 1, *none, later)), 0u)
+        << client.lastMessage();
     IZELServerString& text = client.text();
-    ASSERT_EQ(client.take(jobs->getJobResultString(later, found, text)), 0u);
-    EXPECT_EQ(found, 1u);
+    EXPECT_EQ(client.flag([&](unsigned& f) { return jobs->getJobResultString(later, f, text); }), 1);
     EXPECT_NE(std::string(text.c_str(), text.length()).find("jobStatus=DELAYED"), std::string::npos);
-    EXPECT_EQ(client.take(jobs->scheduleJobString(client.text("zeljob"), client.text("jobs/none/none.zlw"), 1, *none,
-                                                  later)),
-              393625u);
-    session->destroyStringArray(&none);
+    IZELServerString& missing = client.text("jobs/none/none.zlw");
+    EXPECT_EQ(client.take(jobs->scheduleJobString(client.text("zeljob"), missing, 1, *none, later)), kRefused);
 }
 
 TEST_F(Jobs, RequestsTheServerRefusesAreErrors)
 {
     unsigned id = 12345;
-    IZELServerTransformationRequest& unknownService = request("greet.zlw", "nojob");
-    EXPECT_EQ(client.take(jobs->submitJob(unknownService, id)), 393625u);
+    EXPECT_EQ(client.take(jobs->submitJob(request("greet.zlw", "nojob"), id)), kRefused);
     IZELServerTransformationRequest& missing = request("absent.zlw");
-    EXPECT_EQ(client.take(jobs->submitJob(missing, id)), 393625u);
+    EXPECT_EQ(client.take(jobs->submitJob(missing, id)), kRefused);
     IZELServerTransformationRequest& undeclared = request("greet.zlw");
     undeclared.setPublishedParameter(client.text("NOT_DECLARED"), client.text("x"));
-    EXPECT_EQ(client.take(jobs->submitJob(undeclared, id)), 393625u);
-    IZELServerStringArray* none = session->createStringArray();
-    EXPECT_EQ(client.take(jobs->submitJobString(client.text("zeljob"), client.text("jobs/none/none.zlw"), *none, id)),
-              393625u);
-    EXPECT_EQ(client.take(jobs->transactJob(missing, *result)), 393625u);
+    EXPECT_EQ(client.take(jobs->submitJob(undeclared, id)), kRefused);
+    IZELServerString& zeljob = client.text("zeljob");
+    EXPECT_EQ(client.take(jobs->submitJobString(zeljob, client.text("jobs/none/none.zlw"), *none, id)), kRefused);
+    EXPECT_EQ(client.take(jobs->transactJob(missing, *result)), kRefused);
     EXPECT_EQ(id, 12345u) << "no job was queued";
-    EXPECT_EQ(client.take(jobs->submitJobString(client.text("zeljob"), client.text("jobs/fail/fail.zlw"), *none, id)), 0u);
+    EXPECT_EQ(client.take(jobs->submitJobString(zeljob, client.text("jobs/fail/fail.zlw"), *none, id)), 0u);
     EXPECT_NE(id, 12345u);
-    session->destroyStringArray(&none);
 
-    unsigned found = 7;
-    EXPECT_EQ(client.take(jobs->getJobResult(424242, found, *result)), 0u);
-    EXPECT_EQ(found, 0u) << "an unknown job has no result";
-    IZELServerLogFileInfo* info = session->createLogFileInfo();
-    EXPECT_NE(client.take(jobs->getLogFileInfo(424242, *info, found)), 0u);
-    session->destroyLogFileInfo(&info);
-    unsigned success = 1;
-    EXPECT_EQ(client.take(jobs->getLogFile(424242, client.text(local("none.log")), success)), 0u);
-    EXPECT_EQ(success, 0u);
-    unsigned exists = 1;
-    EXPECT_EQ(client.take(jobs->logFileExists(424242, exists)), 0u);
-    EXPECT_EQ(exists, 0u);
+    EXPECT_EQ(client.flag([&](unsigned& f) { return jobs->getJobResult(424242, f, *result); }), 0)
+        << "an unknown job has no result";
+    auto info = client.own(session->createLogFileInfo(), &Session::destroyLogFileInfo);
+    EXPECT_EQ(client.flag([&](unsigned& f) { return jobs->getLogFileInfo(424242, *info, f); }), -1);
+    EXPECT_EQ(client.flag([&](unsigned& f) { return jobs->getLogFile(424242, client.text(local("no.log")), f); }), 0);
+    EXPECT_EQ(client.flag([&](unsigned& f) { return jobs->logFileExists(424242, f); }), 0);
 }
 
 }  // namespace

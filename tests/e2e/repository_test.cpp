@@ -1,5 +1,6 @@
 // Repositories and services end to end: each operation of the repository manager, of a repository
-// and of a service once with success and once refused by the server.
+// and of a service against the local server, with the refusals as the library reports them. The
+// server's own texts for each refusal are the server suite's to check.
 
 #include "e2e/e2e_fixture.h"
 
@@ -14,7 +15,6 @@ const char* kWorkspace =
     "# @featuretype road | A road\n"
     "# @attribute id | zel_int32 | 10 | 0\n"
     "true\n";
-const char* kDisabled = "#!/bin/sh\n# @enabled false\ntrue\n";
 
 class Repositories : public EndToEnd {
 protected:
@@ -25,13 +25,10 @@ protected:
         session = &client.session();
         manager = session->getRepositoryManager();
         repo = client.repository("roads");
-        for (const auto& [name, content] : {std::pair{"roads.zlw", kWorkspace}, {"off.zlw", kDisabled},
+        for (const auto& [name, content] : {std::pair{"roads.zlw", kWorkspace}, {"off.zlw", "# @enabled false\n"},
                                             {"fmt.zds", "# @title Format\n"}, {"tr.zlx", "plain"},
-                                            {"page.zlwt", "# @title Page\n"}}) {
-            writeFile(local(name), content);
-            ASSERT_EQ(client.take(repo->addItem(client.text(name), client.text(local(name)))), 0u)
-                << name << ": " << client.lastMessage();
-        }
+                                            {"page.zlwt", "# @title Page\n"}})
+            ASSERT_EQ(addItem(client, *repo, name, content), 0u) << name << ": " << client.lastMessage();
     }
 
     void TearDown() override
@@ -39,6 +36,8 @@ protected:
         if (session != nullptr)
             session->destroyRepository(&repo);
     }
+
+    IZELServerString& text(const std::string& value) { return client.text(value); }
 
     Client client;
     IZELServerSession* session = nullptr;
@@ -48,275 +47,201 @@ protected:
 
 TEST_F(Repositories, TheManagerAddsListsAndRemovesRepositories)
 {
-    unsigned flag = 0;
-    EXPECT_EQ(client.take(manager->repositoryExists(client.text("roads"), flag)), 0u);
-    EXPECT_EQ(flag, 1u);
-    EXPECT_EQ(client.take(manager->addRepository(client.text("roads"), client.text(""))), 393625u) << "a duplicate";
-    EXPECT_EQ(client.take(manager->addRepository(client.text("second"), client.text("Two"))), 0u);
-
-    IZELServerVector<IZELServerRepository>* all = session->createRepositoryVector();
+    EXPECT_EQ(client.take(manager->addRepository(text("roads"), text(""))), kRefused) << "a duplicate";
+    EXPECT_EQ(client.take(manager->addRepository(text("second"), text("Two"))), 0u);
+    auto all = client.own(session->createRepositoryVector(), &Session::destroyRepositoryVector);
     EXPECT_EQ(client.take(manager->getRepositories(nullptr, *all)), 0u);
     EXPECT_EQ(all->entries(), 2u);
-    session->destroyRepositoryVector(&all);
-
-    IZELServerRepository* absent = session->createRepository();
-    flag = 1;
-    EXPECT_EQ(client.take(manager->getRepository(client.text("absent"), *absent, flag)), 0u);
-    EXPECT_EQ(flag, 0u);
-    session->destroyRepository(&absent);
-
-    EXPECT_EQ(client.take(manager->removeRepository(client.text("second"), flag)), 0u);
-    EXPECT_EQ(flag, 1u);
-    EXPECT_EQ(client.take(manager->removeRepository(client.text("second"), flag)), 0u);
-    EXPECT_EQ(flag, 0u);
-    EXPECT_EQ(client.take(manager->repositoryExists(client.text("second"), flag)), 0u);
-    EXPECT_EQ(flag, 0u);
+    auto absent = client.own(session->createRepository(), &Session::destroyRepository);
+    EXPECT_EQ(client.flag([&](unsigned& f) { return manager->getRepository(text("absent"), *absent, f); }), 0);
+    EXPECT_EQ(client.flag([&](unsigned& f) { return manager->removeRepository(text("second"), f); }), 1);
+    EXPECT_EQ(client.flag([&](unsigned& f) { return manager->removeRepository(text("second"), f); }), 0);
+    EXPECT_EQ(client.flag([&](unsigned& f) { return manager->repositoryExists(text("second"), f); }), 0);
+    EXPECT_EQ(client.flag([&](unsigned& f) { return manager->repositoryExists(text("roads"), f); }), 1);
 
     ZELServerStringDict global;
     global.insert("GLOBAL", "ALLITEMS");
-    IZELServerPropertyAccessor* items = session->createPropertyAccessor();
+    auto items = client.own(session->createPropertyAccessor(), &Session::destroyPropertyAccessor);
     EXPECT_EQ(client.take(manager->getGlobalItems(&global, *items)), 0u) << client.lastMessage();
     IZELServerString& kind = client.text();
-    EXPECT_TRUE(items->getPropertyValue(client.text("roads"), client.text("roads.zlw"), kind));
+    EXPECT_TRUE(items->getPropertyValue(text("roads"), text("roads.zlw"), kind));
     EXPECT_STREQ(kind.c_str(), "WORKSPACE");
-    session->destroyPropertyAccessor(&items);
 }
 
 TEST_F(Repositories, ItemsAndResourcesAreAddedUpdatedFetchedAndRemoved)
 {
+    IZELServerString& roads = text("roads.zlw");
     writeFile(local("v2.zlw"), "#!/bin/sh\n# @title Roads 2\ntrue\n");
-    EXPECT_EQ(client.take(repo->updateItem(client.text("roads.zlw"), client.text(local("v2.zlw")))), 0u);
-    EXPECT_EQ(client.take(repo->updateItem(client.text("absent.zlw"), client.text(local("v2.zlw")))), 393625u);
-    EXPECT_EQ(client.take(repo->addItem(client.text("roads.zlw"), client.text(local("v2.zlw")))), 393625u);
-    writeFile(local("bad.zlw"), "#!/bin/sh\n# @colour red\ntrue\n");
-    EXPECT_EQ(client.take(repo->addItem(client.text("bad.zlw"), client.text(local("bad.zlw")))), 393625u);
+    EXPECT_EQ(client.take(repo->updateItem(roads, text(local("v2.zlw")))), 0u);
+    EXPECT_EQ(addItem(client, *repo, "roads.zlw", "again"), kRefused) << "refused before the transfer";
+    EXPECT_EQ(addItem(client, *repo, "bad.zlw", "#!/bin/sh\n# @colour red\ntrue\n"), kRefused) << "and after it";
     EXPECT_NE(client.lastMessage().find("unknown key '@colour'"), std::string::npos) << client.lastMessage();
 
-    unsigned flag = 0;
-    EXPECT_EQ(client.take(repo->getItem(client.text("roads.zlw"), client.text(local("got.zlw")), flag)), 0u);
+    EXPECT_EQ(client.flag([&](unsigned& f) { return repo->getItem(roads, text(local("got.zlw")), f); }), 1);
     EXPECT_EQ(readAll(local("got.zlw")), readAll(local("v2.zlw")));
     writeFile(local("kept.zlw"), "kept");
-    EXPECT_NE(client.take(repo->getItem(client.text("absent.zlw"), client.text(local("kept.zlw")), flag)), 0u);
+    EXPECT_EQ(client.flag([&](unsigned& f) { return repo->getItem(text("no.zlw"), text(local("kept.zlw")), f); }), -1);
     EXPECT_EQ(readAll(local("kept.zlw")), "kept") << "a failed download leaves the destination alone";
 
+    IZELServerString& r = text("r.txt");
     writeFile(local("r1"), "first");
     writeFile(local("r2"), "second!");
-    EXPECT_EQ(client.take(repo->addItemResource(client.text("roads.zlw"), client.text("r.txt"), client.text(local("r1")))), 0u);
-    EXPECT_EQ(client.take(repo->addItemResource(client.text("roads.zlw"), client.text("r.txt"), client.text(local("r1")))),
-              393625u);
-    EXPECT_EQ(client.take(repo->updateItemResource(client.text("roads.zlw"), client.text("r.txt"), client.text(local("r2")))),
-              0u);
-    EXPECT_EQ(client.take(repo->updateItemResource(client.text("roads.zlw"), client.text("no.txt"), client.text(local("r2")))),
-              393625u);
-    EXPECT_EQ(client.take(repo->itemResourceExists(client.text("roads.zlw"), client.text("r.txt"), flag)), 0u);
-    EXPECT_EQ(flag, 1u);
-    EXPECT_EQ(client.take(repo->getItemResource(client.text("roads.zlw"), client.text("r.txt"), client.text(local("r3")), flag)),
-              0u);
+    EXPECT_EQ(client.take(repo->addItemResource(roads, r, text(local("r1")))), 0u);
+    EXPECT_EQ(client.take(repo->updateItemResource(roads, r, text(local("r2")))), 0u);
+    EXPECT_EQ(client.take(repo->updateItemResource(roads, text("no.txt"), text(local("r2")))), kRefused);
+    EXPECT_EQ(client.flag([&](unsigned& f) { return repo->itemResourceExists(roads, r, f); }), 1);
+    EXPECT_EQ(client.flag([&](unsigned& f) { return repo->getItemResource(roads, r, text(local("r3")), f); }), 1);
     EXPECT_EQ(readAll(local("r3")), "second!");
-
-    IZELServerResource* resource = session->createResource();
-    EXPECT_EQ(client.take(repo->getItemResourceView(client.text("roads.zlw"), client.text("r.txt"), *resource, flag)), 0u);
-    EXPECT_EQ(flag, 1u);
+    auto resource = client.own(session->createResource(), &Session::destroyResource);
+    EXPECT_EQ(client.flag([&](unsigned& f) { return repo->getItemResourceView(roads, r, *resource, f); }), 1);
     EXPECT_EQ(resource->getFileSize(), 7);
-    session->destroyResource(&resource);
-    IZELServerVector<IZELServerResource>* resources = session->createResourceVector();
-    EXPECT_EQ(client.take(repo->getItemResourcesView(client.text("roads.zlw"), nullptr, *resources)), 0u);
+    auto resources = client.own(session->createResourceVector(), &Session::destroyResourceVector);
+    EXPECT_EQ(client.take(repo->getItemResourcesView(roads, nullptr, *resources)), 0u);
     EXPECT_EQ(resources->entries(), 1u);
-    EXPECT_EQ(client.take(repo->getItemResourcesView(client.text("absent.zlw"), nullptr, *resources)), 393625u);
-    session->destroyResourceVector(&resources);
 
-    EXPECT_EQ(client.take(repo->removeItemResource(client.text("roads.zlw"), client.text("r.txt"), flag)), 0u);
-    EXPECT_EQ(flag, 1u);
-    EXPECT_EQ(client.take(repo->removeItem(client.text("roads.zlw"), flag)), 0u);
-    EXPECT_EQ(flag, 1u);
-    EXPECT_EQ(client.take(repo->itemExists(client.text("roads.zlw"), flag)), 0u);
-    EXPECT_EQ(flag, 0u);
-    EXPECT_EQ(client.take(repo->removeItemResource(client.text("roads.zlw"), client.text("r.txt"), flag)), 393625u)
-        << "the item is gone";
+    EXPECT_EQ(client.flag([&](unsigned& f) { return repo->removeItemResource(roads, r, f); }), 1);
+    EXPECT_EQ(client.flag([&](unsigned& f) { return repo->removeItem(roads, f); }), 1);
+    EXPECT_EQ(client.flag([&](unsigned& f) { return repo->itemExists(roads, f); }), 0);
+    unsigned removed = 1;
+    EXPECT_EQ(client.take(repo->removeItemResource(roads, r, removed)), kRefused) << "the item is gone";
+    EXPECT_EQ(removed, 0u);
 }
 
 TEST_F(Repositories, ViewsDescribeTheItemsByKind)
 {
     ZELServerStringDict enabled;
     enabled.insert("ENABLE_FILTER", "ENABLED");
-    IZELServerVector<IZELServerWorkspaceSummary>* summaries = session->createWorkspaceSummaryVector();
+    auto summaries = client.own(session->createWorkspaceSummaryVector(), &Session::destroyWorkspaceSummaryVector);
     EXPECT_EQ(client.take(repo->getWorkspaceSummariesView(&enabled, *summaries)), 0u) << client.lastMessage();
     EXPECT_EQ(summaries->entries(), 1u) << "the disabled workspace is filtered out";
     ZELServerStringDict wrong;
     wrong.insert("ENABLE_FILTER", "SOME");
-    EXPECT_EQ(client.take(repo->getWorkspaceSummariesView(&wrong, *summaries)), 393619u);
-    session->destroyWorkspaceSummaryVector(&summaries);
-
-    IZELServerVector<IZELServerWorkspace>* workspaces = session->createWorkspaceVector();
+    EXPECT_EQ(client.take(repo->getWorkspaceSummariesView(&wrong, *summaries)), 393619u) << "refused before sending";
+    auto workspaces = client.own(session->createWorkspaceVector(), &Session::destroyWorkspaceVector);
     EXPECT_EQ(client.take(repo->getWorkspacesView(nullptr, *workspaces)), 0u);
     EXPECT_EQ(workspaces->entries(), 2u);
-    session->destroyWorkspaceVector(&workspaces);
-    IZELServerWorkspace* workspace = session->createWorkspace();
-    unsigned found = 0;
-    EXPECT_EQ(client.take(repo->getWorkspaceView(client.text("roads.zlw"), *workspace, found)), 0u);
-    EXPECT_EQ(found, 1u);
+
+    IZELServerString& title = client.text();
+    auto workspace = client.own(session->createWorkspace(), &Session::destroyWorkspace);
+    EXPECT_EQ(client.flag([&](unsigned& f) { return repo->getWorkspaceView(text("roads.zlw"), *workspace, f); }), 1);
+    workspace->getTitle(title);
+    EXPECT_STREQ(title.c_str(), "Roads");
     EXPECT_EQ(workspace->getParameters().entries(), 1u);
     EXPECT_EQ(workspace->getSourceDatasets().entries(), 1u);
-    EXPECT_EQ(client.take(repo->getWorkspaceView(client.text("absent.zlw"), *workspace, found)), 0u);
-    EXPECT_EQ(found, 0u);
-    session->destroyWorkspace(&workspace);
+    EXPECT_EQ(client.flag([&](unsigned& f) { return repo->getWorkspaceView(text("no.zlw"), *workspace, f); }), 0);
 
-    IZELServerCustomFormat* format = session->createCustomFormat();
-    EXPECT_EQ(client.take(repo->getCustomFormatView(client.text("fmt.zds"), *format, found)), 0u);
-    EXPECT_EQ(found, 1u);
-    IZELServerString& title = client.text();
+    auto format = client.own(session->createCustomFormat(), &Session::destroyCustomFormat);
+    EXPECT_EQ(client.flag([&](unsigned& f) { return repo->getCustomFormatView(text("fmt.zds"), *format, f); }), 1);
     format->getTitle(title);
     EXPECT_STREQ(title.c_str(), "Format");
-    EXPECT_EQ(client.take(repo->getCustomFormatView(client.text("roads.zlw"), *format, found)), 0u);
-    EXPECT_EQ(found, 0u) << "a workspace is no custom format";
-    session->destroyCustomFormat(&format);
-    IZELServerVector<IZELServerCustomFormat>* formats = session->createCustomFormatVector();
+    EXPECT_EQ(client.flag([&](unsigned& f) { return repo->getCustomFormatView(text("roads.zlw"), *format, f); }), 0)
+        << "a workspace is no custom format";
+    auto formats = client.own(session->createCustomFormatVector(), &Session::destroyCustomFormatVector);
     EXPECT_EQ(client.take(repo->getCustomFormatsView(nullptr, *formats)), 0u);
     EXPECT_EQ(formats->entries(), 1u);
-    session->destroyCustomFormatVector(&formats);
 
-    IZELServerCustomTransformer* transformer = session->createCustomTransformer();
-    EXPECT_EQ(client.take(repo->getCustomTransformerView(client.text("tr.zlx"), *transformer, found)), 0u);
-    EXPECT_EQ(found, 1u);
-    EXPECT_EQ(client.take(repo->getCustomTransformerView(client.text("no.zlx"), *transformer, found)), 0u);
-    EXPECT_EQ(found, 0u);
-    session->destroyCustomTransformer(&transformer);
-    IZELServerVector<IZELServerCustomTransformer>* transformers = session->createCustomTransformerVector();
+    auto transformer = client.own(session->createCustomTransformer(), &Session::destroyCustomTransformer);
+    IZELServerString& tr = text("tr.zlx");
+    EXPECT_EQ(client.flag([&](unsigned& f) { return repo->getCustomTransformerView(tr, *transformer, f); }), 1);
+    auto transformers = client.own(session->createCustomTransformerVector(), &Session::destroyCustomTransformerVector);
     EXPECT_EQ(client.take(repo->getCustomTransformersView(nullptr, *transformers)), 0u);
     EXPECT_EQ(transformers->entries(), 1u);
-    session->destroyCustomTransformerVector(&transformers);
 
-    IZELServerTemplate* page = session->createTemplate();
-    EXPECT_EQ(client.take(repo->getTemplateView(client.text("page.zlwt"), *page, found)), 0u);
-    EXPECT_EQ(found, 1u);
-    EXPECT_EQ(client.take(repo->getTemplateView(client.text("no.zlwt"), *page, found)), 0u);
-    EXPECT_EQ(found, 0u);
-    session->destroyTemplate(&page);
-    IZELServerVector<IZELServerTemplate>* pages = session->createTemplateVector();
+    auto page = client.own(session->createTemplate(), &Session::destroyTemplate);
+    EXPECT_EQ(client.flag([&](unsigned& f) { return repo->getTemplateView(text("page.zlwt"), *page, f); }), 1);
+    page->getTitle(title);
+    EXPECT_STREQ(title.c_str(), "Page");
+    auto pages = client.own(session->createTemplateVector(), &Session::destroyTemplateVector);
     EXPECT_EQ(client.take(repo->getTemplatesView(nullptr, *pages)), 0u);
     EXPECT_EQ(pages->entries(), 1u);
-    session->destroyTemplateVector(&pages);
 }
 
 TEST_F(Repositories, ServicesAndRegistrations)
 {
-    IZELServerService* service = session->createService(client.text("pub"), client.text("Publisher"),
-                                                        client.text("first"), client.text("http://pub"));
+    auto service = client.own(session->createService(text("pub"), text("Publisher"), text("first"), text("")),
+                              &Session::destroyService);
+    EXPECT_EQ(service->isEnabled(), 1u) << "a new service is enabled and open to workspaces only";
+    EXPECT_EQ(service->isWorkspaceRegistrationAllowed(), 1u);
+    EXPECT_EQ(service->isRegistrationAllowed(2), 0u);
     service->setRegistrationAllowed(2, 1);
     ASSERT_EQ(client.take(manager->addService(*service)), 0u) << client.lastMessage();
-    EXPECT_EQ(client.take(manager->addService(*service)), 393625u) << "a duplicate";
-    service->setDescription(client.text("second"));
+    EXPECT_EQ(client.take(manager->addService(*service)), kRefused) << "a duplicate";
+    service->setDescription(text("second"));
     EXPECT_EQ(client.take(manager->updateService(*service)), 0u) << client.lastMessage();
-    session->destroyService(&service);
+    auto ghost = client.own(session->createService(text("ghost"), text(""), text(""), text("")),
+                            &Session::destroyService);
+    EXPECT_EQ(client.take(manager->updateService(*ghost)), kRefused) << "an unknown service";
 
-    IZELServerService* ghost = session->createService(client.text("ghost"), client.text(""), client.text(""), client.text(""));
-    EXPECT_EQ(client.take(manager->updateService(*ghost)), 393625u) << "an unknown service";
-    session->destroyService(&ghost);
-
-    unsigned flag = 0;
-    EXPECT_EQ(client.take(manager->serviceExists(client.text("pub"), flag)), 0u);
-    EXPECT_EQ(flag, 1u);
-    IZELServerVector<IZELServerService>* services = session->createServiceVector();
+    EXPECT_EQ(client.flag([&](unsigned& f) { return manager->serviceExists(text("pub"), f); }), 1);
+    auto services = client.own(session->createServiceVector(), &Session::destroyServiceVector);
     EXPECT_EQ(client.take(manager->getServices(nullptr, *services)), 0u);
     EXPECT_EQ(services->entries(), 1u);
-    session->destroyServiceVector(&services);
-    IZELServerService* fetched = session->createService();
-    EXPECT_EQ(client.take(manager->getService(client.text("pub"), *fetched, flag)), 0u);
-    ASSERT_EQ(flag, 1u);
+    auto fetched = client.own(session->createService(), &Session::destroyService);
+    ASSERT_EQ(client.flag([&](unsigned& f) { return manager->getService(text("pub"), *fetched, f); }), 1);
     IZELServerString& description = client.text();
     fetched->getDescription(description);
     EXPECT_STREQ(description.c_str(), "second");
-    EXPECT_EQ(fetched->isWorkspaceRegistrationAllowed(), 1u) << "the server kept the flag";
-    EXPECT_EQ(fetched->isRegistrationAllowed(2), 1u);
+    EXPECT_EQ(fetched->isRegistrationAllowed(2), 1u) << "the server kept the flags";
     EXPECT_EQ(fetched->isRegistrationAllowed(3), 0u);
 
-    EXPECT_EQ(client.take(fetched->registerItem(client.text("roads"), client.text("fmt.zds"))), 0u) << client.lastMessage();
-    EXPECT_EQ(client.take(fetched->registerItem(client.text("roads"), client.text("fmt.zds"))), 393625u) << "twice";
-    EXPECT_EQ(client.take(fetched->itemRegistered(client.text("roads"), client.text("fmt.zds"), flag)), 0u);
-    EXPECT_EQ(flag, 1u);
-    IZELServerVector<IZELServerItem>* items = session->createItemVector();
+    IZELServerString& repository = text("roads");
+    IZELServerString& format = text("fmt.zds");
+    EXPECT_EQ(client.take(fetched->registerItem(repository, format)), 0u) << client.lastMessage();
+    EXPECT_EQ(client.take(fetched->registerItem(repository, format)), kRefused) << "twice";
+    EXPECT_EQ(client.flag([&](unsigned& f) { return fetched->itemRegistered(repository, format, f); }), 1);
+    auto items = client.own(session->createItemVector(), &Session::destroyItemVector);
     EXPECT_EQ(client.take(fetched->getRegisteredItems(nullptr, *items)), 0u);
     EXPECT_EQ(items->entries(), 1u);
-    session->destroyItemVector(&items);
-    EXPECT_EQ(client.take(fetched->deregisterItem(client.text("roads"), client.text("fmt.zds"), flag)), 0u);
-    EXPECT_EQ(flag, 1u);
+    EXPECT_EQ(client.flag([&](unsigned& f) { return fetched->deregisterItem(repository, format, f); }), 1);
 
-    EXPECT_EQ(client.take(repo->registerWorkspaceService(client.text("roads.zlw"), client.text("pub"))), 0u)
-        << client.lastMessage();
-    EXPECT_EQ(client.take(repo->registerWorkspaceService(client.text("fmt.zds"), client.text("pub"))), 393625u)
-        << "not a workspace";
-    EXPECT_EQ(client.take(repo->workspaceServiceExists(client.text("roads.zlw"), client.text("pub"), flag)), 0u);
-    EXPECT_EQ(flag, 1u);
-    IZELServerVector<IZELServerWorkspaceService>* registrations = session->createWorkspaceServiceVector();
+    IZELServerString& roads = text("roads.zlw");
+    EXPECT_EQ(client.take(repo->registerWorkspaceService(roads, text("pub"))), 0u) << client.lastMessage();
+    EXPECT_EQ(client.take(repo->registerWorkspaceService(format, text("pub"))), kRefused) << "no workspace";
+    EXPECT_EQ(client.flag([&](unsigned& f) { return repo->workspaceServiceExists(roads, text("pub"), f); }), 1);
+    auto registrations = client.own(session->createWorkspaceServiceVector(), &Session::destroyWorkspaceServiceVector);
     EXPECT_EQ(client.take(repo->getWorkspaceServices(nullptr, *registrations)), 0u) << client.lastMessage();
     EXPECT_EQ(registrations->entries(), 1u);
-    session->destroyWorkspaceServiceVector(&registrations);
-    EXPECT_EQ(client.take(repo->deregisterWorkspaceService(client.text("roads.zlw"), client.text("pub"), flag)), 0u);
-    EXPECT_EQ(flag, 1u);
+    EXPECT_EQ(client.flag([&](unsigned& f) { return repo->deregisterWorkspaceService(roads, text("pub"), f); }), 1);
 
     IZELServerPropertyAccessor& properties = fetched->getPropertyAccessor();
-    properties.setProperty(client.text("cat"), client.text("key"), client.text("value"));
+    properties.setProperty(text("cat"), text("key"), text("value"));
     EXPECT_EQ(client.take(fetched->updatePropertyAccessor(properties)), 0u) << client.lastMessage();
-    session->destroyService(&fetched);
-    fetched = session->createService();
-    EXPECT_EQ(client.take(manager->getService(client.text("pub"), *fetched, flag)), 0u);
+    auto again = client.own(session->createService(), &Session::destroyService);
+    EXPECT_EQ(client.flag([&](unsigned& f) { return manager->getService(text("pub"), *again, f); }), 1);
     IZELServerString& value = client.text();
-    EXPECT_TRUE(fetched->getPropertyAccessor().getPropertyValue(client.text("cat"), client.text("key"), value));
+    EXPECT_TRUE(again->getPropertyAccessor().getPropertyValue(text("cat"), text("key"), value));
     EXPECT_STREQ(value.c_str(), "value");
-
-    EXPECT_EQ(client.take(manager->removeService(client.text("pub"), flag)), 0u);
-    EXPECT_EQ(flag, 1u);
-    EXPECT_EQ(client.take(fetched->updatePropertyAccessor(fetched->getPropertyAccessor())), 393625u)
-        << "the service is gone";
-    session->destroyService(&fetched);
-    EXPECT_EQ(client.take(manager->removeService(client.text("pub"), flag)), 0u);
-    EXPECT_EQ(flag, 0u);
+    EXPECT_EQ(client.flag([&](unsigned& f) { return manager->removeService(text("pub"), f); }), 1);
+    EXPECT_EQ(client.take(again->updatePropertyAccessor(again->getPropertyAccessor())), kRefused) << "it is gone";
+    EXPECT_EQ(client.flag([&](unsigned& f) { return manager->removeService(text("pub"), f); }), 0);
 }
 
 TEST_F(Repositories, WorkspaceAndDatasetPropertiesAreReplacedByTheirAccessors)
 {
-    IZELServerWorkspace* workspace = session->createWorkspace();
-    unsigned found = 0;
-    ASSERT_EQ(client.take(repo->getWorkspaceView(client.text("roads.zlw"), *workspace, found)), 0u);
-    ASSERT_EQ(found, 1u);
+    auto workspace = client.own(session->createWorkspace(), &Session::destroyWorkspace);
+    ASSERT_EQ(client.flag([&](unsigned& f) { return repo->getWorkspaceView(text("roads.zlw"), *workspace, f); }), 1);
     IZELServerPropertyAccessor& own = workspace->getPropertyAccessor();
-    own.setProperty(client.text("ui"), client.text("colour"), client.text("green"));
+    own.setProperty(text("ui"), text("colour"), text("green"));
     EXPECT_EQ(client.take(workspace->updatePropertyAccessor(own)), 0u) << client.lastMessage();
     ASSERT_EQ(workspace->getSourceDatasets().entries(), 1u);
     IZELServerDataset& dataset = *workspace->getSourceDatasets().element(0);
     IZELServerPropertyAccessor& datasetOwn = dataset.getPropertyAccessor();
-    datasetOwn.setProperty(client.text("io"), client.text("encoding"), client.text("utf-8"));
+    datasetOwn.setProperty(text("io"), text("encoding"), text("utf-8"));
     EXPECT_EQ(client.take(dataset.updatePropertyAccessor(datasetOwn)), 0u) << client.lastMessage();
 
-    IZELServerWorkspace* again = session->createWorkspace();
-    ASSERT_EQ(client.take(repo->getWorkspaceView(client.text("roads.zlw"), *again, found)), 0u);
+    auto again = client.own(session->createWorkspace(), &Session::destroyWorkspace);
+    ASSERT_EQ(client.flag([&](unsigned& f) { return repo->getWorkspaceView(text("roads.zlw"), *again, f); }), 1);
     IZELServerString& value = client.text();
-    EXPECT_TRUE(again->getPropertyAccessor().getPropertyValue(client.text("ui"), client.text("colour"), value));
+    EXPECT_TRUE(again->getPropertyAccessor().getPropertyValue(text("ui"), text("colour"), value));
     EXPECT_STREQ(value.c_str(), "green");
     ASSERT_EQ(again->getSourceDatasets().entries(), 1u);
     EXPECT_TRUE(again->getSourceDatasets().element(0)->getPropertyAccessor().getPropertyValue(
-        client.text("io"), client.text("encoding"), value));
+        text("io"), text("encoding"), value));
     EXPECT_STREQ(value.c_str(), "utf-8");
-    session->destroyWorkspace(&again);
 
-    unsigned removed = 0;
-    ASSERT_EQ(client.take(repo->removeItem(client.text("roads.zlw"), removed)), 0u);
-    EXPECT_EQ(client.take(workspace->updatePropertyAccessor(own)), 393625u) << "the workspace is gone";
-    EXPECT_EQ(client.take(dataset.updatePropertyAccessor(datasetOwn)), 393625u);
-    session->destroyWorkspace(&workspace);
-}
-
-TEST_F(Repositories, ANewServiceIsEnabledAndOpenToWorkspaces)
-{
-    IZELServerService* service =
-        session->createService(client.text("open"), client.text(""), client.text(""), client.text(""));
-    EXPECT_EQ(service->isEnabled(), 1u);
-    EXPECT_EQ(service->isWorkspaceRegistrationAllowed(), 1u);
-    EXPECT_EQ(service->isRegistrationAllowed(2), 0u);
-    ASSERT_EQ(client.take(manager->addService(*service)), 0u) << client.lastMessage();
-    EXPECT_EQ(client.take(repo->registerWorkspaceService(client.text("roads.zlw"), client.text("open"))), 0u)
-        << client.lastMessage();
-    session->destroyService(&service);
+    ASSERT_EQ(client.flag([&](unsigned& f) { return repo->removeItem(text("roads.zlw"), f); }), 1);
+    EXPECT_EQ(client.take(workspace->updatePropertyAccessor(own)), kRefused) << "the workspace is gone";
+    EXPECT_EQ(client.take(dataset.updatePropertyAccessor(datasetOwn)), kRefused);
 }
 
 }  // namespace

@@ -1,5 +1,5 @@
-// Shared resources end to end: every file operation of a mount point once with success and once
-// refused, and the paths that must never leave the resource's directory.
+// Shared resources end to end: every file operation of a mount point with success and refused, and
+// the paths that must never leave the resource's directory.
 
 #include <filesystem>
 
@@ -19,6 +19,7 @@ protected:
         session = &client.session();
         area = client.area("DATA");
         ASSERT_NE(area, nullptr);
+        writeFile(local("src.txt"), "twelve bytes");
     }
 
     void TearDown() override
@@ -41,6 +42,16 @@ protected:
         return *paths.back();
     }
 
+    unsigned upload(const IZELServerPath& to)
+    {
+        return client.take(area->upload(client.text(local("src.txt")), to, nullptr));
+    }
+    // The "received" flag of a download to the local file `name`, -1 when it failed.
+    long download(const IZELServerPath& from, const std::string& name)
+    {
+        return client.flag([&](unsigned& f) { return area->download(from, client.text(local(name)), f, nullptr); });
+    }
+
     std::string onDisk(const std::string& relative) const { return local("shared/" + relative); }
 
     Client client;
@@ -51,88 +62,67 @@ protected:
 
 TEST_F(SharedResources, TheManagerListsAndLooksUpResources)
 {
-    IZELServerVector<IZELServerMountPoint>* all = session->createMountPointVector();
-    ASSERT_EQ(client.take(session->getMountPointManager()->getSharedResources(*all)), 0u) << client.lastMessage();
+    IZELServerMountPointManager* manager = session->getMountPointManager();
+    auto all = client.own(session->createMountPointVector(), &Session::destroyMountPointVector);
+    ASSERT_EQ(client.take(manager->getSharedResources(*all)), 0u) << client.lastMessage();
     ASSERT_EQ(all->entries(), 1u);
     IZELServerString& name = client.text();
     all->element(0)->getName(name);
     EXPECT_STREQ(name.c_str(), "DATA");
-    session->destroyMountPointVector(&all);
-
-    IZELServerMountPoint* unknown = session->createMountPoint();
-    unsigned found = 1;
-    EXPECT_EQ(client.take(session->getMountPointManager()->getSharedResource(client.text("NOPE"), *unknown, found)), 0u);
-    EXPECT_EQ(found, 0u);
-    session->destroyMountPoint(&unknown);
+    auto unknown = client.own(session->createMountPoint(), &Session::destroyMountPoint);
+    IZELServerString& nope = client.text("NOPE");
+    EXPECT_EQ(client.flag([&](unsigned& f) { return manager->getSharedResource(nope, *unknown, f); }), 0);
 }
 
 TEST_F(SharedResources, FileOperationsSucceedInsideTheResource)
 {
     ASSERT_EQ(client.take(area->makeDirectory(path("/a/b"))), 0u) << client.lastMessage();
-    writeFile(local("src.txt"), "twelve bytes");
-    ASSERT_EQ(client.take(area->upload(client.text(local("src.txt")), path("/a/b", "f.txt"), nullptr)), 0u)
-        << client.lastMessage();
+    ASSERT_EQ(upload(path("/a/b", "f.txt")), 0u) << client.lastMessage();
     EXPECT_EQ(readAll(onDisk("a/b/f.txt")), "twelve bytes");
-
-    unsigned present = 0;
-    EXPECT_EQ(client.take(area->exists(path("/a/b/f.txt"), present)), 0u);
-    EXPECT_EQ(present, 1u);
-    IZELServerFileInfo* info = session->createFileInfo();
+    EXPECT_EQ(client.flag([&](unsigned& f) { return area->exists(path("/a/b/f.txt"), f); }), 1);
+    auto info = client.own(session->createFileInfo(), &Session::destroyFileInfo);
     EXPECT_EQ(client.take(area->getFileInfo(path("/a/b/f.txt"), *info)), 0u) << client.lastMessage();
     EXPECT_FALSE(info->isDirectory());
     EXPECT_EQ(info->getSize(), 12u);
-    session->destroyFileInfo(&info);
 
     EXPECT_EQ(client.take(area->copy(path("/a/b/f.txt"), path("/a/g.txt"))), 0u) << client.lastMessage();
     EXPECT_EQ(client.take(area->move(path("/a/g.txt"), path("/h.txt"))), 0u) << client.lastMessage();
-    IZELServerVector<IZELServerFileInfo>* entries = session->createFileInfoVector();
+    auto entries = client.own(session->createFileInfoVector(), &Session::destroyFileInfoVector);
     EXPECT_EQ(client.take(area->list(path("/"), 2, *entries)), 0u) << client.lastMessage();
     std::vector<std::string> names;
     for (unsigned i = 0; i < entries->entries(); ++i) {
         IZELServerString& whole = client.text();
+        IZELServerString& name = client.text();
         entries->element(i)->getPath().getAbsolutePath(whole);
-        names.push_back(whole.c_str());
+        entries->element(i)->getPath().getName(name);
+        names.push_back(std::string(whole.c_str()) + " " + name.c_str());
     }
     // The server writes entry paths in its relative form, and the library keeps them as written.
-    EXPECT_EQ(names, (std::vector<std::string>{"a", "a/b", "a/b/f.txt", "h.txt"}));
-    session->destroyFileInfoVector(&entries);
+    EXPECT_EQ(names, (std::vector<std::string>{"a a", "a/b b", "a/b/f.txt f.txt", "h.txt h.txt"}));
 
-    unsigned received = 0;
-    EXPECT_EQ(client.take(area->download(path("/h.txt"), client.text(local("back.txt")), received, nullptr)), 0u);
-    EXPECT_EQ(received, 1u);
+    EXPECT_EQ(download(path("/h.txt"), "back.txt"), 1);
     EXPECT_EQ(readAll(local("back.txt")), "twelve bytes");
-
-    unsigned removed = 0;
-    EXPECT_EQ(client.take(area->remove(path("/a"), removed)), 0u);
-    EXPECT_EQ(removed, 1u);
+    EXPECT_EQ(client.flag([&](unsigned& f) { return area->remove(path("/a"), f); }), 1);
     EXPECT_FALSE(std::filesystem::exists(onDisk("a")));
 }
 
 TEST_F(SharedResources, FileOperationsOnMissingEntriesAreRefused)
 {
-    writeFile(local("src.txt"), "x");
-    EXPECT_EQ(client.take(area->upload(client.text(local("src.txt")), path("/no/dir", "f.txt"), nullptr)), 393625u);
-    EXPECT_EQ(client.take(area->copy(path("/none.txt"), path("/x.txt"))), 393625u);
-    EXPECT_EQ(client.take(area->move(path("/none.txt"), path("/x.txt"))), 393625u);
-    IZELServerFileInfo* info = session->createFileInfo();
+    EXPECT_EQ(upload(path("/no/dir", "f.txt")), kRefused);
+    EXPECT_EQ(client.take(area->copy(path("/none.txt"), path("/x.txt"))), kRefused);
+    EXPECT_EQ(client.take(area->move(path("/none.txt"), path("/x.txt"))), kRefused);
+    auto info = client.own(session->createFileInfo(), &Session::destroyFileInfo);
     EXPECT_NE(client.take(area->getFileInfo(path("/none.txt"), *info)), 0u);
-    session->destroyFileInfo(&info);
-    IZELServerVector<IZELServerFileInfo>* entries = session->createFileInfoVector();
+    auto entries = client.own(session->createFileInfoVector(), &Session::destroyFileInfoVector);
     EXPECT_NE(client.take(area->list(path("/none"), *entries)), 0u);
-    session->destroyFileInfoVector(&entries);
 
-    unsigned flag = 1;
-    EXPECT_EQ(client.take(area->exists(path("/none.txt"), flag)), 0u);
-    EXPECT_EQ(flag, 0u);
-    flag = 1;
-    EXPECT_EQ(client.take(area->remove(path("/none.txt"), flag)), 0u);
-    EXPECT_EQ(flag, 0u);
+    EXPECT_EQ(client.flag([&](unsigned& f) { return area->exists(path("/none.txt"), f); }), 0);
+    EXPECT_EQ(client.flag([&](unsigned& f) { return area->remove(path("/none.txt"), f); }), 0);
     writeFile(local("kept.txt"), "kept");
-    flag = 1;
-    EXPECT_EQ(client.take(area->download(path("/none.txt"), client.text(local("kept.txt")), flag, nullptr)), 0u);
-    EXPECT_EQ(flag, 0u);
+    EXPECT_EQ(download(path("/none.txt"), "kept.txt"), 0);
+    EXPECT_EQ(readAll(local("kept.txt")), "") << "no file is a completed exchange: the target is emptied";
     EXPECT_EQ(client.take(area->makeDirectory(path("/ok"))), 0u);
-    EXPECT_EQ(client.take(area->copy(path("/ok"), path("/ok"))), 393625u) << "a directory copy needs a new name";
+    EXPECT_EQ(client.take(area->copy(path("/ok"), path("/ok"))), kRefused) << "a directory copy needs a new name";
 }
 
 // Every operation that names one of these paths is refused before the server touches its disk.
@@ -141,7 +131,6 @@ TEST_F(SharedResources, PathsLeavingTheResourceAreRefused)
     std::filesystem::create_directories(local("outside"));
     writeFile(local("outside/secret.txt"), "secret");
     ASSERT_EQ(::symlink(local("outside").c_str(), onDisk("escape").c_str()), 0);
-    writeFile(local("src.txt"), "attack");
 
     // Directory and name are sent as given: a whole path would be rooted at the resource ("/C:\\x"),
     // which the server rightly treats as a name inside it.
@@ -152,23 +141,20 @@ TEST_F(SharedResources, PathsLeavingTheResourceAreRefused)
         SCOPED_TRACE(directory + " " + name);
         const IZELServerPath& target = path(directory, name);
         unsigned flag = 7;
-        EXPECT_EQ(client.take(area->exists(target, flag)), 393625u);
-        EXPECT_EQ(client.take(area->upload(client.text(local("src.txt")), target, nullptr)), 393625u);
-        EXPECT_EQ(client.take(area->makeDirectory(target)), 393625u);
-        EXPECT_EQ(client.take(area->remove(target, flag)), 393625u);
-        EXPECT_EQ(client.take(area->copy(target, path("/stolen.txt"))), 393625u);
-        flag = 7;
-        EXPECT_EQ(client.take(area->download(target, client.text(local("stolen.txt")), flag, nullptr)), 0u);
-        EXPECT_EQ(flag, 0u);
+        EXPECT_EQ(client.take(area->exists(target, flag)), kRefused);
+        EXPECT_EQ(upload(target), kRefused);
+        EXPECT_EQ(client.take(area->makeDirectory(target)), kRefused);
+        EXPECT_EQ(client.take(area->remove(target, flag)), kRefused);
+        EXPECT_EQ(client.take(area->copy(target, path("/stolen.txt"))), kRefused);
+        EXPECT_EQ(download(target, "stolen.txt"), 0);
     }
     EXPECT_EQ(readAll(local("outside/secret.txt")), "secret");
     EXPECT_EQ(readAll(local("stolen.txt")), "");
     EXPECT_FALSE(std::filesystem::exists(onDisk("stolen.txt")));
 
-    IZELServerVector<IZELServerFileInfo>* entries = session->createFileInfoVector();
+    auto entries = client.own(session->createFileInfoVector(), &Session::destroyFileInfoVector);
     EXPECT_EQ(client.take(area->list(path("/"), *entries)), 0u);
     EXPECT_EQ(entries->entries(), 0u) << "the link pointing outside is not listed";
-    session->destroyFileInfoVector(&entries);
 }
 
 }  // namespace

@@ -3,8 +3,8 @@
 
 #include "jobs/result_text.h"
 
+#include <optional>
 #include <string>
-#include <vector>
 
 #include <gtest/gtest.h>
 
@@ -13,108 +13,85 @@ using namespace std::string_literals;
 namespace zel {
 namespace {
 
-struct ParseCase {
-    const char* what;
-    std::string text;
-    ResultProperties expected;
-};
-
-class ResultTextParse : public ::testing::TestWithParam<ParseCase> {};
-
-TEST_P(ResultTextParse, GivesExactlyTheseProperties)
-{
-    ResultProperties properties;
-    parseResultEntries(GetParam().text, properties);
-    splitResultValue(properties);
-    EXPECT_EQ(properties, GetParam().expected);
+TEST(ResultText, EntriesGiveExactlyTheseProperties) {
+    const struct {
+        const char* what;
+        std::string text;
+        ResultProperties expected;
+    } cases[] = {
+        {"empty text", "", {}},
+        {"two entries", "jobStatus=SUCCESS\0id=17"s, {{"*jobStatus", "SUCCESS"}, {"*id", "17"}}},
+        {"equals inside the value", "request=a=b=c"s, {{"*request", "a=b=c"}}},
+        {"entry without equals skipped", "junk\0x=1\0more junk"s, {{"*x", "1"}}},
+        {"later entry replaces", "x=1\0y=2\0x=3"s, {{"*x", "3"}, {"*y", "2"}}},
+        {"empty value kept", "x="s, {{"*x", ""}}},
+        {"empty name kept under the bare prefix", "=v"s, {{"*", "v"}}},
+        {"leading, doubled and trailing NULs", "\0\0x=1\0\0y=2\0"s, {{"*x", "1"}, {"*y", "2"}}},
+        {"a name with its own star gets a second one", "*x=1"s, {{"**x", "1"}}},
+        {"value keeps blanks and colons", "t= 12:00 "s, {{"*t", " 12:00 "}}},
+        {"no result entry: nothing split", "StatusNumber=5"s, {{"*StatusNumber", "5"}}},
+        {"result with status and a pair", "result=12:Done|a=b"s,
+         {{"*result", "12:Done|a=b"}, {"StatusNumber", "12"}, {"StatusMessage", "Done"}, {"a", "b"}}},
+        {"later status piece wins", "result=1:A|2:B"s,
+         {{"*result", "1:A|2:B"}, {"StatusNumber", "2"}, {"StatusMessage", "B"}}},
+        {"empty number leaves StatusNumber alone", "result=:Msg"s, {{"*result", ":Msg"}, {"StatusMessage", "Msg"}}},
+        {"empty message leaves StatusMessage alone", "result=7:"s, {{"*result", "7:"}, {"StatusNumber", "7"}}},
+        {"empty side keeps the earlier value", "result=1:A|:B|2:"s,
+         {{"*result", "1:A|:B|2:"}, {"StatusNumber", "2"}, {"StatusMessage", "B"}}},
+        {"message holding a colon", "result=12:x:y"s,
+         {{"*result", "12:x:y"}, {"StatusNumber", "12"}, {"StatusMessage", "x:y"}}},
+        {"first piece without colon ends the status run", "result=x|1:A"s, {{"*result", "x|1:A"}}},
+        {"empty first piece ends the status run", "result=|1:A|k=v"s, {{"*result", "|1:A|k=v"}, {"k", "v"}}},
+        {"status after a pair is ignored, pairs anywhere count", "result=1:A|k=v|2:B|m=n"s,
+         {{"*result", "1:A|k=v|2:B|m=n"}, {"StatusNumber", "1"}, {"StatusMessage", "A"}, {"k", "v"}, {"m", "n"}}},
+        {"a piece with colon and equals is a pair", "result=1:a=b"s, {{"*result", "1:a=b"}, {"1:a", "b"}}},
+        {"equals inside a piece value", "result=a=b=c|d="s, {{"*result", "a=b=c|d="}, {"a", "b=c"}, {"d", ""}}},
+        {"repeated piece names: last wins", "result=a=1|a=2"s, {{"*result", "a=1|a=2"}, {"a", "2"}}},
+        {"empty result value", "result="s, {{"*result", ""}}},
+        {"piece overwriting the result itself", "result=*result=z|k=v"s, {{"*result", "z"}, {"k", "v"}}},
+        {"pieces do not overwrite text entries", "a=text\0result=a=piece"s,
+         {{"*a", "text"}, {"*result", "a=piece"}, {"a", "piece"}}},
+        {"repeated result entry: the last is split", "result=1:A\0result=2:B"s,
+         {{"*result", "2:B"}, {"StatusNumber", "2"}, {"StatusMessage", "B"}}},
+    };
+    for (const auto& c : cases) {
+        ResultProperties properties;
+        parseResultEntries(c.text, properties);
+        splitResultValue(properties);
+        EXPECT_EQ(properties, c.expected) << c.what;
+    }
 }
 
-const ParseCase kParseCases[] = {
-    {"empty text", "", {}},
-    {"two entries", "jobStatus=SUCCESS\0id=17"s, {{"*jobStatus", "SUCCESS"}, {"*id", "17"}}},
-    {"equals inside the value", "request=a=b=c"s, {{"*request", "a=b=c"}}},
-    {"entry without equals skipped", "junk\0x=1\0more junk"s, {{"*x", "1"}}},
-    {"later entry replaces", "x=1\0y=2\0x=3"s, {{"*x", "3"}, {"*y", "2"}}},
-    {"empty value kept", "x="s, {{"*x", ""}}},
-    {"empty name kept under the bare prefix", "=v"s, {{"*", "v"}}},
-    {"leading, doubled and trailing NULs", "\0\0x=1\0\0y=2\0"s, {{"*x", "1"}, {"*y", "2"}}},
-    {"a name with its own star gets a second one", "*x=1"s, {{"**x", "1"}}},
-    {"value keeps blanks and colons", "t= 12:00 "s, {{"*t", " 12:00 "}}},
-    {"no result entry: nothing split", "StatusNumber=5"s, {{"*StatusNumber", "5"}}},
-    {"result with status and a pair", "result=12:Done|a=b"s,
-     {{"*result", "12:Done|a=b"}, {"StatusNumber", "12"}, {"StatusMessage", "Done"}, {"a", "b"}}},
-    {"later status piece wins", "result=1:A|2:B"s,
-     {{"*result", "1:A|2:B"}, {"StatusNumber", "2"}, {"StatusMessage", "B"}}},
-    {"empty number leaves StatusNumber alone", "result=:Msg"s, {{"*result", ":Msg"}, {"StatusMessage", "Msg"}}},
-    {"empty message leaves StatusMessage alone", "result=7:"s, {{"*result", "7:"}, {"StatusNumber", "7"}}},
-    {"empty side keeps the earlier value", "result=1:A|:B|2:"s,
-     {{"*result", "1:A|:B|2:"}, {"StatusNumber", "2"}, {"StatusMessage", "B"}}},
-    {"message holding a colon", "result=12:x:y"s,
-     {{"*result", "12:x:y"}, {"StatusNumber", "12"}, {"StatusMessage", "x:y"}}},
-    {"first piece without colon ends the status run", "result=x|1:A"s, {{"*result", "x|1:A"}}},
-    {"empty first piece ends the status run", "result=|1:A|k=v"s, {{"*result", "|1:A|k=v"}, {"k", "v"}}},
-    {"status after a pair is ignored, pairs anywhere count", "result=1:A|k=v|2:B|m=n"s,
-     {{"*result", "1:A|k=v|2:B|m=n"}, {"StatusNumber", "1"}, {"StatusMessage", "A"}, {"k", "v"}, {"m", "n"}}},
-    {"a piece with colon and equals is a pair", "result=1:a=b"s, {{"*result", "1:a=b"}, {"1:a", "b"}}},
-    {"equals inside a piece value", "result=a=b=c|d="s, {{"*result", "a=b=c|d="}, {"a", "b=c"}, {"d", ""}}},
-    {"repeated piece names: last wins", "result=a=1|a=2"s, {{"*result", "a=1|a=2"}, {"a", "2"}}},
-    {"empty result value", "result="s, {{"*result", ""}}},
-    {"piece overwriting the result itself", "result=*result=z|k=v"s, {{"*result", "z"}, {"k", "v"}}},
-    {"pieces do not overwrite text entries", "a=text\0result=a=piece"s,
-     {{"*a", "text"}, {"*result", "a=piece"}, {"a", "piece"}}},
-    {"repeated result entry: the last is split", "result=1:A\0result=2:B"s,
-     {{"*result", "2:B"}, {"StatusNumber", "2"}, {"StatusMessage", "B"}}},
-};
-
-INSTANTIATE_TEST_SUITE_P(Table, ResultTextParse, ::testing::ValuesIn(kParseCases),
-                         [](const auto& info) { return "case" + std::to_string(info.index); });
-
-TEST(ResultTextParse, AddsToExistingPropertiesWithoutRemoving)
-{
+TEST(ResultText, ParsingAddsToExistingPropertiesAndSplittingNeedsThePrefixedResult) {
     ResultProperties properties{{"*kept", "1"}, {"*x", "old"}};
     parseResultEntries("x=new\0y=2"s, properties);
     EXPECT_EQ(properties, (ResultProperties{{"*kept", "1"}, {"*x", "new"}, {"*y", "2"}}));
+
+    ResultProperties unprefixed{{"result", "1:A"}};
+    splitResultValue(unprefixed);
+    EXPECT_EQ(unprefixed, (ResultProperties{{"result", "1:A"}}));
 }
 
-TEST(ResultTextParse, SplitWithoutResultChangesNothing)
-{
-    ResultProperties properties{{"result", "1:A"}};
-    splitResultValue(properties);
-    EXPECT_EQ(properties, (ResultProperties{{"result", "1:A"}}));
-}
-
-struct StatusWordCase {
-    const char* word;
-    int code;  // -1: not a status word
-};
-
-class JobStatusWords : public ::testing::TestWithParam<StatusWordCase> {};
-
-TEST_P(JobStatusWords, MapToTheirCode)
-{
-    const std::optional<unsigned> code = jobStatusCode(GetParam().word);
-    if (GetParam().code < 0) {
-        EXPECT_FALSE(code.has_value());
-        return;
+TEST(ResultText, JobStatusWordsMapToTheirCodesAndBack) {
+    const struct {
+        const char* word;
+        int code;  // -1: not a status word
+    } cases[] = {
+        {"SUBMITTED", 0}, {"QUEUED", 1}, {"DELAYED", 2}, {"PAUSED", 3}, {"IN_PROCESS", 4}, {"DELETED", 5},
+        {"ABORTED", 6}, {"SUCCESS", 7}, {"ZEL_FAILURE", 8}, {"JOB_FAILURE", 9}, {"PULLED", 10},
+        {"success", -1}, {"SUCCESS ", -1}, {" SUCCESS", -1}, {"", -1}, {"FAILURE", -1}, {"IN PROCESS", -1},
+        {"SUCCESSFUL", -1},
+    };
+    for (const auto& c : cases) {
+        const std::optional<unsigned> code = jobStatusCode(c.word);
+        if (c.code < 0) {
+            EXPECT_FALSE(code.has_value()) << c.word;
+            continue;
+        }
+        ASSERT_TRUE(code.has_value()) << c.word;
+        EXPECT_EQ(*code, static_cast<unsigned>(c.code));
+        EXPECT_STREQ(jobStatusWord(*code), c.word);
     }
-    ASSERT_TRUE(code.has_value());
-    EXPECT_EQ(*code, static_cast<unsigned>(GetParam().code));
-    EXPECT_STREQ(jobStatusWord(*code), GetParam().word);
-}
-
-const StatusWordCase kStatusWords[] = {
-    {"SUBMITTED", 0}, {"QUEUED", 1},      {"DELAYED", 2},     {"PAUSED", 3},
-    {"IN_PROCESS", 4}, {"DELETED", 5},    {"ABORTED", 6},     {"SUCCESS", 7},
-    {"ZEL_FAILURE", 8}, {"JOB_FAILURE", 9}, {"PULLED", 10},
-    {"success", -1},  {"SUCCESS ", -1},   {" SUCCESS", -1},   {"", -1},
-    {"FAILURE", -1},  {"IN PROCESS", -1}, {"SUCCESSFUL", -1},
-};
-
-INSTANTIATE_TEST_SUITE_P(Table, JobStatusWords, ::testing::ValuesIn(kStatusWords),
-                         [](const auto& info) { return "case" + std::to_string(info.index); });
-
-TEST(JobStatusWords, NoWordPastTheLastCode)
-{
     EXPECT_EQ(jobStatusWord(11), nullptr);
     EXPECT_EQ(jobStatusWord(0xFFFFFFFFu), nullptr);
 }

@@ -20,23 +20,26 @@ using namespace std::string_literals;
 namespace zel {
 namespace {
 
-constexpr const char* kDeclaration = R"(<?xml version="1.0" encoding="UTF-8" standalone="no" ?>)";
+using Request = ZELServerTransformationRequest;
+using Pairs = std::vector<std::string>;
 
 ZELServerString str(const std::string& text) { return ZELServerString(text); }
 
-std::string requestText(const IZELServerTransformationRequest& request)
-{
+std::string requestText(const IZELServerTransformationRequest& request) {
     ZELServerString out;
     request.getRequestText(out);
     return out.str();
 }
 
-std::string textFor(const std::string& path, const std::string& elements)
-{
+std::string textFor(const std::string& path, const std::string& elements) {
     const std::string document = elements.empty()
                                      ? "<TRANSFORMATION_REQUEST/>"
                                      : "<TRANSFORMATION_REQUEST>" + elements + "</TRANSFORMATION_REQUEST>";
-    return path + " -XML_PARAMETER " + kDeclaration + document;
+    return path + " -XML_PARAMETER " + R"(<?xml version="1.0" encoding="UTF-8" standalone="no" ?>)" + document;
+}
+
+std::string parameter(const std::string& name, const std::string& value) {
+    return "<PUBLISHED_PARAMETER name=\"" + name + "\">" + value + "</PUBLISHED_PARAMETER>";
 }
 
 // A workspace of the repository model whose only answer is its name: the request must not ask it
@@ -59,278 +62,41 @@ public:
     long long getFileSize() const override { unexpected(); }
 
 private:
-    [[noreturn]] static void unexpected()
-    {
+    [[noreturn]] static void unexpected() {
         ADD_FAILURE() << "the request read more than the workspace's name";
         std::abort();
     }
     std::string name_;
 };
 
-// ---- Workspace paths ----------------------------------------------------------------------------------
+// ---- Workspace paths and factories
 
-struct PathCase {
-    std::string repository;
-    std::string workspace;
-    std::string path;
-};
-
-class WorkspacePath : public ::testing::TestWithParam<PathCase> {};
-
-TEST_P(WorkspacePath, DropsFourCharactersForTheFolder)
-{
-    const PathCase& c = GetParam();
-    EXPECT_EQ(workspacePathOf(c.repository, c.workspace), c.path);
-
-    ZELServerTransformationRequest byName(str("S"), str(c.repository), str(c.workspace));
-    EXPECT_EQ(byName.workspacePath(), c.path);
-    ZELServerTransformationRequest byObject(str("S"), str(c.repository), NamedWorkspace(c.workspace));
-    EXPECT_EQ(byObject.workspacePath(), c.path);
-}
-
-const PathCase kPathCases[] = {
-    {"R", "w.ext", "R/w/w.ext"},
-    {"Samples", "austria.fmw", "Samples/austria/austria.fmw"},
-    // Four characters, whatever they are.
-    {"R", "x.fmwt", "R/x./x.fmwt"},
-    {"R", "noextension", "R/noexten/noextension"},
-    {"R", "abcd", "R//abcd"},
-    // Shorter names lose everything they have, and nothing before them.
-    {"R", "abc", "R//abc"},
-    {"R", "a", "R//a"},
-    {"R", "", "R//"},
-    {"", "w.ext", "/w/w.ext"},
-};
-
-INSTANTIATE_TEST_SUITE_P(Table, WorkspacePath, ::testing::ValuesIn(kPathCases),
-                         [](const auto& info) { return "case" + std::to_string(info.index); });
-
-TEST(TransformationRequest, PathFormTakesThePathAsGiven)
-{
-    ZELServerTransformationRequest request(str("S"), str("any/thing here.fmw"));
-    EXPECT_EQ(request.workspacePath(), "any/thing here.fmw");
-    EXPECT_EQ(requestText(request), textFor("any/thing here.fmw", ""));
-}
-
-// ---- Request text -------------------------------------------------------------------------------------
-
-TEST(TransformationRequest, WithoutParametersTheTextIsPathAndEmptyDocument)
-{
-    ZELServerTransformationRequest request(str("S"), str("R"), str("w.ext"));
-    EXPECT_EQ(requestText(request), "R/w/w.ext -XML_PARAMETER "s + kDeclaration + "<TRANSFORMATION_REQUEST/>");
-}
-
-TEST(TransformationRequest, ParametersInNameOrderThenEmbeddedDirectives)
-{
-    ZELServerTransformationRequest request(str("S"), str("R"), str("w.ext"));
-    request.setEmbeddedDirective(str("LOG_LEVEL"), str("2"));
-    request.setPublishedParameter(str("ZONE"), str("north"));
-    request.setPublishedParameter(str("AREA"), str("a<b & c>d"));
-    EXPECT_EQ(requestText(request),
-              textFor("R/w/w.ext", R"(<PUBLISHED_PARAMETER name="AREA">a&lt;b &amp; c&gt;d</PUBLISHED_PARAMETER>)"
-                                   R"(<PUBLISHED_PARAMETER name="ZONE">north</PUBLISHED_PARAMETER>)"
-                                   R"(<ZEL_DIRECTIVE name="LOG_LEVEL">2</ZEL_DIRECTIVE>)"));
-}
-
-TEST(TransformationRequest, ParameterSetTwiceKeepsTheSecondValue)
-{
-    ZELServerTransformationRequest request(str("S"), str("R"), str("w.ext"));
-    request.setPublishedParameter(str("P"), str("first"));
-    request.setPublishedParameter(str("P"), str("second"));
-    EXPECT_EQ(requestText(request), textFor("R/w/w.ext", R"(<PUBLISHED_PARAMETER name="P">second</PUBLISHED_PARAMETER>)"));
-}
-
-TEST(TransformationRequest, AttributeQuotesAreEscaped)
-{
-    ZELServerTransformationRequest request(str("S"), str("p"));
-    request.setPublishedParameter(str("a\"b"), str(""));
-    const std::string text = requestText(request);
-    EXPECT_NE(text.find(R"(name="a&quot;b")"), std::string::npos) << text;
-}
-
-TEST(TransformationRequest, LocalCodePageTextBecomesUtf8)
-{
-    ZELServerTransformationRequest request(str("S"), str("p"));
-    request.setPublishedParameter(str("CITY"), str("Z\xFCrich"));
-    EXPECT_EQ(requestText(request), textFor("p", "<PUBLISHED_PARAMETER name=\"CITY\">Z\xC3\xBCrich</PUBLISHED_PARAMETER>"));
-}
-
-TEST(TransformationRequest, TextThatCannotBeWrittenLeavesOutUntouchedAndStaysDirty)
-{
-    ZELServerTransformationRequest request(str("S"), str("p"));
-    request.setPublishedParameter(str("P"), str("a\0b"s));
-    ZELServerString out("before");
-    request.getRequestText(out);
-    EXPECT_EQ(out.str(), "before");
-    EXPECT_TRUE(request.dirty());
-
-    // Once the value is fixed the next call composes it.
-    request.setPublishedParameter(str("P"), str("ab"));
-    EXPECT_EQ(requestText(request), textFor("p", R"(<PUBLISHED_PARAMETER name="P">ab</PUBLISHED_PARAMETER>)"));
-    EXPECT_FALSE(request.dirty());
-}
-
-TEST(TransformationRequest, XmlSupportThatCannotBeMadeIsTriedAgain)
-{
-    ZELServerTransformationRequest request(str("S"), str("p"));
-    heap::failNextAllocations(1);
-    ZELServerString out("before");
-    request.getRequestText(out);
-    EXPECT_EQ(out.str(), "before");
-    EXPECT_TRUE(request.dirty());
-    EXPECT_EQ(requestText(request), textFor("p", ""));
-}
-
-// ---- Dirty flag ---------------------------------------------------------------------------------------
-
-TEST(TransformationRequest, EmbeddedDirectivesDoNotRecomposeUntilKeywordIsSetAgain)
-{
-    ZELServerTransformationRequest request(str("S"), str("p"));
-    EXPECT_TRUE(request.dirty());
-    const std::string first = requestText(request);
-    EXPECT_FALSE(request.dirty());
-
-    request.setEmbeddedDirective(str("D"), str("1"));
-    request.setEmbeddedDirectives(ZELServerStringArray(std::vector<std::string>{"E", "2"}));
-    EXPECT_FALSE(request.dirty());
-    EXPECT_EQ(requestText(request), first);
-
-    request.setKeyword(str("S"));
-    EXPECT_TRUE(request.dirty());
-    EXPECT_EQ(requestText(request), textFor("p", R"(<ZEL_DIRECTIVE name="D">1</ZEL_DIRECTIVE>)"
-                                                 R"(<ZEL_DIRECTIVE name="E">2</ZEL_DIRECTIVE>)"));
-}
-
-struct DirtyCase {
-    const char* what;
-    void (*change)(ZELServerTransformationRequest&);
-    bool dirty;
-};
-
-class DirtyFlag : public ::testing::TestWithParam<DirtyCase> {};
-
-TEST_P(DirtyFlag, OnlyKeywordAndPublishedParametersSetIt)
-{
-    ZELServerTransformationRequest request(str("S"), str("p"));
-    requestText(request);
-    ASSERT_FALSE(request.dirty());
-    GetParam().change(request);
-    EXPECT_EQ(request.dirty(), GetParam().dirty) << GetParam().what;
-}
-
-const DirtyCase kDirtyCases[] = {
-    {"keyword", [](ZELServerTransformationRequest& r) { r.setKeyword(str("other")); }, true},
-    {"one parameter", [](ZELServerTransformationRequest& r) { r.setPublishedParameter(str("P"), str("1")); }, true},
-    {"parameter list", [](ZELServerTransformationRequest& r) { r.setPublishedParameters(ZELServerStringArray()); }, true},
-    {"directive", [](ZELServerTransformationRequest& r) { r.setDirective(str("D"), str("1")); }, false},
-    {"directive list",
-     [](ZELServerTransformationRequest& r) { r.setDirectives(ZELServerStringArray(std::vector<std::string>{"D", "1"})); },
-     false},
-    {"embedded directive", [](ZELServerTransformationRequest& r) { r.setEmbeddedDirective(str("E"), str("1")); }, false},
-    {"notification", [](ZELServerTransformationRequest& r) { r.setNotification(str("T"), str("m")); }, false},
-    {"notification list",
-     [](ZELServerTransformationRequest& r) {
-         r.setNotifications(ZELServerStringArray(std::vector<std::string>{"T", "m"}));
-     },
-     false},
-};
-
-INSTANTIATE_TEST_SUITE_P(Table, DirtyFlag, ::testing::ValuesIn(kDirtyCases),
-                         [](const auto& info) { return "case" + std::to_string(info.index); });
-
-// ---- Dictionaries -------------------------------------------------------------------------------------
-
-TEST(TransformationRequest, KeywordIsKeptWithItsBytes)
-{
-    ZELServerTransformationRequest request(str(" svc "), str("p"));
-    ZELServerString keyword;
-    request.getKeyword(keyword);
-    EXPECT_EQ(keyword.str(), " svc ");
-    request.setKeyword(str("a\0b"s));
-    request.getKeyword(keyword);
-    EXPECT_EQ(keyword.str(), "a\0b"s);
-}
-
-using SetAll = void (ZELServerTransformationRequest::*)(const IZELServerStringArray&);
-using SetOne = void (ZELServerTransformationRequest::*)(const IZELServerString&, const IZELServerString&);
-using GetOne = unsigned (ZELServerTransformationRequest::*)(const IZELServerString&, IZELServerString&) const;
-using GetAll = void (ZELServerTransformationRequest::*)(IZELServerStringArray&) const;
-
-struct Dictionary {
-    const char* what;
-    SetOne setOne;
-    SetAll setAll;
-    GetOne getOne;
-    GetAll getAll;
-};
-
-class RequestDictionary : public ::testing::TestWithParam<Dictionary> {};
-
-TEST_P(RequestDictionary, PairsReplaceByNameAndComeOutInNameOrder)
-{
-    const Dictionary& d = GetParam();
-    ZELServerTransformationRequest request(str("S"), str("p"));
-    (request.*d.setAll)(ZELServerStringArray(std::vector<std::string>{"b", "1", "a", "2", "b", "3", "odd"}));
-    (request.*d.setOne)(str("c"), str("4"));
-    (request.*d.setOne)(str("a"), str("5"));
-
-    ZELServerStringArray all(std::vector<std::string>{"kept"});
-    (request.*d.getAll)(all);
-    EXPECT_EQ(all.items(), (std::vector<std::string>{"kept", "a", "5", "b", "3", "c", "4"})) << d.what;
-
-    ZELServerString value("untouched");
-    EXPECT_EQ((request.*d.getOne)(str("b"), value), 1u) << d.what;
-    EXPECT_EQ(value.str(), "3") << d.what;
-    value.assign("untouched");
-    EXPECT_EQ((request.*d.getOne)(str("odd"), value), 0u) << d.what;
-    EXPECT_EQ(value.str(), "untouched") << d.what;
-}
-
-TEST_P(RequestDictionary, DictionariesAreSeparate)
-{
-    const Dictionary& d = GetParam();
-    ZELServerTransformationRequest request(str("S"), str("p"));
-    (request.*d.setOne)(str("only"), str("here"));
-    const Dictionary all[] = {
-        {"published", &ZELServerTransformationRequest::setPublishedParameter, nullptr,
-         &ZELServerTransformationRequest::getPublishedParameter, &ZELServerTransformationRequest::getPublishedParameters},
-        {"directives", &ZELServerTransformationRequest::setDirective, nullptr,
-         &ZELServerTransformationRequest::getDirective, &ZELServerTransformationRequest::getDirectives},
-        {"embedded", &ZELServerTransformationRequest::setEmbeddedDirective, nullptr,
-         &ZELServerTransformationRequest::getEmbeddedDirective, &ZELServerTransformationRequest::getEmbeddedDirectives},
-        {"notifications", &ZELServerTransformationRequest::setNotification, nullptr,
-         &ZELServerTransformationRequest::getNotification, &ZELServerTransformationRequest::getNotifications},
+TEST(TransformationRequest, WorkspacePathDropsFourCharactersForTheFolder) {
+    const struct {
+        std::string repository;
+        std::string workspace;
+        std::string path;
+    } cases[] = {
+        {"R", "w.ext", "R/w/w.ext"}, {"Samples", "austria.fmw", "Samples/austria/austria.fmw"},
+        // Four characters, whatever they are.
+        {"R", "x.fmwt", "R/x./x.fmwt"}, {"R", "noextension", "R/noexten/noextension"}, {"R", "abcd", "R//abcd"},
+        // Shorter names lose everything they have, and nothing before them.
+        {"R", "abc", "R//abc"}, {"R", "a", "R//a"}, {"R", "", "R//"}, {"", "w.ext", "/w/w.ext"},
     };
-    for (const Dictionary& other : all) {
-        ZELServerStringArray pairs;
-        (request.*other.getAll)(pairs);
-        EXPECT_EQ(pairs.entries(), other.getAll == d.getAll ? 2u : 0u) << d.what << " seen in " << other.what;
+    for (const auto& c : cases) {
+        SCOPED_TRACE(c.repository + " " + c.workspace);
+        EXPECT_EQ(workspacePathOf(c.repository, c.workspace), c.path);
+        EXPECT_EQ(Request(str("S"), str(c.repository), str(c.workspace)).workspacePath(), c.path);
+        EXPECT_EQ(Request(str("S"), str(c.repository), NamedWorkspace(c.workspace)).workspacePath(), c.path);
     }
+    // The path form takes the path as given.
+    const Request byPath(str("S"), str("any/thing here.fmw"));
+    EXPECT_EQ(byPath.workspacePath(), "any/thing here.fmw");
+    EXPECT_EQ(requestText(byPath), textFor("any/thing here.fmw", ""));
 }
 
-const Dictionary kDictionaries[] = {
-    {"published", &ZELServerTransformationRequest::setPublishedParameter,
-     &ZELServerTransformationRequest::setPublishedParameters, &ZELServerTransformationRequest::getPublishedParameter,
-     &ZELServerTransformationRequest::getPublishedParameters},
-    {"directives", &ZELServerTransformationRequest::setDirective, &ZELServerTransformationRequest::setDirectives,
-     &ZELServerTransformationRequest::getDirective, &ZELServerTransformationRequest::getDirectives},
-    {"embedded", &ZELServerTransformationRequest::setEmbeddedDirective,
-     &ZELServerTransformationRequest::setEmbeddedDirectives, &ZELServerTransformationRequest::getEmbeddedDirective,
-     &ZELServerTransformationRequest::getEmbeddedDirectives},
-    {"notifications", &ZELServerTransformationRequest::setNotification,
-     &ZELServerTransformationRequest::setNotifications, &ZELServerTransformationRequest::getNotification,
-     &ZELServerTransformationRequest::getNotifications},
-};
-
-INSTANTIATE_TEST_SUITE_P(Table, RequestDictionary, ::testing::ValuesIn(kDictionaries),
-                         [](const auto& info) { return std::string(info.param.what); });
-
-// ---- Factories ----------------------------------------------------------------------------------------
-
-TEST(TransformationRequestFactory, ThreeFormsMakeTheirPaths)
-{
-    std::unique_ptr<IZELServerTransformationRequest> byName(
-        makeTransformationRequest(str("S"), str("R"), str("w.ext")));
+TEST(TransformationRequest, FactoriesMakeTheThreeFormsOrNullOnAnExhaustedHeap) {
+    std::unique_ptr<IZELServerTransformationRequest> byName(makeTransformationRequest(str("S"), str("R"), str("w.ext")));
     std::unique_ptr<IZELServerTransformationRequest> byPath(makeTransformationRequest(str("S"), str("R/x/y")));
     std::unique_ptr<IZELServerTransformationRequest> byObject(
         makeTransformationRequest(str("S"), str("R"), NamedWorkspace("v.ext")));
@@ -341,12 +107,154 @@ TEST(TransformationRequestFactory, ThreeFormsMakeTheirPaths)
     ZELServerString keyword;
     byObject->getKeyword(keyword);
     EXPECT_EQ(keyword.str(), "S");
-}
 
-TEST(TransformationRequestFactory, ExhaustedHeapGivesNull)
-{
     heap::failNextAllocations(1);
     EXPECT_EQ(makeTransformationRequest(str("S"), str("R/x/y")), nullptr);
+}
+
+// ---- Request text
+
+TEST(TransformationRequest, ParametersInNameOrderWithTheLastValueThenEmbeddedDirectives) {
+    Request request(str("S"), str("R"), str("w.ext"));
+    request.setEmbeddedDirective(str("LOG_LEVEL"), str("2"));
+    request.setPublishedParameter(str("ZONE"), str("first"));
+    request.setPublishedParameter(str("AREA"), str("a<b & c>d"));
+    request.setPublishedParameter(str("ZONE"), str("north"));
+    EXPECT_EQ(requestText(request), textFor("R/w/w.ext", parameter("AREA", "a&lt;b &amp; c&gt;d") +
+                                                             parameter("ZONE", "north") +
+                                                             R"(<ZEL_DIRECTIVE name="LOG_LEVEL">2</ZEL_DIRECTIVE>)"));
+}
+
+TEST(TransformationRequest, AttributeQuotesAreEscapedAndLocalCodePageTextBecomesUtf8) {
+    Request request(str("S"), str("p"));
+    request.setPublishedParameter(str("a\"b"), str(""));
+    request.setPublishedParameter(str("CITY"), str("Z\xFCrich"));
+    EXPECT_EQ(requestText(request), textFor("p", parameter("CITY", "Z\xC3\xBCrich") +
+                                                     R"(<PUBLISHED_PARAMETER name="a&quot;b"></PUBLISHED_PARAMETER>)"));
+}
+
+TEST(TransformationRequest, TextThatCannotBeWrittenLeavesOutUntouchedAndStaysDirty) {
+    Request request(str("S"), str("p"));
+    request.setPublishedParameter(str("P"), str("a\0b"s));
+    ZELServerString out("before");
+    request.getRequestText(out);
+    EXPECT_EQ(out.str(), "before");
+    EXPECT_TRUE(request.dirty());
+
+    // Once the value is fixed the next call composes it.
+    request.setPublishedParameter(str("P"), str("ab"));
+    EXPECT_EQ(requestText(request), textFor("p", parameter("P", "ab")));
+    EXPECT_FALSE(request.dirty());
+}
+
+TEST(TransformationRequest, XmlSupportThatCannotBeMadeIsTriedAgain) {
+    Request request(str("S"), str("p"));
+    heap::failNextAllocations(1);
+    ZELServerString out("before");
+    request.getRequestText(out);
+    EXPECT_EQ(out.str(), "before");
+    EXPECT_TRUE(request.dirty());
+    EXPECT_EQ(requestText(request), textFor("p", ""));
+}
+
+// ---- Dirty flag
+
+TEST(TransformationRequest, EmbeddedDirectivesDoNotRecomposeUntilKeywordIsSetAgain) {
+    Request request(str("S"), str("p"));
+    EXPECT_TRUE(request.dirty());
+    const std::string first = requestText(request);
+    EXPECT_FALSE(request.dirty());
+
+    request.setEmbeddedDirective(str("D"), str("1"));
+    request.setEmbeddedDirectives(ZELServerStringArray(Pairs{"E", "2"}));
+    EXPECT_FALSE(request.dirty());
+    EXPECT_EQ(requestText(request), first);
+
+    request.setKeyword(str("S"));
+    EXPECT_TRUE(request.dirty());
+    EXPECT_EQ(requestText(request), textFor("p", R"(<ZEL_DIRECTIVE name="D">1</ZEL_DIRECTIVE>)"
+                                                 R"(<ZEL_DIRECTIVE name="E">2</ZEL_DIRECTIVE>)"));
+}
+
+TEST(TransformationRequest, OnlyKeywordAndPublishedParametersSetTheDirtyFlag) {
+    const ZELServerStringArray pair(Pairs{"N", "1"});
+    const struct {
+        const char* what;
+        void (*change)(Request&, const ZELServerStringArray&);
+        bool dirty;
+    } cases[] = {
+        {"keyword", [](Request& r, const ZELServerStringArray&) { r.setKeyword(str("other")); }, true},
+        {"one parameter", [](Request& r, const ZELServerStringArray&) { r.setPublishedParameter(str("P"), str("1")); }, true},
+        {"parameter list", [](Request& r, const ZELServerStringArray& p) { r.setPublishedParameters(p); }, true},
+        {"directive", [](Request& r, const ZELServerStringArray&) { r.setDirective(str("D"), str("1")); }, false},
+        {"directive list", [](Request& r, const ZELServerStringArray& p) { r.setDirectives(p); }, false},
+        {"embedded directive", [](Request& r, const ZELServerStringArray&) { r.setEmbeddedDirective(str("E"), str("1")); }, false},
+        {"notification", [](Request& r, const ZELServerStringArray&) { r.setNotification(str("T"), str("m")); }, false},
+        {"notification list", [](Request& r, const ZELServerStringArray& p) { r.setNotifications(p); }, false},
+    };
+    for (const auto& c : cases) {
+        Request request(str("S"), str("p"));
+        requestText(request);
+        ASSERT_FALSE(request.dirty());
+        c.change(request, pair);
+        EXPECT_EQ(request.dirty(), c.dirty) << c.what;
+    }
+}
+
+// ---- Dictionaries
+
+TEST(TransformationRequest, KeywordIsKeptWithItsBytes) {
+    Request request(str(" svc "), str("p"));
+    ZELServerString keyword;
+    request.getKeyword(keyword);
+    EXPECT_EQ(keyword.str(), " svc ");
+    request.setKeyword(str("a\0b"s));
+    request.getKeyword(keyword);
+    EXPECT_EQ(keyword.str(), "a\0b"s);
+}
+
+struct Dictionary {
+    const char* what;
+    void (Request::*setOne)(const IZELServerString&, const IZELServerString&);
+    void (Request::*setAll)(const IZELServerStringArray&);
+    unsigned (Request::*getOne)(const IZELServerString&, IZELServerString&) const;
+    void (Request::*getAll)(IZELServerStringArray&) const;
+};
+
+const Dictionary kDictionaries[] = {
+    {"published", &Request::setPublishedParameter, &Request::setPublishedParameters, &Request::getPublishedParameter,
+     &Request::getPublishedParameters},
+    {"directives", &Request::setDirective, &Request::setDirectives, &Request::getDirective, &Request::getDirectives},
+    {"embedded", &Request::setEmbeddedDirective, &Request::setEmbeddedDirectives, &Request::getEmbeddedDirective,
+     &Request::getEmbeddedDirectives},
+    {"notifications", &Request::setNotification, &Request::setNotifications, &Request::getNotification,
+     &Request::getNotifications},
+};
+
+TEST(TransformationRequest, DictionaryPairsReplaceByNameComeOutInNameOrderAndStayApart) {
+    for (const Dictionary& d : kDictionaries) {
+        SCOPED_TRACE(d.what);
+        Request request(str("S"), str("p"));
+        (request.*d.setAll)(ZELServerStringArray(Pairs{"b", "1", "a", "2", "b", "3", "odd"}));
+        (request.*d.setOne)(str("c"), str("4"));
+        (request.*d.setOne)(str("a"), str("5"));
+
+        ZELServerStringArray all(Pairs{"kept"});
+        (request.*d.getAll)(all);
+        EXPECT_EQ(all.items(), (Pairs{"kept", "a", "5", "b", "3", "c", "4"}));
+        ZELServerString value("untouched");
+        EXPECT_EQ((request.*d.getOne)(str("b"), value), 1u);
+        EXPECT_EQ(value.str(), "3");
+        value.assign("untouched");
+        EXPECT_EQ((request.*d.getOne)(str("odd"), value), 0u);
+        EXPECT_EQ(value.str(), "untouched");
+
+        for (const Dictionary& other : kDictionaries) {
+            ZELServerStringArray pairs;
+            (request.*other.getAll)(pairs);
+            EXPECT_EQ(pairs.entries(), other.getAll == d.getAll ? 6u : 0u) << "seen in " << other.what;
+        }
+    }
 }
 
 }  // namespace

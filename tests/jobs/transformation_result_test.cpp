@@ -19,79 +19,48 @@ using namespace std::string_literals;
 namespace zel {
 namespace {
 
+using Result = ZELServerTransformationResult;
 constexpr unsigned kUntouched = 0xDEADBEEFu;
 
-std::unique_ptr<ZELServerTransformationResult> parsed(const std::string& text)
-{
-    auto result = std::make_unique<ZELServerTransformationResult>();
+std::unique_ptr<Result> parsed(const std::string& text) {
+    auto result = std::make_unique<Result>();
     result->parse(ZELServerString(text));
     return result;
 }
 
-// ---- Unsigned getters -------------------------------------------------------------------------------
+// ---- Numbers
 
-struct UIntCase {
-    const char* what;
-    std::string text;
-    unsigned found;
-    unsigned value;  // kUntouched when the out value must stay as it was
-};
-
-class ResultIdGetter : public ::testing::TestWithParam<UIntCase> {};
-
-TEST_P(ResultIdGetter, ConvertsLikeTheServerWritesNumbers)
-{
-    const auto result = parsed(GetParam().text);
-    unsigned id = kUntouched;
-    EXPECT_EQ(result->getID(id), GetParam().found);
-    EXPECT_EQ(id, GetParam().value);
+TEST(TransformationResult, UnsignedGettersConvertLikeTheServerWritesNumbers) {
+    using Getter = unsigned (Result::*)(unsigned&) const;
+    const Getter id = &Result::getID;
+    const Getter port = &Result::getRequesterResultPort;  // refuses a minus sign
+    const struct {
+        Getter get;
+        std::string text;
+        unsigned found;
+        unsigned value;  // kUntouched when the out value must stay as it was
+    } cases[] = {
+        {id, "id=17", 1, 17}, {id, "id=   17", 1, 17}, {id, "id=0x1F", 1, 31}, {id, "id=0XfF", 1, 255},
+        {id, "id=12.000  ", 1, 12}, {id, "id=4294967295", 1, 4294967295u},
+        {id, "id=-1", 1, 4294967295u},  // a minus wraps like the server's reader
+        // other text behind the number: stored, not found
+        {id, "id=12abc", 0, 12}, {id, "id=12.5", 0, 12}, {port, "requesterResultPort=80x", 0, 80},
+        {id, "id=4294967296", 0, kUntouched}, {id, "id=abc", 0, kUntouched}, {id, "id=", 0, kUntouched},
+        {id, "id=   ", 0, kUntouched}, {id, "other=1", 0, kUntouched},
+        {id, "result=id=5", 0, kUntouched},  // a result piece is not the job's id
+        {port, "requesterResultPort=7071", 1, 7071}, {port, "requesterResultPort=0x10", 1, 16},
+        {port, "requesterResultPort=-1", 0, kUntouched}, {port, "requesterResultPort= -5", 0, kUntouched},
+        {port, "", 0, kUntouched},
+    };
+    for (const auto& c : cases) {
+        const auto result = parsed(c.text);
+        unsigned value = kUntouched;
+        EXPECT_EQ(((*result).*c.get)(value), c.found) << c.text;
+        EXPECT_EQ(value, c.value) << c.text;
+    }
 }
 
-const UIntCase kIdCases[] = {
-    {"decimal", "id=17", 1, 17},
-    {"leading blanks", "id=   17", 1, 17},
-    {"hexadecimal", "id=0x1F", 1, 31},
-    {"upper-case hex marker", "id=0XfF", 1, 255},
-    {"zero fraction and trailing blanks", "id=12.000  ", 1, 12},
-    {"largest", "id=4294967295", 1, 4294967295u},
-    {"minus wraps like the server's reader", "id=-1", 1, 4294967295u},
-    {"other text behind the number: stored, not found", "id=12abc", 0, 12},
-    {"real fraction: stored, not found", "id=12.5", 0, 12},
-    {"overflow", "id=4294967296", 0, kUntouched},
-    {"no number", "id=abc", 0, kUntouched},
-    {"empty", "id=", 0, kUntouched},
-    {"blanks only", "id=   ", 0, kUntouched},
-    {"missing", "other=1", 0, kUntouched},
-    {"a result piece is not the job's id", "result=id=5", 0, kUntouched},
-};
-
-INSTANTIATE_TEST_SUITE_P(Table, ResultIdGetter, ::testing::ValuesIn(kIdCases),
-                         [](const auto& info) { return "case" + std::to_string(info.index); });
-
-class ResultPortGetter : public ::testing::TestWithParam<UIntCase> {};
-
-TEST_P(ResultPortGetter, RefusesAMinusSign)
-{
-    const auto result = parsed(GetParam().text);
-    unsigned port = kUntouched;
-    EXPECT_EQ(result->getRequesterResultPort(port), GetParam().found);
-    EXPECT_EQ(port, GetParam().value);
-}
-
-const UIntCase kPortCases[] = {
-    {"decimal", "requesterResultPort=7071", 1, 7071},
-    {"hexadecimal", "requesterResultPort=0x10", 1, 16},
-    {"minus", "requesterResultPort=-1", 0, kUntouched},
-    {"blank then minus", "requesterResultPort= -5", 0, kUntouched},
-    {"trailing text: stored, not found", "requesterResultPort=80x", 0, 80},
-    {"missing", "", 0, kUntouched},
-};
-
-INSTANTIATE_TEST_SUITE_P(Table, ResultPortGetter, ::testing::ValuesIn(kPortCases),
-                         [](const auto& info) { return "case" + std::to_string(info.index); });
-
-TEST(TransformationResult, PriorityAndStatusNumberUseTheirOwnNames)
-{
+TEST(TransformationResult, PriorityStatusNumberAndMessageUseTheirOwnNames) {
     const auto result = parsed("priority=3\0result=42:Finished|x=y"s);
     unsigned priority = kUntouched;
     unsigned number = kUntouched;
@@ -104,113 +73,76 @@ TEST(TransformationResult, PriorityAndStatusNumberUseTheirOwnNames)
     EXPECT_EQ(message.str(), "Finished");
 }
 
-// ---- Job status -------------------------------------------------------------------------------------
+// ---- Job status and booleans
 
-TEST(TransformationResult, SuccessTextGivesCodeSevenAndId)
-{
-    const auto result = parsed("jobStatus=SUCCESS\0id=17"s);
-    unsigned code = kUntouched;
-    unsigned id = 0;
-    EXPECT_EQ(result->getJobStatus(code), 1u);
-    EXPECT_EQ(code, 7u);
-    EXPECT_EQ(result->isSuccess(), 1u);
-    EXPECT_EQ(result->getID(id), 1u);
-    EXPECT_EQ(id, 17u);
-}
-
-struct JobStatusCase {
-    std::string text;
-    unsigned found;
-    unsigned code;
-    unsigned success;
-};
-
-class ResultJobStatus : public ::testing::TestWithParam<JobStatusCase> {};
-
-TEST_P(ResultJobStatus, ComparesTheWholeWordExactly)
-{
-    const auto result = parsed(GetParam().text);
-    unsigned code = kUntouched;
-    EXPECT_EQ(result->getJobStatus(code), GetParam().found);
-    EXPECT_EQ(code, GetParam().code);
-    EXPECT_EQ(result->isSuccess(), GetParam().success);
-}
-
-const JobStatusCase kJobStatusCases[] = {
-    {"jobStatus=QUEUED", 1, 1, 0},
-    {"jobStatus=PULLED", 1, 10, 0},
-    {"jobStatus=JOB_FAILURE", 1, 9, 0},
-    {"jobStatus=success", 0, kUntouched, 0},
-    {"jobStatus=SUCCESS ", 0, kUntouched, 0},
-    {"jobStatus=", 0, kUntouched, 0},
-    {"id=1", 0, kUntouched, 0},
-};
-
-INSTANTIATE_TEST_SUITE_P(Table, ResultJobStatus, ::testing::ValuesIn(kJobStatusCases),
-                         [](const auto& info) { return "case" + std::to_string(info.index); });
-
-// ---- Booleans ---------------------------------------------------------------------------------------
-
-struct BoolCase {
-    std::string value;
-    unsigned found;
-    unsigned flag;
-};
-
-class ResultBoolean : public ::testing::TestWithParam<BoolCase> {};
-
-TEST_P(ResultBoolean, ReadsFirstLetterOrNumber)
-{
-    const auto result = parsed("resultSuccess=" + GetParam().value + "\0serviceSuccess="s + GetParam().value);
-    unsigned flag = kUntouched;
-    EXPECT_EQ(result->getBoolProperty(std::string("resultSuccess"), flag), GetParam().found);
-    EXPECT_EQ(flag, GetParam().found ? GetParam().flag : kUntouched);
-    // The two success getters answer the value itself, and 0 for what does not convert.
-    EXPECT_EQ(result->getResultSuccess(), GetParam().flag);
-    EXPECT_EQ(result->getServiceSuccess(), GetParam().flag);
-}
-
-const BoolCase kBoolCases[] = {
-    {"true", 1, 1}, {"Yes", 1, 1},  {"y", 1, 1},   {"T", 1, 1},   {"false", 1, 0}, {"No", 1, 0},
-    {"f", 1, 0},    {"n", 1, 0},    {"1", 1, 1},   {"0", 1, 0},   {"2.5", 1, 1},   {"0.0", 1, 0},
-    {"-3", 1, 1},   {"abc", 0, 0},  {"", 0, 0},    {"xyes", 0, 0},
-};
-
-INSTANTIATE_TEST_SUITE_P(Table, ResultBoolean, ::testing::ValuesIn(kBoolCases),
-                         [](const auto& info) { return "case" + std::to_string(info.index); });
-
-TEST(TransformationResult, MissingSuccessFlagsReadAsZero)
-{
-    const auto result = parsed("id=1");
-    EXPECT_EQ(result->getResultSuccess(), 0u);
-    EXPECT_EQ(result->getServiceSuccess(), 0u);
-}
-
-// ---- Texts ------------------------------------------------------------------------------------------
-
-TEST(TransformationResult, TextGettersReadTheirProperty)
-{
-    const auto result = parsed(
-        "result=0:ok\0serviceMsg=done\0timeRequested=20240102\0timeStarted=20240103\0timeFinished=20240104\0"
-        "requesterHost=10.0.0.1\0request=R/w/w.ext -XML_PARAMETER x\0requestKeyword=svc\0description=nightly"s);
-    struct Getter {
-        const char* what;
-        unsigned (ZELServerTransformationResult::*get)(IZELServerString&) const;
-        const char* expected;
+TEST(TransformationResult, JobStatusComparesTheWholeWordExactly) {
+    const struct {
+        std::string text;
+        unsigned found;
+        unsigned code;
+        unsigned success;
+    } cases[] = {
+        {"jobStatus=SUCCESS\0id=17"s, 1, 7, 1}, {"jobStatus=QUEUED", 1, 1, 0},
+        {"jobStatus=PULLED", 1, 10, 0}, {"jobStatus=JOB_FAILURE", 1, 9, 0},
+        {"jobStatus=success", 0, kUntouched, 0}, {"jobStatus=SUCCESS ", 0, kUntouched, 0},
+        {"jobStatus=", 0, kUntouched, 0}, {"id=1", 0, kUntouched, 0},
     };
-    const Getter getters[] = {
-        {"result", &ZELServerTransformationResult::getResult, "0:ok"},
-        {"serviceMsg", &ZELServerTransformationResult::getServiceMessage, "done"},
-        {"timeRequested", &ZELServerTransformationResult::getTimeRequested, "20240102"},
-        {"timeStarted", &ZELServerTransformationResult::getTimeStarted, "20240103"},
-        {"timeFinished", &ZELServerTransformationResult::getTimeFinished, "20240104"},
-        {"requesterHost", &ZELServerTransformationResult::getRequesterHost, "10.0.0.1"},
-        {"request", &ZELServerTransformationResult::getRequest, "R/w/w.ext -XML_PARAMETER x"},
-        {"requestKeyword", &ZELServerTransformationResult::getRequestKeyword, "svc"},
-        {"description", &ZELServerTransformationResult::getDescription, "nightly"},
+    for (const auto& c : cases) {
+        const auto result = parsed(c.text);
+        unsigned code = kUntouched;
+        EXPECT_EQ(result->getJobStatus(code), c.found) << c.text;
+        EXPECT_EQ(code, c.code) << c.text;
+        EXPECT_EQ(result->isSuccess(), c.success) << c.text;
+    }
+}
+
+TEST(TransformationResult, BooleansReadFirstLetterOrNumber) {
+    const struct {
+        std::string value;
+        unsigned found;
+        unsigned flag;
+    } cases[] = {
+        {"true", 1, 1}, {"Yes", 1, 1}, {"y", 1, 1}, {"T", 1, 1}, {"false", 1, 0}, {"No", 1, 0},
+        {"f", 1, 0}, {"n", 1, 0}, {"1", 1, 1}, {"0", 1, 0}, {"2.5", 1, 1}, {"0.0", 1, 0},
+        {"-3", 1, 1}, {"abc", 0, 0}, {"", 0, 0}, {"xyes", 0, 0},
+    };
+    for (const auto& c : cases) {
+        const auto result = parsed("resultSuccess=" + c.value + "\0serviceSuccess="s + c.value);
+        unsigned flag = kUntouched;
+        EXPECT_EQ(result->getBoolProperty(std::string("resultSuccess"), flag), c.found) << c.value;
+        EXPECT_EQ(flag, c.found ? c.flag : kUntouched) << c.value;
+        // The two success getters answer the value itself, and 0 for what does not convert.
+        EXPECT_EQ(result->getResultSuccess(), c.flag) << c.value;
+        EXPECT_EQ(result->getServiceSuccess(), c.flag) << c.value;
+    }
+    const auto missing = parsed("id=1");
+    EXPECT_EQ(missing->getResultSuccess(), 0u);
+    EXPECT_EQ(missing->getServiceSuccess(), 0u);
+}
+
+// ---- Texts
+
+TEST(TransformationResult, TextGettersReadTheirProperty) {
+    const auto result = parsed(
+        "result=0:ok\0serviceMsg=a=b\0timeRequested=20240102\0timeStarted=20240103\0timeFinished=20240104\0"
+        "requesterHost=10.0.0.1\0request=R/w/w.ext -XML_PARAMETER x\0requestKeyword=svc\0description=nightly"s);
+    const struct {
+        const char* what;
+        unsigned (Result::*get)(IZELServerString&) const;
+        const char* expected;
+    } getters[] = {
+        {"result", &Result::getResult, "0:ok"},
+        {"serviceMsg", &Result::getServiceMessage, "a=b"},
+        {"timeRequested", &Result::getTimeRequested, "20240102"},
+        {"timeStarted", &Result::getTimeStarted, "20240103"},
+        {"timeFinished", &Result::getTimeFinished, "20240104"},
+        {"requesterHost", &Result::getRequesterHost, "10.0.0.1"},
+        {"request", &Result::getRequest, "R/w/w.ext -XML_PARAMETER x"},
+        {"requestKeyword", &Result::getRequestKeyword, "svc"},
+        {"description", &Result::getDescription, "nightly"},
     };
     const auto empty = parsed("");
-    for (const Getter& getter : getters) {
+    for (const auto& getter : getters) {
         ZELServerString out;
         EXPECT_EQ(((*result).*getter.get)(out), 1u) << getter.what;
         EXPECT_EQ(out.str(), getter.expected) << getter.what;
@@ -218,29 +150,16 @@ TEST(TransformationResult, TextGettersReadTheirProperty)
         EXPECT_EQ(((*empty).*getter.get)(untouched), 0u) << getter.what;
         EXPECT_EQ(untouched.str(), "before") << getter.what;
     }
-}
-
-TEST(TransformationResult, DescriptionNullIsNotFoundButWritten)
-{
-    const auto result = parsed("description=null");
+    // A description of "null" is not found, but still written.
     ZELServerString out("before");
-    EXPECT_EQ(result->getDescription(out), 0u);
+    EXPECT_EQ(parsed("description=null")->getDescription(out), 0u);
     EXPECT_EQ(out.str(), "null");
 }
 
-TEST(TransformationResult, ValuesKeepEmbeddedEqualsAndTheirLength)
-{
-    const auto result = parsed("serviceMsg=a=b\0other=x"s);
-    ZELServerString out;
-    EXPECT_EQ(result->getServiceMessage(out), 1u);
-    EXPECT_EQ(out.str(), "a=b");
-}
+// ---- Generic lookup
 
-// ---- Generic lookup ---------------------------------------------------------------------------------
-
-TEST(TransformationResult, NamesAreFoundWithAndWithoutPrefix)
-{
-    const auto result = parsed("x=1\0result=12:Done|a=b"s);
+TEST(TransformationResult, GenericNamesAreFoundWithAndWithoutPrefixAndPiecesShadowTextEntries) {
+    const auto result = parsed("x=1\0priority=1\0result=12:Done|a=b|priority=9"s);
     std::string value;
     EXPECT_EQ(result->findProperty("x", value), 1u);
     EXPECT_EQ(value, "1");
@@ -250,17 +169,12 @@ TEST(TransformationResult, NamesAreFoundWithAndWithoutPrefix)
     value = "before";
     EXPECT_EQ(result->findProperty("y", value), 0u);
     EXPECT_EQ(value, "before");
-
     ZELServerString out;
     EXPECT_EQ(result->getStringProperty(ZELServerString("a"), out), 1u);
     EXPECT_EQ(out.str(), "b");
-}
 
-TEST(TransformationResult, UnprefixedPieceShadowsTextEntryForGenericNames)
-{
     // A "result" piece is stored without the prefix and is looked up first; the typed getter for the
     // text's own entry still reads the prefixed one.
-    const auto result = parsed("priority=1\0result=priority=9"s);
     unsigned generic = 0;
     unsigned typed = 0;
     EXPECT_EQ(result->getUIntProperty(ZELServerString("priority"), generic), 1u);
@@ -269,32 +183,7 @@ TEST(TransformationResult, UnprefixedPieceShadowsTextEntryForGenericNames)
     EXPECT_EQ(typed, 1u);
 }
 
-struct FloatCase {
-    std::string value;
-    unsigned found;
-    float expected;
-};
-
-class ResultFloat : public ::testing::TestWithParam<FloatCase> {};
-
-TEST_P(ResultFloat, ReadsDecimalFloatingPoint)
-{
-    const auto result = parsed("f=" + GetParam().value);
-    float value = -99.0f;
-    EXPECT_EQ(result->getFloatProperty(ZELServerString("f"), value), GetParam().found);
-    EXPECT_FLOAT_EQ(value, GetParam().found ? GetParam().expected : -99.0f);
-}
-
-const FloatCase kFloatCases[] = {
-    {"1.5", 1, 1.5f}, {"-2e3", 1, -2000.0f}, {" 0.25 ", 1, 0.25f}, {"7", 1, 7.0f},
-    {"abc", 0, 0.0f}, {"", 0, 0.0f},         {"1.5x", 0, 0.0f},
-};
-
-INSTANTIATE_TEST_SUITE_P(Table, ResultFloat, ::testing::ValuesIn(kFloatCases),
-                         [](const auto& info) { return "case" + std::to_string(info.index); });
-
-TEST(TransformationResult, UIntAndBoolByInterfaceName)
-{
+TEST(TransformationResult, GenericNumbersFloatsAndBooleansByInterfaceName) {
     const auto result = parsed("n=0x20\0b=no"s);
     unsigned n = 0;
     unsigned b = kUntouched;
@@ -305,17 +194,30 @@ TEST(TransformationResult, UIntAndBoolByInterfaceName)
     unsigned anyBase = kUntouched;
     EXPECT_EQ(result->getUIntPropertyAnyBase("n", anyBase), 1u);
     EXPECT_EQ(anyBase, 32u);
+
+    const struct {
+        std::string value;
+        unsigned found;
+        float expected;
+    } floats[] = {
+        {"1.5", 1, 1.5f}, {"-2e3", 1, -2000.0f}, {" 0.25 ", 1, 0.25f}, {"7", 1, 7.0f},
+        {"abc", 0, 0.0f}, {"", 0, 0.0f}, {"1.5x", 0, 0.0f},
+    };
+    for (const auto& c : floats) {
+        float value = -99.0f;
+        EXPECT_EQ(parsed("f=" + c.value)->getFloatProperty(ZELServerString("f"), value), c.found) << c.value;
+        EXPECT_FLOAT_EQ(value, c.found ? c.expected : -99.0f) << c.value;
+    }
 }
 
-// ---- All properties ---------------------------------------------------------------------------------
+// ---- All properties, parsing again
 
-TEST(TransformationResult, NamesAndPairsComeWithoutPrefixInNameOrder)
-{
+TEST(TransformationResult, NamesAndPairsComeWithoutPrefixInNameOrder) {
     const auto result = parsed("zeta=1\0*odd=2\0result=3:M|a=b"s);
     ZELServerStringArray names(std::vector<std::string>{"kept"});
     result->getPropertyNames(names);
-    EXPECT_EQ(names.items(), (std::vector<std::string>{"kept", "odd", "result", "zeta", "StatusMessage",
-                                                       "StatusNumber", "a"}));
+    EXPECT_EQ(names.items(),
+              (std::vector<std::string>{"kept", "odd", "result", "zeta", "StatusMessage", "StatusNumber", "a"}));
 
     ZELServerStringArray pairs;
     result->getProperties(pairs);
@@ -323,14 +225,16 @@ TEST(TransformationResult, NamesAndPairsComeWithoutPrefixInNameOrder)
                                                        "M", "StatusNumber", "3", "a", "b"}));
 }
 
-// ---- Parsing and text -------------------------------------------------------------------------------
+TEST(TransformationResult, FreshIsEmptyAndParseAgainAddsAndOverwritesButNeverRemoves) {
+    Result result;
+    ZELServerString text("before");
+    result.getText(text);
+    EXPECT_EQ(text.str(), "");
+    EXPECT_TRUE(result.properties().empty());
+    EXPECT_EQ(result.isSuccess(), 0u);
 
-TEST(TransformationResult, ParseAgainAddsAndOverwritesButNeverRemoves)
-{
-    ZELServerTransformationResult result;
     result.parse(ZELServerString("a=1\0b=2"s));
     result.parse(ZELServerString("b=3\0c=4"s));
-    ZELServerString text;
     result.getText(text);
     EXPECT_EQ(text.str(), "b=3\0c=4"s);
     EXPECT_EQ(result.properties(), (ResultProperties{{"*a", "1"}, {"*b", "3"}, {"*c", "4"}}));
@@ -341,22 +245,9 @@ TEST(TransformationResult, ParseAgainAddsAndOverwritesButNeverRemoves)
     EXPECT_EQ(result.properties().size(), 3u);
 }
 
-TEST(TransformationResult, FreshResultIsEmpty)
-{
-    ZELServerTransformationResult result;
-    ZELServerString text("before");
-    result.getText(text);
-    EXPECT_EQ(text.str(), "");
-    ZELServerStringArray names;
-    result.getPropertyNames(names);
-    EXPECT_EQ(names.entries(), 0u);
-    EXPECT_EQ(result.isSuccess(), 0u);
-}
+// ---- Factories
 
-// ---- Factories --------------------------------------------------------------------------------------
-
-TEST(TransformationResultFactory, TextFormIsParsed)
-{
+TEST(TransformationResult, FactoriesParseTheTextOrGiveNullOnAnExhaustedHeap) {
     std::unique_ptr<IZELServerTransformationResult> result(makeTransformationResult(ZELServerString("id=5")));
     ASSERT_NE(result, nullptr);
     unsigned id = 0;
@@ -365,10 +256,7 @@ TEST(TransformationResultFactory, TextFormIsParsed)
     std::unique_ptr<IZELServerTransformationResult> empty(makeTransformationResult());
     ASSERT_NE(empty, nullptr);
     EXPECT_EQ(empty->getID(id), 0u);
-}
 
-TEST(TransformationResultFactory, ExhaustedHeapGivesNull)
-{
     heap::failNextAllocations(1);
     EXPECT_EQ(makeTransformationResult(ZELServerString("id=5")), nullptr);
     heap::failNextAllocations(1);

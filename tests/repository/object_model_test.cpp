@@ -86,16 +86,20 @@ protected:
     ZELServerWorkspace workspace{nullptr};
 };
 
-TEST_F(WorkspaceReading, ReadsItsOwnAttributes)
+TEST_F(WorkspaceReading, ReadsItsOwnAttributesAndResourcesInDocumentOrder)
 {
     EXPECT_EQ(text<IZELServerWorkspace>(workspace, &IZELServerWorkspace::getName), "roads.zlw");
     EXPECT_EQ(text<IZELServerWorkspace>(workspace, &IZELServerWorkspace::getTitle), "Roads");
     EXPECT_EQ(text<IZELServerWorkspace>(workspace, &IZELServerWorkspace::getDescription), "Road network to GeoJSON");
     EXPECT_TRUE(workspace.isEnabled());
     EXPECT_EQ(workspace.getFileSize(), 1234567);
+    IZELServerVector<IZELServerResource>& resources = workspace.getResources();
+    EXPECT_EQ(names(resources), (std::vector<std::string>{"lookup.csv", "style.sld"}));
+    EXPECT_EQ(resources.element(0)->getFileSize(), 2048);
+    EXPECT_EQ(text<IZELServerResource>(*resources.element(1), &IZELServerResource::getDescription), "styling");
 }
 
-TEST_F(WorkspaceReading, SplitsDatasetsBySourceFlagInReverseDocumentOrder)
+TEST_F(WorkspaceReading, SplitsDatasetsBySourceFlagInReverseDocumentOrderWithTheirFeatureTypes)
 {
     EXPECT_EQ(names(workspace.getSourceDatasets()), (std::vector<std::string>{"C", "A"}));
     EXPECT_EQ(names(workspace.getDestinationDatasets()), (std::vector<std::string>{"B"}));
@@ -104,19 +108,15 @@ TEST_F(WorkspaceReading, SplitsDatasetsBySourceFlagInReverseDocumentOrder)
     EXPECT_EQ(text<IZELServerDataset>(a, &IZELServerDataset::getLocation), "/data/a");
     EXPECT_TRUE(a.isSource());
     EXPECT_FALSE(workspace.getDestinationDatasets().element(0)->isSource());
-}
-
-TEST_F(WorkspaceReading, FeatureTypesAreReachableThroughDatasetsAndWorkspaceAlike)
-{
+    // Feature types are reachable through datasets and the workspace alike.
     EXPECT_EQ(names(workspace.getSourceFeatureTypes()), (std::vector<std::string>{"c1", "a1", "a2"}));
     EXPECT_EQ(names(workspace.getDestinationFeatureTypes()), (std::vector<std::string>{"b1"}));
-    IZELServerDataset& a = *workspace.getSourceDatasets().element(1);
     EXPECT_EQ(names(a.getFeatureTypes()), (std::vector<std::string>{"a1", "a2"}));
     // The same objects, not copies.
     EXPECT_EQ(workspace.getSourceFeatureTypes().element(1), a.getFeatureTypes().element(0));
 }
 
-TEST_F(WorkspaceReading, FeatureTypeAttributesAreOnlyItsOwnChildren)
+TEST_F(WorkspaceReading, AttributesAndPropertiesBelongToTheirOwnElementAndRepeatsMerge)
 {
     IZELServerFeatureType& a1 = *workspace.getSourceFeatureTypes().element(1);
     EXPECT_EQ(text<IZELServerFeatureType>(a1, &IZELServerFeatureType::getDescription), "first of A");
@@ -131,20 +131,14 @@ TEST_F(WorkspaceReading, FeatureTypeAttributesAreOnlyItsOwnChildren)
     ZELServerString value;
     EXPECT_TRUE(a1.getPropertyAccessor().getPropertyValue(ZELServerString("display"), ZELServerString("colour"), value));
     EXPECT_EQ(value.str(), "red");
-}
-
-TEST_F(WorkspaceReading, PropertiesBelongToTheirOwnElementOnly)
-{
+    // Properties belong to their own element only.
     ZELServerStringArray categories;
     workspace.getPropertyAccessor().getCategoryNames(categories);
     EXPECT_EQ(categories.items(), (std::vector<std::string>{"notify", "run"}));
     ZELServerStringArray datasetCategories;
     workspace.getSourceDatasets().element(1)->getPropertyAccessor().getCategoryNames(datasetCategories);
     EXPECT_EQ(datasetCategories.items(), (std::vector<std::string>{"source"}));
-}
-
-TEST_F(WorkspaceReading, RepeatedPropertyKeepsTheLaterValueAndGainsItsAttributes)
-{
+    // A repeated property keeps the later value and gains its attributes.
     const IZELServerProperty* priority =
         workspace.getPropertyAccessor().getProperty(ZELServerString("run"), ZELServerString("priority"));
     ASSERT_NE(priority, nullptr);
@@ -182,24 +176,12 @@ TEST_F(WorkspaceReading, ParametersOfferTheirChoicesByOptionsType)
     EXPECT_EQ(text<IZELServerParameter>(source, &IZELServerParameter::getDescription), "Source file");
     EXPECT_EQ(text<IZELServerParameter>(source, &IZELServerParameter::getOptionsType), "FILEFILTER_CONFIG");
     EXPECT_EQ(text<IZELServerParameter>(*parameters.element(3), &IZELServerParameter::getOptionsText), "0%10");
-}
-
-TEST_F(WorkspaceReading, ChoicesAreAppendedToWhatTheCallerHeld)
-{
     ZELServerStringArray choices({"kept"});
-    workspace.getParameters().element(1)->getOptions(choices);
+    parameters.element(1)->getOptions(choices);
     EXPECT_EQ(choices.items(), (std::vector<std::string>{"kept", "fast", "safe", "exact"}));
 }
 
-TEST_F(WorkspaceReading, ResourcesInDocumentOrder)
-{
-    IZELServerVector<IZELServerResource>& resources = workspace.getResources();
-    EXPECT_EQ(names(resources), (std::vector<std::string>{"lookup.csv", "style.sld"}));
-    EXPECT_EQ(resources.element(0)->getFileSize(), 2048);
-    EXPECT_EQ(text<IZELServerResource>(*resources.element(1), &IZELServerResource::getDescription), "styling");
-}
-
-TEST_F(WorkspaceReading, ReadingAgainReplacesEverything)
+TEST_F(WorkspaceReading, ReadingAgainReplacesEverythingAndListsReadEveryWorkspace)
 {
     const std::string smaller =
         R"(<X><WORKSPACE_DEFINITIONS name="w2"><DATASET name="D" is_source="false"><FEATURE_TYPE name="f"/></DATASET>)"
@@ -216,16 +198,14 @@ TEST_F(WorkspaceReading, ReadingAgainReplacesEverything)
     ZELServerStringArray categories;
     workspace.getPropertyAccessor().getCategoryNames(categories);
     EXPECT_EQ(categories.entries(), 0u);
-}
 
-TEST(WorkspaceList, EveryWorkspaceOfTheDocumentInOrderIntoAClearedVector)
-{
+    // A list reader takes every workspace of the document, at any depth, into a cleared vector.
     ZELServerVector<IZELServerWorkspace, ZELServerWorkspace> workspaces;
     workspaces.append(new ZELServerWorkspace(nullptr));
-    const std::string body =
-        R"(<L><WORKSPACE_DEFINITIONS name="one"><DATASET name="s" is_source="true"/></WORKSPACE_DEFINITIONS>)"
-        R"(<G><WORKSPACE_DEFINITIONS name="two"/></G></L>)";
-    ASSERT_EQ(readWorkspacesReply(body, nullptr, workspaces), 0);
+    ASSERT_EQ(readWorkspacesReply(R"(<L><WORKSPACE_DEFINITIONS name="one"><DATASET name="s" is_source="true"/>)"
+                                  R"(</WORKSPACE_DEFINITIONS><G><WORKSPACE_DEFINITIONS name="two"/></G></L>)",
+                                  nullptr, workspaces),
+              0);
     EXPECT_EQ(names(workspaces), (std::vector<std::string>{"one", "two"}));
     EXPECT_EQ(names(workspaces.element(0)->getSourceDatasets()), (std::vector<std::string>{"s"}));
 }
@@ -248,7 +228,7 @@ TEST(SummaryReading, MissingEnabledFlagReadsDisabledAndFlagsFollowTheServersTrut
     EXPECT_EQ(text<IZELServerWorkspaceSummary>(*summaries.element(0), &IZELServerWorkspaceSummary::getTitle), "A");
 }
 
-TEST(ItemReading, ItemTypeFollowsTheNameEndingCaseSensitively)
+TEST(ItemReading, TypeFollowsTheNameEndingCaseSensitivelyAndBadNumbersReadAsZero)
 {
     const std::vector<std::pair<std::string, unsigned>> cases = {
         {"roads.zlw", 1}, {"reader.zds", 2},   {"clean.zlx", 3}, {"report.zlwt", 4},
@@ -258,6 +238,16 @@ TEST(ItemReading, ItemTypeFollowsTheNameEndingCaseSensitively)
         ZELServerItem item;
         ASSERT_EQ(readItemReply("<R><ITEM name=\"" + name + "\"/></R>", item), 0);
         EXPECT_EQ(item.getItemType(), type) << name;
+    }
+    // Numbers that do not convert or fit read as zero.
+    const std::vector<std::pair<std::string, int>> sizes = {
+        {"12", 12}, {"0x10", 16}, {" 7", 7}, {"12.000", 12}, {"-3", -3},
+        {"12abc", 0}, {"", 0}, {"4294967296", 0}, {"2147483648", 0}, {"-2147483648", -2147483647 - 1},
+    };
+    for (const auto& [size, expected] : sizes) {
+        ZELServerItem item;
+        ASSERT_EQ(readItemReply("<ITEM filesize=\"" + size + "\"/>", item), 0);
+        EXPECT_EQ(item.getFileSize(), expected) << '"' << size << '"';
     }
 }
 
@@ -286,19 +276,6 @@ TEST(ItemReading, EveryAttributeLandsInItsField)
     EXPECT_EQ(item.getItemType(), 1u);
 }
 
-TEST(ItemReading, NumbersThatDoNotConvertOrFitReadAsZero)
-{
-    const std::vector<std::pair<std::string, int>> cases = {
-        {"12", 12}, {"0x10", 16}, {" 7", 7}, {"12.000", 12}, {"-3", -3},
-        {"12abc", 0}, {"", 0}, {"4294967296", 0}, {"2147483648", 0}, {"-2147483648", -2147483647 - 1},
-    };
-    for (const auto& [size, expected] : cases) {
-        ZELServerItem item;
-        ASSERT_EQ(readItemReply("<ITEM filesize=\"" + size + "\"/>", item), 0);
-        EXPECT_EQ(item.getFileSize(), expected) << '"' << size << '"';
-    }
-}
-
 TEST(StoredFileReading, CustomFormatsTransformersAndTemplatesShareOneLayout)
 {
     const std::string body =
@@ -325,33 +302,23 @@ TEST(StoredFileReading, CustomFormatsTransformersAndTemplatesShareOneLayout)
 
 // ---- Reader results ---------------------------------------------------------------------------------
 
-TEST(ReaderResults, SingleReaderTakesTheFirstElementAnywhere)
+TEST(ReaderResults, SingleReaderTakesTheFirstElementAnywhereOrFailsAndKeepsTheObject)
 {
     ZELServerResource resource;
-    ASSERT_EQ(readResourceReply(R"(<R><X><RESOURCE name="deep"/></X><RESOURCE name="later"/></R>)", resource), 0);
+    ASSERT_EQ(readResourceReply(R"(<R><X><RESOURCE name="deep" filesize="3"/></X><RESOURCE name="later"/></R>)", resource), 0);
     EXPECT_EQ(text<IZELServerResource>(resource, &IZELServerResource::getName), "deep");
-}
-
-TEST(ReaderResults, SingleReaderWithoutTheElementFailsAndKeepsTheObject)
-{
-    ZELServerResource resource;
-    ASSERT_EQ(readResourceReply(R"(<R><RESOURCE name="kept" filesize="3"/></R>)", resource), 0);
     EXPECT_EQ(readResourceReply("<R><TEMPLATE name=\"t\"/></R>", resource), static_cast<int>(msg::kUnreadableReply));
-    EXPECT_EQ(text<IZELServerResource>(resource, &IZELServerResource::getName), "kept");
+    EXPECT_EQ(text<IZELServerResource>(resource, &IZELServerResource::getName), "deep");
     EXPECT_EQ(resource.getFileSize(), 3);
 }
 
-TEST(ReaderResults, BodyThatIsNoDocumentGivesTheParsersNumberAndLeavesTheListAlone)
+TEST(ReaderResults, ListIsLeftAloneByABodyThatIsNoDocumentAndEmptiedByOneWithoutElements)
 {
     ZELServerVector<IZELServerTemplate, ZELServerTemplate> templates;
     templates.append(new ZELServerTemplate());
     EXPECT_EQ(readTemplatesReply("", templates), static_cast<int>(msg::kXmlFailure));
     EXPECT_EQ(readTemplatesReply("<TEMPLATE", templates), static_cast<int>(msg::kXmlFailure));
     EXPECT_EQ(templates.entries(), 1u);
-}
-
-TEST(ReaderResults, ListWithoutElementsIsAnEmptiedListAndSuccess)
-{
     ZELServerVector<IZELServerResource, ZELServerResource> resources;
     resources.append(new ZELServerResource());
     EXPECT_EQ(readResourcesReply("<REP_GET_ITEMRESOURCESVIEW/>", resources), 0);

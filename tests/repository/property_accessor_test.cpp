@@ -37,7 +37,7 @@ void readInto(ZELServerPropertyAccessor& accessor, const std::string& document)
     accessor.readPropertiesOf(*reader.rootOf());
 }
 
-TEST(PropertyAccessor, SetAddsOrChangesAndKeepsTheAttributes)
+TEST(PropertyAccessor, SetAddsOrChangesAndKeepsTheAttributesAndLookupsAreExact)
 {
     ZELServerPropertyAccessor accessor;
     readInto(accessor, R"(<S><PROPERTY category="c" name="n" value="v1"><ATTRIBUTE name="a" value="1"/></PROPERTY></S>)");
@@ -48,12 +48,7 @@ TEST(PropertyAccessor, SetAddsOrChangesAndKeepsTheAttributes)
     ZELServerString attribute;
     ASSERT_TRUE(accessor.getProperty(S("c"), S("n"))->getAttribute(S("a"), attribute));
     EXPECT_EQ(attribute.str(), "1");
-}
-
-TEST(PropertyAccessor, MissingCategoryOrNameEmptiesTheValue)
-{
-    ZELServerPropertyAccessor accessor;
-    accessor.setProperty(S("c"), S("n"), S("v"));
+    // A missing category or name empties the value.
     ZELServerString value("stale");
     EXPECT_FALSE(accessor.getPropertyValue(S("c"), S("other"), value));
     EXPECT_EQ(value.str(), "");
@@ -61,6 +56,11 @@ TEST(PropertyAccessor, MissingCategoryOrNameEmptiesTheValue)
     EXPECT_FALSE(accessor.getPropertyValue(S("C"), S("n"), value));
     EXPECT_EQ(value.str(), "");
     EXPECT_EQ(accessor.getProperty(S("c"), S("N")), nullptr);
+    // Missing attributes of a read property are empty texts.
+    readInto(accessor, R"(<S><PROPERTY name="n"/></S>)");
+    value.assign("stale");
+    EXPECT_TRUE(accessor.getPropertyValue(S(""), S("n"), value));
+    EXPECT_EQ(value.str(), "");
 }
 
 TEST(PropertyAccessor, NamesAndPairsComeInByteOrder)
@@ -98,7 +98,7 @@ TEST(PropertyAccessor, RemovingReportsWhetherSomethingWasThere)
     EXPECT_EQ(accessor.getProperty(S("d"), S("n")), nullptr);
 }
 
-TEST(PropertyAccessor, GetPropertiesAppendsIndependentCopies)
+TEST(PropertyAccessor, GetPropertiesAppendsIndependentCopiesAndReadingMergesRepeats)
 {
     ZELServerPropertyAccessor accessor;
     readInto(accessor, R"(<S><PROPERTY category="c" name="n" value="v"><ATTRIBUTE name="b" value="2"/>)"
@@ -119,29 +119,17 @@ TEST(PropertyAccessor, GetPropertiesAppendsIndependentCopies)
     ZELServerString missing("untouched");
     EXPECT_FALSE(copies.element(0)->getAttribute(S("c"), missing));
     EXPECT_EQ(missing.str(), "untouched");
-}
 
-TEST(PropertyAccessor, ReadingMergesAttributesOfARepeatedProperty)
-{
-    ZELServerPropertyAccessor accessor;
+    // Reading merges the attributes of a repeated property.
     readInto(accessor, R"(<S><PROPERTY category="c" name="n" value="first"><ATTRIBUTE name="a" value="1"/>)"
                        R"(<ATTRIBUTE name="b" value="old"/></PROPERTY>)"
                        R"(<PROPERTY category="c" name="n" value="second"><ATTRIBUTE name="b" value="new"/></PROPERTY></S>)");
     const IZELServerProperty* property = accessor.getProperty(S("c"), S("n"));
     ASSERT_NE(property, nullptr);
-    ZELServerStringArray attributes;
-    property->getAttributes(attributes);
-    EXPECT_EQ(attributes.items(), (std::vector<std::string>{"a", "1", "b", "new"}));
+    ZELServerStringArray merged;
+    property->getAttributes(merged);
+    EXPECT_EQ(merged.items(), (std::vector<std::string>{"a", "1", "b", "new"}));
     EXPECT_EQ(valueOf(accessor, "c", "n"), "second");
-}
-
-TEST(PropertyAccessor, MissingAttributesReadAsEmptyText)
-{
-    ZELServerPropertyAccessor accessor;
-    readInto(accessor, R"(<S><PROPERTY name="n"/></S>)");
-    ZELServerString value("stale");
-    EXPECT_TRUE(accessor.getPropertyValue(S(""), S("n"), value));
-    EXPECT_EQ(value.str(), "");
 }
 
 // ---- The document the update commands send ----------------------------------------------------------
@@ -169,16 +157,11 @@ TEST(PropertyAccessorXml, WritesEveryPropertyInMapOrderWithItsAttributes)
               R"(<ATTRIBUTE name="unit" value="level"/></PROPERTY></REP_UPDATE_SERVICEPROPERTYACCESSOR>)");
 }
 
-TEST(PropertyAccessorXml, AnEmptyAccessorIsAnEmptyRoot)
+TEST(PropertyAccessorXml, AnEmptyAccessorIsAnEmptyRootAndLocalTextIsWrittenAsUtf8)
 {
     ZELServerPropertyAccessor accessor;
     EXPECT_EQ(writtenDocument(accessor, "REP_UPDATE_DATASETPROPERTYACCESSOR"),
               R"(<?xml version="1.0" encoding="UTF-8" standalone="no" ?><REP_UPDATE_DATASETPROPERTYACCESSOR/>)");
-}
-
-TEST(PropertyAccessorXml, LocalSingleByteTextIsWrittenAsUtf8)
-{
-    ZELServerPropertyAccessor accessor;
     accessor.setProperty(S("c"), S("city"), S("K\xf6ln"));
     EXPECT_EQ(writtenDocument(accessor, "R"),
               "<?xml version=\"1.0\" encoding=\"UTF-8\" standalone=\"no\" ?><R>"

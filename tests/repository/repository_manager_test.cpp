@@ -22,8 +22,6 @@
 namespace zel::repotest {
 namespace {
 
-ZELServerString S(const std::string& text) { return ZELServerString(text); }
-
 class ManagerTest : public RepositoryWireTest {
 protected:
     ZELServerRepositoryManager manager{channel.get()};
@@ -31,11 +29,14 @@ protected:
 
 // ---- Services ---------------------------------------------------------------------------------------
 
-TEST_F(ManagerTest, ServiceExistsAndRemoveServiceAnswerWithTheServersFlag)
+TEST_F(ManagerTest, ServiceLookupsAnswerWithTheServersFlagOrFillTheCallersService)
 {
     server.exchange(command("REP_SERVICEEXISTS", {{"serviceName", "a/b"}}), success("true"))
-        .exchange(command("REP_REMOVE_SERVICE", {{"serviceName", "download"}}), success("true"));
-    connect();
+        .exchange(command("REP_REMOVE_SERVICE", {{"serviceName", "download"}}), success("true"))
+        .exchange(command("REP_GET_SERVICE", {{"serviceName", "download"}}),
+                  success(R"(<R><SERVICE service_id="7" name="download" url_pattern="/dl"/></R>)"))
+        .exchange(command("REP_GET_SERVICE", {{"serviceName", "nothing"}}), success("<R/>"));
+    signIn();
     unsigned exists = 0;
     EXPECT_EQ(StatusPtr(manager.serviceExists(S("a/b"), exists)), nullptr);
     EXPECT_EQ(exists, 1u);
@@ -44,18 +45,28 @@ TEST_F(ManagerTest, ServiceExistsAndRemoveServiceAnswerWithTheServersFlag)
     EXPECT_EQ(removed, 1u);
     EXPECT_EQ(numberOf(StatusPtr(manager.serviceExists(S(""), exists))), msg::kRequiredValueMissing);
     EXPECT_EQ(exists, 0u);
-    EXPECT_TRUE(sentCommands(2));
+    ZELServerService service(channel.get());
+    unsigned found = 0;
+    EXPECT_EQ(StatusPtr(manager.getService(S("download"), service, found)), nullptr);
+    EXPECT_EQ(found, 1u);
+    EXPECT_EQ(service.serviceId(), "7");
+    EXPECT_EQ(StatusPtr(manager.getService(S("nothing"), service, found)), nullptr);
+    EXPECT_EQ(found, 0u);
+    EXPECT_TRUE(server.verify());
 }
 
-TEST_F(ManagerTest, ServicesFilterIsExactAndRequired)
+TEST_F(ManagerTest, ServicesFilterIsExactAndRequiredAndListedServicesUseTheSameChannel)
 {
     const std::vector<std::pair<std::optional<std::string>, std::string>> sent = {
         {std::nullopt, "All"}, {"ALL", "All"}, {"ENABLED", "Enabled"}, {"DISABLED", "Disabled"}};
     for (const auto& [filter, value] : sent) {
         server.exchange(command("REP_GET_SERVICES", {{"enableFilter", value}}),
-                        success(R"(<R><SERVICE name="s1"/><SERVICE name="s2"/></R>)"));
+                        success(R"(<R><SERVICE name="download"/><SERVICE name="s2"/></R>)"));
     }
-    connect();
+    server.exchange(command("REP_ITEMREGISTERED",
+                            {{"serviceName", "download"}, {"repositoryName", "Samples"}, {"itemName", "a.zlw"}}),
+                    success("true"));
+    signIn();
     ZELServerVector<IZELServerService, ZELServerService> services;
     for (const auto& [filter, value] : sent) {
         ZELServerStringDict directives;
@@ -70,59 +81,29 @@ TEST_F(ManagerTest, ServicesFilterIsExactAndRequired)
     EXPECT_EQ(numberOf(StatusPtr(manager.getServices(&lowerCase, services))), msg::kRequiredValueMissing);
     ZELServerStringDict missing;
     EXPECT_EQ(numberOf(StatusPtr(manager.getServices(&missing, services))), msg::kRequiredValueMissing);
-    EXPECT_EQ(services.entries(), 2u);
-    EXPECT_TRUE(sentCommands(sent.size()));
-}
-
-TEST_F(ManagerTest, ListedServicesTalkOverTheSameChannel)
-{
-    server.exchange(command("REP_GET_SERVICES", {{"enableFilter", "All"}}),
-                    success(R"(<R><SERVICE service_id="7" name="download"/></R>)"))
-        .exchange(command("REP_ITEMREGISTERED",
-                          {{"serviceName", "download"}, {"repositoryName", "Samples"}, {"itemName", "a.zlw"}}),
-                  success("true"));
-    connect();
-    ZELServerVector<IZELServerService, ZELServerService> services;
-    ASSERT_EQ(StatusPtr(manager.getServices(nullptr, services)), nullptr);
-    ASSERT_EQ(services.entries(), 1u);
+    ASSERT_EQ(services.entries(), 2u) << "a refusal leaves the list alone";
     unsigned registered = 0;
     EXPECT_EQ(StatusPtr(services.element(0)->itemRegistered(S("Samples"), S("a.zlw"), registered)), nullptr);
     EXPECT_EQ(registered, 1u);
-    EXPECT_TRUE(sentCommands(2));
-}
-
-TEST_F(ManagerTest, GetServiceFillsTheCallersServiceOrLeavesFoundAtZero)
-{
-    server.exchange(command("REP_GET_SERVICE", {{"serviceName", "download"}}),
-                    success(R"(<R><SERVICE service_id="7" name="download" url_pattern="/dl"/></R>)"))
-        .exchange(command("REP_GET_SERVICE", {{"serviceName", "nothing"}}), success("<R/>"));
-    connect();
-    ZELServerService service(channel.get());
-    unsigned found = 0;
-    EXPECT_EQ(StatusPtr(manager.getService(S("download"), service, found)), nullptr);
-    EXPECT_EQ(found, 1u);
-    EXPECT_EQ(service.serviceId(), "7");
-    EXPECT_EQ(StatusPtr(manager.getService(S("nothing"), service, found)), nullptr);
-    EXPECT_EQ(found, 0u);
-    EXPECT_TRUE(sentCommands(2));
+    EXPECT_TRUE(server.verify());
 }
 
 TEST_F(ManagerTest, AddAndUpdateSendTheServiceUnderTheAddRoot)
 {
     // The XML library writes attributes in name order, whatever order they were set in.
-    const std::string added = payloadDocument(
+    const std::string added = xmlDocument(
         "REP_ADD_SERVICE",
         R"(<SERVICE description="Serves &amp; stores" display_name="Data Download" is_customformat_reg_allowed="false" )"
         R"(is_customtransform_reg_allowed="false" is_enabled="true" is_template_reg_allowed="true" )"
         R"(is_workspace_reg_allowed="true" name="download" service_id="-1" url_pattern="/dl/{ws}"/>)");
-    const std::string updated = payloadDocument(
+    const std::string updated = xmlDocument(
         "REP_ADD_SERVICE",
         R"(<SERVICE description="" display_name="" is_customformat_reg_allowed="true" )"
         R"(is_customtransform_reg_allowed="false" is_enabled="false" is_template_reg_allowed="false" )"
         R"(is_workspace_reg_allowed="false" name="download" service_id="7" url_pattern=""/>)");
     server.exchange(command("REP_ADD_SERVICE", {{"serviceObject", added}}), success("true"))
         .exchange(command("REP_UPDATE_SERVICE", {{"serviceObject", updated}}), success("true"));
-    connect();
+    signIn();
     ZELServerService fresh(channel.get(), "download", "Data Download", "Serves & stores", "/dl/{ws}", true, true,
                            false, false, true);
     EXPECT_EQ(StatusPtr(manager.addService(fresh)), nullptr);
@@ -132,15 +113,20 @@ TEST_F(ManagerTest, AddAndUpdateSendTheServiceUnderTheAddRoot)
                                channel.get(), stored),
               0);
     EXPECT_EQ(StatusPtr(manager.updateService(stored)), nullptr);
-    EXPECT_TRUE(sentCommands(2));
+    EXPECT_TRUE(server.verify());
 }
 
 // ---- Repositories -----------------------------------------------------------------------------------
 
-TEST_F(ManagerTest, RepositoryExistsChecksOnlyEmptinessWhileTheOthersCheckCharacters)
+TEST_F(ManagerTest, RepositoryExistsChecksOnlyEmptinessWhileAddAndRemoveCheckCharactersToo)
 {
-    server.exchange(command("REP_REPOSITORYEXISTS", {{"repositoryName", "a/b"}}), success("false"));
-    connect();
+    server.exchange(command("REP_REPOSITORYEXISTS", {{"repositoryName", "a/b"}}), success("false"))
+        .exchange(command("REP_ADD_REPOSITORY",
+                          {{"repositoryObject", xmlDocument("REP_ADD_REPOSITORY",
+                                                            R"(<REPOSITORY description="Roads &lt;2024>" name="Samples"/>)")}}),
+                  success("true"))
+        .exchange(command("REP_REMOVE_REPOSITORY", {{"repositoryName", "Samples"}}), success("true"));
+    signIn();
     unsigned flag = 7;
     EXPECT_EQ(StatusPtr(manager.repositoryExists(S("a/b"), flag)), nullptr);
     EXPECT_EQ(flag, 0u);
@@ -155,7 +141,10 @@ TEST_F(ManagerTest, RepositoryExistsChecksOnlyEmptinessWhileTheOthersCheckCharac
     EXPECT_EQ(numberOf(StatusPtr(manager.getRepository(S(""), repository, flag))), msg::kRequiredValueMissing);
     EXPECT_EQ(numberOf(StatusPtr(manager.addRepository(S(""), S("d")))), msg::kRequiredValueMissing);
     EXPECT_EQ(numberOf(StatusPtr(manager.removeRepository(S(""), flag))), msg::kRequiredValueMissing);
-    EXPECT_TRUE(sentCommands(1));
+    EXPECT_EQ(StatusPtr(manager.addRepository(S("Samples"), S("Roads <2024>"))), nullptr);
+    EXPECT_EQ(StatusPtr(manager.removeRepository(S("Samples"), flag)), nullptr);
+    EXPECT_EQ(flag, 1u);
+    EXPECT_TRUE(server.verify());
 }
 
 TEST_F(ManagerTest, RepositoryListAlwaysAsksForAllAndRefusesDirectives)
@@ -163,7 +152,7 @@ TEST_F(ManagerTest, RepositoryListAlwaysAsksForAllAndRefusesDirectives)
     server.exchange(command("REP_GET_REPOSITORIES", {{"enableFilter", "All"}}),
                     success(R"(<R><REPOSITORY name="Samples" description="d1"/><X><REPOSITORY name="Other"/></X></R>)"))
         .exchange(command("REP_ITEMEXISTS", {{"repositoryName", "Other"}, {"itemName", "a.zlw"}}), success("true"));
-    connect();
+    signIn();
     ZELServerVector<IZELServerRepository, ZELServerRepository> repositories;
     ZELServerStringDict directives;
     EXPECT_EQ(numberOf(StatusPtr(manager.getRepositories(&directives, repositories))), msg::kRequiredValueMissing);
@@ -176,7 +165,7 @@ TEST_F(ManagerTest, RepositoryListAlwaysAsksForAllAndRefusesDirectives)
     unsigned exists = 0;
     EXPECT_EQ(StatusPtr(repositories.element(1)->itemExists(S("a.zlw"), exists)), nullptr);
     EXPECT_EQ(exists, 1u);
-    EXPECT_TRUE(sentCommands(2));
+    EXPECT_TRUE(server.verify());
 }
 
 TEST_F(ManagerTest, UnknownRepositoryIsSuccessWithFoundAtZero)
@@ -185,7 +174,7 @@ TEST_F(ManagerTest, UnknownRepositoryIsSuccessWithFoundAtZero)
                     success(R"(<R><REPOSITORY name="Samples" description="sample workspaces"/></R>)"))
         .exchange(command("REP_GET_REPOSITORY", {{"repositoryName", "Nothing"}}), success("<R/>"))
         .exchange(command("REP_ITEMEXISTS", {{"repositoryName", "Samples"}, {"itemName", "x.zlw"}}), success("false"));
-    connect();
+    signIn();
     ZELServerRepository repository(nullptr);
     unsigned found = 0;
     EXPECT_EQ(StatusPtr(manager.getRepository(S("Samples"), repository, found)), nullptr);
@@ -199,34 +188,20 @@ TEST_F(ManagerTest, UnknownRepositoryIsSuccessWithFoundAtZero)
     unsigned exists = 7;
     EXPECT_EQ(StatusPtr(repository.itemExists(S("x.zlw"), exists)), nullptr);
     EXPECT_EQ(exists, 0u);
-    EXPECT_TRUE(sentCommands(3));
-}
-
-TEST_F(ManagerTest, AddRepositorySendsTheRepositoryDocumentAndRemoveAnswersAFlag)
-{
-    server.exchange(command("REP_ADD_REPOSITORY",
-                            {{"repositoryObject",
-                              payloadDocument("REP_ADD_REPOSITORY",
-                                              R"(<REPOSITORY description="Roads &lt;2024>" name="Samples"/>)")}}),
-                    success("true"))
-        .exchange(command("REP_REMOVE_REPOSITORY", {{"repositoryName", "Samples"}}), success("true"));
-    connect();
-    EXPECT_EQ(StatusPtr(manager.addRepository(S("Samples"), S("Roads <2024>"))), nullptr);
-    unsigned removed = 0;
-    EXPECT_EQ(StatusPtr(manager.removeRepository(S("Samples"), removed)), nullptr);
-    EXPECT_EQ(removed, 1u);
-    EXPECT_TRUE(sentCommands(2));
+    EXPECT_TRUE(server.verify());
 }
 
 // ---- Global query -----------------------------------------------------------------------------------
 
-TEST_F(ManagerTest, GlobalQueryRunsOnlyForExactlyAllItems)
+TEST_F(ManagerTest, GlobalQueryRunsOnlyForExactlyAllItemsAndPassesFailuresOn)
 {
     server.exchange(command("REP_GLOBAL_GET_ALL_ITEMS", {{"enableFilter", "All"}}),
                     success(R"(<R><REPOSITORY name="Samples"><PROPERTY category="Samples" name="roads.zlw" value="1">)"
                             R"(<ATTRIBUTE name="type" value="workspace"/></PROPERTY></REPOSITORY>)"
-                            R"(<PROPERTY category="Other" name="t.zlwt" value="4"/></R>)"));
-    connect();
+                            R"(<PROPERTY category="Other" name="t.zlwt" value="4"/></R>)"))
+        .exchange(command("REP_GLOBAL_GET_ALL_ITEMS", {{"enableFilter", "All"}}), success("not xml"))
+        .exchange(command("REP_GLOBAL_GET_ALL_ITEMS", {{"enableFilter", "All"}}), zeltest::reply("ERROR", "busy"));
+    signIn();
     ZELServerPropertyAccessor items;
     EXPECT_EQ(StatusPtr(manager.getGlobalItems(nullptr, items)), nullptr);
     ZELServerStringDict lowerCase;
@@ -245,20 +220,9 @@ TEST_F(ManagerTest, GlobalQueryRunsOnlyForExactlyAllItems)
     ASSERT_NE(items.getProperty(S("Samples"), S("roads.zlw")), nullptr);
     EXPECT_TRUE(items.getProperty(S("Samples"), S("roads.zlw"))->getAttribute(S("type"), type));
     EXPECT_EQ(type.str(), "workspace");
-    EXPECT_TRUE(sentCommands(1));
-}
-
-TEST_F(ManagerTest, GlobalQueryReplyThatIsNoDocumentGivesTheParsersStatus)
-{
-    server.exchange(command("REP_GLOBAL_GET_ALL_ITEMS", {{"enableFilter", "All"}}), success("not xml"))
-        .exchange(command("REP_GLOBAL_GET_ALL_ITEMS", {{"enableFilter", "All"}}), zeltest::reply("ERROR", "busy"));
-    connect();
-    ZELServerPropertyAccessor items;
-    ZELServerStringDict all;
-    all.insert("GLOBAL", "ALLITEMS");
     EXPECT_EQ(numberOf(StatusPtr(manager.getGlobalItems(&all, items))), msg::kXmlFailure);
     EXPECT_EQ(numberOf(StatusPtr(manager.getGlobalItems(&all, items))), msg::kServerError);
-    EXPECT_TRUE(sentCommands(2));
+    EXPECT_TRUE(server.verify());
 }
 
 }  // namespace

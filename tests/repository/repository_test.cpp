@@ -26,103 +26,19 @@ namespace {
 namespace fs = std::filesystem;
 using namespace std::string_literals;
 
-ZELServerString S(const std::string& text) { return ZELServerString(text); }
-
 const std::string kForbidden = "\\/:*?\"<>|&='+%";
 
 class RepositoryTest : public RepositoryWireTest {
 protected:
+    // A command of this repository: its name first, then the command's own values.
+    static Bytes repoCommand(const std::string& keyword, zeltest::Values values = {})
+    {
+        values.insert(values.begin(), {"repositoryName", "Samples"});
+        return command(keyword, values);
+    }
+
     ZELServerRepository repository{channel.get(), S("Samples"), S("sample workspaces")};
 };
-
-// ---- Items ------------------------------------------------------------------------------------------
-
-TEST_F(RepositoryTest, ItemExistsAsksWithTheRepositoryNameFirst)
-{
-    server.exchange(command("REP_ITEMEXISTS", {{"repositoryName", "Samples"}, {"itemName", "roads.zlw"}}),
-                    success("true"));
-    connect();
-    unsigned exists = 7;
-    const StatusPtr status(repository.itemExists(S("roads.zlw"), exists));
-    EXPECT_EQ(status, nullptr) << describe(status.get());
-    EXPECT_EQ(exists, 1u);
-    EXPECT_TRUE(sentCommands(1));
-}
-
-TEST_F(RepositoryTest, AnswerThatIsNoTruthValueLeavesTheFlagAtZeroAndSucceeds)
-{
-    server.exchange(command("REP_REMOVE_ITEM", {{"repositoryName", "Samples"}, {"itemName", "a.zlw"}}),
-                    success("True"));
-    connect();
-    unsigned removed = 7;
-    const StatusPtr status(repository.removeItem(S("a.zlw"), removed));
-    EXPECT_EQ(status, nullptr) << describe(status.get());
-    EXPECT_EQ(removed, 0u);
-    EXPECT_TRUE(sentCommands(1));
-}
-
-TEST_F(RepositoryTest, ServerErrorComesBackUnchangedWithTheFlagAtZero)
-{
-    server.exchange(command("REP_ITEMRESOURCEEXISTS",
-                            {{"repositoryName", "Samples"}, {"itemName", "a.zlw"}, {"resourceName", "r.csv"}}),
-                    zeltest::reply("ERROR", "Authorization Error: no rights"));
-    connect();
-    unsigned exists = 7;
-    const StatusPtr status(repository.itemResourceExists(S("a.zlw"), S("r.csv"), exists));
-    ASSERT_NE(status, nullptr);
-    EXPECT_EQ(status->getMessageNumber(), msg::kServerError);
-    EXPECT_EQ(status->getCode(), 2u);
-    EXPECT_EQ(exists, 0u);
-    EXPECT_TRUE(sentCommands(1));
-}
-
-TEST_F(RepositoryTest, AddItemUploadsTheFileWithCrcCheckingOff)
-{
-    const std::string content = "workspace bytes\n";
-    const std::string path = file("roads.zlw", content);
-    server.expectFrame(command("REP_ADD_ITEM", {{"repositoryName", "Samples"},
-                                                {"itemName", "roads.zlw"},
-                                                {"itemFileCRCCheckingEnabled", "false"}}))
-        .sendFrame(zeltest::readyAck())
-        .expectFrame(zeltest::fileHeader(content.size(), zeltest::crc32(content)))
-        .sendFrame(zeltest::readyAck())
-        .expectRawBytes(content)
-        .sendFrame(success("true"));
-    connect();
-    const StatusPtr status(repository.addItem(S("roads.zlw"), S(path)));
-    EXPECT_EQ(status, nullptr) << describe(status.get());
-    EXPECT_TRUE(sentCommands(1));
-}
-
-TEST_F(RepositoryTest, UpdateItemResourceUploadsWithResourceCrcCheckingOff)
-{
-    const std::string content = "a,b\n1,2\n";
-    const std::string path = file("codes.csv", content);
-    server.expectFrame(command("REP_UPDATE_ITEMRESOURCE", {{"repositoryName", "Samples"},
-                                                           {"itemName", "roads.zlw"},
-                                                           {"resourceName", "codes.csv"},
-                                                           {"resourceFileCRCCheckingEnabled", "false"}}))
-        .sendFrame(zeltest::readyAck())
-        .expectFrame(zeltest::fileHeader(content.size(), zeltest::crc32(content)))
-        .sendFrame(zeltest::readyAck())
-        .expectRawBytes(content)
-        .sendFrame(success("true"));
-    connect();
-    const StatusPtr status(repository.updateItemResource(S("roads.zlw"), S("codes.csv"), S(path)));
-    EXPECT_EQ(status, nullptr) << describe(status.get());
-    EXPECT_TRUE(sentCommands(1));
-}
-
-TEST_F(RepositoryTest, UploadOfAFileThatCannotBeOpenedNamesItAndSendsNothing)
-{
-    connect();
-    const std::string missing = (dir / "missing.zlw").string();
-    const StatusPtr status(repository.updateItem(S("roads.zlw"), S(missing)));
-    ASSERT_NE(status, nullptr);
-    EXPECT_EQ(status->getMessageNumber(), msg::kLocalFileRead);
-    EXPECT_NE(std::string(status->getMessage()).find(missing), std::string::npos) << status->getMessage();
-    EXPECT_TRUE(sentCommands(0));
-}
 
 // Records the progress calls in order.
 class ProgressLog final : public IZELServerProgressListener {
@@ -134,39 +50,95 @@ public:
     std::vector<std::string> calls;
 };
 
-TEST_F(RepositoryTest, TransfersReportToTheCallersListener)
+// ---- Items ------------------------------------------------------------------------------------------
+
+TEST_F(RepositoryTest, FlagsAreSetOnlyByTheExactTruthValueAndClearedByErrors)
 {
-    const std::string content = "0123456789";
-    const std::string source = file("up.csv", content);
+    server.exchange(repoCommand("REP_ITEMEXISTS", {{"itemName", "roads.zlw"}}), success("true"))
+        .exchange(repoCommand("REP_REMOVE_ITEM", {{"itemName", "a.zlw"}}), success("True"))
+        .exchange(repoCommand("REP_ITEMRESOURCEEXISTS", {{"itemName", "a.zlw"}, {"resourceName", "r.csv"}}),
+                  zeltest::reply("ERROR", "Authorization Error: no rights"));
+    signIn();
+    unsigned exists = 7;
+    unsigned removed = 7;
+    unsigned resource = 7;
+    EXPECT_EQ(StatusPtr(repository.itemExists(S("roads.zlw"), exists)), nullptr);
+    EXPECT_EQ(exists, 1u);
+    EXPECT_EQ(StatusPtr(repository.removeItem(S("a.zlw"), removed)), nullptr) << "no truth value is no failure";
+    EXPECT_EQ(removed, 0u);
+    const StatusPtr error(repository.itemResourceExists(S("a.zlw"), S("r.csv"), resource));
+    ASSERT_EQ(numberOf(error), msg::kServerError);
+    EXPECT_EQ(error->getCode(), 2u);
+    EXPECT_EQ(resource, 0u);
+    EXPECT_TRUE(server.verify());
+}
+
+TEST_F(RepositoryTest, UploadsAndDownloadsTurnCrcCheckingOffAndReportProgress)
+{
+    const std::string item = "workspace bytes\n";
+    const std::string resource = "0123456789";
     const std::string destination = (dir / "down.csv").string();
-    server.expectFrame(command("REP_ADD_ITEMRESOURCE", {{"repositoryName", "Samples"},
-                                                        {"itemName", "a.zlw"},
-                                                        {"resourceName", "up.csv"},
-                                                        {"resourceFileCRCCheckingEnabled", "false"}}))
-        .sendFrame(zeltest::readyAck())
-        .expectFrame(zeltest::fileHeader(content.size(), zeltest::crc32(content)))
-        .sendFrame(zeltest::readyAck())
-        .expectRawBytes(content)
-        .sendFrame(success("true"))
-        .expectFrame(command("REP_GET_ITEMRESOURCE", {{"repositoryName", "Samples"},
-                                                      {"itemName", "a.zlw"},
+    expectUpload(repoCommand("REP_ADD_ITEM", {{"itemName", "roads.zlw"}, {"itemFileCRCCheckingEnabled", "false"}}), item);
+    expectUpload(repoCommand("REP_UPDATE_ITEMRESOURCE", {{"itemName", "roads.zlw"},
+                                                         {"resourceName", "codes.csv"},
+                                                         {"resourceFileCRCCheckingEnabled", "false"}}),
+                 resource);
+    expectUpload(repoCommand("REP_ADD_ITEMRESOURCE", {{"itemName", "a.zlw"},
                                                       {"resourceName", "up.csv"},
-                                                      {"resourceFileCRCCheckingEnabled", "false"}}))
-        .sendFrame(zeltest::fileHeader(content.size(), zeltest::crc32(content)))
-        .expectFrame(zeltest::readyAck())
-        .sendRaw(content)
-        .expectFrame(zeltest::readyAck())
-        .sendFrame(success("true"));
-    connect();
+                                                      {"resourceFileCRCCheckingEnabled", "false"}}),
+                 resource);
+    // updateItem deliberately sends an item name that addItem refuses.
+    expectUpload(repoCommand("REP_UPDATE_ITEM", {{"itemName", "dir/roads.zlw"}, {"itemFileCRCCheckingEnabled", "false"}}),
+                 item);
+    // The resource is read back straight into its destination.
+    expectDownload(repoCommand("REP_GET_ITEMRESOURCE", {{"itemName", "a.zlw"},
+                                                        {"resourceName", "up.csv"},
+                                                        {"resourceFileCRCCheckingEnabled", "false"}}),
+                   resource, success("true"));
+    signIn();
+    const std::string itemFile = file("roads.zlw", item);
+    EXPECT_EQ(StatusPtr(repository.addItem(S("roads.zlw"), S(itemFile))), nullptr);
+    const std::string source = file("up.csv", resource);
+    EXPECT_EQ(StatusPtr(repository.updateItemResource(S("roads.zlw"), S("codes.csv"), S(source))), nullptr);
     ProgressLog up;
     EXPECT_EQ(StatusPtr(repository.addItemResource(S("a.zlw"), S("up.csv"), S(source), &up)), nullptr);
     EXPECT_EQ(up.calls, (std::vector<std::string>{"total 10", "start", "at 0", "finish"}));
+    EXPECT_EQ(numberOf(StatusPtr(repository.addItem(S("dir/roads.zlw"), S(itemFile)))), msg::kForbiddenCharacter);
+    const StatusPtr slash(repository.updateItem(S("dir/roads.zlw"), S(itemFile)));
+    EXPECT_EQ(slash, nullptr) << describe(slash.get());
     ProgressLog down;
-    unsigned received = 0;
+    unsigned received = 7;
     EXPECT_EQ(StatusPtr(repository.getItemResource(S("a.zlw"), S("up.csv"), S(destination), received, &down)), nullptr);
+    EXPECT_EQ(received, 1u);
     EXPECT_EQ(down.calls, (std::vector<std::string>{"total 10", "start", "at 0", "finish"}));
-    EXPECT_EQ(slurp(destination), content);
-    EXPECT_TRUE(sentCommands(2));
+    EXPECT_EQ(slurp(destination), resource);
+    EXPECT_TRUE(server.verify());
+}
+
+TEST_F(RepositoryTest, LocalChecksAndFileProblemsAreReportedBeforeAnythingIsSent)
+{
+    signIn();
+    const std::string missing = (dir / "missing.zlw").string();
+    const StatusPtr upload(repository.updateItem(S("roads.zlw"), S(missing)));
+    ASSERT_EQ(numberOf(upload), msg::kLocalFileRead);
+    EXPECT_NE(std::string(upload->getMessage()).find(missing), std::string::npos) << upload->getMessage();
+
+    const std::string destination = (dir / "missing" / "codes.csv").string();
+    unsigned received = 7;
+    const StatusPtr download(repository.getItemResource(S("roads.zlw"), S("codes.csv"), S(destination), received));
+    ASSERT_EQ(numberOf(download), msg::kLocalFileWrite);
+    EXPECT_NE(std::string(download->getMessage()).find(destination), std::string::npos) << download->getMessage();
+    EXPECT_EQ(received, 0u);
+
+    // A resource named like its item is refused before the file is opened; the character check comes
+    // first, and names that differ only in case are different names.
+    const ZELServerString noFile = S(missing);
+    EXPECT_EQ(numberOf(StatusPtr(repository.addItemResource(S("a.zlw"), S("a.zlw"), noFile))), msg::kResourceNamedAsItem);
+    EXPECT_EQ(numberOf(StatusPtr(repository.updateItemResource(S("a.zlw"), S("a.zlw"), noFile))),
+              msg::kResourceNamedAsItem);
+    EXPECT_EQ(numberOf(StatusPtr(repository.addItemResource(S("a%"), S("a%"), noFile))), msg::kForbiddenCharacter);
+    EXPECT_EQ(numberOf(StatusPtr(repository.addItemResource(S("a.zlw"), S("A.zlw"), noFile))), msg::kLocalFileRead);
+    EXPECT_TRUE(server.verify());
 }
 
 // ---- Argument checks --------------------------------------------------------------------------------
@@ -202,344 +174,176 @@ std::vector<Call> itemOperations()
     };
 }
 
-TEST_F(RepositoryTest, EmptyItemResourceOrPathIsRefusedBeforeAnythingIsSent)
+TEST_F(RepositoryTest, EmptyOrForbiddenNamesAreRefusedBeforeAnythingIsSent)
 {
-    connect();
-    const std::string path = file("src", "x");
+    signIn();
+    const ZELServerString path = S(file("src", "x"));
     for (const Call& c : itemOperations()) {
-        const StatusPtr noItem(c.call(repository, S(""), S("r.csv"), S(path)));
-        EXPECT_EQ(numberOf(noItem), msg::kRequiredValueMissing) << c.operation;
+        SCOPED_TRACE(c.operation);
+        EXPECT_EQ(numberOf(StatusPtr(c.call(repository, S(""), S("r.csv"), path))), msg::kRequiredValueMissing);
         if (c.takesResource) {
-            const StatusPtr noResource(c.call(repository, S("a.zlw"), S(""), S(path)));
-            EXPECT_EQ(numberOf(noResource), msg::kRequiredValueMissing) << c.operation;
+            EXPECT_EQ(numberOf(StatusPtr(c.call(repository, S("a.zlw"), S(""), path))), msg::kRequiredValueMissing);
         }
         if (c.takesPath) {
-            const StatusPtr noPath(c.call(repository, S("a.zlw"), S("r.csv"), S("")));
-            EXPECT_EQ(numberOf(noPath), msg::kRequiredValueMissing) << c.operation;
+            EXPECT_EQ(numberOf(StatusPtr(c.call(repository, S("a.zlw"), S("r.csv"), S("")))), msg::kRequiredValueMissing);
         }
         // An empty name wins over a forbidden character in the other name.
-        const StatusPtr emptyFirst(c.call(repository, S(""), S("r/1"), S(path)));
-        EXPECT_EQ(numberOf(emptyFirst), msg::kRequiredValueMissing) << c.operation;
-    }
-    EXPECT_TRUE(sentCommands(0));
-}
-
-TEST_F(RepositoryTest, ForbiddenCharactersAreRefusedEverywhereButUpdateItem)
-{
-    connect();
-    const std::string path = file("src", "x");
-    for (const Call& c : itemOperations()) {
-        if (std::string(c.operation) == "updateItem") {
-            continue;
-        }
-        for (const char forbidden : kForbidden) {
+        EXPECT_EQ(numberOf(StatusPtr(c.call(repository, S(""), S("r/1"), path))), msg::kRequiredValueMissing);
+        // updateItem deliberately lets any item name through.
+        const std::string forbiddenHere = std::string(c.operation) == "updateItem" ? "" : kForbidden;
+        for (const char forbidden : forbiddenHere) {
             const std::string bad = "a"s + forbidden + "b";
-            const StatusPtr badItem(c.call(repository, S(bad), S("r.csv"), S(path)));
-            ASSERT_EQ(numberOf(badItem), msg::kForbiddenCharacter) << c.operation << " item " << bad;
+            const StatusPtr badItem(c.call(repository, S(bad), S("r.csv"), path));
+            ASSERT_EQ(numberOf(badItem), msg::kForbiddenCharacter) << "item " << bad;
             EXPECT_NE(std::string(badItem->getMessage()).find(kForbidden), std::string::npos) << badItem->getMessage();
             if (c.takesResource) {
-                const StatusPtr badResource(c.call(repository, S("a.zlw"), S(bad), S(path)));
-                EXPECT_EQ(numberOf(badResource), msg::kForbiddenCharacter) << c.operation << " resource " << bad;
+                EXPECT_EQ(numberOf(StatusPtr(c.call(repository, S("a.zlw"), S(bad), path))), msg::kForbiddenCharacter)
+                    << "resource " << bad;
             }
         }
     }
-    EXPECT_TRUE(sentCommands(0));
+    EXPECT_TRUE(server.verify());
 }
 
-TEST_F(RepositoryTest, UpdateItemSendsANameWithASlashThatAddItemRefuses)
+TEST_F(RepositoryTest, ViewsAndRegistrationsCheckOnlyForEmptinessWithTheirOwnExceptions)
 {
-    const std::string content = "z";
-    const std::string path = file("src", content);
-    server.expectFrame(command("REP_UPDATE_ITEM", {{"repositoryName", "Samples"},
-                                                   {"itemName", "dir/roads.zlw"},
-                                                   {"itemFileCRCCheckingEnabled", "false"}}))
-        .sendFrame(zeltest::readyAck())
-        .expectFrame(zeltest::fileHeader(1, zeltest::crc32(content)))
-        .sendFrame(zeltest::readyAck())
-        .expectRawBytes(content)
-        .sendFrame(success("true"));
-    connect();
-    const StatusPtr refused(repository.addItem(S("dir/roads.zlw"), S(path)));
-    EXPECT_EQ(numberOf(refused), msg::kForbiddenCharacter);
-    const StatusPtr sent(repository.updateItem(S("dir/roads.zlw"), S(path)));
-    EXPECT_EQ(sent, nullptr) << describe(sent.get());
-    EXPECT_TRUE(sentCommands(1));
-}
-
-TEST_F(RepositoryTest, ResourceNamedLikeItsItemIsRefusedBeforeTheFileIsOpened)
-{
-    connect();
-    const std::string missing = (dir / "missing").string();
-    const StatusPtr added(repository.addItemResource(S("a.zlw"), S("a.zlw"), S(missing)));
-    EXPECT_EQ(numberOf(added), msg::kResourceNamedAsItem);
-    const StatusPtr updated(repository.updateItemResource(S("a.zlw"), S("a.zlw"), S(missing)));
-    EXPECT_EQ(numberOf(updated), msg::kResourceNamedAsItem);
-    // The character check comes first; names that differ only in case are different names.
-    const StatusPtr forbidden(repository.addItemResource(S("a%"), S("a%"), S(missing)));
-    EXPECT_EQ(numberOf(forbidden), msg::kForbiddenCharacter);
-    const StatusPtr caseDiffers(repository.addItemResource(S("a.zlw"), S("A.zlw"), S(missing)));
-    EXPECT_EQ(numberOf(caseDiffers), msg::kLocalFileRead);
-    EXPECT_TRUE(sentCommands(0));
-}
-
-TEST_F(RepositoryTest, ViewsAndRegistrationsCheckOnlyForEmptiness)
-{
-    server.exchange(command("REP_WORKSPACESERVICEEXISTS",
-                            {{"repositoryName", "Samples"}, {"workspaceName", "a/b"}, {"serviceName", "c:d"}}),
+    server.exchange(repoCommand("REP_WORKSPACESERVICEEXISTS", {{"workspaceName", "a/b"}, {"serviceName", "c:d"}}),
                     success("false"))
-        .exchange(command("REP_GET_TEMPLATEVIEW", {{"repositoryName", "Samples"}, {"templateName", "t*"}}),
+        .exchange(repoCommand("REP_GET_TEMPLATEVIEW", {{"templateName", "t*"}}), success("<R/>"))
+        .exchange(repoCommand("REP_GET_ITEMRESOURCESVIEW", {{"itemName", ""}, {"enableFilter", "All"}}), success("<R/>"))
+        .exchange(repoCommand("REP_GET_ITEMRESOURCEVIEW", {{"itemName", "a.zlw"}, {"resourceName", ""}}),
                   success("<R/>"));
-    connect();
+    signIn();
     unsigned flag = 7;
-    const StatusPtr exists(repository.workspaceServiceExists(S("a/b"), S("c:d"), flag));
-    EXPECT_EQ(exists, nullptr) << describe(exists.get());
+    EXPECT_EQ(StatusPtr(repository.workspaceServiceExists(S("a/b"), S("c:d"), flag)), nullptr);
     EXPECT_EQ(flag, 0u);
     ZELServerTemplate templ;
     unsigned found = 7;
-    const StatusPtr view(repository.getTemplateView(S("t*"), templ, found));
-    EXPECT_EQ(view, nullptr) << describe(view.get());
+    EXPECT_EQ(StatusPtr(repository.getTemplateView(S("t*"), templ, found)), nullptr);
     EXPECT_EQ(found, 0u);
-
-    const StatusPtr noWorkspace(repository.registerWorkspaceService(S(""), S("svc")));
-    EXPECT_EQ(numberOf(noWorkspace), msg::kRequiredValueMissing);
-    const StatusPtr noService(repository.deregisterWorkspaceService(S("w"), S(""), flag));
-    EXPECT_EQ(numberOf(noService), msg::kRequiredValueMissing);
-    ZELServerWorkspace workspace(nullptr);
-    const StatusPtr noName(repository.getWorkspaceView(S(""), workspace, found));
-    EXPECT_EQ(numberOf(noName), msg::kRequiredValueMissing);
-    EXPECT_TRUE(sentCommands(2));
-}
-
-TEST_F(RepositoryTest, ItemResourceViewsHaveTheirOwnExceptions)
-{
-    server.exchange(command("REP_GET_ITEMRESOURCESVIEW",
-                            {{"repositoryName", "Samples"}, {"itemName", ""}, {"enableFilter", "All"}}),
-                    success("<R/>"))
-        .exchange(command("REP_GET_ITEMRESOURCEVIEW",
-                          {{"repositoryName", "Samples"}, {"itemName", "a.zlw"}, {"resourceName", ""}}),
-                  success("<R/>"));
-    connect();
+    // The item resource views let an empty item or resource name through.
     ZELServerVector<IZELServerResource, ZELServerResource> resources;
-    const StatusPtr list(repository.getItemResourcesView(S(""), nullptr, resources));
-    EXPECT_EQ(list, nullptr) << describe(list.get());
+    EXPECT_EQ(StatusPtr(repository.getItemResourcesView(S(""), nullptr, resources)), nullptr);
     ZELServerResource resource;
-    unsigned found = 7;
-    const StatusPtr single(repository.getItemResourceView(S("a.zlw"), S(""), resource, found));
-    EXPECT_EQ(single, nullptr) << describe(single.get());
+    found = 7;
+    EXPECT_EQ(StatusPtr(repository.getItemResourceView(S("a.zlw"), S(""), resource, found)), nullptr);
     EXPECT_EQ(found, 0u);
-    const StatusPtr noItem(repository.getItemResourceView(S(""), S("r.csv"), resource, found));
-    EXPECT_EQ(numberOf(noItem), msg::kRequiredValueMissing);
-    EXPECT_TRUE(sentCommands(2));
-}
 
-// ---- Downloads --------------------------------------------------------------------------------------
-
-// Points the system's temporary directory at a folder of the test, so that leftovers can be seen.
-class ItemDownloadTest : public RepositoryTest {
-protected:
-    void SetUp() override
-    {
-        RepositoryTest::SetUp();
-        temporary = dir / "tmp";
-        fs::create_directory(temporary);
-        redirected.emplace(temporary);
+    ZELServerWorkspace workspace(nullptr);
+    const std::vector<std::pair<const char*, IZELServerStatus*>> refused = {
+        {"registerWorkspaceService", repository.registerWorkspaceService(S(""), S("svc"))},
+        {"deregisterWorkspaceService", repository.deregisterWorkspaceService(S("w"), S(""), flag)},
+        {"getWorkspaceView", repository.getWorkspaceView(S(""), workspace, found)},
+        {"getItemResourceView", repository.getItemResourceView(S(""), S("r.csv"), resource, found)},
+    };
+    for (const auto& [operation, raw] : refused) {
+        EXPECT_EQ(numberOf(StatusPtr(raw)), msg::kRequiredValueMissing) << operation;
     }
-    bool temporaryIsEmpty() const { return fs::is_empty(temporary); }
+    EXPECT_TRUE(server.verify());
+}
 
-    Bytes getItem(const std::string& item)
-    {
-        return command("REP_GET_ITEM",
-                       {{"repositoryName", "Samples"}, {"itemName", item}, {"itemFileCRCCheckingEnabled", "false"}});
+// ---- Item downloads ---------------------------------------------------------------------------------
+
+TEST_F(RepositoryTest, ItemDestinationIsReplacedOnlyByACompleteFileAndNoTemporaryFileStays)
+{
+    // The system's temporary folder points into the test's folder, so that leftovers can be seen.
+    const fs::path temporary = dir / "tmp";
+    fs::create_directory(temporary);
+    const zeltest::ScopedTemporaryFolder redirected(temporary);
+    const Bytes getItem =
+        repoCommand("REP_GET_ITEM", {{"itemName", "roads.zlw"}, {"itemFileCRCCheckingEnabled", "false"}});
+    const std::string big(200000, 'w');
+    expectDownload(getItem, big, success("true"));
+    server.exchange(getItem, success("false"));
+    expectDownload(getItem, "", success("true"));
+    expectDownload(getItem, "new contents", zeltest::reply("ERROR", "item is locked"));
+    expectDownload(getItem, "abc", success("true"));
+    signIn();
+
+    struct Case {
+        const char* what;
+        std::string destination;  // relative to the test's folder; made with the old contents unless missing
+        unsigned number;
+        std::optional<unsigned> received;
+        std::string after;  // the destination's contents afterwards
+        std::string named;  // text the status message must contain
+    };
+    const std::string old = "old contents";
+    const Case cases[] = {
+        {"complete file", "a.zlw", 0, 1, big, ""},
+        {"no file", "b.zlw", msg::kEmptyDownload, 0, old, "roads.zlw"},
+        // The answer is read before the size is looked at.
+        {"zero bytes", "c.zlw", msg::kEmptyDownload, 1, old, ""},
+        {"error after the whole file", "d.zlw", msg::kServerError, 0, old, ""},
+        {"missing folder", "no-such-dir/e.zlw", msg::kLocalFileWrite, std::nullopt, "", (dir / "no-such-dir/e.zlw").string()},
+    };
+    for (const Case& c : cases) {
+        SCOPED_TRACE(c.what);
+        const std::string destination = (dir / c.destination).string();
+        if (c.number != msg::kLocalFileWrite) {
+            file(c.destination, old);
+        }
+        unsigned received = 7;
+        const StatusPtr status(repository.getItem(S("roads.zlw"), S(destination), received));
+        ASSERT_EQ(numberOf(status), c.number) << describe(status.get());
+        if (c.received) {
+            EXPECT_EQ(received, *c.received);
+        }
+        EXPECT_EQ(slurp(destination), c.after);
+        if (!c.named.empty()) {
+            EXPECT_NE(std::string(status->getMessage()).find(c.named), std::string::npos) << status->getMessage();
+        }
+        EXPECT_TRUE(fs::is_empty(temporary));
     }
-
-    fs::path temporary;
-    std::optional<zeltest::ScopedTemporaryFolder> redirected;
-};
-
-TEST_F(ItemDownloadTest, ReceivedItemReplacesTheDestination)
-{
-    const std::string content(200000, 'w');
-    const std::string destination = file("roads.zlw", "old contents");
-    server.expectFrame(getItem("roads.zlw"))
-        .sendFrame(zeltest::fileHeader(content.size(), zeltest::crc32(content)))
-        .expectFrame(zeltest::readyAck())
-        .sendRaw(content)
-        .expectFrame(zeltest::readyAck())
-        .sendFrame(success("true"));
-    connect();
-    unsigned received = 7;
-    const StatusPtr status(repository.getItem(S("roads.zlw"), S(destination), received));
-    EXPECT_EQ(status, nullptr) << describe(status.get());
-    EXPECT_EQ(received, 1u);
-    EXPECT_EQ(slurp(destination), content);
-    EXPECT_TRUE(temporaryIsEmpty());
-    EXPECT_TRUE(sentCommands(1));
-}
-
-TEST_F(ItemDownloadTest, NoFileFromTheServerKeepsTheOldDestinationAndNamesTheItem)
-{
-    const std::string destination = file("roads.zlw", "old contents");
-    server.expectFrame(getItem("roads.zlw")).sendFrame(success("false"));
-    connect();
-    unsigned received = 7;
-    const StatusPtr status(repository.getItem(S("roads.zlw"), S(destination), received));
-    ASSERT_EQ(numberOf(status), msg::kEmptyDownload);
-    EXPECT_NE(std::string(status->getMessage()).find("roads.zlw"), std::string::npos) << status->getMessage();
-    EXPECT_EQ(received, 0u);
-    EXPECT_EQ(slurp(destination), "old contents");
-    EXPECT_TRUE(temporaryIsEmpty());
-    EXPECT_TRUE(sentCommands(1));
-}
-
-TEST_F(ItemDownloadTest, ZeroByteFileIsAnEmptyDownloadToo)
-{
-    const std::string destination = file("roads.zlw", "old contents");
-    server.expectFrame(getItem("roads.zlw"))
-        .sendFrame(zeltest::fileHeader(0, 0))
-        .expectFrame(zeltest::readyAck())
-        .expectFrame(zeltest::readyAck())
-        .sendFrame(success("true"));
-    connect();
-    unsigned received = 7;
-    const StatusPtr status(repository.getItem(S("roads.zlw"), S(destination), received));
-    EXPECT_EQ(numberOf(status), msg::kEmptyDownload);
-    // The answer was read before the size was looked at.
-    EXPECT_EQ(received, 1u);
-    EXPECT_EQ(slurp(destination), "old contents");
-    EXPECT_TRUE(temporaryIsEmpty());
-    EXPECT_TRUE(sentCommands(1));
-}
-
-TEST_F(ItemDownloadTest, FailedTransferKeepsTheDestinationAndRemovesTheTemporaryFile)
-{
-    const std::string destination = file("roads.zlw", "old contents");
-    // The whole file arrives, but the server's final answer is an error.
-    const std::string content = "new contents";
-    server.expectFrame(getItem("roads.zlw"))
-        .sendFrame(zeltest::fileHeader(content.size(), zeltest::crc32(content)))
-        .expectFrame(zeltest::readyAck())
-        .sendRaw(content)
-        .expectFrame(zeltest::readyAck())
-        .sendFrame(zeltest::reply("ERROR", "item is locked"));
-    connect();
-    unsigned received = 7;
-    const StatusPtr status(repository.getItem(S("roads.zlw"), S(destination), received));
-    EXPECT_EQ(numberOf(status), msg::kServerError);
-    EXPECT_EQ(received, 0u);
-    EXPECT_EQ(slurp(destination), "old contents");
-    EXPECT_TRUE(temporaryIsEmpty());
-    EXPECT_TRUE(sentCommands(1));
-}
-
-TEST_F(ItemDownloadTest, DestinationThatCannotBeWrittenIsNamed)
-{
-    const std::string content = "abc";
-    const std::string destination = (dir / "no-such-dir" / "roads.zlw").string();
-    server.expectFrame(getItem("roads.zlw"))
-        .sendFrame(zeltest::fileHeader(content.size(), zeltest::crc32(content)))
-        .expectFrame(zeltest::readyAck())
-        .sendRaw(content)
-        .expectFrame(zeltest::readyAck())
-        .sendFrame(success("true"));
-    connect();
-    unsigned received = 0;
-    const StatusPtr status(repository.getItem(S("roads.zlw"), S(destination), received));
-    ASSERT_EQ(numberOf(status), msg::kLocalFileWrite);
-    EXPECT_NE(std::string(status->getMessage()).find(destination), std::string::npos) << status->getMessage();
-    EXPECT_TRUE(temporaryIsEmpty());
-    EXPECT_TRUE(sentCommands(1));
-}
-
-TEST_F(RepositoryTest, ResourceIsReceivedStraightIntoItsDestination)
-{
-    const std::string content = "code,label\n";
-    const std::string destination = (dir / "codes.csv").string();
-    server.expectFrame(command("REP_GET_ITEMRESOURCE", {{"repositoryName", "Samples"},
-                                                        {"itemName", "roads.zlw"},
-                                                        {"resourceName", "codes.csv"},
-                                                        {"resourceFileCRCCheckingEnabled", "false"}}))
-        .sendFrame(zeltest::fileHeader(content.size(), zeltest::crc32(content)))
-        .expectFrame(zeltest::readyAck())
-        .sendRaw(content)
-        .expectFrame(zeltest::readyAck())
-        .sendFrame(success("true"));
-    connect();
-    unsigned received = 7;
-    const StatusPtr status(repository.getItemResource(S("roads.zlw"), S("codes.csv"), S(destination), received));
-    EXPECT_EQ(status, nullptr) << describe(status.get());
-    EXPECT_EQ(received, 1u);
-    EXPECT_EQ(slurp(destination), content);
-    EXPECT_TRUE(sentCommands(1));
-}
-
-TEST_F(RepositoryTest, ResourceDestinationInAMissingDirectoryIsNamedAndNothingIsSent)
-{
-    connect();
-    const std::string destination = (dir / "missing" / "codes.csv").string();
-    unsigned received = 7;
-    const StatusPtr status(repository.getItemResource(S("roads.zlw"), S("codes.csv"), S(destination), received));
-    ASSERT_EQ(numberOf(status), msg::kLocalFileWrite);
-    EXPECT_NE(std::string(status->getMessage()).find(destination), std::string::npos) << status->getMessage();
-    EXPECT_EQ(received, 0u);
-    EXPECT_TRUE(sentCommands(0));
+    EXPECT_TRUE(server.verify());
 }
 
 // ---- View filters -----------------------------------------------------------------------------------
 
-TEST_F(RepositoryTest, SummaryFilterTranslatesTheThreeValuesExactly)
+TEST_F(RepositoryTest, WorkspaceFiltersTranslateTheThreeValuesExactlyAndRefuseAnythingElse)
 {
     const std::vector<std::pair<std::optional<std::string>, std::string>> sent = {
         {std::nullopt, "All"}, {"ALL", "All"}, {"ENABLED", "Enabled"}, {"DISABLED", "Disabled"}};
     for (const auto& [filter, value] : sent) {
-        server.exchange(command("REP_GET_WORKSPACESUMMARIESVIEW", {{"repositoryName", "Samples"}, {"enableFilter", value}}),
+        server.exchange(repoCommand("REP_GET_WORKSPACESUMMARIESVIEW", {{"enableFilter", value}}),
                         success(R"(<R><WORKSPACE_SUMMARY name="s1"/><WORKSPACE_SUMMARY name="s2"/></R>)"));
     }
-    connect();
+    signIn();
+    ZELServerVector<IZELServerWorkspaceSummary, ZELServerWorkspaceSummary> summaries;
     for (const auto& [filter, value] : sent) {
         ZELServerStringDict directives;
         if (filter) {
             directives.insert("ENABLE_FILTER", *filter);
         }
-        ZELServerVector<IZELServerWorkspaceSummary, ZELServerWorkspaceSummary> summaries;
-        const StatusPtr status(repository.getWorkspaceSummariesView(filter ? &directives : nullptr, summaries));
-        EXPECT_EQ(status, nullptr) << describe(status.get());
+        EXPECT_EQ(StatusPtr(repository.getWorkspaceSummariesView(filter ? &directives : nullptr, summaries)), nullptr);
         EXPECT_EQ(summaries.entries(), 2u) << value;
     }
-    EXPECT_TRUE(sentCommands(sent.size()));
-}
-
-TEST_F(RepositoryTest, FilterWithoutAKnownValueIsRefused)
-{
-    connect();
-    const std::vector<std::optional<std::string>> refused = {std::nullopt, "enabled", "All", "ENABLED ", ""};
-    for (const auto& filter : refused) {
+    for (const char* filter : {static_cast<const char*>(nullptr), "enabled", "All", "ENABLED ", ""}) {
         ZELServerStringDict directives;
         directives.insert("OTHER", "x");
         if (filter) {
-            directives.insert("ENABLE_FILTER", *filter);
+            directives.insert("ENABLE_FILTER", filter);
         }
         ZELServerVector<IZELServerWorkspace, ZELServerWorkspace> workspaces;
-        const StatusPtr workspacesStatus(repository.getWorkspacesView(&directives, workspaces));
-        EXPECT_EQ(numberOf(workspacesStatus), msg::kRequiredValueMissing) << filter.value_or("(missing)");
-        ZELServerVector<IZELServerWorkspaceSummary, ZELServerWorkspaceSummary> summaries;
-        const StatusPtr summariesStatus(repository.getWorkspaceSummariesView(&directives, summaries));
-        EXPECT_EQ(numberOf(summariesStatus), msg::kRequiredValueMissing) << filter.value_or("(missing)");
+        EXPECT_EQ(numberOf(StatusPtr(repository.getWorkspacesView(&directives, workspaces))), msg::kRequiredValueMissing)
+            << (filter ? filter : "(missing)");
+        EXPECT_EQ(numberOf(StatusPtr(repository.getWorkspaceSummariesView(&directives, summaries))),
+                  msg::kRequiredValueMissing)
+            << (filter ? filter : "(missing)");
     }
-    EXPECT_TRUE(sentCommands(0));
+    EXPECT_TRUE(server.verify());
 }
 
 TEST_F(RepositoryTest, ListViewsIgnoreTheirDirectivesAndAskForEverything)
 {
-    server.exchange(command("REP_GET_CUSTOMFORMATSVIEW", {{"repositoryName", "Samples"}, {"enableFilter", "All"}}),
+    server.exchange(repoCommand("REP_GET_CUSTOMFORMATSVIEW", {{"enableFilter", "All"}}),
                     success(R"(<R><CUSTOMFORMAT name="f.zds"/></R>)"))
-        .exchange(command("REP_GET_CUSTOMTRANSFORMERSVIEW", {{"repositoryName", "Samples"}, {"enableFilter", "All"}}),
+        .exchange(repoCommand("REP_GET_CUSTOMTRANSFORMERSVIEW", {{"enableFilter", "All"}}),
                   success(R"(<R><CUSTOMTRANSFORMER name="t1.zlx"/><CUSTOMTRANSFORMER name="t2.zlx"/></R>)"))
-        .exchange(command("REP_GET_TEMPLATESVIEW", {{"repositoryName", "Samples"}, {"enableFilter", "All"}}),
-                  success(R"(<R><TEMPLATE name="p.zlwt"/></R>)"))
-        .exchange(command("REP_GET_ITEMRESOURCESVIEW",
-                          {{"repositoryName", "Samples"}, {"itemName", "a.zlw"}, {"enableFilter", "All"}}),
+        .exchange(repoCommand("REP_GET_TEMPLATESVIEW", {{"enableFilter", "All"}}), success(R"(<R><TEMPLATE name="p"/></R>)"))
+        .exchange(repoCommand("REP_GET_ITEMRESOURCESVIEW", {{"itemName", "a.zlw"}, {"enableFilter", "All"}}),
                   success(R"(<R><RESOURCE name="r1"/><RESOURCE name="r2"/><RESOURCE name="r3"/></R>)"));
-    connect();
+    signIn();
     ZELServerStringDict directives;
     directives.insert("ENABLE_FILTER", "DISABLED");
     ZELServerVector<IZELServerCustomFormat, ZELServerCustomFormat> formats;
@@ -550,27 +354,23 @@ TEST_F(RepositoryTest, ListViewsIgnoreTheirDirectivesAndAskForEverything)
     EXPECT_EQ(StatusPtr(repository.getCustomTransformersView(&directives, transformers)), nullptr);
     EXPECT_EQ(StatusPtr(repository.getTemplatesView(&directives, templates)), nullptr);
     EXPECT_EQ(StatusPtr(repository.getItemResourcesView(S("a.zlw"), &directives, resources)), nullptr);
-    EXPECT_EQ(formats.entries(), 1u);
-    EXPECT_EQ(transformers.entries(), 2u);
-    EXPECT_EQ(templates.entries(), 1u);
-    EXPECT_EQ(resources.entries(), 3u);
-    EXPECT_TRUE(sentCommands(4));
+    EXPECT_EQ((std::vector<unsigned>{formats.entries(), transformers.entries(), templates.entries(), resources.entries()}),
+              (std::vector<unsigned>{1, 2, 1, 3}));
+    EXPECT_TRUE(server.verify());
 }
 
 TEST_F(RepositoryTest, SingleViewsFillTheCallersObjectAndSetFound)
 {
-    server.exchange(command("REP_GET_WORKSPACEVIEW", {{"repositoryName", "Samples"}, {"workspaceName", "roads.zlw"}}),
+    server.exchange(repoCommand("REP_GET_WORKSPACEVIEW", {{"workspaceName", "roads.zlw"}}),
                     success(R"(<R><WORKSPACE_DEFINITIONS workspace_id="w1" name="roads.zlw">)"
                             R"(<DATASET name="A" is_source="true"/></WORKSPACE_DEFINITIONS></R>)"))
-        .exchange(command("REP_GET_CUSTOMFORMATVIEW", {{"repositoryName", "Samples"}, {"customFormatName", "f.zds"}}),
+        .exchange(repoCommand("REP_GET_CUSTOMFORMATVIEW", {{"customFormatName", "f.zds"}}),
                   success(R"(<R><CUSTOMFORMAT name="f.zds" filesize="12"/></R>)"))
-        .exchange(command("REP_GET_CUSTOMTRANSFORMERVIEW",
-                          {{"repositoryName", "Samples"}, {"customTransformerName", "t.zlx"}}),
+        .exchange(repoCommand("REP_GET_CUSTOMTRANSFORMERVIEW", {{"customTransformerName", "t.zlx"}}),
                   success(R"(<R><CUSTOMTRANSFORMER name="t.zlx"/></R>)"))
-        .exchange(command("REP_GET_ITEMRESOURCEVIEW",
-                          {{"repositoryName", "Samples"}, {"itemName", "a.zlw"}, {"resourceName", "r.csv"}}),
+        .exchange(repoCommand("REP_GET_ITEMRESOURCEVIEW", {{"itemName", "a.zlw"}, {"resourceName", "r.csv"}}),
                   success(R"(<R><RESOURCE name="r.csv" filesize="5"/></R>)"));
-    connect();
+    signIn();
     ZELServerWorkspace workspace(nullptr);
     ZELServerCustomFormat format;
     ZELServerCustomTransformer transformer;
@@ -584,24 +384,24 @@ TEST_F(RepositoryTest, SingleViewsFillTheCallersObjectAndSetFound)
     EXPECT_EQ(workspace.getSourceDatasets().entries(), 1u);
     EXPECT_EQ(format.getFileSize(), 12);
     EXPECT_EQ(resource.getFileSize(), 5);
-    EXPECT_TRUE(sentCommands(4));
+    EXPECT_TRUE(server.verify());
 }
 
 // ---- Workspace registrations ------------------------------------------------------------------------
 
-TEST_F(RepositoryTest, WorkspaceServicesFilterAppendsTheWorkspaceName)
+TEST_F(RepositoryTest, WorkspaceServicesFilterAppendsTheWorkspaceNameAndRegistrationsNameBoth)
 {
-    server.exchange(command("REP_GET_WORKSPACESERVICES",
-                            {{"repositoryName", "Samples"}, {"enableFilter", "All"}, {"workspaceName", "roads.zlw"}}),
+    const zeltest::Values names = {{"workspaceName", "roads.zlw"}, {"serviceName", "download"}};
+    server.exchange(repoCommand("REP_GET_WORKSPACESERVICES", {{"enableFilter", "All"}, {"workspaceName", "roads.zlw"}}),
                     success(R"(<R><WORKSPACE_SERVICE><WORKSPACE_SUMMARY name="roads.zlw" is_enabled="true"/>)"
                             R"(<SERVICE service_id="3" name="download" is_workspace_reg_allowed="true"/>)"
                             R"(</WORKSPACE_SERVICE></R>)"))
-        .exchange(command("REP_GET_WORKSPACESERVICES",
-                          {{"repositoryName", "Samples"}, {"enableFilter", "Disabled"}, {"workspaceName", "w"}}),
+        .exchange(repoCommand("REP_GET_WORKSPACESERVICES", {{"enableFilter", "Disabled"}, {"workspaceName", "w"}}),
                   success("<R/>"))
-        .exchange(command("REP_GET_WORKSPACESERVICES", {{"repositoryName", "Samples"}, {"enableFilter", "All"}}),
-                  success("<R/>"));
-    connect();
+        .exchange(repoCommand("REP_GET_WORKSPACESERVICES", {{"enableFilter", "All"}}), success("<R/>"))
+        .exchange(repoCommand("REP_REGISTER_WORKSPACESERVICE", names), success("true"))
+        .exchange(repoCommand("REP_DEREGISTER_WORKSPACESERVICE", names), success("true"));
+    signIn();
     ZELServerStringDict onlyWorkspace;
     onlyWorkspace.insert("WORKSPACE_NAME", "roads.zlw");
     ZELServerVector<IZELServerWorkspaceService, ZELServerWorkspaceService> registrations;
@@ -625,23 +425,11 @@ TEST_F(RepositoryTest, WorkspaceServicesFilterAppendsTheWorkspaceName)
     ZELServerStringDict unknown;
     unknown.insert("ENABLE_FILTER", "Enabled");
     EXPECT_EQ(numberOf(StatusPtr(repository.getWorkspaceServices(&unknown, registrations))), msg::kRequiredValueMissing);
-    EXPECT_TRUE(sentCommands(3));
-}
-
-TEST_F(RepositoryTest, RegisteringAndDeregisteringAWorkspace)
-{
-    server.exchange(command("REP_REGISTER_WORKSPACESERVICE",
-                            {{"repositoryName", "Samples"}, {"workspaceName", "roads.zlw"}, {"serviceName", "download"}}),
-                    success("true"))
-        .exchange(command("REP_DEREGISTER_WORKSPACESERVICE",
-                          {{"repositoryName", "Samples"}, {"workspaceName", "roads.zlw"}, {"serviceName", "download"}}),
-                  success("true"));
-    connect();
     EXPECT_EQ(StatusPtr(repository.registerWorkspaceService(S("roads.zlw"), S("download"))), nullptr);
     unsigned deregistered = 0;
     EXPECT_EQ(StatusPtr(repository.deregisterWorkspaceService(S("roads.zlw"), S("download"), deregistered)), nullptr);
     EXPECT_EQ(deregistered, 1u);
-    EXPECT_TRUE(sentCommands(2));
+    EXPECT_TRUE(server.verify());
 }
 
 TEST(RepositoryObject, WithoutAChannelCommandsFailAfterTheirChecks)

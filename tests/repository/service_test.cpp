@@ -21,8 +21,6 @@
 namespace zel::repotest {
 namespace {
 
-ZELServerString S(const std::string& text) { return ZELServerString(text); }
-
 std::vector<unsigned> flagsOf(const IZELServerService& service)
 {
     return {service.isRegistrationAllowed(1), service.isRegistrationAllowed(2), service.isRegistrationAllowed(3),
@@ -31,28 +29,23 @@ std::vector<unsigned> flagsOf(const IZELServerService& service)
 
 // ---- Settings and flags -----------------------------------------------------------------------------
 
-TEST(ServiceSettings, FreshServiceHasTheUnsavedIdAndNoFlags)
+TEST(ServiceSettings, FreshServiceIsUnsavedAndFlagsApplyPerItemTypeOnly)
 {
-    const ZELServerService service(nullptr, "download", "Data Download", "Serves files", "/svc/{name}", false, false,
-                                   false, false, false);
+    ZELServerService service(nullptr, "download", "Data Download", "Serves files", "/svc/{name}", false, false, false,
+                             false, false);
     EXPECT_EQ(service.serviceId(), "-1");
     EXPECT_EQ(service.isEnabled(), 0u);
     EXPECT_EQ(flagsOf(service), (std::vector<unsigned>{0, 0, 0, 0}));
     ZELServerString text;
     service.getUrlPattern(text);
     EXPECT_EQ(text.str(), "/svc/{name}");
-}
 
-TEST(ServiceSettings, RegistrationFlagsPerItemTypeIgnoreOtherTypes)
-{
-    ZELServerService service(nullptr);
     service.setRegistrationAllowed(3, 1);
     service.setRegistrationAllowed(5, 1);
     service.setRegistrationAllowed(0, 1);
     EXPECT_EQ(flagsOf(service), (std::vector<unsigned>{0, 0, 1, 0}));
     service.setWorkspaceRegistrationAllowed(9);
-    EXPECT_EQ(service.isWorkspaceRegistrationAllowed(), 1u);
-    EXPECT_EQ(service.isRegistrationAllowed(1), 1u);
+    EXPECT_EQ(flagsOf(service), (std::vector<unsigned>{1, 0, 1, 0}));
     EXPECT_EQ(service.isRegistrationAllowed(0), 0u);
     EXPECT_EQ(service.isRegistrationAllowed(5), 0u);
     service.setRegistrationAllowed(1, 0);
@@ -85,6 +78,12 @@ TEST(ServiceSettings, ReadsTheTenAttributesAndItsProperties)
 
 class ServiceTest : public RepositoryWireTest {
 protected:
+    // The accessor document of an update command holding the one property the tests set.
+    static std::string propertiesDocument(const std::string& keyword)
+    {
+        return xmlDocument(keyword, R"(<PROPERTY category="run" name="priority" value="high"/>)");
+    }
+
     ZELServerService service{channel.get(), "download", "Data Download", "", "", false, false, false, false, false};
 };
 
@@ -94,50 +93,40 @@ TEST_F(ServiceTest, RegisterItemRefusesKindsTheServiceDoesNotTakeWithoutSending)
     server.exchange(command("REP_REGISTERITEM",
                             {{"serviceName", "download"}, {"repositoryName", "Samples"}, {"itemName", "roads.zlw"}}),
                     success("true"));
-    connect();
-    EXPECT_EQ(numberOf(StatusPtr(service.registerItem(S("Samples"), S("clean.zlx")))), msg::kRegistrationRefused);
-    EXPECT_EQ(numberOf(StatusPtr(service.registerItem(S("Samples"), S("report.zlwt")))), msg::kRegistrationRefused);
-    EXPECT_EQ(numberOf(StatusPtr(service.registerItem(S("Samples"), S("ROADS.ZLW")))), msg::kRegistrationRefused);
+    signIn();
+    for (const char* refused : {"clean.zlx", "report.zlwt", "ROADS.ZLW"}) {
+        EXPECT_EQ(numberOf(StatusPtr(service.registerItem(S("Samples"), S(refused)))), msg::kRegistrationRefused) << refused;
+    }
     EXPECT_EQ(numberOf(StatusPtr(service.registerItem(S("Samples"), S("")))), msg::kRequiredValueMissing);
     EXPECT_EQ(StatusPtr(service.registerItem(S("Samples"), S("roads.zlw"))), nullptr);
-    EXPECT_TRUE(sentCommands(1));
-}
-
-TEST_F(ServiceTest, NameWithoutAKnownEndingIsAlwaysRefused)
-{
+    // A name without a known ending is refused even by a service that takes every kind.
     for (unsigned type = 1; type <= 4; ++type) {
         service.setRegistrationAllowed(type, 1);
     }
-    connect();
     EXPECT_EQ(numberOf(StatusPtr(service.registerItem(S("Samples"), S("notes.txt")))), msg::kRegistrationRefused);
-    EXPECT_TRUE(sentCommands(0));
+    EXPECT_TRUE(server.verify());
 }
 
-TEST_F(ServiceTest, ItemRegisteredAndDeregisterItemAnswerWithTheServersFlag)
+TEST_F(ServiceTest, ItemCommandsAnswerWithTheServersFlagAndListRegisteredItems)
 {
     server.exchange(command("REP_ITEMREGISTERED",
                             {{"serviceName", "download"}, {"repositoryName", "Samples"}, {"itemName", "a.zlw"}}),
                     success("true"))
         .exchange(command("REP_DEREGISTERITEM",
                           {{"serviceName", "download"}, {"repositoryName", "Samples"}, {"itemName", "a.zlw"}}),
-                  success("false"));
-    connect();
+                  success("false"))
+        .exchange(command("REP_GET_REGISTEREDITEMS", {{"serviceName", "download"}}),
+                  success(R"(<R><ITEM name="a.zlw" repository_name="Samples"/><ITEM name="b.zlwt"/></R>)"))
+        .exchange(command("REP_GET_REGISTEREDITEMS", {{"serviceName", "download"}, {"itemType", "4"}}),
+                  success(R"(<R><ITEM name="b.zlwt"/></R>)"));
+    signIn();
     unsigned registered = 0;
     EXPECT_EQ(StatusPtr(service.itemRegistered(S("Samples"), S("a.zlw"), registered)), nullptr);
     EXPECT_EQ(registered, 1u);
     unsigned deregistered = 7;
     EXPECT_EQ(StatusPtr(service.deregisterItem(S("Samples"), S("a.zlw"), deregistered)), nullptr);
     EXPECT_EQ(deregistered, 0u);
-    EXPECT_TRUE(sentCommands(2));
-}
-
-TEST_F(ServiceTest, RegisteredItemsSendTheItemTypeOnlyWhenAsked)
-{
-    server.exchange(command("REP_GET_REGISTEREDITEMS", {{"serviceName", "download"}}),
-                    success(R"(<R><ITEM name="a.zlw" repository_name="Samples"/><ITEM name="b.zlwt"/></R>)"))
-        .exchange(command("REP_GET_REGISTEREDITEMS", {{"serviceName", "download"}, {"itemType", "4"}}),
-                  success(R"(<R><ITEM name="b.zlwt"/></R>)"));
-    connect();
+    // The registered-items query sends the item type only when "ITEM_TYPE" asks for one.
     ZELServerVector<IZELServerItem, ZELServerItem> items;
     ZELServerStringDict other;
     other.insert("item_type", "1");
@@ -145,71 +134,45 @@ TEST_F(ServiceTest, RegisteredItemsSendTheItemTypeOnlyWhenAsked)
     ASSERT_EQ(items.entries(), 2u);
     EXPECT_EQ(items.element(0)->getItemType(), 1u);
     EXPECT_EQ(items.element(1)->getItemType(), 4u);
-
     ZELServerStringDict templates;
     templates.insert("ITEM_TYPE", "4");
     EXPECT_EQ(StatusPtr(service.getRegisteredItems(&templates, items)), nullptr);
     EXPECT_EQ(items.entries(), 1u);
-    EXPECT_TRUE(sentCommands(2));
+    EXPECT_TRUE(server.verify());
 }
 
 // ---- Property-accessor updates ----------------------------------------------------------------------
 
-std::string propertiesDocument(const std::string& keyword)
+TEST_F(ServiceTest, AccessorUpdatesSendTheOwnersIdAndADocumentNamedAfterTheCommand)
 {
-    return payloadDocument(keyword, R"(<PROPERTY category="run" name="priority" value="high"/>)");
-}
-
-ZELServerPropertyAccessor& highPriority(ZELServerPropertyAccessor& accessor)
-{
-    accessor.setProperty(S("run"), S("priority"), S("high"));
-    return accessor;
-}
-
-TEST_F(ServiceTest, ServicePropertiesAreAddressedByTheServiceId)
-{
-    const std::string keyword = "REP_UPDATE_SERVICEPROPERTYACCESSOR";
-    server.exchange(command(keyword, {{"serviceID", "-1"}, {"propertyAccessorObject", propertiesDocument(keyword)}}),
-                    success("true"))
-        .exchange(command(keyword, {{"serviceID", "42"}, {"propertyAccessorObject", propertiesDocument(keyword)}}),
-                  success("true"));
-    connect();
+    const auto update = [](const std::string& keyword, const char* idName, const char* id) {
+        return command(keyword, {{idName, id}, {"propertyAccessorObject", propertiesDocument(keyword)}});
+    };
+    server.exchange(update("REP_UPDATE_SERVICEPROPERTYACCESSOR", "serviceID", "-1"), success("true"))
+        .exchange(update("REP_UPDATE_SERVICEPROPERTYACCESSOR", "serviceID", "42"), success("true"))
+        .exchange(update("REP_UPDATE_WORKSPACEPROPERTYACCESSOR", "workspaceID", "ws-17"), success("true"))
+        .exchange(update("REP_UPDATE_DATASETPROPERTYACCESSOR", "datasetID", "d-a"), success("true"))
+        .exchange(update("REP_UPDATE_FEATURETYPEPROPERTYACCESSOR", "featureTypeID", "ft-a1"),
+                  zeltest::reply("ERROR", "feature type is locked"));
+    signIn();
     ZELServerPropertyAccessor accessor;
-    EXPECT_EQ(StatusPtr(service.updatePropertyAccessor(highPriority(accessor))), nullptr);
+    accessor.setProperty(S("run"), S("priority"), S("high"));
+    // A service not saved yet goes by the id "-1".
+    EXPECT_EQ(StatusPtr(service.updatePropertyAccessor(accessor)), nullptr);
     ASSERT_EQ(readServiceReply(R"(<SERVICE service_id="42" name="download"/>)", channel.get(), service), 0);
     EXPECT_EQ(StatusPtr(service.updatePropertyAccessor(accessor)), nullptr);
-    EXPECT_TRUE(sentCommands(2));
-}
-
-TEST_F(RepositoryWireTest, WorkspaceDatasetAndFeatureTypeSendTheirOwnIds)
-{
-    const std::string workspaceKeyword = "REP_UPDATE_WORKSPACEPROPERTYACCESSOR";
-    const std::string datasetKeyword = "REP_UPDATE_DATASETPROPERTYACCESSOR";
-    const std::string featureTypeKeyword = "REP_UPDATE_FEATURETYPEPROPERTYACCESSOR";
-    server.exchange(command(workspaceKeyword,
-                            {{"workspaceID", "ws-17"}, {"propertyAccessorObject", propertiesDocument(workspaceKeyword)}}),
-                    success("true"))
-        .exchange(command(datasetKeyword,
-                          {{"datasetID", "d-a"}, {"propertyAccessorObject", propertiesDocument(datasetKeyword)}}),
-                  success("true"))
-        .exchange(command(featureTypeKeyword, {{"featureTypeID", "ft-a1"},
-                                               {"propertyAccessorObject", propertiesDocument(featureTypeKeyword)}}),
-                  zeltest::reply("ERROR", "feature type is locked"));
-    connect();
     ZELServerWorkspace workspace(nullptr);
     ASSERT_EQ(readWorkspaceReply(R"(<WORKSPACE_DEFINITIONS workspace_id="ws-17"><DATASET dataset_id="d-a" )"
                                  R"(is_source="true"><FEATURE_TYPE feature_type_id="ft-a1"/></DATASET>)"
                                  R"(</WORKSPACE_DEFINITIONS>)",
                                  channel.get(), workspace),
               0);
-    ZELServerPropertyAccessor accessor;
-    highPriority(accessor);
     EXPECT_EQ(StatusPtr(workspace.updatePropertyAccessor(accessor)), nullptr);
     EXPECT_EQ(StatusPtr(workspace.getSourceDatasets().element(0)->updatePropertyAccessor(accessor)), nullptr);
     const StatusPtr locked(workspace.getSourceFeatureTypes().element(0)->updatePropertyAccessor(accessor));
     ASSERT_EQ(numberOf(locked), msg::kServerError);
     EXPECT_STREQ(locked->getMessage(), "feature type is locked");
-    EXPECT_TRUE(sentCommands(3));
+    EXPECT_TRUE(server.verify());
 }
 
 }  // namespace

@@ -43,28 +43,19 @@ std::string idOf(const IZELServerIdentity& identity)
     return id.str();
 }
 
-struct FlagCase {
-    const char* attribute;  // null: attribute absent
-    bool authenticated;
-};
-
-class AuthenticatedFlag : public ::testing::TestWithParam<FlagCase> {};
-
-TEST_P(AuthenticatedFlag, IsReadByFirstLetterOrAsANumber)
+TEST(Identity, AuthenticatedFlagIsReadByFirstLetterOrAsANumber)
 {
-    const FlagCase& c = GetParam();
-    ZELServerIdentity identity;
-    const std::string attribute = c.attribute ? std::string(" is_authenticated=\"") + c.attribute + "\"" : "";
-    readInto(identity, "<IDENTITY id=\"ann\"" + attribute + "/>");
-    EXPECT_EQ(identity.isAuthenticated(), c.authenticated);
+    const std::pair<const char*, bool> cases[] = {  // null: attribute absent
+        {"yes", true},        {"No", false}, {"0", false},    {"2.5", true}, {"maybe", false},  {"true", true},
+        {"False", false},     {"Yesterday", true}, {"-1", true}, {"0.0", false}, {"", false}, {nullptr, false},
+    };
+    for (const auto& [text, authenticated] : cases) {
+        ZELServerIdentity identity;
+        const std::string attribute = text ? std::string(" is_authenticated=\"") + text + "\"" : "";
+        readInto(identity, "<IDENTITY id=\"ann\"" + attribute + "/>");
+        EXPECT_EQ(identity.isAuthenticated(), authenticated) << (text ? text : "(absent)");
+    }
 }
-
-INSTANTIATE_TEST_SUITE_P(Identity, AuthenticatedFlag,
-                         ::testing::Values(FlagCase{"yes", true}, FlagCase{"No", false}, FlagCase{"0", false},
-                                           FlagCase{"2.5", true}, FlagCase{"maybe", false}, FlagCase{"true", true},
-                                           FlagCase{"False", false}, FlagCase{"Yesterday", true},
-                                           FlagCase{"-1", true}, FlagCase{"0.0", false}, FlagCase{"", false},
-                                           FlagCase{nullptr, false}));
 
 TEST(Identity, RolesComeFromEveryRolesChildInDocumentOrderMatchedIgnoringCase)
 {
@@ -80,67 +71,32 @@ TEST(Identity, RolesComeFromEveryRolesChildInDocumentOrderMatchedIgnoringCase)
     EXPECT_EQ(rolesOf(identity), (std::vector<std::string>{"a", "b", "c", "a"}));
 }
 
-TEST(Identity, AttributeNamesAreExact)
-{
-    ZELServerIdentity identity;
-    readInto(identity, R"(<IDENTITY ID="ann" Is_Authenticated="true"><ROLES><ROLE NAME="r"/></ROLES></IDENTITY>)");
-    EXPECT_EQ(idOf(identity), "");
-    EXPECT_FALSE(identity.isAuthenticated());
-    EXPECT_TRUE(rolesOf(identity).empty());
-}
-
-TEST(Identity, ReadingAgainReplacesIdAndFlagButAppendsRoles)
+TEST(Identity, ReadingAgainReplacesIdAndFlagButAppendsRolesAndAttributeNamesAreExact)
 {
     ZELServerIdentity identity;
     readInto(identity, R"(<IDENTITY id="ann" is_authenticated="y"><ROLES><ROLE name="r"/></ROLES></IDENTITY>)");
-    readInto(identity, R"(<IDENTITY><ROLES><ROLE name="r"/></ROLES></IDENTITY>)");
+    readInto(identity, R"(<IDENTITY ID="ann" Is_Authenticated="true"><ROLES><ROLE name="r"/><ROLE NAME="x"/></ROLES>)"
+                       R"(</IDENTITY>)");
     EXPECT_EQ(idOf(identity), "");
     EXPECT_FALSE(identity.isAuthenticated());
-    EXPECT_EQ(rolesOf(identity), (std::vector<std::string>{"r", "r"}));
-
     ZELServerStringArray out(std::vector<std::string>{"kept"});
     identity.getRoles(out);
     EXPECT_EQ(out.items(), (std::vector<std::string>{"kept", "r", "r"}));
 }
 
-struct StateCase {
-    const char* attribute;  // null: attribute absent
-    unsigned state;
-};
-
-class SingleSignOnState : public ::testing::TestWithParam<StateCase> {};
-
-TEST_P(SingleSignOnState, IsExactlyOneOfTheTwoKnownWordsOrOther)
+TEST(SingleSignOnIdentity, StateIsExactlyOneOfTheTwoKnownWordsOrOther)
 {
-    const StateCase& c = GetParam();
-    ZELServerSingleSignOnIdentity identity;
-    const std::string attribute = c.attribute ? std::string(" state=\"") + c.attribute + "\"" : "";
-    readInto(identity, "<SSO_IDENTITY" + attribute + "/>");
-    EXPECT_EQ(identity.getState(), c.state);
-}
-
-INSTANTIATE_TEST_SUITE_P(Identity, SingleSignOnState,
-                         ::testing::Values(StateCase{"SUCCEEDED", kSingleSignOnSucceeded},
-                                           StateCase{"IN_PROGRESS", kSingleSignOnInProgress},
-                                           StateCase{"succeeded", kSingleSignOnOther},
-                                           StateCase{"SUCCEEDED ", kSingleSignOnOther},
-                                           StateCase{"", kSingleSignOnOther}, StateCase{nullptr, kSingleSignOnOther}));
-
-TEST(SingleSignOnIdentity, ReadsTheIdentityFieldsTooAndHandsItsDataOutOnce)
-{
-    ZELServerSingleSignOnIdentity identity;
-    EXPECT_EQ(identity.getState(), kSingleSignOnOther);
-    readInto(identity, R"(<SSO_IDENTITY id="bob" is_authenticated="true" state="IN_PROGRESS" auth_data="tok=1&amp;x">)"
-                       R"(<ROLES><ROLE name="user"/></ROLES></SSO_IDENTITY>)");
-    EXPECT_EQ(idOf(identity), "bob");
-    EXPECT_TRUE(identity.isAuthenticated());
-    EXPECT_EQ(rolesOf(identity), std::vector<std::string>{"user"});
-
-    ZELServerString data("stale");
-    identity.takeAuthData(data);
-    EXPECT_EQ(data.str(), "tok=1&x");
-    identity.takeAuthData(data);
-    EXPECT_EQ(data.str(), "");
+    const std::pair<const char*, unsigned> cases[] = {  // null: attribute absent
+        {"SUCCEEDED", kSingleSignOnSucceeded}, {"IN_PROGRESS", kSingleSignOnInProgress},
+        {"succeeded", kSingleSignOnOther},     {"SUCCEEDED ", kSingleSignOnOther},
+        {"", kSingleSignOnOther},              {nullptr, kSingleSignOnOther},
+    };
+    for (const auto& [text, state] : cases) {
+        ZELServerSingleSignOnIdentity identity;
+        const std::string attribute = text ? std::string(" state=\"") + text + "\"" : "";
+        readInto(identity, "<SSO_IDENTITY" + attribute + "/>");
+        EXPECT_EQ(identity.getState(), state) << (text ? text : "(absent)");
+    }
 }
 
 // ---- Writing ----------------------------------------------------------------------------------------
@@ -166,56 +122,40 @@ private:
     bool authenticated_;
 };
 
-class IdentityWriting : public ::testing::Test {
-protected:
-    void SetUp() override
-    {
-        StatusPtr failure(doc.startXml());
-        ASSERT_EQ(failure, nullptr) << failure->getMessage();
+TEST(IdentityXmlWriting, WritesIdFlagAndRolesInOrderOfAnyIdentityAndOnlyUtf8Text)
+{
+    // A single sign-on identity reads the identity's fields too, hands its data out once, and is
+    // written as a plain identity.
+    ZELServerSingleSignOnIdentity singleSignOn;
+    EXPECT_EQ(singleSignOn.getState(), kSingleSignOnOther);
+    readInto(singleSignOn, R"(<SSO_IDENTITY id="bob" is_authenticated="1" state="IN_PROGRESS" auth_data="tok=1&amp;x">)"
+                           R"(<ROLES><ROLE name="user"/></ROLES></SSO_IDENTITY>)");
+    ZELServerString data("stale");
+    singleSignOn.takeAuthData(data);
+    EXPECT_EQ(data.str(), "tok=1&x");
+    singleSignOn.takeAuthData(data);
+    EXPECT_EQ(data.str(), "");
+    const FixedIdentity withRoles("ann & co", {"admin", "dev", "admin"}, true);
+    const FixedIdentity bare("", {}, false);
+    const std::pair<const IZELServerIdentity*, std::string> cases[] = {
+        {&withRoles, R"(<IDENTITY id="ann &amp; co" is_authenticated="true"><ROLES><ROLE name="admin"/>)"
+                     R"(<ROLE name="dev"/><ROLE name="admin"/></ROLES></IDENTITY>)"},
+        {&bare, R"(<IDENTITY id="" is_authenticated="false"><ROLES/></IDENTITY>)"},
+        {&singleSignOn, R"(<IDENTITY id="bob" is_authenticated="true"><ROLES><ROLE name="user"/></ROLES></IDENTITY>)"},
+    };
+    for (const auto& [identity, element] : cases) {
+        XmlDocument doc;
+        ASSERT_EQ(StatusPtr(doc.startXml()), nullptr);
         ASSERT_NE(doc.createDocument("", "REP_GET_REPOSITORIES"), nullptr);
-    }
-
-    std::string write(const IZELServerIdentity& identity)
-    {
-        EXPECT_EQ(IdentityXml(identity).writeXml(doc), 0u);
+        EXPECT_EQ(IdentityXml(*identity).writeXml(doc), 0u);
         std::string out;
-        StatusPtr failure(doc.serialize(out));
-        EXPECT_EQ(failure, nullptr) << failure->getMessage();
-        return out;
+        ASSERT_EQ(StatusPtr(doc.serialize(out)), nullptr);
+        EXPECT_EQ(out, std::string(kDeclaration) + "<REP_GET_REPOSITORIES>" + element + "</REP_GET_REPOSITORIES>");
     }
-
+    // Text that is not UTF-8 cannot be written.
     XmlDocument doc;
-};
-
-TEST_F(IdentityWriting, WritesIdFlagAndOneRolePerRoleInOrder)
-{
-    EXPECT_EQ(write(FixedIdentity("ann & co", {"admin", "dev", "admin"}, true)),
-              std::string(kDeclaration) +
-                  R"(<REP_GET_REPOSITORIES><IDENTITY id="ann &amp; co" is_authenticated="true"><ROLES>)"
-                  R"(<ROLE name="admin"/><ROLE name="dev"/><ROLE name="admin"/></ROLES></IDENTITY>)"
-                  R"(</REP_GET_REPOSITORIES>)");
-}
-
-TEST_F(IdentityWriting, WithoutRolesStillWritesAnEmptyRolesElement)
-{
-    EXPECT_EQ(write(FixedIdentity("", {}, false)),
-              std::string(kDeclaration) +
-                  R"(<REP_GET_REPOSITORIES><IDENTITY id="" is_authenticated="false"><ROLES/></IDENTITY>)"
-                  R"(</REP_GET_REPOSITORIES>)");
-}
-
-TEST_F(IdentityWriting, SingleSignOnIdentityIsWrittenAsAPlainIdentity)
-{
-    ZELServerSingleSignOnIdentity identity;
-    readInto(identity, R"(<SSO_IDENTITY id="bob" is_authenticated="1" state="SUCCEEDED" auth_data="secret">)"
-                       R"(<ROLES><ROLE name="user"/></ROLES></SSO_IDENTITY>)");
-    EXPECT_EQ(write(identity), std::string(kDeclaration) +
-                                   R"(<REP_GET_REPOSITORIES><IDENTITY id="bob" is_authenticated="true"><ROLES>)"
-                                   R"(<ROLE name="user"/></ROLES></IDENTITY></REP_GET_REPOSITORIES>)");
-}
-
-TEST_F(IdentityWriting, TextThatIsNotUtf8CannotBeWritten)
-{
+    ASSERT_EQ(StatusPtr(doc.startXml()), nullptr);
+    ASSERT_NE(doc.createDocument("", "REP_GET_REPOSITORIES"), nullptr);
     EXPECT_EQ(IdentityXml(FixedIdentity("caf\xE9", {}, true)).writeXml(doc), msg::kXmlFailure);
     EXPECT_EQ(IdentityXml(FixedIdentity("ann", {"\xFF"}, true)).writeXml(doc), msg::kXmlFailure);
 }

@@ -82,75 +82,47 @@ protected:
     std::string path_;
 };
 
-TEST_F(MemoryHandler, ReportsOnceThroughTheSinkAndExitsWithOne) {
+// How the routine is set up before the heap runs out, and the one report expected afterwards.
+struct ReportCase {
+    const char* what;
+    enum { kSink, kFailingSink, kNoSink } sink;
+    const char* earlierName;  // set first, then replaced by `name`
+    std::string name;
+    std::string report;
+};
+
+class MemoryReport : public MemoryHandler, public ::testing::WithParamInterface<ReportCase> {};
+
+TEST_P(MemoryReport, IsSentOnceAndTheProcessExitsWithOne) {
+    const ReportCase& c = GetParam();
     EXPECT_EXIT(
         {
-            FileSink sink(path_);
-            DllSetMemoryErrorHandler(&sink, "converter");
+            // A failing sink runs out of memory itself while it writes the first report.
+            FileSink sink(path_, c.sink == ReportCase::kFailingSink);
+            IZELLogSink* used = c.sink == ReportCase::kNoSink ? nullptr : &sink;
+            if (c.earlierName != nullptr) {
+                DllSetMemoryErrorHandler(used, c.earlierName);
+            }
+            DllSetMemoryErrorHandler(used, c.name == "(null)" ? nullptr : c.name.c_str());
             exhaust();
         },
         ::testing::ExitedWithCode(1), "");
-    EXPECT_EQ(recorded(), "3|" + kReport + "converter'\n");
+    EXPECT_EQ(recorded(), c.report);
 }
 
-TEST_F(MemoryHandler, LongNameIsCutToTwoHundredCharacters) {
-    const std::string name = std::string(199, 'a') + "bc" + std::string(49, 'd');
-    ASSERT_EQ(name.size(), 250u);
-    EXPECT_EXIT(
-        {
-            FileSink sink(path_);
-            DllSetMemoryErrorHandler(&sink, name.c_str());
-            exhaust();
-        },
-        ::testing::ExitedWithCode(1), "");
-    EXPECT_EQ(recorded(), "3|" + kReport + std::string(199, 'a') + "b'\n");
-}
+const ReportCase kReportCases[] = {
+    {"plain", ReportCase::kSink, nullptr, "converter", "3|" + kReport + "converter'\n"},
+    {"long name cut to 200", ReportCase::kSink, nullptr, std::string(199, 'a') + "bc" + std::string(49, 'd'),
+     "3|" + kReport + std::string(199, 'a') + "b'\n"},
+    {"name of exactly 200 kept", ReportCase::kSink, nullptr, std::string(200, 'n'),
+     "3|" + kReport + std::string(200, 'n') + "'\n"},
+    {"null name reported empty", ReportCase::kSink, "earlier name", "(null)", "3|" + kReport + "'\n"},
+    {"second report not sent", ReportCase::kFailingSink, nullptr, "p", "3|" + kReport + "p'\n"},
+    {"no sink, no report", ReportCase::kNoSink, nullptr, "quiet", ""},
+};
 
-TEST_F(MemoryHandler, NameOfExactlyTwoHundredCharactersIsKept) {
-    const std::string name(200, 'n');
-    EXPECT_EXIT(
-        {
-            FileSink sink(path_);
-            DllSetMemoryErrorHandler(&sink, name.c_str());
-            exhaust();
-        },
-        ::testing::ExitedWithCode(1), "");
-    EXPECT_EQ(recorded(), "3|" + kReport + name + "'\n");
-}
-
-TEST_F(MemoryHandler, NullNameIsReportedEmpty) {
-    EXPECT_EXIT(
-        {
-            FileSink sink(path_);
-            DllSetMemoryErrorHandler(&sink, "earlier name");
-            DllSetMemoryErrorHandler(&sink, nullptr);
-            exhaust();
-        },
-        ::testing::ExitedWithCode(1), "");
-    EXPECT_EQ(recorded(), "3|" + kReport + "'\n");
-}
-
-TEST_F(MemoryHandler, SecondReportIsNotSentButTheProcessStillExitsWithOne) {
-    EXPECT_EXIT(
-        {
-            // The sink's own allocation fails while it writes the first report.
-            FileSink sink(path_, true);
-            DllSetMemoryErrorHandler(&sink, "p");
-            exhaust();
-        },
-        ::testing::ExitedWithCode(1), "");
-    EXPECT_EQ(recorded(), "3|" + kReport + "p'\n");
-}
-
-TEST_F(MemoryHandler, WithoutASinkNothingIsReportedAndTheProcessExitsWithOne) {
-    EXPECT_EXIT(
-        {
-            DllSetMemoryErrorHandler(nullptr, "quiet");
-            exhaust();
-        },
-        ::testing::ExitedWithCode(1), "");
-    EXPECT_EQ(recorded(), "");
-}
+INSTANTIATE_TEST_SUITE_P(Table, MemoryReport, ::testing::ValuesIn(kReportCases),
+                         [](const auto& info) { return "case" + std::to_string(info.index); });
 
 TEST_F(MemoryHandler, ReturnsThePreviousRoutine) {
     const ZELMemoryFailureRoutine own = [](int) {};

@@ -20,18 +20,16 @@ using zeltest::describe;
 using zeltest::StatusPtr;
 using MountPoints = std::unique_ptr<IZELServerVector<IZELServerMountPoint>>;
 
-std::string nameOf(const IZELServerMountPoint& mountPoint)
-{
-    ZELServerString text;
-    mountPoint.getName(text);
-    return text.str();
-}
+unsigned numberOf(const IZELServerStatus* status) { return status ? status->getMessageNumber() : 0; }
 
-std::string descriptionOf(const IZELServerMountPoint& mountPoint)
+// Name and description of a mount point, as "name|description".
+std::string textsOf(const IZELServerMountPoint& mountPoint)
 {
-    ZELServerString text;
-    mountPoint.getDescription(text);
-    return text.str();
+    ZELServerString name;
+    ZELServerString description;
+    mountPoint.getName(name);
+    mountPoint.getDescription(description);
+    return name.str() + "|" + description.str();
 }
 
 const std::string kTwoResources =
@@ -55,9 +53,8 @@ TEST_F(MountPointManagerTest, GetSharedResourcesListsThemAndTheyTalkThroughTheSa
     const StatusPtr status(manager->getSharedResources(*mountPoints));
     ASSERT_EQ(status, nullptr) << describe(status.get());
     ASSERT_EQ(mountPoints->entries(), 2u);
-    EXPECT_EQ(nameOf(*mountPoints->element(0)), "DATA");
-    EXPECT_EQ(descriptionOf(*mountPoints->element(0)), "Files the jobs read");
-    EXPECT_EQ(nameOf(*mountPoints->element(1)), "OUT");
+    EXPECT_EQ(textsOf(*mountPoints->element(0)), "DATA|Files the jobs read");
+    EXPECT_EQ(textsOf(*mountPoints->element(1)), "OUT|");
 
     IZELServerMountPoint& out = *mountPoints->element(1);
     IZELServerPath* path = out.createPath(ZELServerString("new"));
@@ -67,7 +64,7 @@ TEST_F(MountPointManagerTest, GetSharedResourcesListsThemAndTheyTalkThroughTheSa
     EXPECT_TRUE(server.verify());
 }
 
-TEST_F(MountPointManagerTest, GetSharedResourcesFailures)
+TEST_F(MountPointManagerTest, GetSharedResourcesFailuresLeaveTheListAlone)
 {
     server.exchange(command("SR_GET_SHAREDRESOURCES"), zeltest::reply("ERROR", "Authorization Error: no"))
         .exchange(command("SR_GET_SHAREDRESOURCES"), zeltest::reply("SUCCESS", "true"))
@@ -75,75 +72,47 @@ TEST_F(MountPointManagerTest, GetSharedResourcesFailures)
     signIn();
     const MountPoints mountPoints(makeMountPointVector());
     mountPoints->append(makeMountPoint(nullptr));
-    StatusPtr status(manager->getSharedResources(*mountPoints));
-    ASSERT_NE(status, nullptr);
-    EXPECT_EQ(status->getMessageNumber(), msg::kServerError);
-    EXPECT_EQ(status->getCode(), 2u);
-    status.reset(manager->getSharedResources(*mountPoints));
-    ASSERT_NE(status, nullptr);
-    EXPECT_EQ(status->getMessageNumber(), msg::kXmlFailure);
-    EXPECT_EQ(mountPoints->entries(), 1u) << "failures leave the caller's list alone";
-    status.reset(manager->getSharedResources(*mountPoints));
-    EXPECT_EQ(status, nullptr) << describe(status.get());
+    const StatusPtr denied(manager->getSharedResources(*mountPoints));
+    ASSERT_EQ(numberOf(denied.get()), msg::kServerError);
+    EXPECT_EQ(denied->getCode(), 2u);
+    EXPECT_EQ(numberOf(StatusPtr(manager->getSharedResources(*mountPoints)).get()), msg::kXmlFailure);
+    EXPECT_EQ(mountPoints->entries(), 1u);
+    EXPECT_EQ(numberOf(StatusPtr(manager->getSharedResources(*mountPoints)).get()), 0u);
     EXPECT_EQ(mountPoints->entries(), 0u) << "a server without resources lists none";
     EXPECT_TRUE(server.verify());
 }
 
-TEST_F(MountPointManagerTest, GetSharedResourceFillsTheMountPointAndBindsIt)
+TEST_F(MountPointManagerTest, GetSharedResourceFillsAndBindsTheMountPointOrLeavesFoundAtZero)
 {
-    server.exchange(command("SR_GET_SHAREDRESOURCE", {{"srName", "DATA"}}),
-                    zeltest::reply("SUCCESS", R"(<SR_GET_SHAREDRESOURCE><SHAREDRESOURCE name="DATA" displayname="Input data" )"
-                                              R"(description="d"/></SR_GET_SHAREDRESOURCE>)"))
+    const auto lookUp = [](const char* name) { return command("SR_GET_SHAREDRESOURCE", {{"srName", name}}); };
+    server.exchange(lookUp("NOPE"), zeltest::reply("SUCCESS", "<SR_GET_SHAREDRESOURCE/>"))
+        .exchange(lookUp("DATA"), zeltest::reply("ERROR", "down"))
+        .exchange(lookUp("DATA"), zeltest::reply("SUCCESS", "<unclosed"))
+        .exchange(lookUp("DATA"), zeltest::reply("SUCCESS", R"(<SR_GET_SHAREDRESOURCE><SHAREDRESOURCE name="DATA" )"
+                                                            R"(displayname="Input data" description="d"/></SR_GET_SHAREDRESOURCE>)"))
         .exchange(command("SR_EXISTS", {{"srName", "DATA"},
                                         {"srPath", xmlDocument("SR_EXISTS", R"(<PATH abspath="/a" dirpath="" name="a"/>)")}}),
                   zeltest::reply("SUCCESS", "true"));
     signIn();
     const std::unique_ptr<IZELServerMountPoint> mountPoint(makeMountPoint(nullptr));
+    const std::pair<const char*, unsigned> failures[] = {{"NOPE", 0}, {"DATA", msg::kServerError}, {"DATA", msg::kXmlFailure}};
+    for (const auto& [name, number] : failures) {
+        unsigned found = 7;
+        EXPECT_EQ(numberOf(StatusPtr(manager->getSharedResource(ZELServerString(name), *mountPoint, found)).get()), number);
+        EXPECT_EQ(found, 0u) << number;
+        EXPECT_EQ(textsOf(*mountPoint), "|");
+    }
     unsigned found = 0;
     const StatusPtr status(manager->getSharedResource(ZELServerString("DATA"), *mountPoint, found));
     ASSERT_EQ(status, nullptr) << describe(status.get());
     EXPECT_EQ(found, 1u);
-    EXPECT_EQ(nameOf(*mountPoint), "DATA");
-
+    EXPECT_EQ(textsOf(*mountPoint), "DATA|d");
+    // The mount point was made without a channel and now talks through the manager's.
     IZELServerPath* path = mountPoint->createPath(ZELServerString("a"));
     unsigned present = 0;
-    const StatusPtr exists(mountPoint->exists(*path, present));
-    EXPECT_EQ(exists, nullptr) << describe(exists.get()) << " (the mount point was made without a channel)";
+    EXPECT_EQ(numberOf(StatusPtr(mountPoint->exists(*path, present)).get()), 0u);
     EXPECT_EQ(present, 1u);
     mountPoint->releaseObject(path);
-    EXPECT_TRUE(server.verify());
-}
-
-TEST_F(MountPointManagerTest, AnUnknownResourceIsNotFoundAndNoFailure)
-{
-    server.exchange(command("SR_GET_SHAREDRESOURCE", {{"srName", "NOPE"}}),
-                    zeltest::reply("SUCCESS", "<SR_GET_SHAREDRESOURCE/>"));
-    signIn();
-    const std::unique_ptr<IZELServerMountPoint> mountPoint(makeMountPoint(nullptr));
-    unsigned found = 7;
-    const StatusPtr status(manager->getSharedResource(ZELServerString("NOPE"), *mountPoint, found));
-    EXPECT_EQ(status, nullptr) << describe(status.get());
-    EXPECT_EQ(found, 0u);
-    EXPECT_EQ(nameOf(*mountPoint), "");
-    EXPECT_TRUE(server.verify());
-}
-
-TEST_F(MountPointManagerTest, GetSharedResourceFailuresLeaveFoundAtZero)
-{
-    server.exchange(command("SR_GET_SHAREDRESOURCE", {{"srName", "DATA"}}), zeltest::reply("ERROR", "down"))
-        .exchange(command("SR_GET_SHAREDRESOURCE", {{"srName", "DATA"}}), zeltest::reply("SUCCESS", "<unclosed"));
-    signIn();
-    const std::unique_ptr<IZELServerMountPoint> mountPoint(makeMountPoint(nullptr));
-    unsigned found = 7;
-    StatusPtr status(manager->getSharedResource(ZELServerString("DATA"), *mountPoint, found));
-    ASSERT_NE(status, nullptr);
-    EXPECT_EQ(status->getMessageNumber(), msg::kServerError);
-    EXPECT_EQ(found, 0u);
-    found = 7;
-    status.reset(manager->getSharedResource(ZELServerString("DATA"), *mountPoint, found));
-    ASSERT_NE(status, nullptr);
-    EXPECT_EQ(status->getMessageNumber(), msg::kXmlFailure);
-    EXPECT_EQ(found, 0u);
     EXPECT_TRUE(server.verify());
 }
 
@@ -153,12 +122,9 @@ TEST(MountPointManagerWithoutChannel, AnswersNotConnected)
     const MountPoints mountPoints(makeMountPointVector());
     const std::unique_ptr<IZELServerMountPoint> mountPoint(makeMountPoint(nullptr));
     unsigned found = 7;
-    const StatusPtr list(manager->getSharedResources(*mountPoints));
-    const StatusPtr one(manager->getSharedResource(ZELServerString("DATA"), *mountPoint, found));
-    ASSERT_NE(list, nullptr);
-    ASSERT_NE(one, nullptr);
-    EXPECT_EQ(list->getMessageNumber(), msg::kNotConnected);
-    EXPECT_EQ(one->getMessageNumber(), msg::kNotConnected);
+    EXPECT_EQ(numberOf(StatusPtr(manager->getSharedResources(*mountPoints)).get()), msg::kNotConnected);
+    EXPECT_EQ(numberOf(StatusPtr(manager->getSharedResource(ZELServerString("DATA"), *mountPoint, found)).get()),
+              msg::kNotConnected);
     EXPECT_EQ(found, 0u);
 }
 

@@ -8,7 +8,6 @@
 #include <unistd.h>
 
 #include <chrono>
-#include <functional>
 #include <regex>
 #include <thread>
 
@@ -17,24 +16,68 @@
 namespace zeltest {
 namespace {
 
+using namespace std::string_literals;
+
+// A started server with the read ends of its standard output and standard error.
 struct Process {
   pid_t pid = -1;
   int out = -1;
   int err = -1;
+
+  // Reads `fd` until it ends, holds a whole line when `line`, or the time-out passes.
+  static std::string read(int fd, bool line, int timeoutMs = 20000) {
+    std::string text;
+    auto deadline = std::chrono::steady_clock::now() + std::chrono::milliseconds(timeoutMs);
+    while (!(line && text.find('\n') != std::string::npos) &&
+           std::chrono::steady_clock::now() < deadline) {
+      pollfd p{fd, POLLIN, 0};
+      if (::poll(&p, 1, 100) != 1) continue;
+      char buffer[512];
+      ssize_t n = ::read(fd, buffer, sizeof buffer);
+      if (n <= 0) break;
+      text.append(buffer, static_cast<std::size_t>(n));
+    }
+    return text;
+  }
+  // The port of its "listening on" line, 0 when the line is something else.
+  std::uint16_t port() const {
+    std::string line = read(out, true);
+    std::smatch match;
+    if (!std::regex_match(line, match, std::regex("^listening on 127\\.0\\.0\\.1:([0-9]+)\n$")))
+      return 0;
+    return static_cast<std::uint16_t>(std::stoi(match[1]));
+  }
+  // Its exit status once it has ended (-2: killed for not ending in time), and its standard error.
+  std::pair<int, std::string> finish() {
+    int code = -2;
+    for (int waited = 0; waited < 20000 && code == -2; waited += 20) {
+      int status = 0;
+      if (::waitpid(pid, &status, WNOHANG) == pid)
+        code = WIFEXITED(status) ? WEXITSTATUS(status) : -1;
+      else
+        std::this_thread::sleep_for(std::chrono::milliseconds(20));
+    }
+    if (code == -2) {
+      ::kill(pid, SIGKILL);
+      ::waitpid(pid, nullptr, 0);
+    }
+    std::string errors = read(err, false, 2000);
+    ::close(out);
+    ::close(err);
+    return {code, errors};
+  }
 };
 
-Process spawnServer(const std::vector<std::string>& args) {
+Process spawnServer(std::vector<std::string> args) {
   int outPipe[2], errPipe[2];
   if (::pipe(outPipe) != 0 || ::pipe(errPipe) != 0) return {};
   pid_t pid = ::fork();
   if (pid == 0) {
     ::dup2(outPipe[1], 1);
     ::dup2(errPipe[1], 2);
-    std::vector<char*> argv;
     std::string exe = ZELSERVERD_EXECUTABLE;
-    argv.push_back(exe.data());
-    std::vector<std::string> copies = args;
-    for (auto& arg : copies) argv.push_back(arg.data());
+    std::vector<char*> argv{exe.data()};
+    for (auto& arg : args) argv.push_back(arg.data());
     argv.push_back(nullptr);
     ::execv(exe.c_str(), argv.data());
     ::_exit(127);
@@ -42,46 +85,6 @@ Process spawnServer(const std::vector<std::string>& args) {
   ::close(outPipe[1]);
   ::close(errPipe[1]);
   return {pid, outPipe[0], errPipe[0]};
-}
-
-// Reads from fd until `done` says so or the time-out passes.
-std::string readUntil(int fd, int timeoutMs, const std::function<bool(const std::string&)>& done) {
-  std::string text;
-  auto deadline = std::chrono::steady_clock::now() + std::chrono::milliseconds(timeoutMs);
-  while (!done(text) && std::chrono::steady_clock::now() < deadline) {
-    pollfd p{fd, POLLIN, 0};
-    if (::poll(&p, 1, 100) != 1) continue;
-    char buffer[512];
-    ssize_t n = ::read(fd, buffer, sizeof buffer);
-    if (n <= 0) break;
-    text.append(buffer, static_cast<std::size_t>(n));
-  }
-  return text;
-}
-
-// Waits for the exit status; kills the process if it does not end in time.
-int waitExit(pid_t pid, int timeoutMs) {
-  for (int waited = 0; waited < timeoutMs; waited += 20) {
-    int status = 0;
-    if (::waitpid(pid, &status, WNOHANG) == pid) return WIFEXITED(status) ? WEXITSTATUS(status) : -1;
-    std::this_thread::sleep_for(std::chrono::milliseconds(20));
-  }
-  ::kill(pid, SIGKILL);
-  ::waitpid(pid, nullptr, 0);
-  return -2;
-}
-
-std::uint16_t listeningPort(const std::string& line) {
-  std::smatch match;
-  std::regex pattern("^listening on 127\\.0\\.0\\.1:([0-9]+)\n$");
-  if (!std::regex_match(line, match, pattern)) return 0;
-  return static_cast<std::uint16_t>(std::stoi(match[1]));
-}
-
-std::string trimmedFile(const std::string& path) {
-  std::string text = readFile(path);
-  while (!text.empty() && (text.back() == '\n' || text.back() == ' ')) text.pop_back();
-  return text;
 }
 
 class Executable : public ::testing::Test {
@@ -95,13 +98,11 @@ TEST_F(Executable, GeneratesAnAdministratorOnceAndStopsOnSigterm) {
   std::string data = root_ + "/data";
   Process first = spawnServer({"--data", data, "--listen", "127.0.0.1:0"});
   ASSERT_GT(first.pid, 0);
-  std::string line = readUntil(first.out, 20000, [](const std::string& t) {
-    return t.find('\n') != std::string::npos;
-  });
-  std::uint16_t port = listeningPort(line);
-  ASSERT_NE(port, 0) << line;
-
-  std::string password = trimmedFile(data + "/admin-password");
+  std::uint16_t port = first.port();
+  ASSERT_NE(port, 0);
+  std::string password = readFile(data + "/admin-password");
+  ASSERT_EQ(password.back(), '\n');
+  password.pop_back();
   struct stat info {};
   ASSERT_EQ(::stat((data + "/admin-password").c_str(), &info), 0);
   EXPECT_EQ(info.st_mode & 0777, 0600u);
@@ -115,28 +116,19 @@ TEST_F(Executable, GeneratesAnAdministratorOnceAndStopsOnSigterm) {
     EXPECT_EQ(client.signIn("admin", "admin").status, "ERROR");
   }
   ::kill(first.pid, SIGTERM);
-  EXPECT_EQ(waitExit(first.pid, 20000), 0);
-  std::string log = readUntil(first.err, 1000, [](const std::string&) { return false; });
-  EXPECT_NE(log.find("created user 'admin' with password " + password), std::string::npos) << log;
-  EXPECT_NE(log.find("user=admin command=SERVER_SESSION_GET_PROP outcome=SUCCESS"),
-            std::string::npos) << log;
-  EXPECT_NE(log.find("user=- command=SERVER_SESSION_INIT outcome=ERROR"), std::string::npos)
-      << log;
-  ::close(first.out);
-  ::close(first.err);
+  auto [code, log] = first.finish();
+  EXPECT_EQ(code, 0);
+  for (const std::string& line : {"created user 'admin' with password " + password,
+                                  "user=admin command=SERVER_SESSION_GET_PROP outcome=SUCCESS"s,
+                                  "user=- command=SERVER_SESSION_INIT outcome=ERROR"s})
+    EXPECT_NE(log.find(line), std::string::npos) << log;
 
   // A second start keeps the password and does not print it again; SIGINT also stops it.
   Process second = spawnServer({"--data", data, "--listen", "127.0.0.1:0", "--quiet"});
-  line = readUntil(second.out, 20000, [](const std::string& t) {
-    return t.find('\n') != std::string::npos;
-  });
-  ASSERT_NE(listeningPort(line), 0) << line;
-  EXPECT_EQ(trimmedFile(data + "/admin-password"), password);
+  ASSERT_NE(second.port(), 0);
+  EXPECT_EQ(readFile(data + "/admin-password"), password + "\n");
   ::kill(second.pid, SIGINT);
-  EXPECT_EQ(waitExit(second.pid, 20000), 0);
-  EXPECT_EQ(readUntil(second.err, 1000, [](const std::string&) { return false; }), "");
-  ::close(second.out);
-  ::close(second.err);
+  EXPECT_EQ(second.finish(), std::make_pair(0, std::string()));
 }
 
 TEST_F(Executable, RefusesBadArgumentsAndConfigs) {
@@ -159,12 +151,9 @@ TEST_F(Executable, RefusesBadArgumentsAndConfigs) {
   for (const Case& c : cases) {
     Process p = spawnServer(c.args);
     ASSERT_GT(p.pid, 0);
-    int code = waitExit(p.pid, 20000);
-    std::string err = readUntil(p.err, 2000, [](const std::string&) { return false; });
+    auto [code, err] = p.finish();
     EXPECT_EQ(code, c.code) << err;
     EXPECT_NE(err.find(c.expected), std::string::npos) << err;
-    ::close(p.out);
-    ::close(p.err);
   }
 }
 

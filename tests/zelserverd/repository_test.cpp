@@ -1,12 +1,10 @@
 // Repositories, items, resources, views, services, registrations and property accessors: every
 // "REP_" command family with success and failure, and persistence across a restart.
 #include <gtest/gtest.h>
-#include <pugixml.hpp>
 
-#include <chrono>
-#include <thread>
+#include <map>
 
-#include "support/repository_fixture.h"
+#include "support/server_fixture.h"
 
 namespace zeltest {
 namespace {
@@ -27,6 +25,31 @@ const char* kRoads = R"(#!/bin/sh
 echo copying
 )";
 
+// The view of kRoads as the first item of a fresh server with one resource "lookup.csv" of one
+// byte, and the properties listed in `properties` by the id of their owner.
+std::string roadsView(const std::map<std::string, std::string>& properties = {}) {
+  auto at = [&](const char* id) {
+    auto found = properties.find(id);
+    return found == properties.end() ? std::string() : found->second;
+  };
+  return R"(<WORKSPACE_DEFINITIONS workspace_id="1" name="roads.zlw" title="Roads" )"
+         R"(description="Copies roads&#10;and checks them" is_enabled="true" filesize="503">)"
+         R"(<PARAMETER name="SOURCE" param_type="FILENAME" default_val="in.dat" )"
+         R"(description="Where to read" options_type="FILEFILTER_CONFIG" options="*.dat"/>)"
+         R"(<PARAMETER name="MODE" param_type="CHOICE" default_val="fast" description="How" )"
+         R"(options_type="SINGLECHOICE_CONFIG" options="fast%slow%exact"/><DATASET )"
+         R"(dataset_id="1.1" format="CSV" name="roads" location="/data/roads.csv" )"
+         R"(is_source="true"><FEATURE_TYPE feature_type_id="1.1.1" name="road" )"
+         R"(description="A road"><ATTRIBUTE name="id" zel_type="zel_int32" decimals="0" )"
+         R"(width="10"/><ATTRIBUTE name="length" zel_type="zel_real64" decimals="3" width="12"/>)" +
+         at("1.1.1") + "</FEATURE_TYPE>" + at("1.1") +
+         R"(</DATASET><DATASET dataset_id="1.2" format="GPKG" name="out" location="out.gpkg" )"
+         R"(is_source="false"><FEATURE_TYPE feature_type_id="1.2.1" name="line" description=""/>)" +
+         at("1.2") +
+         R"(</DATASET><RESOURCE name="lookup.csv" description="" filesize="1"/>)" + at("1") +
+         "</WORKSPACE_DEFINITIONS>";
+}
+
 std::string service(const std::string& name, bool enabled, bool workspaces, bool templates) {
   auto f = [](bool b) { return b ? "true" : "false"; };
   return std::string("<REP_ADD_SERVICE><SERVICE service_id=\"-1\" name=\"") + name +
@@ -36,12 +59,20 @@ std::string service(const std::string& name, bool enabled, bool workspaces, bool
          "is_template_reg_allowed=\"" + f(templates) + "\"/></REP_ADD_SERVICE>";
 }
 
-std::string accessor(const std::string& root, const std::string& category,
-                     const std::string& name, const std::string& value) {
-  return "<" + root + "><PROPERTY category=\"" + category + "\" name=\"" + name +
-         "\" value=\"" + value + "\"><ATTRIBUTE name=\"unit\" value=\"m\"/></PROPERTY></" + root +
-         ">";
+// A property with one attribute, as accessors send it and views list it.
+std::string property(const std::string& name, const std::string& value) {
+  return "<PROPERTY category=\"CAT\" name=\"" + name + "\" value=\"" + value +
+         "\"><ATTRIBUTE name=\"unit\" value=\"m\"/></PROPERTY>";
 }
+
+// The "name" attributes of the root's children.
+std::vector<std::string> names(pugi::xml_node root) {
+  std::vector<std::string> out;
+  for (pugi::xml_node child : root.children()) out.push_back(child.attribute("name").value());
+  return out;
+}
+
+using Names = std::vector<std::string>;
 
 class Repository : public RepositoryFixture {
  protected:
@@ -50,56 +81,51 @@ class Repository : public RepositoryFixture {
     all.insert(all.end(), values.begin(), values.end());
     return admin_->command(keyword, all);
   }
-  pugi::xml_node parse(const WireReply& reply) {
-    EXPECT_TRUE(reply.ok()) << reply.body;
-    EXPECT_TRUE(doc_.load_string(reply.body.c_str())) << reply.body;
-    return doc_.document_element();
+  WireReply admin(const std::string& keyword, const Values& values) {
+    return admin_->command(keyword, values);
   }
-  std::vector<std::string> names(pugi::xml_node root, const char* element,
-                                 const char* attribute = "name") {
-    std::vector<std::string> out;
-    for (auto n : root.select_nodes((std::string("//") + element).c_str()))
-      out.push_back(n.node().attribute(attribute).value());
-    return out;
+  // A registration command naming the service, REPO and an item under `valueName`.
+  WireReply reg(const char* keyword, const char* service, const char* valueName, const char* item) {
+    return repo(keyword, {{"serviceName", service}, {valueName, item}});
   }
-  pugi::xml_document doc_;
 };
 
-using Names = std::vector<std::string>;
-
 TEST_F(Repository, RepositoriesAreAddedListedAndRemoved) {
-  EXPECT_EQ(admin_->command("REP_REPOSITORYEXISTS", {{"repositoryName", "REPO"}}).body, "true");
-  EXPECT_EQ(admin_->command("REP_REPOSITORYEXISTS", {{"repositoryName", "NOPE"}}).body, "false");
-  auto root = parse(admin_->command("REP_GET_REPOSITORIES", {{"enableFilter", "All"}}));
-  EXPECT_EQ(names(root, "REPOSITORY"), Names{"REPO"});
-  EXPECT_STREQ(root.child("REPOSITORY").attribute("description").value(), "Test repository");
-  root = parse(admin_->command("REP_GET_REPOSITORY", {{"repositoryName", "NOPE"}}));
-  EXPECT_FALSE(root.child("REPOSITORY"));
+  EXPECT_EQ(admin("REP_REPOSITORYEXISTS", {{"repositoryName", "REPO"}}).body, "true");
+  EXPECT_EQ(admin("REP_REPOSITORYEXISTS", {{"repositoryName", "NOPE"}}).body, "false");
+  const std::string element = R"(<REPOSITORY name="REPO" description="Test repository"/>)";
+  EXPECT_EQ(admin("REP_GET_REPOSITORIES", {{"enableFilter", "All"}}).body,
+            document("<REP_GET_REPOSITORIES>" + element + "</REP_GET_REPOSITORIES>"));
+  EXPECT_EQ(repo("REP_GET_REPOSITORY").body,
+            document("<REP_GET_REPOSITORY>" + element + "</REP_GET_REPOSITORY>"));
+  EXPECT_EQ(admin("REP_GET_REPOSITORY", {{"repositoryName", "NOPE"}}).body,
+            document("<REP_GET_REPOSITORY/>"));
 
   auto add = [&](const std::string& name) {
-    return admin_->command("REP_ADD_REPOSITORY",
-                           {{"repositoryObject", "<REP_ADD_REPOSITORY><REPOSITORY name=\"" +
-                                                     name + "\" description=\"\"/>"
-                                                     "</REP_ADD_REPOSITORY>"}});
+    return admin("REP_ADD_REPOSITORY",
+                 {{"repositoryObject", "<R><REPOSITORY name=\"" + name + "\"/></R>"}}).body;
   };
-  EXPECT_EQ(add("REPO").body, "repository 'REPO' already exists");
-  EXPECT_EQ(add("a/b").body,
-            "repository name 'a/b' holds the character '/', one of \\/:*?\"<>|&='+%");
-  EXPECT_EQ(add("").body, "repository name is empty");
-  EXPECT_EQ(admin_->command("REP_ADD_REPOSITORY", {{"repositoryObject", "<X/>"}}).body,
+  EXPECT_EQ(add("REPO"), "repository 'REPO' already exists");
+  EXPECT_EQ(add("a/b"), "repository name 'a/b' holds the character '/', one of \\/:*?\"<>|&='+%");
+  EXPECT_EQ(add(""), "repository name is empty");
+  EXPECT_EQ(admin("REP_ADD_REPOSITORY", {{"repositoryObject", "<X/>"}}).body,
             "repositoryObject holds no REPOSITORY element");
-  auto ann = connectAs("ann");
-  EXPECT_EQ(ann->command("REP_REMOVE_REPOSITORY", {{"repositoryName", "REPO"}}).body,
+  EXPECT_EQ(connectAs("ann")->command("REP_REMOVE_REPOSITORY", {{"repositoryName", "REPO"}}).body,
             "Authorization Error: user 'ann' may not run REP_REMOVE_REPOSITORY");
 
   ASSERT_TRUE(addItem("a.zlx", "transformer").ok());
-  std::size_t before = storedFiles();
-  EXPECT_EQ(admin_->command("REP_REMOVE_REPOSITORY", {{"repositoryName", "REPO"}}).body, "true");
-  EXPECT_EQ(storedFiles(), before - 1);
-  EXPECT_EQ(admin_->command("REP_REMOVE_REPOSITORY", {{"repositoryName", "REPO"}}).body, "false");
-  EXPECT_EQ(admin_->command("REP_ITEMEXISTS", {{"repositoryName", "REPO"}, {"itemName", "a.zlx"}})
-                .body,
-            "unknown repository 'REPO'");
+  // One property per item: repository, name and kind, with the details as attributes.
+  EXPECT_EQ(withoutTimes(admin("REP_GLOBAL_GET_ALL_ITEMS", {{"enableFilter", "All"}}).body),
+            document(R"(<REP_GLOBAL_GET_ALL_ITEMS><PROPERTY category="REPO" name="a.zlx" )"
+                     R"(value="CUSTOMTRANSFORMER"><ATTRIBUTE name="title" value=""/><ATTRIBUTE )"
+                     R"(name="description" value=""/><ATTRIBUTE name="filesize" value="11"/>)"
+                     R"(<ATTRIBUTE name="lastsavedate" value="TIME"/></PROPERTY>)"
+                     R"(</REP_GLOBAL_GET_ALL_ITEMS>)"));
+  EXPECT_EQ(storedFiles(), 1u);
+  EXPECT_EQ(repo("REP_REMOVE_REPOSITORY").body, "true");
+  EXPECT_EQ(storedFiles(), 0u);
+  EXPECT_EQ(repo("REP_REMOVE_REPOSITORY").body, "false");
+  EXPECT_EQ(repo("REP_ITEMEXISTS", {{"itemName", "a.zlx"}}).body, "unknown repository 'REPO'");
 }
 
 TEST_F(Repository, ItemsAreUploadedReplacedDownloadedAndRemoved) {
@@ -107,39 +133,37 @@ TEST_F(Repository, ItemsAreUploadedReplacedDownloadedAndRemoved) {
   EXPECT_EQ(repo("REP_ITEMEXISTS", {{"itemName", "roads.zlw"}}).body, "true");
   EXPECT_EQ(repo("REP_ITEMEXISTS", {{"itemName", "other.zlw"}}).body, "false");
   // Refused before any content moves: the reply comes in place of the first acknowledgement.
-  WireReply twice = addItem("roads.zlw", "x");
-  EXPECT_EQ(twice.body, "item 'roads.zlw' already exists in 'REPO'");
+  EXPECT_EQ(addItem("roads.zlw", "x").body, "item 'roads.zlw' already exists in 'REPO'");
   EXPECT_EQ(addItem("new.zlw", "x", "REP_UPDATE_ITEM").body,
             "item 'new.zlw' does not exist in 'REPO'");
-  EXPECT_EQ(addItem("a:b", "x").body, "item name 'a:b' holds the character ':', one of "
-                                      "\\/:*?\"<>|&='+%");
+  EXPECT_EQ(addItem("a:b", "x").body,
+            "item name 'a:b' holds the character ':', one of \\/:*?\"<>|&='+%");
 
   std::string replacement = std::string(kRoads) + "echo more\n";
   ASSERT_TRUE(addItem("roads.zlw", replacement, "REP_UPDATE_ITEM").ok());
-  Download down = admin_->download(
-      "REP_GET_ITEM",
-      {{"repositoryName", "REPO"}, {"itemName", "roads.zlw"}, {"itemFileCRCCheckingEnabled", "false"}});
+  Download down = admin_->download("REP_GET_ITEM", {{"repositoryName", "REPO"},
+                                                    {"itemName", "roads.zlw"},
+                                                    {"itemFileCRCCheckingEnabled", "false"}});
   EXPECT_TRUE(down.gotFile);
   EXPECT_EQ(down.content, replacement);
   EXPECT_TRUE(down.reply.ok());
   EXPECT_EQ(storedFiles(), 1u);  // the replaced content is gone
-
-  Download missing = admin_->download("REP_GET_ITEM",
-                                      {{"repositoryName", "REPO"}, {"itemName", "none.zlw"}});
+  // A refusal is one "ERROR" frame in place of the file header; the connection stays in step.
+  Download missing =
+      admin_->download("REP_GET_ITEM", {{"repositoryName", "REPO"}, {"itemName", "none.zlw"}});
   EXPECT_FALSE(missing.gotFile);
   EXPECT_EQ(missing.reply.body, "unknown item 'none.zlw' in 'REPO'");
 
   EXPECT_EQ(repo("REP_REMOVE_ITEM", {{"itemName", "roads.zlw"}}).body, "true");
   EXPECT_EQ(repo("REP_REMOVE_ITEM", {{"itemName", "roads.zlw"}}).body, "false");
   EXPECT_EQ(storedFiles(), 0u);
-  auto vic = connectAs("vic");
-  EXPECT_EQ(vic->command("REP_REMOVE_ITEM", {{"repositoryName", "REPO"}, {"itemName", "x"}}).body,
+  EXPECT_EQ(connectAs("vic")->command("REP_REMOVE_ITEM", {{"repositoryName", "REPO"}}).body,
             "Authorization Error: user 'vic' may not run REP_REMOVE_ITEM");
 }
 
 TEST_F(Repository, RefusedUploadsLeaveNothingBehind) {
-  WireReply bad = addItem("bad.zlw", "# @title ok\n# @attribute x\n");
-  EXPECT_EQ(bad.body, "bad workspace header: line 2: @attribute before any @featuretype");
+  EXPECT_EQ(addItem("bad.zlw", "# @title ok\n# @attribute x\n").body,
+            "bad workspace header: line 2: @attribute before any @featuretype");
   WireReply crc = admin_->upload("REP_ADD_ITEM",
                                  {{"repositoryName", "REPO"},
                                   {"itemName", "c.zds"},
@@ -158,14 +182,9 @@ TEST_F(Repository, RefusedUploadsLeaveNothingBehind) {
   ASSERT_TRUE(gone.sendRaw("only part"));
   gone.close();
   // The server is still serving, and nothing of the three uploads was kept.
-  EXPECT_EQ(repo("REP_ITEMEXISTS", {{"itemName", "cut.zds"}}).body, "false");
-  EXPECT_EQ(repo("REP_ITEMEXISTS", {{"itemName", "bad.zlw"}}).body, "false");
-  EXPECT_EQ(repo("REP_ITEMEXISTS", {{"itemName", "c.zds"}}).body, "false");
-  // The connection thread discards the partial file once it notices the client is gone.
-  auto deadline = std::chrono::steady_clock::now() + std::chrono::seconds(10);
-  while (storedFiles() != 0 && std::chrono::steady_clock::now() < deadline)
-    std::this_thread::sleep_for(std::chrono::milliseconds(10));
-  EXPECT_EQ(storedFiles(), 0u);
+  for (const char* name : {"cut.zds", "bad.zlw", "c.zds"})
+    EXPECT_EQ(repo("REP_ITEMEXISTS", {{"itemName", name}}).body, "false") << name;
+  EXPECT_TRUE(eventually([&] { return storedFiles() == 0; }));
 }
 
 TEST_F(Repository, ResourcesBelongToTheirItem) {
@@ -173,28 +192,32 @@ TEST_F(Repository, ResourcesBelongToTheirItem) {
   ASSERT_TRUE(addResource("roads.zlw", "lookup.csv", "a,b\n").ok());
   EXPECT_EQ(addResource("roads.zlw", "lookup.csv", "x").body,
             "resource 'lookup.csv' already exists on 'roads.zlw'");
+  EXPECT_EQ(addResource("roads.zlw", "new.csv", "x", "REP_UPDATE_ITEMRESOURCE").body,
+            "resource 'new.csv' does not exist on 'roads.zlw'");
   EXPECT_EQ(addResource("roads.zlw", "roads.zlw", "x").body,
             "a resource cannot have the name of its item");
   EXPECT_EQ(addResource("none.zlw", "r", "x").body, "unknown item 'none.zlw' in 'REPO'");
   ASSERT_TRUE(addResource("roads.zlw", "lookup.csv", "a,b,c\n", "REP_UPDATE_ITEMRESOURCE").ok());
-  EXPECT_EQ(repo("REP_ITEMRESOURCEEXISTS", {{"itemName", "roads.zlw"}, {"resourceName", "lookup.csv"}})
-                .body,
-            "true");
+  const Values lookup = {{"itemName", "roads.zlw"}, {"resourceName", "lookup.csv"}};
+  EXPECT_EQ(repo("REP_ITEMRESOURCEEXISTS", lookup).body, "true");
+  EXPECT_EQ(repo("REP_ITEMRESOURCEEXISTS", {{"itemName", "roads.zlw"}}).body,
+            "missing value \"resourceName\"");
   Download down = admin_->download("REP_GET_ITEMRESOURCE", {{"repositoryName", "REPO"},
                                                             {"itemName", "roads.zlw"},
                                                             {"resourceName", "lookup.csv"}});
   EXPECT_EQ(down.content, "a,b,c\n");
-  auto root = parse(repo("REP_GET_ITEMRESOURCEVIEW",
-                         {{"itemName", "roads.zlw"}, {"resourceName", "lookup.csv"}}));
-  EXPECT_STREQ(root.child("RESOURCE").attribute("filesize").value(), "6");
-  root = parse(repo("REP_GET_ITEMRESOURCEVIEW", {{"itemName", "roads.zlw"}, {"resourceName", ""}}));
-  EXPECT_FALSE(root.child("RESOURCE"));
+  const std::string element = R"(<RESOURCE name="lookup.csv" description="" filesize="6"/>)";
+  EXPECT_EQ(repo("REP_GET_ITEMRESOURCEVIEW", lookup).body,
+            document("<REP_GET_ITEMRESOURCEVIEW>" + element + "</REP_GET_ITEMRESOURCEVIEW>"));
+  EXPECT_EQ(repo("REP_GET_ITEMRESOURCEVIEW", {{"itemName", "roads.zlw"}}).body,
+            document("<REP_GET_ITEMRESOURCEVIEW/>"));
   ASSERT_TRUE(addResource("roads.zlw", "style.txt", "s").ok());
-  root = parse(repo("REP_GET_ITEMRESOURCESVIEW", {{"itemName", "roads.zlw"}, {"enableFilter", "All"}}));
-  EXPECT_EQ(names(root, "RESOURCE"), (Names{"lookup.csv", "style.txt"}));
-  EXPECT_EQ(repo("REP_REMOVE_ITEMRESOURCE", {{"itemName", "roads.zlw"}, {"resourceName", "style.txt"}})
-                .body,
-            "true");
+  EXPECT_EQ(repo("REP_GET_ITEMRESOURCESVIEW", {{"itemName", "roads.zlw"}}).body,
+            document("<REP_GET_ITEMRESOURCESVIEW>" + element +
+                     R"(<RESOURCE name="style.txt" description="" filesize="1"/>)"
+                     "</REP_GET_ITEMRESOURCESVIEW>"));
+  const Values style = {{"itemName", "roads.zlw"}, {"resourceName", "style.txt"}};
+  EXPECT_EQ(repo("REP_REMOVE_ITEMRESOURCE", style).body, "true");
   EXPECT_EQ(storedFiles(), 2u);
   // Removing the item takes its resources along.
   ASSERT_EQ(repo("REP_REMOVE_ITEM", {{"itemName", "roads.zlw"}}).body, "true");
@@ -205,42 +228,29 @@ TEST_F(Repository, WorkspaceViewsComeFromTheHeader) {
   ASSERT_TRUE(addItem("roads.zlw", kRoads).ok());
   ASSERT_TRUE(addItem("off.zlw", "# @title Off\n# @enabled false\n").ok());
   ASSERT_TRUE(addResource("roads.zlw", "lookup.csv", "x").ok());
-  auto root = parse(repo("REP_GET_WORKSPACEVIEW", {{"workspaceName", "roads.zlw"}}));
-  pugi::xml_node ws = root.child("WORKSPACE_DEFINITIONS");
-  EXPECT_STREQ(ws.attribute("title").value(), "Roads");
-  EXPECT_STREQ(ws.attribute("description").value(), "Copies roads\nand checks them");
-  EXPECT_STREQ(ws.attribute("is_enabled").value(), "true");
-  EXPECT_EQ(std::string(ws.attribute("filesize").value()), std::to_string(std::string(kRoads).size()));
-  std::string id = ws.attribute("workspace_id").value();
-  pugi::xml_node mode = ws.find_child_by_attribute("PARAMETER", "name", "MODE");
-  EXPECT_STREQ(mode.attribute("param_type").value(), "CHOICE");
-  EXPECT_STREQ(mode.attribute("default_val").value(), "fast");
-  EXPECT_STREQ(mode.attribute("options_type").value(), "SINGLECHOICE_CONFIG");
-  EXPECT_STREQ(mode.attribute("options").value(), "fast%slow%exact");
-  pugi::xml_node source = ws.child("DATASET");
-  EXPECT_EQ(std::string(source.attribute("dataset_id").value()), id + ".1");
-  EXPECT_STREQ(source.attribute("is_source").value(), "true");
-  EXPECT_STREQ(source.attribute("location").value(), "/data/roads.csv");
-  pugi::xml_node road = source.child("FEATURE_TYPE");
-  EXPECT_EQ(std::string(road.attribute("feature_type_id").value()), id + ".1.1");
-  EXPECT_EQ(names(road, "ATTRIBUTE"), (Names{"id", "length"}));
-  pugi::xml_node length = road.find_child_by_attribute("ATTRIBUTE", "name", "length");
-  EXPECT_STREQ(length.attribute("zel_type").value(), "zel_real64");
-  EXPECT_STREQ(length.attribute("width").value(), "12");
-  EXPECT_STREQ(length.attribute("decimals").value(), "3");
-  EXPECT_STREQ(source.next_sibling("DATASET").attribute("is_source").value(), "false");
-  EXPECT_EQ(names(ws, "RESOURCE"), Names{"lookup.csv"});
+  std::string roads = roadsView();
+  EXPECT_EQ(repo("REP_GET_WORKSPACEVIEW", {{"workspaceName", "roads.zlw"}}).body,
+            document("<REP_GET_WORKSPACEVIEW>" + roads + "</REP_GET_WORKSPACEVIEW>"));
+  EXPECT_EQ(repo("REP_GET_WORKSPACEVIEW", {{"workspaceName", "nope.zlw"}}).body,
+            document("<REP_GET_WORKSPACEVIEW/>"));
 
-  root = parse(repo("REP_GET_WORKSPACESUMMARIESVIEW", {{"enableFilter", "All"}}));
-  EXPECT_EQ(names(root, "WORKSPACE_SUMMARY"), (Names{"off.zlw", "roads.zlw"}));
-  root = parse(repo("REP_GET_WORKSPACESUMMARIESVIEW", {{"enableFilter", "Disabled"}}));
-  EXPECT_EQ(names(root, "WORKSPACE_SUMMARY"), Names{"off.zlw"});
-  root = parse(repo("REP_GET_WORKSPACESVIEW", {{"enableFilter", "Enabled"}}));
-  EXPECT_EQ(names(root, "WORKSPACE_DEFINITIONS"), Names{"roads.zlw"});
+  const std::string off = R"(<WORKSPACE_SUMMARY name="off.zlw" title="Off" description="" )"
+                          R"(is_enabled="false"/>)";
+  const std::string on = R"(<WORKSPACE_SUMMARY name="roads.zlw" title="Roads" )"
+                         R"(description="Copies roads&#10;and checks them" is_enabled="true"/>)";
+  struct Case {
+    const char* keyword;
+    const char* filter;
+    std::string elements;
+  };
+  for (const Case& c : {Case{"REP_GET_WORKSPACESUMMARIESVIEW", "All", off + on},
+                        Case{"REP_GET_WORKSPACESUMMARIESVIEW", "Disabled", off},
+                        Case{"REP_GET_WORKSPACESVIEW", "Enabled", roads}}) {
+    EXPECT_EQ(repo(c.keyword, {{"enableFilter", c.filter}}).body,
+              document("<" + std::string(c.keyword) + ">" + c.elements + "</" + c.keyword + ">"));
+  }
   EXPECT_EQ(repo("REP_GET_WORKSPACESVIEW", {{"enableFilter", "enabled"}}).body,
             "bad enableFilter 'enabled' (All, Enabled or Disabled)");
-  root = parse(repo("REP_GET_WORKSPACEVIEW", {{"workspaceName", "nope.zlw"}}));
-  EXPECT_FALSE(root.first_child());
 }
 
 TEST_F(Repository, CustomFormatsTransformersAndTemplates) {
@@ -249,66 +259,59 @@ TEST_F(Repository, CustomFormatsTransformersAndTemplates) {
   ASSERT_TRUE(addItem("t.zlwt", "# @title Template\n").ok());
   ASSERT_TRUE(addItem("notes.txt", "plain").ok());
   struct Case {
-    const char* list;
-    const char* single;
-    const char* valueName;
-    const char* element;
-    const char* name;
-    const char* title;
+    std::string list, single, valueName, name, element;
   };
-  for (const Case& c : {Case{"REP_GET_CUSTOMFORMATSVIEW", "REP_GET_CUSTOMFORMATVIEW",
-                             "customFormatName", "CUSTOMFORMAT", "fmt.zds", "Format"},
-                        Case{"REP_GET_CUSTOMTRANSFORMERSVIEW", "REP_GET_CUSTOMTRANSFORMERVIEW",
-                             "customTransformerName", "CUSTOMTRANSFORMER", "tr.zlx", ""},
-                        Case{"REP_GET_TEMPLATESVIEW", "REP_GET_TEMPLATEVIEW", "templateName",
-                             "TEMPLATE", "t.zlwt", "Template"}}) {
-    auto root = parse(repo(c.list, {{"enableFilter", "All"}}));
-    EXPECT_EQ(names(root, c.element), Names{c.name}) << c.list;
-    root = parse(repo(c.single, {{c.valueName, c.name}}));
-    EXPECT_STREQ(root.child(c.element).attribute("title").value(), c.title) << c.single;
+  for (const Case& c :
+       {Case{"CUSTOMFORMATSVIEW", "CUSTOMFORMATVIEW", "customFormatName", "fmt.zds",
+             R"(<CUSTOMFORMAT name="fmt.zds" title="Format" description="A format" )"
+             R"(filesize="40"/>)"},
+        Case{"CUSTOMTRANSFORMERSVIEW", "CUSTOMTRANSFORMERVIEW", "customTransformerName", "tr.zlx",
+             R"(<CUSTOMTRANSFORMER name="tr.zlx" title="" description="" filesize="12"/>)"},
+        Case{"TEMPLATESVIEW", "TEMPLATEVIEW", "templateName", "t.zlwt",
+             R"(<TEMPLATE name="t.zlwt" title="Template" description="" filesize="18"/>)"}}) {
+    auto reply = [](const std::string& root, const std::string& content) {
+      return document("<REP_GET_" + root + ">" + content + "</REP_GET_" + root + ">");
+    };
+    EXPECT_EQ(repo("REP_GET_" + c.list).body, reply(c.list, c.element));
+    EXPECT_EQ(repo("REP_GET_" + c.single, {{c.valueName, c.name}}).body,
+              reply(c.single, c.element));
     // An item of another kind is not found under this view.
-    root = parse(repo(c.single, {{c.valueName, "notes.txt"}}));
-    EXPECT_FALSE(root.child(c.element)) << c.single;
+    EXPECT_EQ(repo("REP_GET_" + c.single, {{c.valueName, "notes.txt"}}).body,
+              document("<REP_GET_" + c.single + "/>"));
   }
-  auto root = parse(admin_->command("REP_GLOBAL_GET_ALL_ITEMS", {{"enableFilter", "All"}}));
-  EXPECT_EQ(names(root, "PROPERTY"), (Names{"fmt.zds", "notes.txt", "t.zlwt", "tr.zlx"}));
-  EXPECT_EQ(names(root, "PROPERTY", "value"),
-            (Names{"CUSTOMFORMAT", "OTHER", "TEMPLATE", "CUSTOMTRANSFORMER"}));
-  EXPECT_EQ(names(root, "PROPERTY", "category"), (Names{"REPO", "REPO", "REPO", "REPO"}));
 }
 
 TEST_F(Repository, ServicesAndRegistrations) {
-  ASSERT_TRUE(admin_->command("REP_ADD_SERVICE", {{"serviceObject", service("run", true, true, false)}}).ok());
-  ASSERT_TRUE(admin_->command("REP_ADD_SERVICE", {{"serviceObject", service("off", false, true, true)}}).ok());
-  EXPECT_EQ(admin_->command("REP_ADD_SERVICE", {{"serviceObject", service("run", true, true, false)}}).body,
+  auto put = [&](const char* keyword, const std::string& object) {
+    return admin(keyword, {{"serviceObject", object}}).body;
+  };
+  ASSERT_EQ(put("REP_ADD_SERVICE", service("run", true, true, false)), "true");
+  ASSERT_EQ(put("REP_ADD_SERVICE", service("off", false, true, true)), "true");
+  EXPECT_EQ(put("REP_ADD_SERVICE", service("run", true, true, false)),
             "service 'run' already exists");
-  EXPECT_EQ(admin_->command("REP_SERVICEEXISTS", {{"serviceName", "run"}}).body, "true");
-  auto root = parse(admin_->command("REP_GET_SERVICES", {{"enableFilter", "Enabled"}}));
-  EXPECT_EQ(names(root, "SERVICE"), Names{"run"});
-  root = parse(admin_->command("REP_GET_SERVICES", {{"enableFilter", "All"}}));
-  EXPECT_EQ(names(root, "SERVICE"), (Names{"off", "run"}));
-  root = parse(admin_->command("REP_GET_SERVICE", {{"serviceName", "run"}}));
-  pugi::xml_node run = root.child("SERVICE");
-  EXPECT_STREQ(run.attribute("display_name").value(), "run service");
-  EXPECT_STREQ(run.attribute("url_pattern").value(), "/run");
-  EXPECT_STREQ(run.attribute("is_template_reg_allowed").value(), "false");
-  EXPECT_NE(std::string(run.attribute("service_id").value()), "-1");
-  ASSERT_TRUE(admin_->command("REP_UPDATE_SERVICE", {{"serviceObject", service("run", true, true, true)}}).ok());
-  root = parse(admin_->command("REP_GET_SERVICE", {{"serviceName", "run"}}));
-  EXPECT_STREQ(root.child("SERVICE").attribute("is_template_reg_allowed").value(), "true");
-  EXPECT_EQ(admin_->command("REP_UPDATE_SERVICE", {{"serviceObject", service("zz", true, true, true)}}).body,
-            "unknown service 'zz'");
-  root = parse(admin_->command("REP_GET_SERVICE", {{"serviceName", "zz"}}));
-  EXPECT_FALSE(root.child("SERVICE"));
+  EXPECT_EQ(put("REP_UPDATE_SERVICE", service("zz", true, true, true)), "unknown service 'zz'");
+  EXPECT_EQ(admin("REP_SERVICEEXISTS", {{"serviceName", "run"}}).body, "true");
+  // The id is the server's: the client's "-1" only marks a new object.
+  auto element = [](const char* templates) {
+    return R"(<SERVICE service_id="1" name="run" display_name="run service" description="d" )"
+           R"(url_pattern="/run" is_enabled="true" is_workspace_reg_allowed="true" )"
+           R"(is_customformat_reg_allowed="false" is_customtransform_reg_allowed="false" )"
+           R"(is_template_reg_allowed=")" + std::string(templates) + "\"/>";
+  };
+  EXPECT_EQ(admin("REP_GET_SERVICE", {{"serviceName", "run"}}).body,
+            document("<REP_GET_SERVICE>" + element("false") + "</REP_GET_SERVICE>"));
+  ASSERT_EQ(put("REP_UPDATE_SERVICE", service("run", true, true, true)), "true");
+  const std::string run = element("true");
+  EXPECT_EQ(admin("REP_GET_SERVICES", {{"enableFilter", "Enabled"}}).body,
+            document("<REP_GET_SERVICES>" + run + "</REP_GET_SERVICES>"));
+  EXPECT_EQ(names(parse(admin("REP_GET_SERVICES", {{"enableFilter", "All"}}))),
+            (Names{"off", "run"}));
+  EXPECT_EQ(admin("REP_GET_SERVICE", {{"serviceName", "zz"}}).body,
+            document("<REP_GET_SERVICE/>"));
 
   ASSERT_TRUE(addItem("roads.zlw", kRoads).ok());
-  ASSERT_TRUE(addItem("t.zlwt", "template").ok());
+  ASSERT_TRUE(addItem("t.zlwt", "# @title T\n").ok());
   ASSERT_TRUE(addItem("fmt.zds", "format").ok());
-  auto reg = [&](const char* keyword, const char* service, const char* valueName, const char* item) {
-    return admin_->command(keyword, {{"serviceName", service},
-                                     {"repositoryName", "REPO"},
-                                     {valueName, item}});
-  };
   ASSERT_TRUE(reg("REP_REGISTER_WORKSPACESERVICE", "run", "workspaceName", "roads.zlw").ok());
   ASSERT_TRUE(reg("REP_REGISTER_WORKSPACESERVICE", "off", "workspaceName", "roads.zlw").ok());
   EXPECT_EQ(reg("REP_REGISTER_WORKSPACESERVICE", "run", "workspaceName", "roads.zlw").body,
@@ -318,124 +321,100 @@ TEST_F(Repository, ServicesAndRegistrations) {
   ASSERT_TRUE(reg("REP_REGISTERITEM", "run", "itemName", "t.zlwt").ok());
   EXPECT_EQ(reg("REP_REGISTERITEM", "run", "itemName", "fmt.zds").body,
             "service 'run' does not accept items of kind CUSTOMFORMAT ('fmt.zds')");
+  EXPECT_EQ(reg("REP_REGISTERITEM", "nope", "itemName", "t.zlwt").body, "unknown service 'nope'");
+  EXPECT_EQ(reg("REP_REGISTERITEM", "run", "itemName", "none").body,
+            "unknown item 'none' in 'REPO'");
   EXPECT_EQ(reg("REP_ITEMREGISTERED", "run", "itemName", "t.zlwt").body, "true");
   EXPECT_EQ(reg("REP_ITEMREGISTERED", "off", "itemName", "t.zlwt").body, "false");
   EXPECT_EQ(reg("REP_WORKSPACESERVICEEXISTS", "off", "workspaceName", "roads.zlw").body, "true");
 
-  root = parse(admin_->command("REP_GET_REGISTEREDITEMS", {{"serviceName", "run"}}));
-  EXPECT_EQ(names(root, "ITEM"), (Names{"roads.zlw", "t.zlwt"}));
-  EXPECT_STREQ(root.child("ITEM").attribute("title").value(), "Roads");
-  EXPECT_STREQ(root.child("ITEM").attribute("repository_name").value(), "REPO");
-  root = parse(admin_->command("REP_GET_REGISTEREDITEMS", {{"serviceName", "run"}, {"itemType", "4"}}));
-  EXPECT_EQ(names(root, "ITEM"), Names{"t.zlwt"});
-  EXPECT_EQ(admin_->command("REP_GET_REGISTEREDITEMS", {{"serviceName", "run"}, {"itemType", "9"}})
-                .body.rfind("bad itemType '9'", 0),
-            0u);
+  EXPECT_EQ(names(parse(admin("REP_GET_REGISTEREDITEMS", {{"serviceName", "run"}}))),
+            (Names{"roads.zlw", "t.zlwt"}));
+  EXPECT_EQ(withoutTimes(
+                admin("REP_GET_REGISTEREDITEMS", {{"serviceName", "run"}, {"itemType", "4"}}).body),
+            document(R"(<REP_GET_REGISTEREDITEMS><ITEM name="t.zlwt" repository_name="REPO" )"
+                     R"(title="T" description="" filesize="11" category="" requirements="" )"
+                     R"(requirementskeyword="" usage="" history="" lastsavedate="TIME" )"
+                     R"(lastsavebuild="zelserverd 0.1.0" buildnumber="0" )"
+                     R"(legaltermsconditions=""/></REP_GET_REGISTEREDITEMS>)"));
+  EXPECT_EQ(admin("REP_GET_REGISTEREDITEMS", {{"serviceName", "run"}, {"itemType", "9"}}).body,
+            "bad itemType '9' (0 to 4, or WORKSPACE, CUSTOMFORMAT, CUSTOMTRANSFORMER, TEMPLATE, "
+            "OTHER)");
 
-  root = parse(repo("REP_GET_WORKSPACESERVICES", {{"enableFilter", "All"}}));
-  EXPECT_EQ(names(root, "SERVICE"), (Names{"off", "run"}));
-  root = parse(repo("REP_GET_WORKSPACESERVICES",
-                    {{"enableFilter", "Enabled"}, {"workspaceName", "roads.zlw"}}));
-  ASSERT_EQ(names(root, "WORKSPACE_SERVICE", "name").size(), 1u);
-  EXPECT_STREQ(root.child("WORKSPACE_SERVICE").child("WORKSPACE_SUMMARY").attribute("name").value(),
-               "roads.zlw");
-  EXPECT_STREQ(root.child("WORKSPACE_SERVICE").child("SERVICE").attribute("name").value(), "run");
-  root = parse(repo("REP_GET_WORKSPACESERVICES", {{"enableFilter", "All"}, {"workspaceName", "x.zlw"}}));
-  EXPECT_FALSE(root.first_child());
+  auto pairs = parse(repo("REP_GET_WORKSPACESERVICES", {{"enableFilter", "All"}}));
+  EXPECT_EQ(std::distance(pairs.begin(), pairs.end()), 2);
+  EXPECT_EQ(repo("REP_GET_WORKSPACESERVICES",
+                 {{"enableFilter", "Enabled"}, {"workspaceName", "roads.zlw"}})
+                .body,
+            document(R"(<REP_GET_WORKSPACESERVICES><WORKSPACE_SERVICE><WORKSPACE_SUMMARY )"
+                     R"(name="roads.zlw" title="Roads" description="Copies roads&#10;and )"
+                     R"(checks them" is_enabled="true"/>)" +
+                     run + "</WORKSPACE_SERVICE></REP_GET_WORKSPACESERVICES>"));
+  EXPECT_EQ(repo("REP_GET_WORKSPACESERVICES", {{"workspaceName", "x.zlw"}}).body,
+            document("<REP_GET_WORKSPACESERVICES/>"));
 
-  EXPECT_EQ(reg("REP_DEREGISTER_WORKSPACESERVICE", "off", "workspaceName", "roads.zlw").body, "true");
-  EXPECT_EQ(reg("REP_DEREGISTER_WORKSPACESERVICE", "off", "workspaceName", "roads.zlw").body, "false");
+  auto deregister = [&](const char* service) {
+    return reg("REP_DEREGISTER_WORKSPACESERVICE", service, "workspaceName", "roads.zlw").body;
+  };
+  EXPECT_EQ(deregister("off"), "true");
+  EXPECT_EQ(deregister("off"), "false");
   EXPECT_EQ(reg("REP_DEREGISTERITEM", "run", "itemName", "t.zlwt").body, "true");
-  EXPECT_EQ(reg("REP_REGISTERITEM", "nope", "itemName", "t.zlwt").body, "unknown service 'nope'");
-  EXPECT_EQ(admin_->command("REP_REMOVE_SERVICE", {{"serviceName", "run"}}).body, "true");
-  EXPECT_EQ(admin_->command("REP_REMOVE_SERVICE", {{"serviceName", "run"}}).body, "false");
-  root = parse(repo("REP_GET_WORKSPACESERVICES", {{"enableFilter", "All"}}));
-  EXPECT_FALSE(root.first_child());
+  EXPECT_EQ(admin("REP_REMOVE_SERVICE", {{"serviceName", "run"}}).body, "true");
+  EXPECT_EQ(admin("REP_REMOVE_SERVICE", {{"serviceName", "run"}}).body, "false");
+  EXPECT_EQ(repo("REP_GET_WORKSPACESERVICES").body, document("<REP_GET_WORKSPACESERVICES/>"));
   auto ann = connectAs("ann");
-  EXPECT_EQ(ann->command("REP_ADD_SERVICE", {{"serviceObject", service("x", true, true, true)}}).body,
+  EXPECT_EQ(ann->command("REP_ADD_SERVICE", {{"serviceObject", service("x", 1, 1, 1)}}).body,
             "Authorization Error: user 'ann' may not run REP_ADD_SERVICE");
 }
 
-TEST_F(Repository, PropertyAccessors) {
-  ASSERT_TRUE(admin_->command("REP_ADD_SERVICE", {{"serviceObject", service("run", true, true, false)}}).ok());
+// Properties set through the accessors appear in the views and, with everything else, survive a
+// restart; an update replaces the whole set of its owner.
+TEST_F(Repository, PropertyAccessorsAndEverythingSurviveARestart) {
+  ASSERT_TRUE(admin("REP_ADD_SERVICE", {{"serviceObject", service("run", true, true, false)}})
+                  .ok());
   ASSERT_TRUE(addItem("roads.zlw", kRoads).ok());
-  auto root = parse(admin_->command("REP_GET_SERVICE", {{"serviceName", "run"}}));
-  std::string serviceId = root.child("SERVICE").attribute("service_id").value();
-  root = parse(repo("REP_GET_WORKSPACEVIEW", {{"workspaceName", "roads.zlw"}}));
-  std::string ws = root.child("WORKSPACE_DEFINITIONS").attribute("workspace_id").value();
-
+  ASSERT_TRUE(addResource("roads.zlw", "lookup.csv", "x").ok());
+  ASSERT_TRUE(reg("REP_REGISTER_WORKSPACESERVICE", "run", "workspaceName", "roads.zlw").ok());
   struct Case {
-    const char* keyword;
-    const char* idName;
-    std::string id;
+    const char *keyword, *idName, *id, *unknownId, *unknown;
   };
-  for (const Case& c : {Case{"REP_UPDATE_SERVICEPROPERTYACCESSOR", "serviceID", serviceId},
-                        Case{"REP_UPDATE_WORKSPACEPROPERTYACCESSOR", "workspaceID", ws},
-                        Case{"REP_UPDATE_DATASETPROPERTYACCESSOR", "datasetID", ws + ".2"},
-                        Case{"REP_UPDATE_FEATURETYPEPROPERTYACCESSOR", "featureTypeID", ws + ".1.1"}}) {
-    WireReply r = admin_->command(c.keyword, {{c.idName, c.id},
-                                              {"propertyAccessorObject",
-                                               accessor(c.keyword, "CAT", c.idName, "v1")}});
-    EXPECT_TRUE(r.ok()) << c.keyword << ": " << r.body;
-    WireReply unknown = admin_->command(c.keyword, {{c.idName, "999"},
-                                                    {"propertyAccessorObject", accessor(c.keyword, "C", "n", "v")}});
-    EXPECT_EQ(unknown.status, "ERROR") << c.keyword;
+  for (const Case& c : {Case{"REP_UPDATE_SERVICEPROPERTYACCESSOR", "serviceID", "1", "999",
+                             "unknown service id '999'"},
+                        Case{"REP_UPDATE_WORKSPACEPROPERTYACCESSOR", "workspaceID", "1", "2",
+                             "unknown workspace '2'"},
+                        Case{"REP_UPDATE_DATASETPROPERTYACCESSOR", "datasetID", "1.2", "1.3",
+                             "unknown dataset '1.3'"},
+                        Case{"REP_UPDATE_FEATURETYPEPROPERTYACCESSOR", "featureTypeID", "1.1.1",
+                             "1.1.2", "unknown featuretype '1.1.2'"}}) {
+    auto update = [&](const char* id) {
+      return admin(c.keyword, {{c.idName, id}, {"propertyAccessorObject",
+                                                "<A>" + property(c.idName, id) + "</A>"}});
+    };
+    EXPECT_EQ(update(c.id).body, "true") << c.keyword;
+    EXPECT_EQ(update(c.unknownId).body, c.unknown);
   }
-  EXPECT_EQ(admin_->command("REP_UPDATE_DATASETPROPERTYACCESSOR",
-                            {{"datasetID", ws + ".3"}, {"propertyAccessorObject", "<A/>"}})
-                .body,
-            "unknown dataset '" + ws + ".3'");
-  root = parse(admin_->command("REP_GET_SERVICE", {{"serviceName", "run"}}));
-  pugi::xml_node p = root.child("SERVICE").child("PROPERTY");
-  EXPECT_STREQ(p.attribute("name").value(), "serviceID");
-  EXPECT_STREQ(p.child("ATTRIBUTE").attribute("value").value(), "m");
-  root = parse(repo("REP_GET_WORKSPACEVIEW", {{"workspaceName", "roads.zlw"}}));
-  pugi::xml_node def = root.child("WORKSPACE_DEFINITIONS");
-  EXPECT_STREQ(def.child("PROPERTY").attribute("name").value(), "workspaceID");
-  pugi::xml_node destination = def.child("DATASET").next_sibling("DATASET");
-  EXPECT_STREQ(destination.child("PROPERTY").attribute("name").value(), "datasetID");
-  EXPECT_STREQ(def.child("DATASET").child("FEATURE_TYPE").child("PROPERTY").attribute("name").value(),
-               "featureTypeID");
-  // An update replaces the whole set.
-  ASSERT_TRUE(admin_->command("REP_UPDATE_SERVICEPROPERTYACCESSOR",
-                              {{"serviceID", serviceId},
-                               {"propertyAccessorObject", "<REP_UPDATE_SERVICEPROPERTYACCESSOR/>"}})
-                  .ok());
-  root = parse(admin_->command("REP_GET_SERVICE", {{"serviceName", "run"}}));
-  EXPECT_FALSE(root.child("SERVICE").child("PROPERTY"));
-}
-
-TEST_F(Repository, EverythingSurvivesARestart) {
-  ASSERT_TRUE(addItem("roads.zlw", kRoads).ok());
-  ASSERT_TRUE(addResource("roads.zlw", "lookup.csv", "a,b\n").ok());
-  ASSERT_TRUE(admin_->command("REP_ADD_SERVICE", {{"serviceObject", service("run", true, true, false)}}).ok());
-  ASSERT_TRUE(admin_->command("REP_REGISTER_WORKSPACESERVICE", {{"serviceName", "run"},
-                                                                {"repositoryName", "REPO"},
-                                                                {"workspaceName", "roads.zlw"}})
-                  .ok());
-  auto root = parse(repo("REP_GET_WORKSPACEVIEW", {{"workspaceName", "roads.zlw"}}));
-  std::string ws = root.child("WORKSPACE_DEFINITIONS").attribute("workspace_id").value();
-  ASSERT_TRUE(admin_->command("REP_UPDATE_WORKSPACEPROPERTYACCESSOR",
-                              {{"workspaceID", ws}, {"propertyAccessorObject", accessor("A", "c", "n", "v")}})
-                  .ok());
   // A stray file in the content directory (as a crash between rename and commit leaves) goes.
   writeFile(dataDir_ + "/store/orphan", "x");
-  admin_.reset();
-  startServer();
-  admin_ = connectAs("admin");
+  restart();
   EXPECT_EQ(storedFiles(), 2u);
-  EXPECT_EQ(admin_->command("REP_REPOSITORYEXISTS", {{"repositoryName", "REPO"}}).body, "true");
+  EXPECT_EQ(repo("REP_GET_WORKSPACEVIEW", {{"workspaceName", "roads.zlw"}}).body,
+            document("<REP_GET_WORKSPACEVIEW>" +
+                     roadsView({{"1", property("workspaceID", "1")},
+                                {"1.2", property("datasetID", "1.2")},
+                                {"1.1.1", property("featureTypeID", "1.1.1")}}) +
+                     "</REP_GET_WORKSPACEVIEW>"));
+  EXPECT_EQ(reg("REP_WORKSPACESERVICEEXISTS", "run", "workspaceName", "roads.zlw").body, "true");
   Download down = admin_->download("REP_GET_ITEMRESOURCE", {{"repositoryName", "REPO"},
                                                             {"itemName", "roads.zlw"},
                                                             {"resourceName", "lookup.csv"}});
-  EXPECT_EQ(down.content, "a,b\n");
-  root = parse(repo("REP_GET_WORKSPACEVIEW", {{"workspaceName", "roads.zlw"}}));
-  EXPECT_STREQ(root.child("WORKSPACE_DEFINITIONS").child("PROPERTY").attribute("value").value(), "v");
-  EXPECT_EQ(admin_->command("REP_WORKSPACESERVICEEXISTS", {{"serviceName", "run"},
-                                                           {"repositoryName", "REPO"},
-                                                           {"workspaceName", "roads.zlw"}})
-                .body,
-            "true");
+  EXPECT_EQ(down.content, "x");
+  auto root = parse(admin("REP_GET_SERVICE", {{"serviceName", "run"}}));
+  EXPECT_STREQ(root.child("SERVICE").first_child().attribute("name").value(), "serviceID");
+  ASSERT_TRUE(admin("REP_UPDATE_SERVICEPROPERTYACCESSOR",
+                    {{"serviceID", "1"}, {"propertyAccessorObject", "<EMPTY/>"}})
+                  .ok());
+  root = parse(admin("REP_GET_SERVICE", {{"serviceName", "run"}}));
+  EXPECT_FALSE(root.child("SERVICE").first_child());
 }
 
 }  // namespace

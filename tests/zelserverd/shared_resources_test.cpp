@@ -1,10 +1,10 @@
-// Shared resources: every "SR_" command, confinement to the area, checked uploads.
+// Shared resources: every "SR_" command, confinement to the area, checked uploads; and the path
+// resolver on its own.
 #include <gtest/gtest.h>
-#include <pugixml.hpp>
-#include <unistd.h>
 
 #include <filesystem>
 
+#include "shared_resources.h"
 #include "support/server_fixture.h"
 
 namespace zeltest {
@@ -38,38 +38,36 @@ class Shared : public ServerFixture {
                             {"itemFileCRCCheckingEnabled", check ? "true" : "false"}},
                            content, crc);
   }
-  std::vector<std::string> areaNames(const std::string& sub = "") {
-    std::vector<std::string> names;
-    for (const auto& entry : fs::directory_iterator(areaDir_ + sub))
-      names.push_back(entry.path().filename().string());
-    std::sort(names.begin(), names.end());
-    return names;
+  Download download(const std::string& path) {
+    return client_->download("SR_DOWNLOAD",
+                             {{"srName", "AREA"}, {"srSrcPath", pathDocument(path)}});
   }
 
   std::unique_ptr<TestClient> client_;
 };
 
-TEST_F(Shared, ListsAndFindsResources) {
-  WireReply all = client_->command("SR_GET_SHAREDRESOURCES");
-  ASSERT_TRUE(all.ok());
-  pugi::xml_document doc;
-  ASSERT_TRUE(doc.load_string(all.body.c_str()));
-  pugi::xml_node area = doc.document_element().child("SHAREDRESOURCE");
-  EXPECT_STREQ(area.attribute("name").value(), "AREA");
-  EXPECT_STREQ(area.attribute("displayname").value(), "Test area");
-  EXPECT_STREQ(area.attribute("description").value(), "Files of the test");
-  EXPECT_FALSE(area.next_sibling("SHAREDRESOURCE"));
+// A "FILEINFO" element as the server writes it, with its time stamp made "TIME".
+std::string fileInfo(const std::string& type, const std::string& size, const std::string& name,
+                     const std::string& dir) {
+  std::string path = "name=\"" + name + "\" dirpath=\"" + dir + "\" abspath=\"" +
+                     (dir.empty() ? name : dir + "/" + name) + "\"";
+  return "<FILEINFO filetype=\"" + type + "\" size=\"" + size + "\" date=\"TIME\" " + path +
+         "><PATH " + path + "/></FILEINFO>";
+}
 
-  WireReply one = client_->command("SR_GET_SHAREDRESOURCE", {{"srName", "AREA"}});
-  ASSERT_TRUE(doc.load_string(one.body.c_str()));
-  EXPECT_STREQ(doc.document_element().child("SHAREDRESOURCE").attribute("name").value(), "AREA");
-  WireReply unknown = client_->command("SR_GET_SHAREDRESOURCE", {{"srName", "NOPE"}});
-  ASSERT_TRUE(unknown.ok());
-  ASSERT_TRUE(doc.load_string(unknown.body.c_str()));
-  EXPECT_FALSE(doc.document_element().child("SHAREDRESOURCE"));
-  EXPECT_EQ(onPath("SR_EXISTS", "x").body, "false");
+TEST_F(Shared, ListsAndFindsResources) {
+  const std::string area =
+      R"(<SHAREDRESOURCE name="AREA" displayname="Test area" description="Files of the test"/>)";
+  EXPECT_EQ(client_->command("SR_GET_SHAREDRESOURCES").body,
+            document("<SR_GET_SHAREDRESOURCES>" + area + "</SR_GET_SHAREDRESOURCES>"));
+  EXPECT_EQ(client_->command("SR_GET_SHAREDRESOURCE", {{"srName", "AREA"}}).body,
+            document("<SR_GET_SHAREDRESOURCE>" + area + "</SR_GET_SHAREDRESOURCE>"));
+  // Unknown: a document without the element, which clients read as "not found".
+  EXPECT_EQ(client_->command("SR_GET_SHAREDRESOURCE", {{"srName", "NOPE"}}).body,
+            document("<SR_GET_SHAREDRESOURCE/>"));
   EXPECT_EQ(client_->command("SR_EXISTS", {{"srName", "NOPE"}, {"srPath", pathDocument("x")}}).body,
             "unknown shared resource 'NOPE'");
+  EXPECT_EQ(client_->command("SR_EXISTS", {{"srName", "AREA"}}).body, "missing value \"srPath\"");
 }
 
 TEST_F(Shared, UploadDownloadAndDescribe) {
@@ -79,42 +77,28 @@ TEST_F(Shared, UploadDownloadAndDescribe) {
   WireReply up = upload("in/deep/data.bin", content);
   ASSERT_TRUE(up.ok()) << up.body;
   EXPECT_TRUE(readFile(areaDir_ + "/in/deep/data.bin") == content);
-  EXPECT_EQ(areaNames("/in/deep"), std::vector<std::string>{"data.bin"});
+  EXPECT_EQ(entriesOf(areaDir_ + "/in/deep"), std::vector<std::string>{"data.bin"});
   EXPECT_EQ(onPath("SR_EXISTS", "in/deep/data.bin").body, "true");
+  EXPECT_EQ(onPath("SR_EXISTS", "in/x").body, "false");
 
-  Download down = client_->download(
-      "SR_DOWNLOAD", {{"srName", "AREA"}, {"srSrcPath", pathDocument("in/deep/data.bin")}});
+  Download down = download("in/deep/data.bin");
   EXPECT_TRUE(down.gotFile);
-  EXPECT_EQ(down.content.size(), content.size());
   EXPECT_TRUE(down.content == content);
   EXPECT_TRUE(down.reply.ok());
 
-  WireReply info = onPath("SR_GET", "in/deep/data.bin");
-  pugi::xml_document doc;
-  ASSERT_TRUE(doc.load_string(info.body.c_str())) << info.body;
-  pugi::xml_node file = doc.document_element().child("FILEINFO");
-  EXPECT_STREQ(file.attribute("filetype").value(), "FILE");
-  EXPECT_STREQ(file.attribute("size").value(), "300000");
-  EXPECT_EQ(std::string(file.attribute("date").value()).size(), 20u);
-  EXPECT_STREQ(file.child("PATH").attribute("name").value(), "data.bin");
-  EXPECT_STREQ(file.child("PATH").attribute("dirpath").value(), "in/deep");
-  EXPECT_STREQ(file.child("PATH").attribute("abspath").value(), "in/deep/data.bin");
-
-  WireReply listing = onPath("SR_LIST", "in");
-  ASSERT_TRUE(doc.load_string(listing.body.c_str()));
-  pugi::xml_node entry = doc.document_element().child("FILEINFO");
-  EXPECT_STREQ(entry.attribute("filetype").value(), "DIR");
-  EXPECT_STREQ(entry.attribute("abspath").value(), "in/deep");
-  EXPECT_FALSE(entry.next_sibling("FILEINFO"));
+  EXPECT_EQ(withoutTimes(onPath("SR_GET", "in/deep/data.bin").body),
+            document("<SR_GET>" + fileInfo("FILE", "300000", "data.bin", "in/deep") + "</SR_GET>"));
+  // Files being received have a temporary name and are not listed.
+  writeFile(areaDir_ + "/in/.zelserverd-partial", "x");
+  EXPECT_EQ(withoutTimes(onPath("SR_LIST", "in").body),
+            document("<SR_LIST>" + fileInfo("DIR", "0", "deep", "in") + "</SR_LIST>"));
   EXPECT_EQ(onPath("SR_LIST", "in/deep/data.bin").body, "'in/deep/data.bin' is not a directory");
-}
+  EXPECT_EQ(onPath("SR_GET", "in/x").body, "'in/x' does not exist");
 
-TEST_F(Shared, EmptyFileAndReplacingUpload) {
-  ASSERT_TRUE(upload("f.txt", "first version").ok());
-  ASSERT_TRUE(upload("f.txt", "").ok());
-  EXPECT_EQ(readFile(areaDir_ + "/f.txt"), "");
-  Download down =
-      client_->download("SR_DOWNLOAD", {{"srName", "AREA"}, {"srSrcPath", pathDocument("f.txt")}});
+  // An empty upload replaces a file and downloads as empty.
+  ASSERT_TRUE(upload("in/deep/data.bin", "").ok());
+  EXPECT_EQ(readFile(areaDir_ + "/in/deep/data.bin"), "");
+  down = download("in/deep/data.bin");
   EXPECT_TRUE(down.gotFile);
   EXPECT_EQ(down.content, "");
 }
@@ -124,10 +108,9 @@ TEST_F(Shared, CrcMismatchIsRefusedWithoutAFile) {
   WireReply bad = upload("keep.txt", "new content", crc32("new content") ^ 1);
   EXPECT_EQ(bad.status, "ERROR");
   EXPECT_EQ(bad.body.rfind("CRC mismatch", 0), 0u) << bad.body;
-  WireReply fresh = upload("fresh.txt", "abc", 12345);
-  EXPECT_EQ(fresh.status, "ERROR");
+  EXPECT_EQ(upload("fresh.txt", "abc", 12345).status, "ERROR");
   EXPECT_EQ(readFile(areaDir_ + "/keep.txt"), "old");
-  EXPECT_EQ(areaNames(), std::vector<std::string>{"keep.txt"});
+  EXPECT_EQ(entriesOf(areaDir_), std::vector<std::string>{"keep.txt"});
   // Without checking asked for, the announced CRC is not compared.
   EXPECT_TRUE(upload("unchecked.txt", "abc", 12345, false).ok());
   // The connection stays in step after a refusal.
@@ -144,11 +127,7 @@ TEST_F(Shared, PathsCannotLeaveTheArea) {
   fs::create_directories(areaDir_ + "/inner");
   fs::create_directory_symlink(areaDir_ + "/inner", areaDir_ + "/inner-link");
 
-  struct Case {
-    std::string path;
-    std::string expected;
-  };
-  const Case cases[] = {
+  const std::pair<std::string, std::string> cases[] = {
       {"../outside/secret.txt", "path '../outside/secret.txt' may not contain '..'"},
       {"inner/../../outside", "path 'inner/../../outside' may not contain '..'"},
       {"inner\\..\\..\\x", "path 'inner\\..\\..\\x' may not contain '..'"},
@@ -159,32 +138,25 @@ TEST_F(Shared, PathsCannotLeaveTheArea) {
       {"secret-link", "symbolic link 'secret-link' points outside shared resource 'AREA'"},
       {"dangling", "symbolic link 'dangling' points outside shared resource 'AREA'"},
   };
-  for (const Case& c : cases) {
-    for (const char* keyword : {"SR_EXISTS", "SR_GET", "SR_LIST", "SR_MAKE", "SR_DELETE"}) {
-      WireReply reply = onPath(keyword, c.path);
-      EXPECT_EQ(reply.status, "ERROR") << keyword << " " << c.path;
-      EXPECT_EQ(reply.body, c.expected) << keyword;
-    }
-    EXPECT_EQ(upload(c.path, "x").body, c.expected);
-    EXPECT_EQ(twoPaths("SR_COPY", "inner", c.path).body, c.expected);
-    EXPECT_EQ(twoPaths("SR_MOVE", c.path, "inner/x").body, c.expected);
-    Download down =
-        client_->download("SR_DOWNLOAD", {{"srName", "AREA"}, {"srSrcPath", pathDocument(c.path)}});
+  for (const auto& [path, expected] : cases) {
+    for (const char* keyword : {"SR_EXISTS", "SR_GET", "SR_LIST", "SR_MAKE", "SR_DELETE"})
+      EXPECT_EQ(onPath(keyword, path).body, expected) << keyword;
+    EXPECT_EQ(upload(path, "x").body, expected);
+    EXPECT_EQ(twoPaths("SR_COPY", "inner", path).body, expected);
+    EXPECT_EQ(twoPaths("SR_MOVE", path, "inner/x").body, expected);
+    Download down = download(path);
     EXPECT_FALSE(down.gotFile);
-    EXPECT_EQ(down.reply.body, c.expected);
+    EXPECT_EQ(down.reply.body, expected);
   }
+  EXPECT_EQ(entriesOf(outside), std::vector<std::string>{"secret.txt"});
   EXPECT_EQ(readFile(outside + "/secret.txt"), "secret");
-  EXPECT_EQ(fs::directory_iterator(outside) != fs::directory_iterator(), true);
   // A link that stays inside the area is fine.
   EXPECT_TRUE(upload("inner-link/ok.txt", "ok").ok());
   EXPECT_EQ(readFile(areaDir_ + "/inner/ok.txt"), "ok");
   // The listing leaves out links that point outside.
-  pugi::xml_document doc;
-  ASSERT_TRUE(doc.load_string(onPath("SR_LIST", "").body.c_str()));
-  std::vector<std::string> listed;
-  for (pugi::xml_node e : doc.document_element().children("FILEINFO"))
-    listed.push_back(e.attribute("name").value());
-  EXPECT_EQ(listed, (std::vector<std::string>{"inner", "inner-link"}));
+  EXPECT_EQ(withoutTimes(onPath("SR_LIST", "").body),
+            document("<SR_LIST>" + fileInfo("DIR", "0", "inner", "") +
+                     fileInfo("DIR", "0", "inner-link", "") + "</SR_LIST>"));
 }
 
 TEST_F(Shared, CopyMoveMakeDelete) {
@@ -200,13 +172,17 @@ TEST_F(Shared, CopyMoveMakeDelete) {
   EXPECT_FALSE(fs::exists(areaDir_ + "/a/two.txt"));
   EXPECT_EQ(readFile(areaDir_ + "/c/three.txt"), "1");
   EXPECT_EQ(twoPaths("SR_MOVE", "missing", "x").body, "'missing' does not exist");
+  EXPECT_EQ(twoPaths("SR_MOVE", "", "x").body,
+            "the shared resource itself cannot be copied or moved");
   EXPECT_EQ(twoPaths("SR_COPY", "c/one.txt", "no/dir/x").body, "directory 'no/dir' does not exist");
+  EXPECT_EQ(twoPaths("SR_COPY", "c/one.txt", "").body,
+            "the shared resource itself cannot be replaced");
   EXPECT_EQ(upload("no/dir/x", "x").body, "directory 'no/dir' does not exist");
   EXPECT_EQ(upload("c", "x").body, "'c' is a directory");
   EXPECT_EQ(onPath("SR_DELETE", "c").body, "true");
   EXPECT_EQ(onPath("SR_DELETE", "c").body, "false");
   EXPECT_EQ(onPath("SR_DELETE", "").body, "the shared resource itself cannot be deleted");
-  EXPECT_EQ(areaNames(), std::vector<std::string>{"a"});
+  EXPECT_EQ(entriesOf(areaDir_), std::vector<std::string>{"a"});
 }
 
 TEST_F(Shared, ViewersMayReadButNotWrite) {
@@ -217,20 +193,72 @@ TEST_F(Shared, ViewersMayReadButNotWrite) {
   WireReply refused = vic->upload(
       "SR_UPLOAD", {{"srName", "AREA"}, {"srDestPath", pathDocument("w.txt")}}, "w");
   EXPECT_EQ(refused.body, "Authorization Error: user 'vic' may not run SR_UPLOAD");
-  EXPECT_FALSE(fs::exists(areaDir_ + "/w.txt"));
+  EXPECT_EQ(entriesOf(areaDir_), std::vector<std::string>{"r.txt"});
 }
 
 TEST_F(Shared, PathValueMustBeAPathDocument) {
-  WireReply plain = client_->command("SR_EXISTS", {{"srName", "AREA"}, {"srPath", "r.txt"}});
-  EXPECT_EQ(plain.body.rfind("path value is not a PATH document", 0), 0u) << plain.body;
-  WireReply other = client_->command(
-      "SR_EXISTS", {{"srName", "AREA"}, {"srPath", "<?xml version=\"1.0\"?><X><FILE/></X>"}});
-  EXPECT_EQ(other.body, "path value holds no PATH element");
+  auto exists = [&](const std::string& value) {
+    return client_->command("SR_EXISTS", {{"srName", "AREA"}, {"srPath", value}}).body;
+  };
+  EXPECT_EQ(exists("r.txt").rfind("path value is not a PATH document", 0), 0u);
+  EXPECT_EQ(exists("<?xml version=\"1.0\"?><X><FILE/></X>"), "path value holds no PATH element");
   writeFile(areaDir_ + "/n.txt", "n");
-  WireReply byParts = client_->command(
-      "SR_EXISTS", {{"srName", "AREA"},
-                    {"srPath", "<?xml version=\"1.0\"?><X><PATH name=\"n.txt\" dirpath=\"\" abspath=\"\"/></X>"}});
-  EXPECT_EQ(byParts.body, "true");
+  EXPECT_EQ(exists("<X><PATH name=\"n.txt\" dirpath=\"\" abspath=\"\"/></X>"), "true");
+}
+
+class Paths : public ::testing::Test {
+ protected:
+  void SetUp() override {
+    root_ = makeTempDir();
+    fs::create_directories(root_ + "/area/sub");
+    std::string error;
+    area_ = std::make_unique<zelserverd::SharedArea>(
+        zelserverd::SharedResourceConfig{"A", root_ + "/area", "A", ""}, error);
+    ASSERT_EQ(error, "");
+    real_ = fs::canonical(root_ + "/area").string();
+  }
+  void TearDown() override { removeTree(root_); }
+
+  std::string root_;
+  std::string real_;
+  std::unique_ptr<zelserverd::SharedArea> area_;
+};
+
+TEST_F(Paths, NormalisesAndMapsEveryComponent) {
+  struct Case {
+    const char* client;
+    const char* relative;
+  };
+  const Case cases[] = {
+      {"", ""},
+      {".", ""},
+      {"sub", "sub"},
+      {"sub//./file.txt", "sub/file.txt"},
+      {"sub\\x\\y", "sub/x/y"},
+      {"missing/deeper/still", "missing/deeper/still"},
+      {"a..b/..c", "a..b/..c"},
+      {"/sub/file.txt", "sub/file.txt"},
+      {"/", ""},
+  };
+  for (const Case& c : cases) {
+    zelserverd::AreaPath path;
+    ASSERT_EQ(area_->resolve(c.client, path), "") << c.client;
+    EXPECT_EQ(path.relative, c.relative);
+    EXPECT_EQ(path.full, std::string(c.relative).empty() ? real_ : real_ + "/" + c.relative);
+  }
+}
+
+TEST_F(Paths, LinkTargetsAreCheckedWhereverTheLinkStands) {
+  fs::create_directories(root_ + "/out");
+  fs::create_directory_symlink(root_ + "/out", root_ + "/area/sub/out");
+  fs::create_directory_symlink("..", root_ + "/area/sub/up");
+  fs::create_directory_symlink(".", root_ + "/area/sub/self");
+  zelserverd::AreaPath path;
+  EXPECT_EQ(area_->resolve("sub/out/new/file", path),
+            "symbolic link 'sub/out' points outside shared resource 'A'");
+  EXPECT_EQ(area_->resolve("sub/up/sub", path), "");
+  EXPECT_EQ(area_->resolve("sub/up/sub/up/up", path), "");
+  EXPECT_EQ(area_->resolve("sub/self/self/x", path), "");
 }
 
 }  // namespace

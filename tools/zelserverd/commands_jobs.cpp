@@ -14,16 +14,17 @@ namespace zelserverd {
 
 namespace {
 
-// Clients write job ids as signed 32-bit decimals, so 4294967295 arrives as -1.
-std::optional<std::int64_t> jobIdOf(CommandContext& context, Reply& failure) {
+// The job a command names: the failure reply, or nothing with `id` set. Clients write job ids
+// as signed 32-bit decimals, so 4294967295 arrives as -1.
+std::optional<Reply> resolveJob(CommandContext& context, std::int64_t& id) {
+  Reply failure;
   auto text = context.required("jobID", failure);
-  if (!text) return std::nullopt;
+  if (!text) return failure;
   auto value = parseSigned(*text);
-  if (!value || *value < INT32_MIN || *value > static_cast<std::int64_t>(UINT32_MAX)) {
-    failure = Reply::error("bad job id '" + *text + "'");
-    return std::nullopt;
-  }
-  return static_cast<std::int64_t>(static_cast<std::uint32_t>(*value));
+  if (!value || *value < INT32_MIN || *value > static_cast<std::int64_t>(UINT32_MAX))
+    return Reply::error("bad job id '" + *text + "'");
+  id = static_cast<std::int64_t>(static_cast<std::uint32_t>(*value));
+  return std::nullopt;
 }
 
 Reply jobRequest(CommandContext& context) {
@@ -62,36 +63,32 @@ Reply jobRequest(CommandContext& context) {
 }
 
 Reply abortJob(CommandContext& context) {
-  Reply failure;
-  auto id = jobIdOf(context, failure);
-  if (!id) return failure;
-  std::string error = context.server.jobs->abort(*id, context.principal().user);
+  std::int64_t id = 0;
+  if (auto failure = resolveJob(context, id)) return *failure;
+  std::string error = context.server.jobs->abort(id, context.principal().user);
   return error.empty() ? Reply::ok() : Reply::error(error);
 }
 
 Reply jobResult(CommandContext& context) {
-  Reply failure;
-  auto id = jobIdOf(context, failure);
-  if (!id) return failure;
-  std::optional<std::string> text = context.server.jobs->resultText(*id);
+  std::int64_t id = 0;
+  if (auto failure = resolveJob(context, id)) return *failure;
+  std::optional<std::string> text = context.server.jobs->resultText(id);
   return Reply::ok(text ? *text : "null");
 }
 
 Reply logExists(CommandContext& context) {
-  Reply failure;
-  auto id = jobIdOf(context, failure);
-  if (!id) return failure;
+  std::int64_t id = 0;
+  if (auto failure = resolveJob(context, id)) return *failure;
   struct stat info {};
-  return Reply::boolean(::stat(context.server.jobs->logPath(*id).c_str(), &info) == 0);
+  return Reply::boolean(::stat(context.server.jobs->logPath(id).c_str(), &info) == 0);
 }
 
 Reply logInfo(CommandContext& context) {
-  Reply failure;
-  auto id = jobIdOf(context, failure);
-  if (!id) return failure;
+  std::int64_t id = 0;
+  if (auto failure = resolveJob(context, id)) return *failure;
   struct stat info {};
-  if (::stat(context.server.jobs->logPath(*id).c_str(), &info) != 0)
-    return Reply::error("job " + std::to_string(*id) + " has no log");
+  if (::stat(context.server.jobs->logPath(id).c_str(), &info) != 0)
+    return Reply::error("job " + std::to_string(id) + " has no log");
   return Reply::ok(replyDocument("LOG_GET_FILEINFO", [&](pugi::xml_node root) {
     root.append_child("LOGFILEINFO").append_attribute("size") =
         std::to_string(static_cast<unsigned long long>(info.st_size)).c_str();
@@ -99,12 +96,11 @@ Reply logInfo(CommandContext& context) {
 }
 
 Reply logFile(CommandContext& context) {
-  Reply failure;
-  auto id = jobIdOf(context, failure);
-  if (!id) return failure;
+  std::int64_t id = 0;
+  if (auto failure = resolveJob(context, id)) return *failure;
   // The log of a running job keeps growing; the transfer sends what is there when it starts.
-  UniqueFd fd(::open(context.server.jobs->logPath(*id).c_str(), O_RDONLY | O_CLOEXEC));
-  if (!fd.valid()) return Reply::error("job " + std::to_string(*id) + " has no log");
+  UniqueFd fd(::open(context.server.jobs->logPath(id).c_str(), O_RDONLY | O_CLOEXEC));
+  if (!fd.valid()) return Reply::error("job " + std::to_string(id) + " has no log");
   std::string message;
   TransferOutcome outcome = sendDownload(context.io, fd.get(), message);
   if (outcome == TransferOutcome::Lost) return Reply::close();

@@ -33,43 +33,90 @@ std::string kindWord(ItemKind kind) {
   return "OTHER";
 }
 
-// "enableFilter" as the directives put it on the wire; absent means all.
-std::optional<Filter> filterOf(CommandContext& context, Reply& failure) {
-  std::string value = context.request.get("enableFilter", "All");
-  if (value == "All") return Filter::All;
-  if (value == "Enabled") return Filter::Enabled;
-  if (value == "Disabled") return Filter::Disabled;
-  failure = Reply::error("bad enableFilter '" + value + "' (All, Enabled or Disabled)");
-  return std::nullopt;
-}
-
 bool passes(Filter filter, bool enabled) {
   return filter == Filter::All || (filter == Filter::Enabled) == enabled;
 }
 
-std::optional<RepositoryRecord> repositoryFor(CommandContext& context, Reply& failure) {
-  auto name = context.required("repositoryName", failure);
-  if (!name) return std::nullopt;
-  auto repo = context.server.repos.repository(*name);
-  if (!repo) failure = Reply::error("unknown repository '" + *name + "'");
-  return repo;
-}
+// How a command names a service, repository or item: not at all, by a name it answers for
+// itself when unknown ("false", or a document without the element), or as something that must
+// exist.
+enum class Named { No, Name, Known };
 
-std::optional<ItemRecord> itemFor(CommandContext& context, const RepositoryRecord& repo,
-                                  std::string_view valueName, Reply& failure) {
+// What a command names, in the order a request is checked: the first missing value or unknown
+// name is the reply.
+struct Wants {
+  Named service = Named::No;                // "serviceName"
+  Named repository = Named::No;             // "repositoryName"
+  bool filter = false;                      // "enableFilter", absent meaning all
+  Named item = Named::No;                   // `itemValue`, in the repository
+  std::string_view itemValue = "itemName";  // "workspaceName" and others for the typed forms
+  bool resource = false;                    // "resourceName"
+};
+
+// What the names resolved to. A record named by its name alone holds only that name.
+struct Target {
+  ServiceRecord service;
+  RepositoryRecord repository;
+  Filter filter = Filter::All;
+  ItemRecord item;
+  std::string resourceName;
+};
+
+// Reads the value `valueName` into `out.name`; a Known one must also be found by `find`, which
+// fills `out`, or the command is refused with "unknown <what> '<name>'<where>".
+template <typename Record, typename Find>
+std::optional<Reply> resolveName(CommandContext& context, Named how, std::string_view valueName,
+                                 std::string_view what, const std::string& where, Find find,
+                                 Record& out) {
+  if (how == Named::No) return std::nullopt;
+  Reply failure;
   auto name = context.required(valueName, failure);
-  if (!name) return std::nullopt;
-  auto item = context.server.repos.item(repo.name, *name);
-  if (!item) failure = Reply::error("unknown item '" + *name + "' in '" + repo.name + "'");
-  return item;
+  if (!name) return failure;
+  out.name = *name;
+  if (how == Named::Name) return std::nullopt;
+  std::optional<Record> record = find(*name);
+  if (!record)
+    return Reply::error("unknown " + std::string(what) + " '" + *name + "'" + where);
+  out = std::move(*record);
+  return std::nullopt;
 }
 
-std::optional<ServiceRecord> serviceFor(CommandContext& context, Reply& failure) {
-  auto name = context.required("serviceName", failure);
-  if (!name) return std::nullopt;
-  auto service = context.server.repos.service(*name);
-  if (!service) failure = Reply::error("unknown service '" + *name + "'");
-  return service;
+// "enableFilter" as the directives put it on the wire.
+std::optional<Reply> resolveFilter(CommandContext& context, Filter& out) {
+  std::string value = context.request.get("enableFilter", "All");
+  if (value == "All") out = Filter::All;
+  else if (value == "Enabled") out = Filter::Enabled;
+  else if (value == "Disabled") out = Filter::Disabled;
+  else return Reply::error("bad enableFilter '" + value + "' (All, Enabled or Disabled)");
+  return std::nullopt;
+}
+
+// The one way a handler learns what its request names: the failure reply, or nothing with
+// `target` filled.
+std::optional<Reply> resolve(CommandContext& context, const Wants& wants, Target& target) {
+  RepositoryStore& repos = context.server.repos;
+  if (auto failure = resolveName(
+          context, wants.service, "serviceName", "service", "",
+          [&](const std::string& name) { return repos.service(name); }, target.service))
+    return failure;
+  if (auto failure = resolveName(
+          context, wants.repository, "repositoryName", "repository", "",
+          [&](const std::string& name) { return repos.repository(name); }, target.repository))
+    return failure;
+  if (wants.filter)
+    if (auto failure = resolveFilter(context, target.filter)) return failure;
+  if (auto failure = resolveName(
+          context, wants.item, wants.itemValue, "item", " in '" + target.repository.name + "'",
+          [&](const std::string& name) { return repos.item(target.repository.name, name); },
+          target.item))
+    return failure;
+  if (wants.resource) {
+    Reply failure;
+    auto name = context.required("resourceName", failure);
+    if (!name) return failure;
+    target.resourceName = *name;
+  }
+  return std::nullopt;
 }
 
 ItemHeader headerOf(CommandContext& context, const ItemRecord& item) {
@@ -214,25 +261,23 @@ void appendCustom(CommandContext& context, Node parent, const char* element,
 // ---- repositories -------------------------------------------------------------------------
 
 Reply repositoryExists(CommandContext& context) {
-  Reply failure;
-  auto name = context.required("repositoryName", failure);
-  if (!name) return failure;
-  return Reply::boolean(context.server.repos.repository(*name).has_value());
+  Target t;
+  if (auto failure = resolve(context, {.repository = Named::Name}, t)) return *failure;
+  return Reply::boolean(context.server.repos.repository(t.repository.name).has_value());
 }
 
 Reply getRepositories(CommandContext& context) {
-  Reply failure;
-  if (!filterOf(context, failure)) return failure;
+  Target t;
+  if (auto failure = resolve(context, {.filter = true}, t)) return *failure;
   return Reply::ok(replyDocument("REP_GET_REPOSITORIES", [&](Node root) {
     for (const auto& repo : context.server.repos.repositories()) appendRepository(root, repo);
   }));
 }
 
 Reply getRepository(CommandContext& context) {
-  Reply failure;
-  auto name = context.required("repositoryName", failure);
-  if (!name) return failure;
-  auto repo = context.server.repos.repository(*name);
+  Target t;
+  if (auto failure = resolve(context, {.repository = Named::Name}, t)) return *failure;
+  auto repo = context.server.repos.repository(t.repository.name);
   // Unknown: a document without the element, which clients read as "not found".
   return Reply::ok(replyDocument("REP_GET_REPOSITORY", [&](Node root) {
     if (repo) appendRepository(root, *repo);
@@ -256,15 +301,14 @@ Reply addRepository(CommandContext& context) {
 }
 
 Reply removeRepository(CommandContext& context) {
-  Reply failure;
-  auto name = context.required("repositoryName", failure);
-  if (!name) return failure;
-  return Reply::boolean(context.server.repos.removeRepository(*name));
+  Target t;
+  if (auto failure = resolve(context, {.repository = Named::Name}, t)) return *failure;
+  return Reply::boolean(context.server.repos.removeRepository(t.repository.name));
 }
 
 Reply globalItems(CommandContext& context) {
-  Reply failure;
-  if (!filterOf(context, failure)) return failure;
+  Target t;
+  if (auto failure = resolve(context, {.filter = true}, t)) return *failure;
   // One property per item: the repository is the category, the item the name, its kind the
   // value; the details are the property's attributes.
   return Reply::ok(replyDocument("REP_GLOBAL_GET_ALL_ITEMS", [&](Node root) {
@@ -289,12 +333,10 @@ Reply globalItems(CommandContext& context) {
 // ---- items and resources ----------------------------------------------------------------
 
 Reply itemExists(CommandContext& context) {
-  Reply failure;
-  auto repo = repositoryFor(context, failure);
-  if (!repo) return failure;
-  auto name = context.required("itemName", failure);
-  if (!name) return failure;
-  return Reply::boolean(context.server.repos.item(repo->name, *name).has_value());
+  Target t;
+  if (auto failure = resolve(context, {.repository = Named::Known, .item = Named::Name}, t))
+    return *failure;
+  return Reply::boolean(context.server.repos.item(t.repository.name, t.item.name).has_value());
 }
 
 // Reads the head of a received file to check a workspace's header before it is stored.
@@ -305,26 +347,26 @@ std::string checkWorkspaceContent(int fd) {
 }
 
 Reply putItem(CommandContext& context, bool replace) {
-  Reply failure;
-  auto repo = repositoryFor(context, failure);
-  if (!repo) return failure;
-  auto name = context.required("itemName", failure);
-  if (!name) return failure;
-  std::string error = checkName("item", *name);
+  Target t;
+  if (auto failure = resolve(context, {.repository = Named::Known, .item = Named::Name}, t))
+    return *failure;
+  const std::string& repo = t.repository.name;
+  const std::string& name = t.item.name;
+  std::string error = checkName("item", name);
   if (!error.empty()) return Reply::error(error);
   // Refused before the transfer starts when it is clear already; checked again on commit.
-  bool exists = context.server.repos.item(repo->name, *name).has_value();
+  bool exists = context.server.repos.item(repo, name).has_value();
   if (exists != replace)
-    return Reply::error("item '" + *name + (exists ? "' already exists" : "' does not exist") +
-                        " in '" + repo->name + "'");
+    return Reply::error("item '" + name + (exists ? "' already exists" : "' does not exist") +
+                        " in '" + repo + "'");
   bool checkCrc = context.request.get("itemFileCRCCheckingEnabled") == "true";
   UploadResult upload = receiveUpload(context.io, context.server.repos.dir(), checkCrc,
                                       context.server.config.maxFileBytes);
   if (upload.outcome == TransferOutcome::Lost) return Reply::close();
   if (upload.outcome == TransferOutcome::Refused) return Reply::error(upload.message);
-  if (itemKindOf(*name) == ItemKind::Workspace) error = checkWorkspaceContent(upload.file.fd());
+  if (itemKindOf(name) == ItemKind::Workspace) error = checkWorkspaceContent(upload.file.fd());
   if (error.empty())
-    error = context.server.repos.putItem(repo->name, *name, upload.file,
+    error = context.server.repos.putItem(repo, name, upload.file,
                                          static_cast<std::int64_t>(upload.length), replace);
   return error.empty() ? Reply::ok() : Reply::error(error);
 }
@@ -344,56 +386,47 @@ Reply sendFile(CommandContext& context, UniqueFd fd, const std::string& what) {
 // A refusal here is one "ERROR" frame in place of the file header, which clients read as
 // "no file".
 Reply getItem(CommandContext& context) {
-  Reply failure;
-  auto repo = repositoryFor(context, failure);
-  if (!repo) return failure;
-  auto item = itemFor(context, *repo, "itemName", failure);
-  if (!item) return failure;
-  return sendFile(context, context.server.repos.openItem(repo->name, item->name),
-                  "item '" + item->name + "'");
+  Target t;
+  if (auto failure = resolve(context, {.repository = Named::Known, .item = Named::Known}, t))
+    return *failure;
+  return sendFile(context, context.server.repos.openItem(t.repository.name, t.item.name),
+                  "item '" + t.item.name + "'");
 }
 
 Reply removeItem(CommandContext& context) {
-  Reply failure;
-  auto repo = repositoryFor(context, failure);
-  if (!repo) return failure;
-  auto name = context.required("itemName", failure);
-  if (!name) return failure;
-  return Reply::boolean(context.server.repos.removeItem(repo->name, *name));
+  Target t;
+  if (auto failure = resolve(context, {.repository = Named::Known, .item = Named::Name}, t))
+    return *failure;
+  return Reply::boolean(context.server.repos.removeItem(t.repository.name, t.item.name));
 }
 
+// The commands on one resource of an item.
+constexpr Wants kResource{.repository = Named::Known, .item = Named::Known, .resource = true};
+
 Reply resourceExists(CommandContext& context) {
-  Reply failure;
-  auto repo = repositoryFor(context, failure);
-  if (!repo) return failure;
-  auto item = itemFor(context, *repo, "itemName", failure);
-  if (!item) return failure;
-  auto name = context.required("resourceName", failure);
-  if (!name) return failure;
-  return Reply::boolean(context.server.repos.resource(item->id, *name).has_value());
+  Target t;
+  if (auto failure = resolve(context, kResource, t)) return *failure;
+  return Reply::boolean(context.server.repos.resource(t.item.id, t.resourceName).has_value());
 }
 
 Reply putResource(CommandContext& context, bool replace) {
-  Reply failure;
-  auto repo = repositoryFor(context, failure);
-  if (!repo) return failure;
-  auto item = itemFor(context, *repo, "itemName", failure);
-  if (!item) return failure;
-  auto name = context.required("resourceName", failure);
-  if (!name) return failure;
-  std::string error = checkName("resource", *name);
+  Target t;
+  if (auto failure = resolve(context, kResource, t)) return *failure;
+  const ItemRecord& item = t.item;
+  const std::string& name = t.resourceName;
+  std::string error = checkName("resource", name);
   if (!error.empty()) return Reply::error(error);
-  if (*name == item->name) return Reply::error("a resource cannot have the name of its item");
-  bool exists = context.server.repos.resource(item->id, *name).has_value();
+  if (name == item.name) return Reply::error("a resource cannot have the name of its item");
+  bool exists = context.server.repos.resource(item.id, name).has_value();
   if (exists != replace)
-    return Reply::error("resource '" + *name + (exists ? "' already exists" : "' does not exist") +
-                        " on '" + item->name + "'");
+    return Reply::error("resource '" + name + (exists ? "' already exists" : "' does not exist") +
+                        " on '" + item.name + "'");
   bool checkCrc = context.request.get("resourceFileCRCCheckingEnabled") == "true";
   UploadResult upload = receiveUpload(context.io, context.server.repos.dir(), checkCrc,
                                       context.server.config.maxFileBytes);
   if (upload.outcome == TransferOutcome::Lost) return Reply::close();
   if (upload.outcome == TransferOutcome::Refused) return Reply::error(upload.message);
-  error = context.server.repos.putResource(item->id, *name, upload.file,
+  error = context.server.repos.putResource(item.id, name, upload.file,
                                            static_cast<std::int64_t>(upload.length), replace);
   return error.empty() ? Reply::ok() : Reply::error(error);
 }
@@ -402,49 +435,36 @@ Reply addResource(CommandContext& context) { return putResource(context, false);
 Reply updateResource(CommandContext& context) { return putResource(context, true); }
 
 Reply getResource(CommandContext& context) {
-  Reply failure;
-  auto repo = repositoryFor(context, failure);
-  if (!repo) return failure;
-  auto item = itemFor(context, *repo, "itemName", failure);
-  if (!item) return failure;
-  auto name = context.required("resourceName", failure);
-  if (!name) return failure;
-  return sendFile(context, context.server.repos.openResource(item->id, *name),
-                  "resource '" + *name + "'");
+  Target t;
+  if (auto failure = resolve(context, kResource, t)) return *failure;
+  return sendFile(context, context.server.repos.openResource(t.item.id, t.resourceName),
+                  "resource '" + t.resourceName + "'");
 }
 
 Reply removeResource(CommandContext& context) {
-  Reply failure;
-  auto repo = repositoryFor(context, failure);
-  if (!repo) return failure;
-  auto item = itemFor(context, *repo, "itemName", failure);
-  if (!item) return failure;
-  auto name = context.required("resourceName", failure);
-  if (!name) return failure;
-  return Reply::boolean(context.server.repos.removeResource(item->id, *name));
+  Target t;
+  if (auto failure = resolve(context, kResource, t)) return *failure;
+  return Reply::boolean(context.server.repos.removeResource(t.item.id, t.resourceName));
 }
 
+// An absent or unknown resource name gives a document without the element.
 Reply resourceView(CommandContext& context) {
-  Reply failure;
-  auto repo = repositoryFor(context, failure);
-  if (!repo) return failure;
-  auto item = itemFor(context, *repo, "itemName", failure);
-  if (!item) return failure;
-  auto resource = context.server.repos.resource(item->id, context.request.get("resourceName"));
+  Target t;
+  if (auto failure = resolve(context, {.repository = Named::Known, .item = Named::Known}, t))
+    return *failure;
+  auto resource = context.server.repos.resource(t.item.id, context.request.get("resourceName"));
   return Reply::ok(replyDocument("REP_GET_ITEMRESOURCEVIEW", [&](Node root) {
     if (resource) appendResource(root, *resource);
   }));
 }
 
 Reply resourcesView(CommandContext& context) {
-  Reply failure;
-  auto repo = repositoryFor(context, failure);
-  if (!repo) return failure;
-  if (!filterOf(context, failure)) return failure;
-  auto item = itemFor(context, *repo, "itemName", failure);
-  if (!item) return failure;
+  Target t;
+  if (auto failure = resolve(
+          context, {.repository = Named::Known, .filter = true, .item = Named::Known}, t))
+    return *failure;
   return Reply::ok(replyDocument("REP_GET_ITEMRESOURCESVIEW", [&](Node root) {
-    for (const auto& r : context.server.repos.resources(item->id)) appendResource(root, r);
+    for (const auto& r : context.server.repos.resources(t.item.id)) appendResource(root, r);
   }));
 }
 
@@ -458,41 +478,37 @@ std::vector<ItemRecord> itemsOfKind(CommandContext& context, const RepositoryRec
   return out;
 }
 
+// The commands that list what a repository holds.
+constexpr Wants kRepositoryList{.repository = Named::Known, .filter = true};
+
 Reply summariesView(CommandContext& context) {
-  Reply failure;
-  auto repo = repositoryFor(context, failure);
-  if (!repo) return failure;
-  auto filter = filterOf(context, failure);
-  if (!filter) return failure;
+  Target t;
+  if (auto failure = resolve(context, kRepositoryList, t)) return *failure;
   return Reply::ok(replyDocument("REP_GET_WORKSPACESUMMARIESVIEW", [&](Node root) {
-    for (const auto& item : itemsOfKind(context, *repo, ItemKind::Workspace)) {
+    for (const auto& item : itemsOfKind(context, t.repository, ItemKind::Workspace)) {
       ItemHeader h = headerOf(context, item);
-      if (passes(*filter, h.enabled)) appendSummary(root, item, h);
+      if (passes(t.filter, h.enabled)) appendSummary(root, item, h);
     }
   }));
 }
 
 Reply workspacesView(CommandContext& context) {
-  Reply failure;
-  auto repo = repositoryFor(context, failure);
-  if (!repo) return failure;
-  auto filter = filterOf(context, failure);
-  if (!filter) return failure;
+  Target t;
+  if (auto failure = resolve(context, kRepositoryList, t)) return *failure;
   return Reply::ok(replyDocument("REP_GET_WORKSPACESVIEW", [&](Node root) {
-    for (const auto& item : itemsOfKind(context, *repo, ItemKind::Workspace))
-      if (passes(*filter, headerOf(context, item).enabled)) appendWorkspace(context, root, item);
+    for (const auto& item : itemsOfKind(context, t.repository, ItemKind::Workspace))
+      if (passes(t.filter, headerOf(context, item).enabled)) appendWorkspace(context, root, item);
   }));
 }
 
 // One view of a single item of `kind`, named by `valueName`; unknown gives no element.
 Reply singleView(CommandContext& context, const char* root, const char* valueName, ItemKind kind,
                  void (*append)(CommandContext&, Node, const ItemRecord&)) {
-  Reply failure;
-  auto repo = repositoryFor(context, failure);
-  if (!repo) return failure;
-  auto name = context.required(valueName, failure);
-  if (!name) return failure;
-  auto item = context.server.repos.item(repo->name, *name);
+  Target t;
+  if (auto failure = resolve(
+          context, {.repository = Named::Known, .item = Named::Name, .itemValue = valueName}, t))
+    return *failure;
+  auto item = context.server.repos.item(t.repository.name, t.item.name);
   return Reply::ok(replyDocument(root, [&](Node node) {
     if (item && itemKindOf(item->name) == kind) append(context, node, *item);
   }));
@@ -500,12 +516,10 @@ Reply singleView(CommandContext& context, const char* root, const char* valueNam
 
 Reply listView(CommandContext& context, const char* root, ItemKind kind,
                void (*append)(CommandContext&, Node, const ItemRecord&)) {
-  Reply failure;
-  auto repo = repositoryFor(context, failure);
-  if (!repo) return failure;
-  if (!filterOf(context, failure)) return failure;
+  Target t;
+  if (auto failure = resolve(context, kRepositoryList, t)) return *failure;
   return Reply::ok(replyDocument(root, [&](Node node) {
-    for (const auto& item : itemsOfKind(context, *repo, kind)) append(context, node, item);
+    for (const auto& item : itemsOfKind(context, t.repository, kind)) append(context, node, item);
   }));
 }
 
@@ -584,27 +598,24 @@ std::string serviceFromDocument(const std::string& text, ServiceRecord& out) {
 }
 
 Reply serviceExists(CommandContext& context) {
-  Reply failure;
-  auto name = context.required("serviceName", failure);
-  if (!name) return failure;
-  return Reply::boolean(context.server.repos.service(*name).has_value());
+  Target t;
+  if (auto failure = resolve(context, {.service = Named::Name}, t)) return *failure;
+  return Reply::boolean(context.server.repos.service(t.service.name).has_value());
 }
 
 Reply getServices(CommandContext& context) {
-  Reply failure;
-  auto filter = filterOf(context, failure);
-  if (!filter) return failure;
+  Target t;
+  if (auto failure = resolve(context, {.filter = true}, t)) return *failure;
   return Reply::ok(replyDocument("REP_GET_SERVICES", [&](Node root) {
     for (const auto& s : context.server.repos.services())
-      if (passes(*filter, s.enabled)) appendService(context, root, s);
+      if (passes(t.filter, s.enabled)) appendService(context, root, s);
   }));
 }
 
 Reply getService(CommandContext& context) {
-  Reply failure;
-  auto name = context.required("serviceName", failure);
-  if (!name) return failure;
-  auto service = context.server.repos.service(*name);
+  Target t;
+  if (auto failure = resolve(context, {.service = Named::Name}, t)) return *failure;
+  auto service = context.server.repos.service(t.service.name);
   return Reply::ok(replyDocument("REP_GET_SERVICE", [&](Node root) {
     if (service) appendService(context, root, *service);
   }));
@@ -627,10 +638,9 @@ Reply addService(CommandContext& context) { return putService(context, false); }
 Reply updateService(CommandContext& context) { return putService(context, true); }
 
 Reply removeService(CommandContext& context) {
-  Reply failure;
-  auto name = context.required("serviceName", failure);
-  if (!name) return failure;
-  return Reply::boolean(context.server.repos.removeService(*name));
+  Target t;
+  if (auto failure = resolve(context, {.service = Named::Name}, t)) return *failure;
+  return Reply::boolean(context.server.repos.removeService(t.service.name));
 }
 
 bool accepts(const ServiceRecord& s, ItemKind kind) {
@@ -655,89 +665,69 @@ std::string registerWith(CommandContext& context, const ServiceRecord& s, const 
   return context.server.repos.registerItem(s.id, item.id);
 }
 
-// Registration commands name a service, a repository and an item ("itemName", or
-// "workspaceName" for the workspace forms).
-struct Registration {
-  ServiceRecord service;
-  ItemRecord item;
-};
+// Registration commands name a service, a repository and an item of it.
+constexpr Wants kItemRegistration{
+    .service = Named::Known, .repository = Named::Known, .item = Named::Known};
+constexpr Wants kWorkspaceRegistration{.service = Named::Known,
+                                       .repository = Named::Known,
+                                       .item = Named::Known,
+                                       .itemValue = "workspaceName"};
 
-std::optional<Registration> registrationFor(CommandContext& context, std::string_view itemValue,
-                                            Reply& failure) {
-  auto service = serviceFor(context, failure);
-  if (!service) return std::nullopt;
-  auto repo = repositoryFor(context, failure);
-  if (!repo) return std::nullopt;
-  auto item = itemFor(context, *repo, itemValue, failure);
-  if (!item) return std::nullopt;
-  return Registration{*service, *item};
+Reply isRegistered(CommandContext& context, const Wants& wants) {
+  Target t;
+  if (auto failure = resolve(context, wants, t)) return *failure;
+  return Reply::boolean(context.server.repos.registered(t.service.id, t.item.id));
 }
 
-Reply itemRegistered(CommandContext& context) {
-  Reply failure;
-  auto r = registrationFor(context, "itemName", failure);
-  if (!r) return failure;
-  return Reply::boolean(context.server.repos.registered(r->service.id, r->item.id));
+Reply itemRegistered(CommandContext& context) { return isRegistered(context, kItemRegistration); }
+Reply workspaceServiceExists(CommandContext& context) {
+  return isRegistered(context, kWorkspaceRegistration);
 }
 
 Reply registerItem(CommandContext& context) {
-  Reply failure;
-  auto r = registrationFor(context, "itemName", failure);
-  if (!r) return failure;
-  std::string error = registerWith(context, r->service, r->item);
+  Target t;
+  if (auto failure = resolve(context, kItemRegistration, t)) return *failure;
+  std::string error = registerWith(context, t.service, t.item);
   return error.empty() ? Reply::ok() : Reply::error(error);
 }
 
 Reply deregisterItem(CommandContext& context) {
-  Reply failure;
-  auto r = registrationFor(context, "itemName", failure);
-  if (!r) return failure;
-  return Reply::boolean(context.server.repos.deregisterItem(r->service.id, r->item.id));
-}
-
-Reply workspaceServiceExists(CommandContext& context) {
-  Reply failure;
-  auto r = registrationFor(context, "workspaceName", failure);
-  if (!r) return failure;
-  return Reply::boolean(context.server.repos.registered(r->service.id, r->item.id));
+  Target t;
+  if (auto failure = resolve(context, kItemRegistration, t)) return *failure;
+  return Reply::boolean(context.server.repos.deregisterItem(t.service.id, t.item.id));
 }
 
 Reply registerWorkspace(CommandContext& context) {
-  Reply failure;
-  auto r = registrationFor(context, "workspaceName", failure);
-  if (!r) return failure;
-  if (itemKindOf(r->item.name) != ItemKind::Workspace)
-    return Reply::error("'" + r->item.name + "' is not a workspace");
-  std::string error = registerWith(context, r->service, r->item);
+  Target t;
+  if (auto failure = resolve(context, kWorkspaceRegistration, t)) return *failure;
+  if (itemKindOf(t.item.name) != ItemKind::Workspace)
+    return Reply::error("'" + t.item.name + "' is not a workspace");
+  std::string error = registerWith(context, t.service, t.item);
   return error.empty() ? Reply::ok() : Reply::error(error);
 }
 
 Reply deregisterWorkspace(CommandContext& context) {
-  Reply failure;
-  auto r = registrationFor(context, "workspaceName", failure);
-  if (!r) return failure;
-  if (itemKindOf(r->item.name) != ItemKind::Workspace)
-    return Reply::error("'" + r->item.name + "' is not a workspace");
-  return Reply::boolean(context.server.repos.deregisterItem(r->service.id, r->item.id));
+  Target t;
+  if (auto failure = resolve(context, kWorkspaceRegistration, t)) return *failure;
+  if (itemKindOf(t.item.name) != ItemKind::Workspace)
+    return Reply::error("'" + t.item.name + "' is not a workspace");
+  return Reply::boolean(context.server.repos.deregisterItem(t.service.id, t.item.id));
 }
 
 // The registrations of the repository's workspaces, filtered by whether the service is
 // enabled, and to one workspace when "workspaceName" is given.
 Reply workspaceServices(CommandContext& context) {
-  Reply failure;
-  auto repo = repositoryFor(context, failure);
-  if (!repo) return failure;
-  auto filter = filterOf(context, failure);
-  if (!filter) return failure;
+  Target t;
+  if (auto failure = resolve(context, kRepositoryList, t)) return *failure;
   const std::string* only = context.request.find("workspaceName");
   auto& repos = context.server.repos;
   return Reply::ok(replyDocument("REP_GET_WORKSPACESERVICES", [&](Node root) {
-    for (const auto& item : itemsOfKind(context, *repo, ItemKind::Workspace)) {
+    for (const auto& item : itemsOfKind(context, t.repository, ItemKind::Workspace)) {
       if (only && item.name != *only) continue;
       ItemHeader h = headerOf(context, item);
       for (std::int64_t serviceId : repos.servicesOfItem(item.id)) {
         auto service = repos.serviceById(serviceId);
-        if (!service || !passes(*filter, service->enabled)) continue;
+        if (!service || !passes(t.filter, service->enabled)) continue;
         Node pair = root.append_child("WORKSPACE_SERVICE");
         appendSummary(pair, item, h);
         appendService(context, pair, *service);
@@ -755,9 +745,8 @@ std::optional<ItemKind> kindFromText(std::string_view text) {
 }
 
 Reply registeredItems(CommandContext& context) {
-  Reply failure;
-  auto service = serviceFor(context, failure);
-  if (!service) return failure;
+  Target t;
+  if (auto failure = resolve(context, {.service = Named::Known}, t)) return *failure;
   std::optional<ItemKind> only;
   if (const std::string* type = context.request.find("itemType")) {
     only = kindFromText(*type);
@@ -767,7 +756,7 @@ Reply registeredItems(CommandContext& context) {
                           "OTHER)");
   }
   return Reply::ok(replyDocument("REP_GET_REGISTEREDITEMS", [&](Node root) {
-    for (const auto& item : context.server.repos.registeredItems(service->id))
+    for (const auto& item : context.server.repos.registeredItems(t.service.id))
       if (!only || itemKindOf(item.name) == *only) appendItem(root, item, headerOf(context, item));
   }));
 }

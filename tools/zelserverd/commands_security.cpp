@@ -9,64 +9,56 @@ namespace zelserverd {
 
 namespace {
 
-// Resolves "userAccountName" and checks that the signed-in user may touch that account.
-std::optional<std::string> accountFor(CommandContext& context, Reply& failure) {
-  auto account = context.required("userAccountName", failure);
-  if (!account) return std::nullopt;
+// The account a command names ("userAccountName"), once the signed-in user may touch it: the
+// failure reply, or nothing with `account` set.
+std::optional<Reply> resolveAccount(CommandContext& context, std::string& account) {
+  Reply failure;
+  auto name = context.required("userAccountName", failure);
+  if (!name) return failure;
   const Principal& principal = context.principal();
-  bool own = *account == principal.user;
+  bool own = *name == principal.user;
   std::uint32_t needed = own ? (kRightTokens | kRightTokensAdmin) : kRightTokensAdmin;
-  if ((principal.rights & needed) == 0) {
-    failure = Reply::authorization("user '" + principal.user +
-                                   "' may not manage the user token of '" + *account + "'");
-    return std::nullopt;
-  }
-  if (!context.server.config.findUser(*account)) {
-    failure = Reply::error("unknown user account '" + *account + "'");
-    return std::nullopt;
-  }
-  return account;
+  if ((principal.rights & needed) == 0)
+    return Reply::authorization("user '" + principal.user +
+                                "' may not manage the user token of '" + *name + "'");
+  if (!context.server.config.findUser(*name))
+    return Reply::error("unknown user account '" + *name + "'");
+  account = *name;
+  return std::nullopt;
 }
 
-// Reads the "USERTOKEN" element of "userTokenObject". The dates are the server's to set.
-std::optional<UserToken> tokenFromRequest(CommandContext& context, const std::string& account,
-                                          Reply& failure) {
+// Reads the "USERTOKEN" element of "userTokenObject" into `token`. The dates are the server's
+// to set.
+std::optional<Reply> readToken(CommandContext& context, UserToken& token) {
+  Reply failure;
   auto text = context.required("userTokenObject", failure);
-  if (!text) return std::nullopt;
+  if (!text) return failure;
   pugi::xml_document doc;
   std::string error = parseXml(*text, doc);
   pugi::xml_node element = error.empty() ? findElement(doc, "USERTOKEN") : pugi::xml_node();
-  if (!element) {
-    failure = Reply::error("\"userTokenObject\" holds no USERTOKEN element" +
-                           (error.empty() ? std::string() : ": " + error));
-    return std::nullopt;
-  }
-  UserToken token;
-  token.account = account;
+  if (!element)
+    return Reply::error("\"userTokenObject\" holds no USERTOKEN element" +
+                        (error.empty() ? std::string() : ": " + error));
   token.token = element.attribute("token").value();
   token.clientAddress = element.attribute("clientaddress").value();
   std::string timeout = element.attribute("expirationtimeout").value();
   auto seconds = parseSigned(trim(timeout));
-  if (!timeout.empty() && !seconds) {
-    failure = Reply::error("expirationtimeout '" + timeout + "' is not a number of seconds");
-    return std::nullopt;
-  }
+  if (!timeout.empty() && !seconds)
+    return Reply::error("expirationtimeout '" + timeout + "' is not a number of seconds");
   token.timeoutSeconds = seconds.value_or(0);
-  return token;
+  return std::nullopt;
 }
 
 Reply tokenExists(CommandContext& context) {
-  Reply failure;
-  auto account = accountFor(context, failure);
-  if (!account) return failure;
-  return Reply::boolean(context.server.tokens.get(*account).has_value());
+  std::string account;
+  if (auto failure = resolveAccount(context, account)) return *failure;
+  return Reply::boolean(context.server.tokens.get(account).has_value());
 }
 
 Reply getToken(CommandContext& context) {
-  Reply failure;
-  auto account = accountFor(context, failure);
-  if (!account) return failure;
-  std::optional<UserToken> token = context.server.tokens.get(*account);
+  std::string account;
+  if (auto failure = resolveAccount(context, account)) return *failure;
+  std::optional<UserToken> token = context.server.tokens.get(account);
   return Reply::ok(replyDocument("SEC_GET_USERTOKEN", [&](pugi::xml_node root) {
     if (!token) return;
     pugi::xml_node element = root.append_child("USERTOKEN");
@@ -80,12 +72,12 @@ Reply getToken(CommandContext& context) {
 }
 
 Reply writeToken(CommandContext& context, bool add) {
-  Reply failure;
-  auto account = accountFor(context, failure);
-  if (!account) return failure;
-  auto token = tokenFromRequest(context, *account, failure);
-  if (!token) return failure;
-  std::string error = add ? context.server.tokens.add(*token) : context.server.tokens.update(*token);
+  std::string account;
+  if (auto failure = resolveAccount(context, account)) return *failure;
+  UserToken token;
+  token.account = account;
+  if (auto failure = readToken(context, token)) return *failure;
+  std::string error = add ? context.server.tokens.add(token) : context.server.tokens.update(token);
   return error.empty() ? Reply::ok() : Reply::error(error);
 }
 
@@ -93,18 +85,16 @@ Reply addToken(CommandContext& context) { return writeToken(context, true); }
 Reply updateToken(CommandContext& context) { return writeToken(context, false); }
 
 Reply removeToken(CommandContext& context) {
-  Reply failure;
-  auto account = accountFor(context, failure);
-  if (!account) return failure;
-  return Reply::boolean(context.server.tokens.remove(*account));
+  std::string account;
+  if (auto failure = resolveAccount(context, account)) return *failure;
+  return Reply::boolean(context.server.tokens.remove(account));
 }
 
 Reply tokenExpired(CommandContext& context) {
-  Reply failure;
-  auto account = accountFor(context, failure);
-  if (!account) return failure;
-  std::optional<UserToken> token = context.server.tokens.get(*account);
-  if (!token) return Reply::error("account '" + *account + "' has no user token");
+  std::string account;
+  if (auto failure = resolveAccount(context, account)) return *failure;
+  std::optional<UserToken> token = context.server.tokens.get(account);
+  if (!token) return Reply::error("account '" + account + "' has no user token");
   return Reply::boolean(token->expired(nowSeconds()));
 }
 

@@ -58,31 +58,48 @@ void appendFileInfo(pugi::xml_node parent, const std::string& relative, const st
   path.append_attribute("abspath") = relative.c_str();
 }
 
-const SharedArea* areaFor(CommandContext& context, Reply& failure) {
-  auto name = context.required("srName", failure);
-  if (!name) return nullptr;
-  const SharedArea* area = context.server.findArea(*name);
-  if (!area) failure = Reply::error("unknown shared resource '" + *name + "'");
-  return area;
-}
-
 // Reads the "PATH" document under `valueName` and confines it to the area.
-std::optional<AreaPath> pathFor(CommandContext& context, const SharedArea& area,
-                                std::string_view valueName, Reply& failure) {
+std::optional<Reply> resolvePath(CommandContext& context, const SharedArea& area,
+                                 std::string_view valueName, AreaPath& out) {
   const std::string* value = context.request.find(valueName);
-  if (!value) {
-    failure = Reply::error("missing value \"" + std::string(valueName) + "\"");
-    return std::nullopt;
-  }
+  if (!value) return Reply::error("missing value \"" + std::string(valueName) + "\"");
   std::string clientPath;
   std::string error = pathFromDocument(*value, clientPath);
+  if (error.empty()) error = area.resolve(clientPath, out);
+  if (!error.empty()) return Reply::error(error);
+  return std::nullopt;
+}
+
+// What a shared-resource command names: always its area ("srName"), and the paths in it that
+// it works on, checked in this order.
+struct Wants {
+  bool path = false;         // "srPath"
+  bool source = false;       // "srSrcPath"
+  bool destination = false;  // "srDestPath"
+};
+
+struct Target {
+  const SharedArea* area = nullptr;
   AreaPath path;
-  if (error.empty()) error = area.resolve(clientPath, path);
-  if (!error.empty()) {
-    failure = Reply::error(error);
-    return std::nullopt;
-  }
-  return path;
+  AreaPath source;
+  AreaPath destination;
+};
+
+// The one way a handler learns what its request names: the failure reply, or nothing with
+// `target` filled.
+std::optional<Reply> resolve(CommandContext& context, const Wants& wants, Target& target) {
+  Reply failure;
+  auto name = context.required("srName", failure);
+  if (!name) return failure;
+  target.area = context.server.findArea(*name);
+  if (!target.area) return Reply::error("unknown shared resource '" + *name + "'");
+  const SharedArea& area = *target.area;
+  std::optional<Reply> refused;
+  if (wants.path) refused = resolvePath(context, area, "srPath", target.path);
+  if (!refused && wants.source) refused = resolvePath(context, area, "srSrcPath", target.source);
+  if (!refused && wants.destination)
+    refused = resolvePath(context, area, "srDestPath", target.destination);
+  return refused;
 }
 
 bool statPath(const AreaPath& path, struct stat& info) {
@@ -90,22 +107,17 @@ bool statPath(const AreaPath& path, struct stat& info) {
 }
 
 // The directory that will hold `path`; it must exist already.
-std::optional<std::string> existingParent(const SharedArea& area, const AreaPath& path,
-                                          Reply& failure) {
-  if (path.relative.empty()) {
-    failure = Reply::error("the shared resource itself cannot be replaced");
-    return std::nullopt;
-  }
+std::optional<Reply> existingParent(const SharedArea& area, const AreaPath& path,
+                                    std::string& parentDir) {
+  if (path.relative.empty()) return Reply::error("the shared resource itself cannot be replaced");
   AreaPath parent;
   std::string error = area.resolve(parentOf(path.relative), parent);
   struct stat info {};
-  if (!error.empty() || ::stat(parent.full.c_str(), &info) != 0 || !S_ISDIR(info.st_mode)) {
-    failure = Reply::error(error.empty() ? "directory '" + parentOf(path.relative) +
-                                               "' does not exist"
-                                         : error);
-    return std::nullopt;
-  }
-  return parent.full;
+  if (!error.empty() || ::stat(parent.full.c_str(), &info) != 0 || !S_ISDIR(info.st_mode))
+    return Reply::error(error.empty() ? "directory '" + parentOf(path.relative) + "' does not exist"
+                                      : error);
+  parentDir = parent.full;
+  return std::nullopt;
 }
 
 Reply listResources(CommandContext& context) {
@@ -127,82 +139,70 @@ Reply getResource(CommandContext& context) {
 }
 
 Reply exists(CommandContext& context) {
-  Reply failure;
-  const SharedArea* area = areaFor(context, failure);
-  if (!area) return failure;
-  auto path = pathFor(context, *area, "srPath", failure);
-  if (!path) return failure;
+  Target t;
+  if (auto failure = resolve(context, {.path = true}, t)) return *failure;
   struct stat info {};
-  return Reply::boolean(statPath(*path, info));
+  return Reply::boolean(statPath(t.path, info));
 }
 
 Reply getInfo(CommandContext& context) {
-  Reply failure;
-  const SharedArea* area = areaFor(context, failure);
-  if (!area) return failure;
-  auto path = pathFor(context, *area, "srPath", failure);
-  if (!path) return failure;
+  Target t;
+  if (auto failure = resolve(context, {.path = true}, t)) return *failure;
   struct stat info {};
-  if (!statPath(*path, info)) return Reply::error("'" + path->relative + "' does not exist");
+  if (!statPath(t.path, info)) return Reply::error("'" + t.path.relative + "' does not exist");
   return Reply::ok(replyDocument("SR_GET", [&](pugi::xml_node root) {
-    appendFileInfo(root, path->relative, info);
+    appendFileInfo(root, t.path.relative, info);
   }));
 }
 
 Reply list(CommandContext& context) {
-  Reply failure;
-  const SharedArea* area = areaFor(context, failure);
-  if (!area) return failure;
-  auto path = pathFor(context, *area, "srPath", failure);
-  if (!path) return failure;
+  Target t;
+  if (auto failure = resolve(context, {.path = true}, t)) return *failure;
+  const AreaPath& path = t.path;
   struct stat info {};
-  if (!statPath(*path, info)) return Reply::error("'" + path->relative + "' does not exist");
-  if (!S_ISDIR(info.st_mode)) return Reply::error("'" + path->relative + "' is not a directory");
+  if (!statPath(path, info)) return Reply::error("'" + path.relative + "' does not exist");
+  if (!S_ISDIR(info.st_mode)) return Reply::error("'" + path.relative + "' is not a directory");
   std::error_code ec;
   std::vector<std::string> names;
-  for (const auto& entry : fs::directory_iterator(path->full, ec)) {
+  for (const auto& entry : fs::directory_iterator(path.full, ec)) {
     std::string name = entry.path().filename().string();
     if (name.rfind(kTempPrefix, 0) != 0) names.push_back(name);
   }
-  if (ec) return Reply::error("cannot list '" + path->relative + "': " + ec.message());
+  if (ec) return Reply::error("cannot list '" + path.relative + "': " + ec.message());
   std::sort(names.begin(), names.end());
   return Reply::ok(replyDocument("SR_LIST", [&](pugi::xml_node root) {
     for (const auto& name : names) {
-      std::string relative = path->relative.empty() ? name : path->relative + "/" + name;
+      std::string relative = path.relative.empty() ? name : path.relative + "/" + name;
       struct stat entryInfo {};
       // Links are described by what they point to, and only when that stays in the area.
       AreaPath checked;
-      if (area->resolve(relative, checked).empty() && ::stat(checked.full.c_str(), &entryInfo) == 0)
+      if (t.area->resolve(relative, checked).empty() &&
+          ::stat(checked.full.c_str(), &entryInfo) == 0)
         appendFileInfo(root, relative, entryInfo);
     }
   }));
 }
 
 Reply makeDirectory(CommandContext& context) {
-  Reply failure;
-  const SharedArea* area = areaFor(context, failure);
-  if (!area) return failure;
-  auto path = pathFor(context, *area, "srPath", failure);
-  if (!path) return failure;
+  Target t;
+  if (auto failure = resolve(context, {.path = true}, t)) return *failure;
   std::error_code ec;
-  fs::create_directories(path->full, ec);
-  if (ec || !fs::is_directory(path->full))
-    return Reply::error("cannot make directory '" + path->relative + "'" +
+  fs::create_directories(t.path.full, ec);
+  if (ec || !fs::is_directory(t.path.full))
+    return Reply::error("cannot make directory '" + t.path.relative + "'" +
                         (ec ? ": " + ec.message() : std::string()));
   return Reply::ok();
 }
 
 Reply removePath(CommandContext& context) {
-  Reply failure;
-  const SharedArea* area = areaFor(context, failure);
-  if (!area) return failure;
-  auto path = pathFor(context, *area, "srPath", failure);
-  if (!path) return failure;
-  if (path->relative.empty()) return Reply::error("the shared resource itself cannot be deleted");
+  Target t;
+  if (auto failure = resolve(context, {.path = true}, t)) return *failure;
+  if (t.path.relative.empty())
+    return Reply::error("the shared resource itself cannot be deleted");
   std::error_code ec;
   // remove_all does not follow symbolic links: a link is removed, never what it points to.
-  std::uintmax_t removed = fs::remove_all(path->full, ec);
-  if (ec) return Reply::error("cannot delete '" + path->relative + "': " + ec.message());
+  std::uintmax_t removed = fs::remove_all(t.path.full, ec);
+  if (ec) return Reply::error("cannot delete '" + t.path.relative + "': " + ec.message());
   return Reply::boolean(removed > 0);
 }
 
@@ -222,34 +222,31 @@ Reply copyFile(const std::string& from, const std::string& to, const std::string
 }
 
 Reply copyOrMove(CommandContext& context, bool move) {
-  Reply failure;
-  const SharedArea* area = areaFor(context, failure);
-  if (!area) return failure;
-  auto source = pathFor(context, *area, "srSrcPath", failure);
-  if (!source) return failure;
-  auto destination = pathFor(context, *area, "srDestPath", failure);
-  if (!destination) return failure;
+  Target t;
+  if (auto failure = resolve(context, {.source = true, .destination = true}, t)) return *failure;
+  const AreaPath& source = t.source;
+  const AreaPath& destination = t.destination;
   struct stat info {};
-  if (!statPath(*source, info)) return Reply::error("'" + source->relative + "' does not exist");
-  if (source->relative.empty())
+  if (!statPath(source, info)) return Reply::error("'" + source.relative + "' does not exist");
+  if (source.relative.empty())
     return Reply::error("the shared resource itself cannot be copied or moved");
-  auto parent = existingParent(*area, *destination, failure);
-  if (!parent) return failure;
+  std::string parent;
+  if (auto failure = existingParent(*t.area, destination, parent)) return *failure;
   if (move) {
-    if (::rename(source->full.c_str(), destination->full.c_str()) != 0)
-      return Reply::error("cannot move '" + source->relative + "' to '" +
-                          destination->relative + "': " + std::strerror(errno));
+    if (::rename(source.full.c_str(), destination.full.c_str()) != 0)
+      return Reply::error("cannot move '" + source.relative + "' to '" + destination.relative +
+                          "': " + std::strerror(errno));
     return Reply::ok();
   }
-  if (S_ISREG(info.st_mode)) return copyFile(source->full, destination->full, *parent);
+  if (S_ISREG(info.st_mode)) return copyFile(source.full, destination.full, parent);
   std::error_code ec;
-  if (fs::exists(destination->full))
-    return Reply::error("'" + destination->relative + "' already exists");
-  fs::copy(source->full, destination->full,
+  if (fs::exists(destination.full))
+    return Reply::error("'" + destination.relative + "' already exists");
+  fs::copy(source.full, destination.full,
            fs::copy_options::recursive | fs::copy_options::copy_symlinks, ec);
   if (ec) {
-    fs::remove_all(destination->full);
-    return Reply::error("cannot copy '" + source->relative + "': " + ec.message());
+    fs::remove_all(destination.full);
+    return Reply::error("cannot copy '" + source.relative + "': " + ec.message());
   }
   return Reply::ok();
 }
@@ -258,38 +255,32 @@ Reply copy(CommandContext& context) { return copyOrMove(context, false); }
 Reply move(CommandContext& context) { return copyOrMove(context, true); }
 
 Reply upload(CommandContext& context) {
-  Reply failure;
-  const SharedArea* area = areaFor(context, failure);
-  if (!area) return failure;
-  auto destination = pathFor(context, *area, "srDestPath", failure);
-  if (!destination) return failure;
-  auto parent = existingParent(*area, *destination, failure);
-  if (!parent) return failure;
+  Target t;
+  if (auto failure = resolve(context, {.destination = true}, t)) return *failure;
+  std::string parent;
+  if (auto failure = existingParent(*t.area, t.destination, parent)) return *failure;
   struct stat info {};
-  if (statPath(*destination, info) && S_ISDIR(info.st_mode))
-    return Reply::error("'" + destination->relative + "' is a directory");
+  if (statPath(t.destination, info) && S_ISDIR(info.st_mode))
+    return Reply::error("'" + t.destination.relative + "' is a directory");
   bool checkCrc = context.request.get("itemFileCRCCheckingEnabled") == "true";
   UploadResult result =
-      receiveUpload(context.io, *parent, checkCrc, context.server.config.maxFileBytes);
+      receiveUpload(context.io, parent, checkCrc, context.server.config.maxFileBytes);
   if (result.outcome == TransferOutcome::Lost) return Reply::close();
   if (result.outcome == TransferOutcome::Refused) return Reply::error(result.message);
-  std::string error = result.file.commit(destination->full);
+  std::string error = result.file.commit(t.destination.full);
   return error.empty() ? Reply::ok() : Reply::error(error);
 }
 
 Reply download(CommandContext& context) {
-  Reply failure;
-  const SharedArea* area = areaFor(context, failure);
-  if (!area) return failure;
-  auto source = pathFor(context, *area, "srSrcPath", failure);
-  if (!source) return failure;
-  UniqueFd fd(::open(source->full.c_str(), O_RDONLY | O_CLOEXEC));
-  if (!fd.valid()) return Reply::error("cannot open '" + source->relative + "'");
+  Target t;
+  if (auto failure = resolve(context, {.source = true}, t)) return *failure;
+  UniqueFd fd(::open(t.source.full.c_str(), O_RDONLY | O_CLOEXEC));
+  if (!fd.valid()) return Reply::error("cannot open '" + t.source.relative + "'");
   std::string message;
   TransferOutcome outcome = sendDownload(context.io, fd.get(), message);
   if (outcome == TransferOutcome::Lost) return Reply::close();
   if (outcome == TransferOutcome::Refused)
-    return Reply::error("'" + source->relative + "': " + message);
+    return Reply::error("'" + t.source.relative + "': " + message);
   return Reply::ok();
 }
 

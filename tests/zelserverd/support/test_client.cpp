@@ -10,27 +10,18 @@
 
 namespace zeltest {
 
+using namespace std::string_literals;
+
 std::string requestPayload(const std::string& keyword, const Values& values) {
-  std::string payload = "APIVERSION=1";
-  payload.push_back('\0');
-  payload += keyword;
-  payload.push_back('\0');
-  payload += "clientID=";
-  for (const auto& [name, value] : values) {
-    payload.push_back('\0');
-    payload += name + "=" + value;
-  }
+  std::string payload = "APIVERSION=1\0"s + keyword + "\0clientID=";
+  for (const auto& [name, value] : values) payload += "\0"s + name + "=" + value;
   return payload;
 }
 
 std::string frame(const std::string& payload) {
-  std::uint32_t n = static_cast<std::uint32_t>(payload.size());
-  std::string out;
-  out.push_back(static_cast<char>(n >> 24));
-  out.push_back(static_cast<char>(n >> 16));
-  out.push_back(static_cast<char>(n >> 8));
-  out.push_back(static_cast<char>(n));
-  return out + payload;
+  std::string prefix(4, '\0');
+  for (int i = 0; i < 4; ++i) prefix[i] = static_cast<char>(payload.size() >> (24 - 8 * i));
+  return prefix + payload;
 }
 
 WireReply splitReply(const std::string& payload) {
@@ -121,10 +112,13 @@ bool TestClient::closedByPeer(int timeoutMs) {
   return n == 0 || (n < 0 && errno == ECONNRESET);
 }
 
-WireReply TestClient::command(const std::string& keyword, const Values& values) {
-  if (!sendFrame(requestPayload(keyword, values))) return {};
+WireReply TestClient::readReply() {
   std::optional<std::string> reply = readFrame();
   return reply ? splitReply(*reply) : WireReply{};
+}
+
+WireReply TestClient::command(const std::string& keyword, const Values& values) {
+  return sendFrame(requestPayload(keyword, values)) ? readReply() : WireReply{};
 }
 
 WireReply TestClient::signIn(const std::string& user, const std::string& password) {
@@ -134,45 +128,32 @@ WireReply TestClient::signIn(const std::string& user, const std::string& passwor
 WireReply TestClient::upload(const std::string& keyword, const Values& values,
                              const std::string& content,
                              std::optional<std::uint32_t> announcedCrc) {
-  if (!sendFrame(requestPayload(keyword, values))) return {};
-  std::optional<std::string> ack = readFrame();
-  if (!ack) return {};
-  WireReply first = splitReply(*ack);
-  if (!(first.ok() && first.body == "ready_to_transfer")) return first;
-  std::string header = "fileLength=" + std::to_string(content.size());
-  header.push_back('\0');
-  header += "fileCRC=" + std::to_string(announcedCrc.value_or(crc32(content)));
-  if (!sendFrame(header)) return {};
-  ack = readFrame();
-  if (!ack) return {};
-  WireReply second = splitReply(*ack);
-  if (!(second.ok() && second.body == "ready_to_transfer")) return second;
-  if (!sendRaw(content)) return {};
-  std::optional<std::string> reply = readFrame();
-  return reply ? splitReply(*reply) : WireReply{};
+  auto acknowledged = [](const WireReply& reply) {
+    return reply.ok() && reply.body == "ready_to_transfer";
+  };
+  WireReply reply = command(keyword, values);
+  if (!acknowledged(reply)) return reply;
+  std::string crc = std::to_string(announcedCrc.value_or(crc32(content)));
+  if (!sendFrame("fileLength=" + std::to_string(content.size()) + "\0fileCRC="s + crc)) return {};
+  reply = readReply();
+  if (!acknowledged(reply)) return reply;
+  return sendRaw(content) ? readReply() : WireReply{};
 }
 
 Download TestClient::download(const std::string& keyword, const Values& values) {
   Download result;
-  if (!sendFrame(requestPayload(keyword, values))) return result;
-  std::optional<std::string> header = readFrame();
-  if (!header) return result;
-  WireReply parts = splitReply(*header);
-  if (parts.status.rfind("fileLength=", 0) != 0 || parts.body.rfind("fileCRC=", 0) != 0) {
-    result.reply = parts;
+  result.reply = command(keyword, values);
+  const WireReply header = result.reply;
+  if (header.status.rfind("fileLength=", 0) != 0 || header.body.rfind("fileCRC=", 0) != 0)
     return result;
-  }
-  std::size_t length = std::stoul(parts.status.substr(11));
-  std::string ack = "SUCCESS";
-  ack.push_back('\0');
-  ack += "ready_to_transfer";
+  result.reply = {};
+  std::size_t length = std::stoul(header.status.substr(11));
+  const std::string ack = "SUCCESS\0ready_to_transfer"s;
   if (!sendFrame(ack)) return result;
   result.content.assign(length, '\0');
   if (length > 0 && !recvExact(result.content.data(), length, 5000)) return result;
-  result.gotFile = crc32(result.content) == std::stoul(parts.body.substr(8));
-  if (!sendFrame(ack)) return result;
-  std::optional<std::string> reply = readFrame();
-  if (reply) result.reply = splitReply(*reply);
+  result.gotFile = crc32(result.content) == std::stoul(header.body.substr(8));
+  if (sendFrame(ack)) result.reply = readReply();
   return result;
 }
 

@@ -55,6 +55,7 @@ class TestClient {
   Download download(const std::string& keyword, const Values& values);
 
  private:
+  WireReply readReply();
   bool waitReadable(int timeoutMs);
   bool recvExact(char* data, std::size_t size, int timeoutMs);
 
