@@ -21,12 +21,10 @@ cmake --preset default > /dev/null
 cmake --build --preset default
 
 work="$(mktemp -d /tmp/zel-demo-XXXXXX)"
-server_pid=""
+# shellcheck source=lib/zelserverd.sh
+source "$root/scripts/lib/zelserverd.sh"
 cleanup() {
-  if [ -n "$server_pid" ] && kill -0 "$server_pid" 2>/dev/null; then
-    kill -TERM "$server_pid" 2>/dev/null || true
-    wait "$server_pid" 2>/dev/null || true
-  fi
+  stop_zelserverd
   rm -rf "$work"
 }
 trap cleanup EXIT
@@ -46,20 +44,8 @@ roles = admin
 path = shared
 description = Files for the demo
 CONF
-"$bin/zelserverd" --data "$work/data" --listen 127.0.0.1:0 --config "$work/zelserverd.conf" \
-  > "$work/stdout" 2> "$work/server.log" &
-server_pid=$!
-# The server prints one line once it accepts connections; with port 0 that line names the port.
-line=""
-for _ in $(seq 150); do
-  line="$(head -n 1 "$work/stdout")"
-  [ -n "$line" ] || ! kill -0 "$server_pid" 2>/dev/null && break
-  sleep 0.1
-done
-case "$line" in
-  "listening on "*) port="${line##*:}" ;;
-  *) echo "zelserverd did not start:" >&2; cat "$work/server.log" >&2; exit 1 ;;
-esac
+start_zelserverd "$bin/zelserverd" "$work"
+line="$(head -n 1 "$work/stdout")"
 echo "$line (data in $work/data, user demo with a random password)"
 
 step "Who am I?"

@@ -19,29 +19,16 @@ if [ ! -x "$server" ]; then
 fi
 
 work="$(mktemp -d /tmp/zel-cross-XXXXXX)"
-server_pid=""
+# shellcheck source=../../scripts/lib/zelserverd.sh
+source "$(dirname "$0")/../../scripts/lib/zelserverd.sh"
 cleanup() {
-  [ -z "$server_pid" ] || kill -TERM "$server_pid" 2>/dev/null || true
-  [ -z "$server_pid" ] || wait "$server_pid" 2>/dev/null || true
+  stop_zelserverd
   rm -rf "$work"
 }
 trap cleanup EXIT
 
 printf '[user ann]\npassword = pw-ann\nroles = admin\n' > "$work/zelserverd.conf"
-"$server" --data "$work/data" --listen 127.0.0.1:0 --config "$work/zelserverd.conf" \
-  > "$work/stdout" 2> "$work/server.log" &
-server_pid=$!
-line=""
-for _ in $(seq 100); do
-  line="$(head -n 1 "$work/stdout")"
-  [ -n "$line" ] && break
-  kill -0 "$server_pid" 2>/dev/null || break
-  sleep 0.1
-done
-case "$line" in
-  "listening on 127.0.0.1:"*) port="${line##*:}" ;;
-  *) echo "zelserverd did not start:" >&2; cat "$work/server.log" >&2; exit 1 ;;
-esac
+start_zelserverd "$server" "$work"
 
 cp "$workspace" "$work/greeting.zlw"
 windows_path() { winepath -w "$1" 2>/dev/null; }
