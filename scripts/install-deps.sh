@@ -6,7 +6,7 @@
 set -euo pipefail
 
 packages=(
-  g++ cmake ninja-build pkg-config binutils
+  g++ cmake ninja-build pkg-config binutils clang-format-16
   libxerces-c-dev
   libgtest-dev libgmock-dev libbenchmark-dev
   libpugixml-dev libsqlite3-dev

@@ -33,6 +33,8 @@ run_windows() {
   return $status
 }
 
+bash scripts/check-format.sh
+
 for preset in "${presets[@]}"; do
   echo "== preset $preset"
   if [ "$preset" = windows ]; then

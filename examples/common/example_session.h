@@ -43,8 +43,8 @@ public:
             return false;
         }
         String hostText(*this, host), userText(*this, user), passwordText(*this, password);
-        info_ = session_->createConnectionInfo(*hostText, static_cast<unsigned short>(number), *userText,
-                                               *passwordText);
+        info_ =
+            session_->createConnectionInfo(*hostText, static_cast<unsigned short>(number), *userText, *passwordText);
         return succeeded(session_->init(*info_, nullptr));
     }
 

@@ -5,7 +5,9 @@
 #include "IZELServerString.h"
 #include "IZELServerStringArray.h"
 
-namespace xercesc_3_2 { class DOMElement; }
+namespace xercesc_3_2 {
+class DOMElement;
+}
 
 class IZELServerIdentity {
 public:

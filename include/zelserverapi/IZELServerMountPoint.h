@@ -18,7 +18,9 @@
 #include "IZELServerString.h"
 #include "IZELServerVector.h"
 
-namespace xercesc_3_2 { class DOMElement; }
+namespace xercesc_3_2 {
+class DOMElement;
+}
 
 class IZELServerMountPoint {
 public:
@@ -36,11 +38,13 @@ public:
     // like after any completed exchange. 393624 when the temporary file cannot be made (with the target, or the folder
     // for an empty target), before anything is sent, or when it cannot be moved onto the target.
     // `listener` (owned by the caller, may be null) follows the transfer.
-    virtual IZELServerStatus* download(const IZELServerPath& source, const IZELServerString& localTarget, unsigned& received, IZELServerProgressListener* listener) = 0;
+    virtual IZELServerStatus* download(const IZELServerPath& source, const IZELServerString& localTarget,
+                                       unsigned& received, IZELServerProgressListener* listener) = 0;
     // Uploads the local file `localSource` to `destination`. 393617 ("src", the path) when the local
     // file cannot be opened and read (a missing file, a folder); nothing is sent then. `listener`
     // (owned by the caller, may be null) follows the transfer.
-    virtual IZELServerStatus* upload(const IZELServerString& localSource, const IZELServerPath& destination, IZELServerProgressListener* listener) = 0;
+    virtual IZELServerStatus* upload(const IZELServerString& localSource, const IZELServerPath& destination,
+                                     IZELServerProgressListener* listener) = 0;
     virtual IZELServerStatus* copy(const IZELServerPath& source, const IZELServerPath& destination) = 0;
     virtual IZELServerStatus* move(const IZELServerPath& source, const IZELServerPath& destination) = 0;
 
@@ -53,7 +57,8 @@ public:
     // order. With `depth` 0 that is all: one listing. With a larger depth each directory entry is
     // followed by its own entries, listed the same way with depth - 1. When a deeper listing fails,
     // its status is returned and the entries gathered so far stay in `entries`.
-    virtual IZELServerStatus* list(const IZELServerPath& path, unsigned depth, IZELServerVector<IZELServerFileInfo>& entries) = 0;
+    virtual IZELServerStatus* list(const IZELServerPath& path, unsigned depth,
+                                   IZELServerVector<IZELServerFileInfo>& entries) = 0;
     // As list with depth 0.
     virtual IZELServerStatus* list(const IZELServerPath& path, IZELServerVector<IZELServerFileInfo>& entries) = 0;
     virtual IZELServerStatus* makeDirectory(const IZELServerPath& path) = 0;

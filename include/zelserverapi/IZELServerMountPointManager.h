@@ -20,7 +20,8 @@ public:
     // Fills `mountPoint` with the named shared resource. `found` is set to 0 first and to 1 when the
     // server described the resource; a reply that describes none is no failure. A reply that is no
     // XML document gives the parser's status.
-    virtual IZELServerStatus* getSharedResource(const IZELServerString& name, IZELServerMountPoint& mountPoint, unsigned& found) = 0;
+    virtual IZELServerStatus* getSharedResource(const IZELServerString& name, IZELServerMountPoint& mountPoint,
+                                                unsigned& found) = 0;
     virtual ~IZELServerMountPointManager() = default;
 
 protected:

@@ -21,19 +21,23 @@ public:
     virtual bool getPropertyPairs(const IZELServerString& category, IZELServerStringArray& pairs) const = 0;
     // Empties `value`, then writes the property's value into it. False, `value` left empty, when the
     // category or the name is missing.
-    virtual bool getPropertyValue(const IZELServerString& category, const IZELServerString& name, IZELServerString& value) const = 0;
+    virtual bool getPropertyValue(const IZELServerString& category, const IZELServerString& name,
+                                  IZELServerString& value) const = 0;
     // Adds the property (and its category when that is missing), or changes the value of an existing
     // one, keeping its attributes.
-    virtual void setProperty(const IZELServerString& category, const IZELServerString& name, const IZELServerString& value) = 0;
+    virtual void setProperty(const IZELServerString& category, const IZELServerString& name,
+                             const IZELServerString& value) = 0;
     // True when the category existed and was removed with all its properties.
     virtual bool removeCategory(const IZELServerString& category) = 0;
     // True when the property existed and was removed.
     virtual bool removeProperty(const IZELServerString& category, const IZELServerString& name) = 0;
     // Appends a copy of every property of one category; the copies belong to the vector.
-    virtual void getProperties(const IZELServerString& category, IZELServerVector<IZELServerProperty>& properties) const = 0;
+    virtual void getProperties(const IZELServerString& category,
+                               IZELServerVector<IZELServerProperty>& properties) const = 0;
     // The property itself, owned by this accessor and valid until the accessor changes; null when the
     // category or the name is missing.
-    virtual const IZELServerProperty* getProperty(const IZELServerString& category, const IZELServerString& name) const = 0;
+    virtual const IZELServerProperty* getProperty(const IZELServerString& category,
+                                                  const IZELServerString& name) const = 0;
     virtual ~IZELServerPropertyAccessor() = default;
 
 protected:

@@ -48,52 +48,87 @@ public:
     // Downloads the item into `destinationPath`, through a temporary file: a failed or empty download
     // never replaces an existing destination. 393624 names the temporary file when that cannot be
     // made; 393638 (the item name) when the server sent zero bytes. `received` is the server's answer.
-    virtual IZELServerStatus* getItem(const IZELServerString& itemName, const IZELServerString& destinationPath, unsigned& received, IZELServerProgressListener* listener) = 0;
-    virtual IZELServerStatus* getItem(const IZELServerString& itemName, const IZELServerString& destinationPath, unsigned& received) = 0;
+    virtual IZELServerStatus* getItem(const IZELServerString& itemName, const IZELServerString& destinationPath,
+                                      unsigned& received, IZELServerProgressListener* listener) = 0;
+    virtual IZELServerStatus* getItem(const IZELServerString& itemName, const IZELServerString& destinationPath,
+                                      unsigned& received) = 0;
     // Uploads a new item from the local file `sourcePath`.
-    virtual IZELServerStatus* addItem(const IZELServerString& itemName, const IZELServerString& sourcePath, IZELServerProgressListener* listener) = 0;
+    virtual IZELServerStatus* addItem(const IZELServerString& itemName, const IZELServerString& sourcePath,
+                                      IZELServerProgressListener* listener) = 0;
     virtual IZELServerStatus* addItem(const IZELServerString& itemName, const IZELServerString& sourcePath) = 0;
     // Replaces an item's contents from the local file `sourcePath`.
-    virtual IZELServerStatus* updateItem(const IZELServerString& itemName, const IZELServerString& sourcePath, IZELServerProgressListener* listener) = 0;
+    virtual IZELServerStatus* updateItem(const IZELServerString& itemName, const IZELServerString& sourcePath,
+                                         IZELServerProgressListener* listener) = 0;
     virtual IZELServerStatus* updateItem(const IZELServerString& itemName, const IZELServerString& sourcePath) = 0;
     virtual IZELServerStatus* removeItem(const IZELServerString& itemName, unsigned& removed) = 0;
 
-    virtual IZELServerStatus* itemResourceExists(const IZELServerString& itemName, const IZELServerString& resourceName, unsigned& exists) = 0;
+    virtual IZELServerStatus* itemResourceExists(const IZELServerString& itemName, const IZELServerString& resourceName,
+                                                 unsigned& exists) = 0;
     // Downloads the resource straight into `destinationPath` (replacing it); `received` is the
     // server's answer.
-    virtual IZELServerStatus* getItemResource(const IZELServerString& itemName, const IZELServerString& resourceName, const IZELServerString& destinationPath, unsigned& received, IZELServerProgressListener* listener) = 0;
+    virtual IZELServerStatus* getItemResource(const IZELServerString& itemName, const IZELServerString& resourceName,
+                                              const IZELServerString& destinationPath, unsigned& received,
+                                              IZELServerProgressListener* listener) = 0;
     // Describes one resource of the item.
-    virtual IZELServerStatus* getItemResourceView(const IZELServerString& itemName, const IZELServerString& resourceName, IZELServerResource& resource, unsigned& found) = 0;
-    virtual IZELServerStatus* getItemResource(const IZELServerString& itemName, const IZELServerString& resourceName, const IZELServerString& destinationPath, unsigned& received) = 0;
-    virtual IZELServerStatus* addItemResource(const IZELServerString& itemName, const IZELServerString& resourceName, const IZELServerString& sourcePath, IZELServerProgressListener* listener) = 0;
-    virtual IZELServerStatus* addItemResource(const IZELServerString& itemName, const IZELServerString& resourceName, const IZELServerString& sourcePath) = 0;
-    virtual IZELServerStatus* updateItemResource(const IZELServerString& itemName, const IZELServerString& resourceName, const IZELServerString& sourcePath, IZELServerProgressListener* listener) = 0;
-    virtual IZELServerStatus* updateItemResource(const IZELServerString& itemName, const IZELServerString& resourceName, const IZELServerString& sourcePath) = 0;
-    virtual IZELServerStatus* removeItemResource(const IZELServerString& itemName, const IZELServerString& resourceName, unsigned& removed) = 0;
+    virtual IZELServerStatus* getItemResourceView(const IZELServerString& itemName,
+                                                  const IZELServerString& resourceName, IZELServerResource& resource,
+                                                  unsigned& found) = 0;
+    virtual IZELServerStatus* getItemResource(const IZELServerString& itemName, const IZELServerString& resourceName,
+                                              const IZELServerString& destinationPath, unsigned& received) = 0;
+    virtual IZELServerStatus* addItemResource(const IZELServerString& itemName, const IZELServerString& resourceName,
+                                              const IZELServerString& sourcePath,
+                                              IZELServerProgressListener* listener) = 0;
+    virtual IZELServerStatus* addItemResource(const IZELServerString& itemName, const IZELServerString& resourceName,
+                                              const IZELServerString& sourcePath) = 0;
+    virtual IZELServerStatus* updateItemResource(const IZELServerString& itemName, const IZELServerString& resourceName,
+                                                 const IZELServerString& sourcePath,
+                                                 IZELServerProgressListener* listener) = 0;
+    virtual IZELServerStatus* updateItemResource(const IZELServerString& itemName, const IZELServerString& resourceName,
+                                                 const IZELServerString& sourcePath) = 0;
+    virtual IZELServerStatus* removeItemResource(const IZELServerString& itemName, const IZELServerString& resourceName,
+                                                 unsigned& removed) = 0;
 
     // Filtered by "ENABLE_FILTER"; directives without one of its three values give 393619.
-    virtual IZELServerStatus* getWorkspaceSummariesView(const ZELServerStringDict* directives, IZELServerVector<IZELServerWorkspaceSummary>& summaries) = 0;
-    virtual IZELServerStatus* getWorkspacesView(const ZELServerStringDict* directives, IZELServerVector<IZELServerWorkspace>& workspaces) = 0;
-    virtual IZELServerStatus* getWorkspaceView(const IZELServerString& workspaceName, IZELServerWorkspace& workspace, unsigned& found) = 0;
+    virtual IZELServerStatus* getWorkspaceSummariesView(const ZELServerStringDict* directives,
+                                                        IZELServerVector<IZELServerWorkspaceSummary>& summaries) = 0;
+    virtual IZELServerStatus* getWorkspacesView(const ZELServerStringDict* directives,
+                                                IZELServerVector<IZELServerWorkspace>& workspaces) = 0;
+    virtual IZELServerStatus* getWorkspaceView(const IZELServerString& workspaceName, IZELServerWorkspace& workspace,
+                                               unsigned& found) = 0;
     // `directives` is not read: all custom formats are listed.
-    virtual IZELServerStatus* getCustomFormatsView(const ZELServerStringDict* directives, IZELServerVector<IZELServerCustomFormat>& customFormats) = 0;
-    virtual IZELServerStatus* getCustomFormatView(const IZELServerString& customFormatName, IZELServerCustomFormat& customFormat, unsigned& found) = 0;
+    virtual IZELServerStatus* getCustomFormatsView(const ZELServerStringDict* directives,
+                                                   IZELServerVector<IZELServerCustomFormat>& customFormats) = 0;
+    virtual IZELServerStatus* getCustomFormatView(const IZELServerString& customFormatName,
+                                                  IZELServerCustomFormat& customFormat, unsigned& found) = 0;
     // `directives` is not read: all custom transformers are listed.
-    virtual IZELServerStatus* getCustomTransformersView(const ZELServerStringDict* directives, IZELServerVector<IZELServerCustomTransformer>& customTransformers) = 0;
-    virtual IZELServerStatus* getCustomTransformerView(const IZELServerString& customTransformerName, IZELServerCustomTransformer& customTransformer, unsigned& found) = 0;
+    virtual IZELServerStatus*
+    getCustomTransformersView(const ZELServerStringDict* directives,
+                              IZELServerVector<IZELServerCustomTransformer>& customTransformers) = 0;
+    virtual IZELServerStatus* getCustomTransformerView(const IZELServerString& customTransformerName,
+                                                       IZELServerCustomTransformer& customTransformer,
+                                                       unsigned& found) = 0;
     // `directives` is not read: all resources of the item are listed.
-    virtual IZELServerStatus* getItemResourcesView(const IZELServerString& itemName, const ZELServerStringDict* directives, IZELServerVector<IZELServerResource>& resources) = 0;
+    virtual IZELServerStatus* getItemResourcesView(const IZELServerString& itemName,
+                                                   const ZELServerStringDict* directives,
+                                                   IZELServerVector<IZELServerResource>& resources) = 0;
 
     // The registrations of workspaces with services. A missing "ENABLE_FILTER" means all, an unknown
     // value gives 393619; "WORKSPACE_NAME" limits the list to that workspace.
-    virtual IZELServerStatus* getWorkspaceServices(const ZELServerStringDict* directives, IZELServerVector<IZELServerWorkspaceService>& workspaceServices) = 0;
-    virtual IZELServerStatus* workspaceServiceExists(const IZELServerString& workspaceName, const IZELServerString& serviceName, unsigned& exists) = 0;
-    virtual IZELServerStatus* registerWorkspaceService(const IZELServerString& workspaceName, const IZELServerString& serviceName) = 0;
-    virtual IZELServerStatus* deregisterWorkspaceService(const IZELServerString& workspaceName, const IZELServerString& serviceName, unsigned& deregistered) = 0;
+    virtual IZELServerStatus* getWorkspaceServices(const ZELServerStringDict* directives,
+                                                   IZELServerVector<IZELServerWorkspaceService>& workspaceServices) = 0;
+    virtual IZELServerStatus* workspaceServiceExists(const IZELServerString& workspaceName,
+                                                     const IZELServerString& serviceName, unsigned& exists) = 0;
+    virtual IZELServerStatus* registerWorkspaceService(const IZELServerString& workspaceName,
+                                                       const IZELServerString& serviceName) = 0;
+    virtual IZELServerStatus* deregisterWorkspaceService(const IZELServerString& workspaceName,
+                                                         const IZELServerString& serviceName,
+                                                         unsigned& deregistered) = 0;
 
     // `directives` is not read: all templates are listed.
-    virtual IZELServerStatus* getTemplatesView(const ZELServerStringDict* directives, IZELServerVector<IZELServerTemplate>& templates) = 0;
-    virtual IZELServerStatus* getTemplateView(const IZELServerString& templateName, IZELServerTemplate& templ, unsigned& found) = 0;
+    virtual IZELServerStatus* getTemplatesView(const ZELServerStringDict* directives,
+                                               IZELServerVector<IZELServerTemplate>& templates) = 0;
+    virtual IZELServerStatus* getTemplateView(const IZELServerString& templateName, IZELServerTemplate& templ,
+                                              unsigned& found) = 0;
 
     virtual ~IZELServerRepository() = default;
 

@@ -24,9 +24,11 @@ public:
     virtual IZELServerStatus* serviceExists(const IZELServerString& serviceName, unsigned& exists) = 0;
     // Null directives list all services; otherwise "ENABLE_FILTER" must be "ALL", "ENABLED" or
     // "DISABLED" (exact), else 393619.
-    virtual IZELServerStatus* getServices(const ZELServerStringDict* directives, IZELServerVector<IZELServerService>& services) = 0;
+    virtual IZELServerStatus* getServices(const ZELServerStringDict* directives,
+                                          IZELServerVector<IZELServerService>& services) = 0;
     // `found` is 1 when the server described the service.
-    virtual IZELServerStatus* getService(const IZELServerString& serviceName, IZELServerService& service, unsigned& found) = 0;
+    virtual IZELServerStatus* getService(const IZELServerString& serviceName, IZELServerService& service,
+                                         unsigned& found) = 0;
     virtual IZELServerStatus* addService(const IZELServerService& service) = 0;
     // Sends the service's settings as an update of that service on the server.
     virtual IZELServerStatus* updateService(const IZELServerService& service) = 0;
@@ -35,16 +37,20 @@ public:
     // Checks only that the name is not empty.
     virtual IZELServerStatus* repositoryExists(const IZELServerString& repositoryName, unsigned& exists) = 0;
     // Lists every repository. `directives` must be null (393619 otherwise).
-    virtual IZELServerStatus* getRepositories(const ZELServerStringDict* directives, IZELServerVector<IZELServerRepository>& repositories) = 0;
+    virtual IZELServerStatus* getRepositories(const ZELServerStringDict* directives,
+                                              IZELServerVector<IZELServerRepository>& repositories) = 0;
     // `found` is 1 when the server described the repository.
-    virtual IZELServerStatus* getRepository(const IZELServerString& repositoryName, IZELServerRepository& repository, unsigned& found) = 0;
-    virtual IZELServerStatus* addRepository(const IZELServerString& repositoryName, const IZELServerString& description) = 0;
+    virtual IZELServerStatus* getRepository(const IZELServerString& repositoryName, IZELServerRepository& repository,
+                                            unsigned& found) = 0;
+    virtual IZELServerStatus* addRepository(const IZELServerString& repositoryName,
+                                            const IZELServerString& description) = 0;
     virtual IZELServerStatus* removeRepository(const IZELServerString& repositoryName, unsigned& removed) = 0;
 
     // Runs the global query that `directives` selects and fills `items` from the answer. Only "GLOBAL"
     // = "ALLITEMS" (exact) selects a query; null or other directives return null and do nothing. 393621
     // when the answer holds no document, or the XML parser's status when it does not parse.
-    virtual IZELServerStatus* getGlobalItems(const ZELServerStringDict* directives, IZELServerPropertyAccessor& items) = 0;
+    virtual IZELServerStatus* getGlobalItems(const ZELServerStringDict* directives,
+                                             IZELServerPropertyAccessor& items) = 0;
 
     virtual ~IZELServerRepositoryManager() = default;
 

@@ -17,7 +17,8 @@ public:
     virtual IZELServerStatus* userTokenExists(const IZELServerString& accountName, bool& exists) = 0;
 
     // A new token with empty dates; null when memory is exhausted. Destroy it with destroyUserToken.
-    virtual IZELServerUserToken* createUserToken(const IZELServerString& token, const IZELServerString& clientAddress, long long expirationTimeout) = 0;
+    virtual IZELServerUserToken* createUserToken(const IZELServerString& token, const IZELServerString& clientAddress,
+                                                 long long expirationTimeout) = 0;
     // A new empty token (timeout 0); null when memory is exhausted.
     virtual IZELServerUserToken* createUserToken() = 0;
     // Destroys the token when `*token` is not null; always stores null.
@@ -25,9 +26,11 @@ public:
 
     // Fills `token` from the server's answer; `found` is false, and `token` untouched, when the answer
     // holds no token (which is no failure).
-    virtual IZELServerStatus* getUserToken(const IZELServerString& accountName, IZELServerUserToken& token, bool& found) = 0;
+    virtual IZELServerStatus* getUserToken(const IZELServerString& accountName, IZELServerUserToken& token,
+                                           bool& found) = 0;
     virtual IZELServerStatus* addUserToken(const IZELServerString& accountName, const IZELServerUserToken& token) = 0;
-    virtual IZELServerStatus* updateUserToken(const IZELServerString& accountName, const IZELServerUserToken& token) = 0;
+    virtual IZELServerStatus* updateUserToken(const IZELServerString& accountName,
+                                              const IZELServerUserToken& token) = 0;
     // `removed` is the server's answer.
     virtual IZELServerStatus* removeUserToken(const IZELServerString& accountName, bool& removed) = 0;
     virtual IZELServerStatus* userTokenExpired(const IZELServerString& accountName, bool& expired) = 0;

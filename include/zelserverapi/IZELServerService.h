@@ -46,16 +46,20 @@ public:
     virtual void setRegistrationAllowed(unsigned itemType, unsigned allowed) = 0;
 
     // Whether the item is registered with this service (the server's answer).
-    virtual IZELServerStatus* itemRegistered(const IZELServerString& repositoryName, const IZELServerString& itemName, unsigned& registered) = 0;
+    virtual IZELServerStatus* itemRegistered(const IZELServerString& repositoryName, const IZELServerString& itemName,
+                                             unsigned& registered) = 0;
     // Registers the item. Checked locally first, with nothing sent: 393619 for an empty item name,
     // 393635 when this service does not take the item's type (a name with none of the four endings
     // is always refused).
-    virtual IZELServerStatus* registerItem(const IZELServerString& repositoryName, const IZELServerString& itemName) = 0;
+    virtual IZELServerStatus* registerItem(const IZELServerString& repositoryName,
+                                           const IZELServerString& itemName) = 0;
     // `deregistered` is the server's answer.
-    virtual IZELServerStatus* deregisterItem(const IZELServerString& repositoryName, const IZELServerString& itemName, unsigned& deregistered) = 0;
+    virtual IZELServerStatus* deregisterItem(const IZELServerString& repositoryName, const IZELServerString& itemName,
+                                             unsigned& deregistered) = 0;
     // Appends the items registered with this service to `items` (cleared first). `directives` may be
     // null; its key "ITEM_TYPE", when present, asks the server for items of that type only.
-    virtual IZELServerStatus* getRegisteredItems(const ZELServerStringDict* directives, IZELServerVector<IZELServerItem>& items) = 0;
+    virtual IZELServerStatus* getRegisteredItems(const ZELServerStringDict* directives,
+                                                 IZELServerVector<IZELServerItem>& items) = 0;
 
     virtual ~IZELServerService() = default;
 

@@ -45,14 +45,21 @@ public:
     // Returns null when signed in; 393639 for a web-address connection (the session stays empty);
     // otherwise the connection's status (393601 cannot connect, 393631 sign-in refused, ...), and then
     // only the connection is kept (disconnect and getIdentity work), no managers.
-    virtual IZELServerStatus* init(const IZELServerConnectionInfo& info, const IZELServerStringArray* handshakeOptions) = 0;
+    virtual IZELServerStatus* init(const IZELServerConnectionInfo& info,
+                                   const IZELServerStringArray* handshakeOptions) = 0;
 
     // Connection information: by web address (kind 1, which this session refuses at init) or by host
     // and port (kind 0); with a flat pair list of properties, or with a user name and password.
-    virtual IZELServerConnectionInfo* createConnectionInfo(const IZELServerString& address, const IZELServerStringArray& properties) = 0;
-    virtual IZELServerConnectionInfo* createConnectionInfo(const IZELServerString& address, const IZELServerString& userName, const IZELServerString& password) = 0;
-    virtual IZELServerConnectionInfo* createConnectionInfo(const IZELServerString& host, unsigned short port, const IZELServerStringArray& properties) = 0;
-    virtual IZELServerConnectionInfo* createConnectionInfo(const IZELServerString& host, unsigned short port, const IZELServerString& userName, const IZELServerString& password) = 0;
+    virtual IZELServerConnectionInfo* createConnectionInfo(const IZELServerString& address,
+                                                           const IZELServerStringArray& properties) = 0;
+    virtual IZELServerConnectionInfo* createConnectionInfo(const IZELServerString& address,
+                                                           const IZELServerString& userName,
+                                                           const IZELServerString& password) = 0;
+    virtual IZELServerConnectionInfo* createConnectionInfo(const IZELServerString& host, unsigned short port,
+                                                           const IZELServerStringArray& properties) = 0;
+    virtual IZELServerConnectionInfo* createConnectionInfo(const IZELServerString& host, unsigned short port,
+                                                           const IZELServerString& userName,
+                                                           const IZELServerString& password) = 0;
     virtual void destroyConnectionInfo(IZELServerConnectionInfo** info) = 0;
 
     // Drops the connection and keeps every object. Null when there is no connection object at all;
@@ -70,9 +77,14 @@ public:
 
     // A job description: the service keyword, a repository and a workspace (object or item name, the
     // workspace path being repository/name-less-extension/name), or a workspace path as it stands.
-    virtual IZELServerTransformationRequest* createTransformationRequest(const IZELServerString& keyword, const IZELServerString& repository, const IZELServerWorkspace& workspace) = 0;
-    virtual IZELServerTransformationRequest* createTransformationRequest(const IZELServerString& keyword, const IZELServerString& repository, const IZELServerString& workspace) = 0;
-    virtual IZELServerTransformationRequest* createTransformationRequest(const IZELServerString& keyword, const IZELServerString& workspacePath) = 0;
+    virtual IZELServerTransformationRequest* createTransformationRequest(const IZELServerString& keyword,
+                                                                         const IZELServerString& repository,
+                                                                         const IZELServerWorkspace& workspace) = 0;
+    virtual IZELServerTransformationRequest* createTransformationRequest(const IZELServerString& keyword,
+                                                                         const IZELServerString& repository,
+                                                                         const IZELServerString& workspace) = 0;
+    virtual IZELServerTransformationRequest* createTransformationRequest(const IZELServerString& keyword,
+                                                                         const IZELServerString& workspacePath) = 0;
     virtual void destroyTransformationRequest(IZELServerTransformationRequest** request) = 0;
 
     // A job result, filled from a result text, or empty.
@@ -82,7 +94,9 @@ public:
 
     // A service bound to the connection: name, display name, description and URL pattern, enabled and
     // open to workspace registrations; or an empty one.
-    virtual IZELServerService* createService(const IZELServerString& name, const IZELServerString& displayName, const IZELServerString& description, const IZELServerString& urlPattern) = 0;
+    virtual IZELServerService* createService(const IZELServerString& name, const IZELServerString& displayName,
+                                             const IZELServerString& description,
+                                             const IZELServerString& urlPattern) = 0;
     virtual IZELServerService* createService() = 0;
     virtual void destroyService(IZELServerService** service) = 0;
     virtual IZELServerVector<IZELServerService>* createServiceVector() = 0;

@@ -27,10 +27,13 @@ class IZELServerBaseTransformationManager {
 public:
     // Runs the job and parses the server's result text into `result`; on failure `result` is not
     // touched. Also fails with 393618 when the server does not deliver the result.
-    virtual IZELServerStatus* transactJob(const IZELServerTransformationRequest& request, IZELServerTransformationResult& result) = 0;
+    virtual IZELServerStatus* transactJob(const IZELServerTransformationRequest& request,
+                                          IZELServerTransformationResult& result) = 0;
     // Runs the job without notifications and writes the result text into `resultText`, on failure too
     // (then whatever reply there was, possibly nothing).
-    virtual IZELServerStatus* transactJobString(const IZELServerString& keyword, const IZELServerString& requestText, const IZELServerStringArray& directives, IZELServerString& resultText) = 0;
+    virtual IZELServerStatus* transactJobString(const IZELServerString& keyword, const IZELServerString& requestText,
+                                                const IZELServerStringArray& directives,
+                                                IZELServerString& resultText) = 0;
     virtual ~IZELServerBaseTransformationManager() = default;
 
 protected:
@@ -42,19 +45,26 @@ protected:
 class IZELServerTransformationManager {
 public:
     // As IZELServerBaseTransformationManager.
-    virtual IZELServerStatus* transactJob(const IZELServerTransformationRequest& request, IZELServerTransformationResult& result) = 0;
-    virtual IZELServerStatus* transactJobString(const IZELServerString& keyword, const IZELServerString& requestText, const IZELServerStringArray& directives, IZELServerString& resultText) = 0;
+    virtual IZELServerStatus* transactJob(const IZELServerTransformationRequest& request,
+                                          IZELServerTransformationResult& result) = 0;
+    virtual IZELServerStatus* transactJobString(const IZELServerString& keyword, const IZELServerString& requestText,
+                                                const IZELServerStringArray& directives,
+                                                IZELServerString& resultText) = 0;
 
     // Queues the job and writes the ID the server gave it into `jobId` (left as it was when the reply
     // holds no number). The keyword is sent as given, the request text trimmed.
     virtual IZELServerStatus* submitJob(const IZELServerTransformationRequest& request, unsigned& jobId) = 0;
     // As submitJob, without notifications.
-    virtual IZELServerStatus* submitJobString(const IZELServerString& keyword, const IZELServerString& requestText, const IZELServerStringArray& directives, unsigned& jobId) = 0;
+    virtual IZELServerStatus* submitJobString(const IZELServerString& keyword, const IZELServerString& requestText,
+                                              const IZELServerStringArray& directives, unsigned& jobId) = 0;
 
     // Queues the job to start `secondsFromNow` seconds ahead: a submission whose directives hold
     // "secondsFromNow", replacing one the caller gave. The request's notifications are not sent.
-    virtual IZELServerStatus* scheduleJob(const IZELServerTransformationRequest& request, unsigned secondsFromNow, unsigned& jobId) = 0;
-    virtual IZELServerStatus* scheduleJobString(const IZELServerString& keyword, const IZELServerString& requestText, unsigned secondsFromNow, const IZELServerStringArray& directives, unsigned& jobId) = 0;
+    virtual IZELServerStatus* scheduleJob(const IZELServerTransformationRequest& request, unsigned secondsFromNow,
+                                          unsigned& jobId) = 0;
+    virtual IZELServerStatus* scheduleJobString(const IZELServerString& keyword, const IZELServerString& requestText,
+                                                unsigned secondsFromNow, const IZELServerStringArray& directives,
+                                                unsigned& jobId) = 0;
 
     virtual IZELServerStatus* abortJob(unsigned jobId) = 0;
 

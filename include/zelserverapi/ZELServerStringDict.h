@@ -19,7 +19,10 @@ public:
 
     // Sets a key; a key that is already present gets the new value.
     void insert(const std::string& key, const std::string& value) { entries_[key] = value; }
-    void insert(const char* key, const char* value) { insert(std::string(key ? key : ""), std::string(value ? value : "")); }
+    void insert(const char* key, const char* value)
+    {
+        insert(std::string(key ? key : ""), std::string(value ? value : ""));
+    }
 
     // The value of a key, or null when the key is absent. The pointer is valid until the next change.
     const std::string* find(const std::string& key) const

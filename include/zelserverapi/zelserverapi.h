@@ -22,5 +22,4 @@ ZEL_API void ZEL_destroyServerSession(IZELServerSession** session);
 // characters of `pluginName`, which may be null), and ends the process with exit code 1.
 // `sink` stays owned by the caller and must live as long as the library is loaded.
 ZEL_API ZELMemoryFailureRoutine DllSetMemoryErrorHandler(IZELLogSink* sink, const char* pluginName);
-
 }

@@ -9,7 +9,8 @@ namespace zel {
 namespace {
 
 // Only ever touched under ZELCoreScopeLock.
-StatusInfo& lastErrorRecord() {
+StatusInfo& lastErrorRecord()
+{
     static StatusInfo record;
     return record;
 }
@@ -28,11 +29,13 @@ std::atomic<DiagnosticHook> diagnosticHook{nullptr};
 
 StatusInfo::StatusInfo()
     : message_("Internal Error -- No Descriptive Message Available"),
-      stackTrace_("Internal Error -- No Stack Trace Available") {}
+      stackTrace_("Internal Error -- No Stack Trace Available")
+{}
 
 StatusInfo::StatusInfo(unsigned type, std::string message, const std::string& function, int line,
                        const std::string& sourceFile)
-    : type_(type), message_(std::move(message)), number_(-1) {
+    : type_(type), message_(std::move(message)), number_(-1)
+{
     addFrame(function, line, sourceFile);
     if (DiagnosticHook hook = diagnosticHook.load(std::memory_order_acquire)) {
         const std::string report = "BADNEWS: " + message_ + " " + stackTrace_;
@@ -40,7 +43,8 @@ StatusInfo::StatusInfo(unsigned type, std::string message, const std::string& fu
     }
 }
 
-void StatusInfo::addFrame(const std::string& function, int line, const std::string& sourceFile) {
+void StatusInfo::addFrame(const std::string& function, int line, const std::string& sourceFile)
+{
     std::string frame = function;
     if (!sourceFile.empty()) {
         frame += "(" + sourceFile + ":" + std::to_string(line) + ")";
@@ -54,12 +58,14 @@ void StatusInfo::addFrame(const std::string& function, int line, const std::stri
     lastErrorRecord() = *this;
 }
 
-StatusInfo lastStatusInfo() {
+StatusInfo lastStatusInfo()
+{
     ZELCoreScopeLock lock;
     return lastErrorRecord();
 }
 
-DiagnosticHook setDiagnosticHook(DiagnosticHook hook) {
+DiagnosticHook setDiagnosticHook(DiagnosticHook hook)
+{
     return diagnosticHook.exchange(hook, std::memory_order_acq_rel);
 }
 

@@ -31,9 +31,8 @@ StringDict::StringDict() : entries_(kInitialBuckets) {}
 
 StringDict::StringDict(const IZELServerStringArray& pairs) : StringDict()
 {
-    forEachPair(pairs, [this](std::string key, std::string value) {
-        entries_.try_emplace(std::move(key), std::move(value));
-    });
+    forEachPair(pairs,
+                [this](std::string key, std::string value) { entries_.try_emplace(std::move(key), std::move(value)); });
 }
 
 bool StringDict::insert(const std::string& key, const std::string& value)

@@ -16,7 +16,8 @@ public:
 private:
     // A function-local static is built on first use, so taking the lock during the static set-up of
     // another translation unit is safe.
-    static std::mutex& mutex() {
+    static std::mutex& mutex()
+    {
         static std::mutex processMutex;
         return processMutex;
     }

@@ -9,28 +9,29 @@ namespace zel {
 
 ZELServerStatus::ZELServerStatus(unsigned number) : number_(number) { build({}); }
 
-ZELServerStatus::ZELServerStatus(unsigned number, const std::vector<std::string>& parameters)
-    : number_(number) {
+ZELServerStatus::ZELServerStatus(unsigned number, const std::vector<std::string>& parameters) : number_(number)
+{
     build(parameters);
 }
 
-ZELServerStatus::ZELServerStatus(unsigned number, const std::string& parameter) : number_(number) {
+ZELServerStatus::ZELServerStatus(unsigned number, const std::string& parameter) : number_(number)
+{
     build({parameter});
 }
 
-ZELServerStatus::ZELServerStatus(unsigned code, unsigned number) : number_(number), code_(code) {
-    build({});
-}
+ZELServerStatus::ZELServerStatus(unsigned code, unsigned number) : number_(number), code_(code) { build({}); }
 
 ZELServerStatus::ZELServerStatus(unsigned code, unsigned number, const std::string& parameter)
-    : number_(number), code_(code) {
+    : number_(number), code_(code)
+{
     build({parameter});
 }
 
 // The token's destructor tears the process-wide database down.
 ZELServerStatus::~ZELServerStatus() = default;
 
-void ZELServerStatus::startDatabase() {
+void ZELServerStatus::startDatabase()
+{
     if (databaseStarted_) {
         return;
     }
@@ -47,7 +48,8 @@ void ZELServerStatus::startDatabase() {
     }
 }
 
-void ZELServerStatus::build(const std::vector<std::string>& parameters) {
+void ZELServerStatus::build(const std::vector<std::string>& parameters)
+{
     startDatabase();
     message_ = "Could not load resource: " + std::to_string(number_);
     // Without the library's own catalogue the status keeps the fallback text: looking further (the
@@ -57,8 +59,7 @@ void ZELServerStatus::build(const std::vector<std::string>& parameters) {
     }
     const ZELServerStringArray parameterList(parameters);
     std::string filled;
-    const std::unique_ptr<StatusInfo> failure(
-        fillInMessage(number_, &parameterList, filled, false));
+    const std::unique_ptr<StatusInfo> failure(fillInMessage(number_, &parameterList, filled, false));
     // An empty text is no message at all; the number still tells the client what happened.
     if (!failure && !filled.empty()) {
         message_ = std::move(filled);

@@ -6,10 +6,7 @@ namespace zel {
 
 ZELServerString::ZELServerString(const char* text) : text_(text ? text : "") {}
 
-ZELServerString::ZELServerString(const char* data, unsigned length)
-{
-    set(data, length);
-}
+ZELServerString::ZELServerString(const char* data, unsigned length) { set(data, length); }
 
 ZELServerString& ZELServerString::operator=(const ZELServerString& other)
 {

@@ -14,15 +14,9 @@ ZELServerStringArray& ZELServerStringArray::operator=(const ZELServerStringArray
     return *this;
 }
 
-void ZELServerStringArray::append(const IZELServerString& value)
-{
-    elements_.push_back(toStdString(value));
-}
+void ZELServerStringArray::append(const IZELServerString& value) { elements_.push_back(toStdString(value)); }
 
-void ZELServerStringArray::append(const char* value)
-{
-    elements_.emplace_back(value ? value : "");
-}
+void ZELServerStringArray::append(const char* value) { elements_.emplace_back(value ? value : ""); }
 
 const char* ZELServerStringArray::element(unsigned index) const
 {
@@ -46,15 +40,9 @@ int ZELServerStringArray::setElement(unsigned index, const IZELServerString& val
     return 0;
 }
 
-bool ZELServerStringArray::contains(const IZELServerString& value) const
-{
-    return containsBytes(toStdString(value));
-}
+bool ZELServerStringArray::contains(const IZELServerString& value) const { return containsBytes(toStdString(value)); }
 
-bool ZELServerStringArray::contains(const char* value) const
-{
-    return containsBytes(value ? value : "");
-}
+bool ZELServerStringArray::contains(const char* value) const { return containsBytes(value ? value : ""); }
 
 void ZELServerStringArray::appendTokens(const char* text, const char* delimiter)
 {
@@ -93,15 +81,9 @@ void ZELServerStringArray::appendTokensAnyOf(const char* text, const char* delim
     }
 }
 
-unsigned ZELServerStringArray::removeAll(const IZELServerString& value)
-{
-    return removeBytes(toStdString(value));
-}
+unsigned ZELServerStringArray::removeAll(const IZELServerString& value) { return removeBytes(toStdString(value)); }
 
-unsigned ZELServerStringArray::removeAll(const char* value)
-{
-    return removeBytes(value ? value : "");
-}
+unsigned ZELServerStringArray::removeAll(const char* value) { return removeBytes(value ? value : ""); }
 
 bool ZELServerStringArray::containsBytes(const std::string& value) const
 {

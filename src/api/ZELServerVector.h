@@ -53,10 +53,7 @@ public:
         }
     }
 
-    I*& element(unsigned index) override
-    {
-        return index < items_.size() ? items_[index] : vectorNullSlot<I>();
-    }
+    I*& element(unsigned index) override { return index < items_.size() ? items_[index] : vectorNullSlot<I>(); }
 
     I* removeLast() override
     {

@@ -5,10 +5,7 @@
 namespace zel {
 namespace {
 
-bool isBlank(char c)
-{
-    return c == ' ' || c == '\t' || c == '\n' || c == '\v' || c == '\f' || c == '\r';
-}
+bool isBlank(char c) { return c == ' ' || c == '\t' || c == '\n' || c == '\v' || c == '\f' || c == '\r'; }
 
 std::string_view skipBlanks(std::string_view text)
 {
@@ -27,10 +24,7 @@ std::string_view trimBlanks(std::string_view text)
     return text;
 }
 
-bool isDecimalDigit(char c)
-{
-    return c >= '0' && c <= '9';
-}
+bool isDecimalDigit(char c) { return c >= '0' && c <= '9'; }
 
 // The digit's value in `base` (10 or 16), or -1 when the character is no digit there.
 int digitValue(char c, unsigned base)
@@ -120,7 +114,8 @@ NumberReading<T> readUnsigned(std::string_view text, bool refuseMinus)
     reading.read = scan.read;
     reading.complete = scan.complete;
     // Unsigned negation wraps, as the C library's unsigned conversion does.
-    reading.value = static_cast<T>(scan.negative ? T{0} - static_cast<T>(scan.magnitude) : static_cast<T>(scan.magnitude));
+    reading.value =
+        static_cast<T>(scan.negative ? T{0} - static_cast<T>(scan.magnitude) : static_cast<T>(scan.magnitude));
     return reading;
 }
 
@@ -152,20 +147,14 @@ std::optional<bool> decimalIsNonZero(std::string_view text)
 
 }  // namespace
 
-NumberReading<std::uint32_t> readUInt32(std::string_view text)
-{
-    return readUnsigned<std::uint32_t>(text, false);
-}
+NumberReading<std::uint32_t> readUInt32(std::string_view text) { return readUnsigned<std::uint32_t>(text, false); }
 
 NumberReading<std::uint32_t> readUInt32AnyBase(std::string_view text)
 {
     return readUnsigned<std::uint32_t>(text, true);
 }
 
-NumberReading<std::uint64_t> readUInt64(std::string_view text)
-{
-    return readUnsigned<std::uint64_t>(text, false);
-}
+NumberReading<std::uint64_t> readUInt64(std::string_view text) { return readUnsigned<std::uint64_t>(text, false); }
 
 NumberReading<std::int64_t> readInt64(std::string_view text)
 {
@@ -194,9 +183,15 @@ std::optional<bool> toBoolean(std::string_view text)
         return std::nullopt;
     }
     switch (text.front()) {
-    case 'T': case 't': case 'Y': case 'y':
+    case 'T':
+    case 't':
+    case 'Y':
+    case 'y':
         return true;
-    case 'F': case 'f': case 'N': case 'n':
+    case 'F':
+    case 'f':
+    case 'N':
+    case 'n':
         return false;
     default:
         return decimalIsNonZero(text);

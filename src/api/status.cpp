@@ -6,19 +6,20 @@ namespace zel {
 
 IZELServerStatus* makeStatus(unsigned number) { return new ZELServerStatus(number); }
 
-IZELServerStatus* makeStatus(unsigned number, const std::string& parameter) {
+IZELServerStatus* makeStatus(unsigned number, const std::string& parameter)
+{
     return new ZELServerStatus(number, parameter);
 }
 
-IZELServerStatus* makeStatus(unsigned number, const std::vector<std::string>& parameters) {
+IZELServerStatus* makeStatus(unsigned number, const std::vector<std::string>& parameters)
+{
     return new ZELServerStatus(number, parameters);
 }
 
-IZELServerStatus* makeStatusWithCode(unsigned code, unsigned number) {
-    return new ZELServerStatus(code, number);
-}
+IZELServerStatus* makeStatusWithCode(unsigned code, unsigned number) { return new ZELServerStatus(code, number); }
 
-IZELServerStatus* makeStatusWithCode(unsigned code, unsigned number, const std::string& parameter) {
+IZELServerStatus* makeStatusWithCode(unsigned code, unsigned number, const std::string& parameter)
+{
     return new ZELServerStatus(code, number, parameter);
 }
 

@@ -18,7 +18,11 @@ std::size_t decodeOne(std::string_view text, std::size_t pos, std::uint32_t& cod
         return 1;
     }
     // Lead byte pattern, payload bits of the lead, sequence length, smallest code point it may carry.
-    struct Form { unsigned char mask, pattern, payload; std::size_t length; std::uint32_t minimum; };
+    struct Form {
+        unsigned char mask, pattern, payload;
+        std::size_t length;
+        std::uint32_t minimum;
+    };
     static constexpr Form kForms[] = {
         {0xE0, 0xC0, 0x1F, 2, 0x80}, {0xF0, 0xE0, 0x0F, 3, 0x800}, {0xF8, 0xF0, 0x07, 4, 0x10000}};
     const Form* form = nullptr;

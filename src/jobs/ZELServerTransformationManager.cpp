@@ -38,10 +38,7 @@ std::string trimSpaces(const std::string& text)
     return text.substr(first, text.find_last_not_of(' ') - first + 1);
 }
 
-bool unusable(const std::string& trimmed)
-{
-    return trimmed.empty() || trimmed.find('\0') != std::string::npos;
-}
+bool unusable(const std::string& trimmed) { return trimmed.empty() || trimmed.find('\0') != std::string::npos; }
 
 // Checks keyword and request text before anything is sent. `keywordParameter` is the name the
 // failure reports for the keyword: the submit and transact paths have always named it differently.
@@ -62,10 +59,7 @@ IZELServerStatus* checkJobInput(const IZELServerString& keyword, const IZELServe
 }
 
 // The server reads job IDs as signed 32-bit numbers, so the top half of the range goes out negative.
-std::string jobIdText(unsigned jobId)
-{
-    return formatSigned(static_cast<std::int32_t>(jobId));
-}
+std::string jobIdText(unsigned jobId) { return formatSigned(static_cast<std::int32_t>(jobId)); }
 
 std::string elementBytes(const IZELServerStringArray& list, unsigned index)
 {
@@ -94,10 +88,7 @@ struct RequestParts {
 
 // ---- Base: transact -------------------------------------------------------------------------------
 
-ZELServerBaseTransformationManager::~ZELServerBaseTransformationManager()
-{
-    channel_ = nullptr;
-}
+ZELServerBaseTransformationManager::~ZELServerBaseTransformationManager() { channel_ = nullptr; }
 
 IZELServerStatus* ZELServerBaseTransformationManager::transactJob(const IZELServerTransformationRequest& request,
                                                                   IZELServerTransformationResult& result)

@@ -20,8 +20,7 @@ public:
     IZELServerStatus* transactJob(const IZELServerTransformationRequest& request,
                                   IZELServerTransformationResult& result) override;
     IZELServerStatus* transactJobString(const IZELServerString& keyword, const IZELServerString& requestText,
-                                        const IZELServerStringArray& directives,
-                                        IZELServerString& resultText) override;
+                                        const IZELServerStringArray& directives, IZELServerString& resultText) override;
 
 protected:
     IZELServerChannel* channel() const { return channel_; }
@@ -39,15 +38,13 @@ private:
 class ZELServerTransformationManager : public IZELServerTransformationManager,
                                        public ZELServerBaseTransformationManager {
 public:
-    explicit ZELServerTransformationManager(IZELServerChannel* channel)
-        : ZELServerBaseTransformationManager(channel) {}
+    explicit ZELServerTransformationManager(IZELServerChannel* channel) : ZELServerBaseTransformationManager(channel) {}
     ~ZELServerTransformationManager() override = default;
 
     IZELServerStatus* transactJob(const IZELServerTransformationRequest& request,
                                   IZELServerTransformationResult& result) override;
     IZELServerStatus* transactJobString(const IZELServerString& keyword, const IZELServerString& requestText,
-                                        const IZELServerStringArray& directives,
-                                        IZELServerString& resultText) override;
+                                        const IZELServerStringArray& directives, IZELServerString& resultText) override;
     IZELServerStatus* submitJob(const IZELServerTransformationRequest& request, unsigned& jobId) override;
     IZELServerStatus* submitJobString(const IZELServerString& keyword, const IZELServerString& requestText,
                                       const IZELServerStringArray& directives, unsigned& jobId) override;

@@ -37,10 +37,7 @@ unsigned getOne(const ZELServerStringDict& dict, const IZELServerString& name, I
 
 // Texts that are not UTF-8 are taken to be in the local code page, as the channel takes the request
 // text itself; the XML layer accepts UTF-8 only.
-std::string asUtf8(const std::string& text)
-{
-    return isValidUtf8(text) ? text : latin1ToUtf8(text);
-}
+std::string asUtf8(const std::string& text) { return isValidUtf8(text) ? text : latin1ToUtf8(text); }
 
 std::string workspaceName(const IZELServerWorkspace& workspace)
 {
@@ -62,28 +59,24 @@ std::string workspacePathOf(const std::string& repository, const std::string& wo
 ZELServerTransformationRequest::ZELServerTransformationRequest(const IZELServerString& keyword,
                                                                std::string workspacePath)
     : workspacePath_(std::move(workspacePath)), keyword_(toStdString(keyword))
-{
-}
+{}
 
 ZELServerTransformationRequest::ZELServerTransformationRequest(const IZELServerString& keyword,
                                                                const IZELServerString& repository,
                                                                const IZELServerString& workspace)
     : ZELServerTransformationRequest(keyword, workspacePathOf(toStdString(repository), toStdString(workspace)))
-{
-}
+{}
 
 ZELServerTransformationRequest::ZELServerTransformationRequest(const IZELServerString& keyword,
                                                                const IZELServerString& workspacePath)
     : ZELServerTransformationRequest(keyword, toStdString(workspacePath))
-{
-}
+{}
 
 ZELServerTransformationRequest::ZELServerTransformationRequest(const IZELServerString& keyword,
                                                                const IZELServerString& repository,
                                                                const IZELServerWorkspace& workspace)
     : ZELServerTransformationRequest(keyword, workspacePathOf(toStdString(repository), workspaceName(workspace)))
-{
-}
+{}
 
 ZELServerTransformationRequest::~ZELServerTransformationRequest() = default;
 
@@ -109,7 +102,8 @@ void ZELServerTransformationRequest::setPublishedParameters(const IZELServerStri
     dirty_ = true;
 }
 
-unsigned ZELServerTransformationRequest::getPublishedParameter(const IZELServerString& name, IZELServerString& value) const
+unsigned ZELServerTransformationRequest::getPublishedParameter(const IZELServerString& name,
+                                                               IZELServerString& value) const
 {
     return getOne(publishedParameters_, name, value);
 }
@@ -151,7 +145,8 @@ void ZELServerTransformationRequest::setEmbeddedDirectives(const IZELServerStrin
     insertPairs(pairs, embeddedDirectives_);
 }
 
-unsigned ZELServerTransformationRequest::getEmbeddedDirective(const IZELServerString& name, IZELServerString& value) const
+unsigned ZELServerTransformationRequest::getEmbeddedDirective(const IZELServerString& name,
+                                                              IZELServerString& value) const
 {
     return getOne(embeddedDirectives_, name, value);
 }

@@ -10,10 +10,7 @@ namespace zel {
 namespace {
 
 // The well-known properties all come from the text itself, so they carry its prefix.
-std::string fromText(const char* name)
-{
-    return std::string(1, kResultPropertyPrefix) + name;
-}
+std::string fromText(const char* name) { return std::string(1, kResultPropertyPrefix) + name; }
 
 void write(IZELServerString& out, const std::string& value)
 {

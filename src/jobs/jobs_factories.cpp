@@ -27,10 +27,7 @@ IZELServerTransformationRequest* makeTransformationRequest(const IZELServerStrin
     return new ZELServerTransformationRequest(keyword, workspacePath);
 }
 
-IZELServerTransformationResult* makeTransformationResult()
-{
-    return new ZELServerTransformationResult();
-}
+IZELServerTransformationResult* makeTransformationResult() { return new ZELServerTransformationResult(); }
 
 IZELServerTransformationResult* makeTransformationResult(const IZELServerString& text)
 {
@@ -41,10 +38,7 @@ IZELServerTransformationResult* makeTransformationResult(const IZELServerString&
     return result;
 }
 
-IZELServerLogFileInfo* makeLogFileInfo()
-{
-    return new ZELServerLogFileInfo();
-}
+IZELServerLogFileInfo* makeLogFileInfo() { return new ZELServerLogFileInfo(); }
 
 IZELServerTransformationManager* makeTransformationManager(IZELServerChannel* channel)
 {

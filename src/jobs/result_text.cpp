@@ -93,9 +93,6 @@ std::optional<unsigned> jobStatusCode(std::string_view word)
     return std::nullopt;
 }
 
-const char* jobStatusWord(unsigned code)
-{
-    return code < kJobStatusWords.size() ? kJobStatusWords[code] : nullptr;
-}
+const char* jobStatusWord(unsigned code) { return code < kJobStatusWords.size() ? kJobStatusWords[code] : nullptr; }
 
 }  // namespace zel

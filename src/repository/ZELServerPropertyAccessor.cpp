@@ -73,16 +73,19 @@ bool writeProperty(XmlDocument& document, XmlElement& root, const std::string& c
 // ---- Property ---------------------------------------------------------------------------------------
 
 ZELServerProperty::ZELServerProperty(std::string category, std::string name, std::string value, Attributes attributes)
-    : category_(std::move(category)), name_(std::move(name)), value_(std::move(value)),
+    : category_(std::move(category)),
+      name_(std::move(name)),
+      value_(std::move(value)),
       attributes_(std::move(attributes))
-{
-}
+{}
 
 ZELServerProperty::ZELServerProperty(const ZELServerProperty& other)
-    : IZELServerProperty(), category_(other.category_), name_(other.name_), value_(other.value_),
+    : IZELServerProperty(),
+      category_(other.category_),
+      name_(other.name_),
+      value_(other.value_),
       attributes_(other.attributes_)
-{
-}
+{}
 
 void ZELServerProperty::getCategory(IZELServerString& out) const { copyText(category_, out); }
 void ZELServerProperty::getName(IZELServerString& out) const { copyText(name_, out); }
@@ -115,7 +118,8 @@ void ZELServerProperty::setAttributes(const Attributes& attributes)
 
 // ---- Accessor ---------------------------------------------------------------------------------------
 
-const ZELServerPropertyAccessor::Category* ZELServerPropertyAccessor::findCategory(const IZELServerString& category) const
+const ZELServerPropertyAccessor::Category*
+ZELServerPropertyAccessor::findCategory(const IZELServerString& category) const
 {
     const auto found = categories_.find(toStdString(category));
     return found == categories_.end() ? nullptr : &found->second;

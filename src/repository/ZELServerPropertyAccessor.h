@@ -55,12 +55,16 @@ public:
     void getCategoryNames(IZELServerStringArray& names) const override;
     void getPropertyNames(const IZELServerString& category, IZELServerStringArray& names) const override;
     bool getPropertyPairs(const IZELServerString& category, IZELServerStringArray& pairs) const override;
-    bool getPropertyValue(const IZELServerString& category, const IZELServerString& name, IZELServerString& value) const override;
-    void setProperty(const IZELServerString& category, const IZELServerString& name, const IZELServerString& value) override;
+    bool getPropertyValue(const IZELServerString& category, const IZELServerString& name,
+                          IZELServerString& value) const override;
+    void setProperty(const IZELServerString& category, const IZELServerString& name,
+                     const IZELServerString& value) override;
     bool removeCategory(const IZELServerString& category) override;
     bool removeProperty(const IZELServerString& category, const IZELServerString& name) override;
-    void getProperties(const IZELServerString& category, IZELServerVector<IZELServerProperty>& properties) const override;
-    const IZELServerProperty* getProperty(const IZELServerString& category, const IZELServerString& name) const override;
+    void getProperties(const IZELServerString& category,
+                       IZELServerVector<IZELServerProperty>& properties) const override;
+    const IZELServerProperty* getProperty(const IZELServerString& category,
+                                          const IZELServerString& name) const override;
 
     // Forgets every property.
     void clear() { categories_.clear(); }

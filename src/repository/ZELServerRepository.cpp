@@ -144,26 +144,27 @@ CheckedCommand ZELServerRepository::on(const char* keyword) const
 
 IZELServerStatus* ZELServerRepository::itemExists(const IZELServerString& itemName, unsigned& exists)
 {
-    return on("REP_ITEMEXISTS")
-        .require(itemName).allowedName(itemName)
-        .add("itemName", itemName)
-        .askFlag(exists);
+    return on("REP_ITEMEXISTS").require(itemName).allowedName(itemName).add("itemName", itemName).askFlag(exists);
 }
 
-IZELServerStatus* ZELServerRepository::getItem(const IZELServerString& itemName, const IZELServerString& destinationPath,
-                                               unsigned& received, IZELServerProgressListener* listener)
+IZELServerStatus* ZELServerRepository::getItem(const IZELServerString& itemName,
+                                               const IZELServerString& destinationPath, unsigned& received,
+                                               IZELServerProgressListener* listener)
 {
     received = 0;
     const std::string item = toStdString(itemName);
     const std::string destination = toStdString(destinationPath);
     return on("REP_GET_ITEM")
-        .require(itemName).require(destinationPath).allowedName(itemName)
-        .add("itemName", item).add("itemFileCRCCheckingEnabled", kNoCrcCheck)
+        .require(itemName)
+        .require(destinationPath)
+        .allowedName(itemName)
+        .add("itemName", item)
+        .add("itemFileCRCCheckingEnabled", kNoCrcCheck)
         .run([&](Command& command) { return downloadItem(command, item, destination, received, listener); });
 }
 
-IZELServerStatus* ZELServerRepository::getItem(const IZELServerString& itemName, const IZELServerString& destinationPath,
-                                               unsigned& received)
+IZELServerStatus* ZELServerRepository::getItem(const IZELServerString& itemName,
+                                               const IZELServerString& destinationPath, unsigned& received)
 {
     return getItem(itemName, destinationPath, received, nullptr);
 }
@@ -172,8 +173,11 @@ IZELServerStatus* ZELServerRepository::addItem(const IZELServerString& itemName,
                                                IZELServerProgressListener* listener)
 {
     return on("REP_ADD_ITEM")
-        .require(itemName).require(sourcePath).allowedName(itemName)
-        .add("itemName", itemName).add("itemFileCRCCheckingEnabled", kNoCrcCheck)
+        .require(itemName)
+        .require(sourcePath)
+        .allowedName(itemName)
+        .add("itemName", itemName)
+        .add("itemFileCRCCheckingEnabled", kNoCrcCheck)
         .upload(sourcePath, listener);
 }
 
@@ -188,8 +192,10 @@ IZELServerStatus* ZELServerRepository::updateItem(const IZELServerString& itemNa
                                                   IZELServerProgressListener* listener)
 {
     return on("REP_UPDATE_ITEM")
-        .require(itemName).require(sourcePath)
-        .add("itemName", itemName).add("itemFileCRCCheckingEnabled", kNoCrcCheck)
+        .require(itemName)
+        .require(sourcePath)
+        .add("itemName", itemName)
+        .add("itemFileCRCCheckingEnabled", kNoCrcCheck)
         .upload(sourcePath, listener);
 }
 
@@ -200,10 +206,7 @@ IZELServerStatus* ZELServerRepository::updateItem(const IZELServerString& itemNa
 
 IZELServerStatus* ZELServerRepository::removeItem(const IZELServerString& itemName, unsigned& removed)
 {
-    return on("REP_REMOVE_ITEM")
-        .require(itemName).allowedName(itemName)
-        .add("itemName", itemName)
-        .askFlag(removed);
+    return on("REP_REMOVE_ITEM").require(itemName).allowedName(itemName).add("itemName", itemName).askFlag(removed);
 }
 
 // ---- Item resources ---------------------------------------------------------------------------------
@@ -212,8 +215,12 @@ IZELServerStatus* ZELServerRepository::itemResourceExists(const IZELServerString
                                                           const IZELServerString& resourceName, unsigned& exists)
 {
     return on("REP_ITEMRESOURCEEXISTS")
-        .require(itemName).require(resourceName).allowedName(itemName).allowedName(resourceName)
-        .add("itemName", itemName).add("resourceName", resourceName)
+        .require(itemName)
+        .require(resourceName)
+        .allowedName(itemName)
+        .allowedName(resourceName)
+        .add("itemName", itemName)
+        .add("resourceName", resourceName)
         .askFlag(exists);
 }
 
@@ -225,9 +232,14 @@ IZELServerStatus* ZELServerRepository::getItemResource(const IZELServerString& i
     received = 0;
     const std::string destination = toStdString(destinationPath);
     return on("REP_GET_ITEMRESOURCE")
-        .require(itemName).require(resourceName).require(destinationPath)
-        .allowedName(itemName).allowedName(resourceName)
-        .add("itemName", itemName).add("resourceName", resourceName).add("resourceFileCRCCheckingEnabled", kNoCrcCheck)
+        .require(itemName)
+        .require(resourceName)
+        .require(destinationPath)
+        .allowedName(itemName)
+        .allowedName(resourceName)
+        .add("itemName", itemName)
+        .add("resourceName", resourceName)
+        .add("resourceFileCRCCheckingEnabled", kNoCrcCheck)
         .run([&](Command& command) { return downloadResource(command, destination, received, listener); });
 }
 
@@ -245,7 +257,8 @@ IZELServerStatus* ZELServerRepository::getItemResourceView(const IZELServerStrin
 {
     return on("REP_GET_ITEMRESOURCEVIEW")
         .require(itemName)
-        .add("itemName", itemName).add("resourceName", resourceName)
+        .add("itemName", itemName)
+        .add("resourceName", resourceName)
         .askObject(found, [&](const IZELServerResponse& response) { return response.readResource(resource); });
 }
 
@@ -255,9 +268,15 @@ IZELServerStatus* ZELServerRepository::addItemResource(const IZELServerString& i
                                                        IZELServerProgressListener* listener)
 {
     return on("REP_ADD_ITEMRESOURCE")
-        .require(itemName).require(resourceName).require(sourcePath)
-        .allowedName(itemName).allowedName(resourceName).distinct(resourceName, itemName)
-        .add("itemName", itemName).add("resourceName", resourceName).add("resourceFileCRCCheckingEnabled", kNoCrcCheck)
+        .require(itemName)
+        .require(resourceName)
+        .require(sourcePath)
+        .allowedName(itemName)
+        .allowedName(resourceName)
+        .distinct(resourceName, itemName)
+        .add("itemName", itemName)
+        .add("resourceName", resourceName)
+        .add("resourceFileCRCCheckingEnabled", kNoCrcCheck)
         .upload(sourcePath, listener);
 }
 
@@ -274,9 +293,15 @@ IZELServerStatus* ZELServerRepository::updateItemResource(const IZELServerString
                                                           IZELServerProgressListener* listener)
 {
     return on("REP_UPDATE_ITEMRESOURCE")
-        .require(itemName).require(resourceName).require(sourcePath)
-        .allowedName(itemName).allowedName(resourceName).distinct(resourceName, itemName)
-        .add("itemName", itemName).add("resourceName", resourceName).add("resourceFileCRCCheckingEnabled", kNoCrcCheck)
+        .require(itemName)
+        .require(resourceName)
+        .require(sourcePath)
+        .allowedName(itemName)
+        .allowedName(resourceName)
+        .distinct(resourceName, itemName)
+        .add("itemName", itemName)
+        .add("resourceName", resourceName)
+        .add("resourceFileCRCCheckingEnabled", kNoCrcCheck)
         .upload(sourcePath, listener);
 }
 
@@ -291,21 +316,28 @@ IZELServerStatus* ZELServerRepository::removeItemResource(const IZELServerString
                                                           const IZELServerString& resourceName, unsigned& removed)
 {
     return on("REP_REMOVE_ITEMRESOURCE")
-        .require(itemName).require(resourceName).allowedName(itemName).allowedName(resourceName)
-        .add("itemName", itemName).add("resourceName", resourceName)
+        .require(itemName)
+        .require(resourceName)
+        .allowedName(itemName)
+        .allowedName(resourceName)
+        .add("itemName", itemName)
+        .add("resourceName", resourceName)
         .askFlag(removed);
 }
 
 // ---- Views ------------------------------------------------------------------------------------------
 
-IZELServerStatus* ZELServerRepository::getWorkspaceSummariesView(const ZELServerStringDict* directives,
-                                                                 IZELServerVector<IZELServerWorkspaceSummary>& summaries)
+IZELServerStatus*
+ZELServerRepository::getWorkspaceSummariesView(const ZELServerStringDict* directives,
+                                               IZELServerVector<IZELServerWorkspaceSummary>& summaries)
 {
     const ZELServerStringArray filter = enableFilterList(directives);
     return on("REP_GET_WORKSPACESUMMARIESVIEW")
         .require(filter.entries() >= 2)
         .addList("directives", filter)
-        .askList([&](const IZELServerResponse& response) { return readWorkspaceSummariesReply(bodyOf(response), summaries); });
+        .askList([&](const IZELServerResponse& response) {
+            return readWorkspaceSummariesReply(bodyOf(response), summaries);
+        });
 }
 
 IZELServerStatus* ZELServerRepository::getWorkspacesView(const ZELServerStringDict* directives,
@@ -345,12 +377,14 @@ IZELServerStatus* ZELServerRepository::getCustomFormatView(const IZELServerStrin
         .askObject(found, [&](const IZELServerResponse& response) { return response.readCustomFormat(customFormat); });
 }
 
-IZELServerStatus* ZELServerRepository::getCustomTransformersView(
-    const ZELServerStringDict* /*directives*/, IZELServerVector<IZELServerCustomTransformer>& customTransformers)
+IZELServerStatus*
+ZELServerRepository::getCustomTransformersView(const ZELServerStringDict* /*directives*/,
+                                               IZELServerVector<IZELServerCustomTransformer>& customTransformers)
 {
     return on("REP_GET_CUSTOMTRANSFORMERSVIEW")
         .addList("directives", allObjects())
-        .askList([&](const IZELServerResponse& response) { return response.readCustomTransformers(customTransformers); });
+        .askList(
+            [&](const IZELServerResponse& response) { return response.readCustomTransformers(customTransformers); });
 }
 
 IZELServerStatus* ZELServerRepository::getCustomTransformerView(const IZELServerString& customTransformerName,
@@ -360,7 +394,9 @@ IZELServerStatus* ZELServerRepository::getCustomTransformerView(const IZELServer
     return on("REP_GET_CUSTOMTRANSFORMERVIEW")
         .require(customTransformerName)
         .add("customTransformerName", customTransformerName)
-        .askObject(found, [&](const IZELServerResponse& response) { return response.readCustomTransformer(customTransformer); });
+        .askObject(found, [&](const IZELServerResponse& response) {
+            return response.readCustomTransformer(customTransformer);
+        });
 }
 
 // Nothing is checked here, not even the item name, which goes to the server as given.
@@ -393,8 +429,9 @@ IZELServerStatus* ZELServerRepository::getTemplateView(const IZELServerString& t
 
 // ---- Workspace registrations ------------------------------------------------------------------------
 
-IZELServerStatus* ZELServerRepository::getWorkspaceServices(const ZELServerStringDict* directives,
-                                                            IZELServerVector<IZELServerWorkspaceService>& workspaceServices)
+IZELServerStatus*
+ZELServerRepository::getWorkspaceServices(const ZELServerStringDict* directives,
+                                          IZELServerVector<IZELServerWorkspaceService>& workspaceServices)
 {
     const std::optional<ZELServerStringArray> filter = registrationFilterOf(directives);
     IZELServerChannel* channel = channel_;
@@ -410,8 +447,10 @@ IZELServerStatus* ZELServerRepository::workspaceServiceExists(const IZELServerSt
                                                               const IZELServerString& serviceName, unsigned& exists)
 {
     return on("REP_WORKSPACESERVICEEXISTS")
-        .require(workspaceName).require(serviceName)
-        .add("workspaceName", workspaceName).add("serviceName", serviceName)
+        .require(workspaceName)
+        .require(serviceName)
+        .add("workspaceName", workspaceName)
+        .add("serviceName", serviceName)
         .askFlag(exists);
 }
 
@@ -419,8 +458,10 @@ IZELServerStatus* ZELServerRepository::registerWorkspaceService(const IZELServer
                                                                 const IZELServerString& serviceName)
 {
     return on("REP_REGISTER_WORKSPACESERVICE")
-        .require(workspaceName).require(serviceName)
-        .add("workspaceName", workspaceName).add("serviceName", serviceName)
+        .require(workspaceName)
+        .require(serviceName)
+        .add("workspaceName", workspaceName)
+        .add("serviceName", serviceName)
         .send();
 }
 
@@ -429,8 +470,10 @@ IZELServerStatus* ZELServerRepository::deregisterWorkspaceService(const IZELServ
                                                                   unsigned& deregistered)
 {
     return on("REP_DEREGISTER_WORKSPACESERVICE")
-        .require(workspaceName).require(serviceName)
-        .add("workspaceName", workspaceName).add("serviceName", serviceName)
+        .require(workspaceName)
+        .require(serviceName)
+        .add("workspaceName", workspaceName)
+        .add("serviceName", serviceName)
         .askFlag(deregistered);
 }
 

@@ -68,17 +68,13 @@ IZELServerStatus* ZELServerRepositoryManager::getService(const IZELServerString&
 
 IZELServerStatus* ZELServerRepositoryManager::addService(const IZELServerService& service)
 {
-    return CheckedCommand(channel_, "REP_ADD_SERVICE")
-        .addService("serviceObject", service)
-        .send();
+    return CheckedCommand(channel_, "REP_ADD_SERVICE").addService("serviceObject", service).send();
 }
 
 // The payload's root stays "REP_ADD_SERVICE" for the update: the server reads only its "SERVICE".
 IZELServerStatus* ZELServerRepositoryManager::updateService(const IZELServerService& service)
 {
-    return CheckedCommand(channel_, "REP_UPDATE_SERVICE")
-        .addService("serviceObject", service)
-        .send();
+    return CheckedCommand(channel_, "REP_UPDATE_SERVICE").addService("serviceObject", service).send();
 }
 
 IZELServerStatus* ZELServerRepositoryManager::removeService(const IZELServerString& serviceName, unsigned& removed)
@@ -113,7 +109,8 @@ IZELServerStatus* ZELServerRepositoryManager::getRepository(const IZELServerStri
                                                             IZELServerRepository& repository, unsigned& found)
 {
     return CheckedCommand(channel_, "REP_GET_REPOSITORY")
-        .require(repositoryName).allowedName(repositoryName)
+        .require(repositoryName)
+        .allowedName(repositoryName)
         .add("repositoryName", repositoryName)
         .askObject(found, [&](const IZELServerResponse& response) { return response.readRepository(repository); });
 }
@@ -128,15 +125,18 @@ IZELServerStatus* ZELServerRepositoryManager::addRepository(const IZELServerStri
     repository.getName(name);
     repository.getDescription(text);
     return CheckedCommand(channel_, "REP_ADD_REPOSITORY")
-        .require(repositoryName).allowedName(repositoryName)
+        .require(repositoryName)
+        .allowedName(repositoryName)
         .addRepository("repositoryObject", name, text)
         .send();
 }
 
-IZELServerStatus* ZELServerRepositoryManager::removeRepository(const IZELServerString& repositoryName, unsigned& removed)
+IZELServerStatus* ZELServerRepositoryManager::removeRepository(const IZELServerString& repositoryName,
+                                                               unsigned& removed)
 {
     return CheckedCommand(channel_, "REP_REMOVE_REPOSITORY")
-        .require(repositoryName).allowedName(repositoryName)
+        .require(repositoryName)
+        .allowedName(repositoryName)
         .add("repositoryName", repositoryName)
         .askFlag(removed);
 }

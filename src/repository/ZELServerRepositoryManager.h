@@ -18,16 +18,21 @@ public:
     ~ZELServerRepositoryManager() override = default;
 
     IZELServerStatus* serviceExists(const IZELServerString& serviceName, unsigned& exists) override;
-    IZELServerStatus* getServices(const ZELServerStringDict* directives, IZELServerVector<IZELServerService>& services) override;
-    IZELServerStatus* getService(const IZELServerString& serviceName, IZELServerService& service, unsigned& found) override;
+    IZELServerStatus* getServices(const ZELServerStringDict* directives,
+                                  IZELServerVector<IZELServerService>& services) override;
+    IZELServerStatus* getService(const IZELServerString& serviceName, IZELServerService& service,
+                                 unsigned& found) override;
     IZELServerStatus* addService(const IZELServerService& service) override;
     IZELServerStatus* updateService(const IZELServerService& service) override;
     IZELServerStatus* removeService(const IZELServerString& serviceName, unsigned& removed) override;
 
     IZELServerStatus* repositoryExists(const IZELServerString& repositoryName, unsigned& exists) override;
-    IZELServerStatus* getRepositories(const ZELServerStringDict* directives, IZELServerVector<IZELServerRepository>& repositories) override;
-    IZELServerStatus* getRepository(const IZELServerString& repositoryName, IZELServerRepository& repository, unsigned& found) override;
-    IZELServerStatus* addRepository(const IZELServerString& repositoryName, const IZELServerString& description) override;
+    IZELServerStatus* getRepositories(const ZELServerStringDict* directives,
+                                      IZELServerVector<IZELServerRepository>& repositories) override;
+    IZELServerStatus* getRepository(const IZELServerString& repositoryName, IZELServerRepository& repository,
+                                    unsigned& found) override;
+    IZELServerStatus* addRepository(const IZELServerString& repositoryName,
+                                    const IZELServerString& description) override;
     IZELServerStatus* removeRepository(const IZELServerString& repositoryName, unsigned& removed) override;
 
     IZELServerStatus* getGlobalItems(const ZELServerStringDict* directives, IZELServerPropertyAccessor& items) override;

@@ -49,25 +49,34 @@ ZELServerService::ZELServerService(IZELServerChannel* channel, std::string name,
 void ZELServerService::getName(IZELServerString& out) const { copyText(fields_.name, out); }
 void ZELServerService::setName(const IZELServerString& name) { fields_.name = toStdString(name); }
 void ZELServerService::getDisplayName(IZELServerString& out) const { copyText(fields_.displayName, out); }
-void ZELServerService::setDisplayName(const IZELServerString& displayName) { fields_.displayName = toStdString(displayName); }
+void ZELServerService::setDisplayName(const IZELServerString& displayName)
+{
+    fields_.displayName = toStdString(displayName);
+}
 void ZELServerService::getDescription(IZELServerString& out) const { copyText(fields_.description, out); }
-void ZELServerService::setDescription(const IZELServerString& description) { fields_.description = toStdString(description); }
+void ZELServerService::setDescription(const IZELServerString& description)
+{
+    fields_.description = toStdString(description);
+}
 void ZELServerService::getUrlPattern(IZELServerString& out) const { copyText(fields_.urlPattern, out); }
-void ZELServerService::setUrlPattern(const IZELServerString& urlPattern) { fields_.urlPattern = toStdString(urlPattern); }
+void ZELServerService::setUrlPattern(const IZELServerString& urlPattern)
+{
+    fields_.urlPattern = toStdString(urlPattern);
+}
 
 bool ServiceFields::*ZELServerService::registrationField(unsigned itemType)
 {
     switch (itemType) {
-        case kWorkspaceItemType:
-            return &ServiceFields::workspaceRegistration;
-        case kCustomFormatItemType:
-            return &ServiceFields::customFormatRegistration;
-        case kCustomTransformerItemType:
-            return &ServiceFields::customTransformerRegistration;
-        case kTemplateItemType:
-            return &ServiceFields::templateRegistration;
-        default:
-            return nullptr;
+    case kWorkspaceItemType:
+        return &ServiceFields::workspaceRegistration;
+    case kCustomFormatItemType:
+        return &ServiceFields::customFormatRegistration;
+    case kCustomTransformerItemType:
+        return &ServiceFields::customTransformerRegistration;
+    case kTemplateItemType:
+        return &ServiceFields::templateRegistration;
+    default:
+        return nullptr;
     }
 }
 
@@ -97,7 +106,9 @@ IZELServerStatus* ZELServerService::itemRegistered(const IZELServerString& repos
                                                    const IZELServerString& itemName, unsigned& registered)
 {
     return CheckedCommand(channel_, "REP_ITEMREGISTERED")
-        .add("serviceName", fields_.name).add("repositoryName", repositoryName).add("itemName", itemName)
+        .add("serviceName", fields_.name)
+        .add("repositoryName", repositoryName)
+        .add("itemName", itemName)
         .askFlag(registered);
 }
 
@@ -109,7 +120,9 @@ IZELServerStatus* ZELServerService::registerItem(const IZELServerString& reposit
     return CheckedCommand(channel_, "REP_REGISTERITEM")
         .require(itemName)
         .check(isRegistrationAllowed(itemTypeOf(toStdString(itemName))) == 1, msg::kRegistrationRefused)
-        .add("serviceName", fields_.name).add("repositoryName", repositoryName).add("itemName", itemName)
+        .add("serviceName", fields_.name)
+        .add("repositoryName", repositoryName)
+        .add("itemName", itemName)
         .send();
 }
 
@@ -117,7 +130,9 @@ IZELServerStatus* ZELServerService::deregisterItem(const IZELServerString& repos
                                                    const IZELServerString& itemName, unsigned& deregistered)
 {
     return CheckedCommand(channel_, "REP_DEREGISTERITEM")
-        .add("serviceName", fields_.name).add("repositoryName", repositoryName).add("itemName", itemName)
+        .add("serviceName", fields_.name)
+        .add("repositoryName", repositoryName)
+        .add("itemName", itemName)
         .askFlag(deregistered);
 }
 

@@ -18,20 +18,14 @@ constexpr AttributeBinding<FeatureTypeFields> kFeatureTypeAttributes[] = {
 };
 
 constexpr AttributeBinding<DatasetFields> kDatasetAttributes[] = {
-    {"dataset_id", &DatasetFields::id},
-    {"format", &DatasetFields::format},
-    {"name", &DatasetFields::name},
-    {"location", &DatasetFields::location},
-    {"is_source", &DatasetFields::isSource},
+    {"dataset_id", &DatasetFields::id},     {"format", &DatasetFields::format},      {"name", &DatasetFields::name},
+    {"location", &DatasetFields::location}, {"is_source", &DatasetFields::isSource},
 };
 
 constexpr AttributeBinding<WorkspaceFields> kWorkspaceAttributes[] = {
-    {"workspace_id", &WorkspaceFields::id},
-    {"name", &WorkspaceFields::name},
-    {"title", &WorkspaceFields::title},
-    {"description", &WorkspaceFields::description},
-    {"is_enabled", &WorkspaceFields::enabled},
-    {"filesize", &WorkspaceFields::fileSize},
+    {"workspace_id", &WorkspaceFields::id},    {"name", &WorkspaceFields::name},
+    {"title", &WorkspaceFields::title},        {"description", &WorkspaceFields::description},
+    {"is_enabled", &WorkspaceFields::enabled}, {"filesize", &WorkspaceFields::fileSize},
 };
 
 // Replaces the contents of `out` with one object per direct child named `tag`, in document order.
@@ -108,7 +102,8 @@ bool ZELServerDataset::readFrom(const XmlElement& element)
     properties_.clear();
     properties_.readPropertiesOf(element);
     IZELServerChannel* channel = channel_;
-    return readChildren(element, "FEATURE_TYPE", featureTypes_, [channel] { return new ZELServerFeatureType(channel); });
+    return readChildren(element, "FEATURE_TYPE", featureTypes_,
+                        [channel] { return new ZELServerFeatureType(channel); });
 }
 
 // ---- Workspace --------------------------------------------------------------------------------------

@@ -44,8 +44,7 @@ ZELServerStringArray enableFilterList(const ZELServerStringDict* directives)
 
 CheckedCommand::CheckedCommand(IZELServerChannel* channel, std::string keyword)
     : channel_(channel), keyword_(std::move(keyword))
-{
-}
+{}
 
 CheckedCommand& CheckedCommand::fail(unsigned number, std::string parameter)
 {
@@ -56,15 +55,9 @@ CheckedCommand& CheckedCommand::fail(unsigned number, std::string parameter)
     return *this;
 }
 
-CheckedCommand& CheckedCommand::require(const IZELServerString& text)
-{
-    return require(text.length() > 0);
-}
+CheckedCommand& CheckedCommand::require(const IZELServerString& text) { return require(text.length() > 0); }
 
-CheckedCommand& CheckedCommand::require(bool condition)
-{
-    return check(condition, msg::kRequiredValueMissing);
-}
+CheckedCommand& CheckedCommand::require(bool condition) { return check(condition, msg::kRequiredValueMissing); }
 
 CheckedCommand& CheckedCommand::allowedName(const IZELServerString& name)
 {
@@ -76,10 +69,7 @@ CheckedCommand& CheckedCommand::distinct(const IZELServerString& resourceName, c
     return check(toStdString(resourceName) != toStdString(itemName), msg::kResourceNamedAsItem);
 }
 
-CheckedCommand& CheckedCommand::check(bool condition, unsigned number)
-{
-    return condition ? *this : fail(number);
-}
+CheckedCommand& CheckedCommand::check(bool condition, unsigned number) { return condition ? *this : fail(number); }
 
 CheckedCommand& CheckedCommand::add(const std::string& name, const std::string& value)
 {
@@ -100,9 +90,8 @@ CheckedCommand& CheckedCommand::addList(const std::string& name, const ZELServer
 
 CheckedCommand& CheckedCommand::addXml(const std::string& name, const XmlWritable& object, const std::string& rootName)
 {
-    values_.push_back([name, &object, rootName](Command& command) {
-        command.request().addXmlValue(name, object, rootName);
-    });
+    values_.push_back(
+        [name, &object, rootName](Command& command) { command.request().addXmlValue(name, object, rootName); });
     return *this;
 }
 

@@ -58,7 +58,8 @@ int readWorkspaceSummaryReply(std::string_view body, IZELServerWorkspaceSummary&
 
 int readWorkspaceSummariesReply(std::string_view body, IZELServerVector<IZELServerWorkspaceSummary>& summaries)
 {
-    return readObjectList(body, kSummaryTag, summaries, make<ZELServerWorkspaceSummary>(), fill<ZELServerWorkspaceSummary>);
+    return readObjectList(body, kSummaryTag, summaries, make<ZELServerWorkspaceSummary>(),
+                          fill<ZELServerWorkspaceSummary>);
 }
 
 int readWorkspaceReply(std::string_view body, IZELServerChannel* channel, IZELServerWorkspace& workspace)
@@ -66,9 +67,11 @@ int readWorkspaceReply(std::string_view body, IZELServerChannel* channel, IZELSe
     return readFirstObject<ZELServerWorkspace>(body, kWorkspaceTag, workspace, boundFill<ZELServerWorkspace>(channel));
 }
 
-int readWorkspacesReply(std::string_view body, IZELServerChannel* channel, IZELServerVector<IZELServerWorkspace>& workspaces)
+int readWorkspacesReply(std::string_view body, IZELServerChannel* channel,
+                        IZELServerVector<IZELServerWorkspace>& workspaces)
 {
-    return readObjectList(body, kWorkspaceTag, workspaces, makeOn<ZELServerWorkspace>(channel), fill<ZELServerWorkspace>);
+    return readObjectList(body, kWorkspaceTag, workspaces, makeOn<ZELServerWorkspace>(channel),
+                          fill<ZELServerWorkspace>);
 }
 
 int readCustomFormatReply(std::string_view body, IZELServerCustomFormat& format)
@@ -149,7 +152,8 @@ int readWorkspaceServicesReply(std::string_view body, IZELServerChannel* channel
 
 int readRepositoryReply(std::string_view body, IZELServerChannel* channel, IZELServerRepository& repository)
 {
-    return readFirstObject<ZELServerRepository>(body, kRepositoryTag, repository, boundFill<ZELServerRepository>(channel));
+    return readFirstObject<ZELServerRepository>(body, kRepositoryTag, repository,
+                                                boundFill<ZELServerRepository>(channel));
 }
 
 int readRepositoriesReply(std::string_view body, IZELServerChannel* channel,

@@ -31,7 +31,8 @@ int readWorkspaceSummaryReply(std::string_view body, IZELServerWorkspaceSummary&
 int readWorkspaceSummariesReply(std::string_view body, IZELServerVector<IZELServerWorkspaceSummary>& summaries);
 
 int readWorkspaceReply(std::string_view body, IZELServerChannel* channel, IZELServerWorkspace& workspace);
-int readWorkspacesReply(std::string_view body, IZELServerChannel* channel, IZELServerVector<IZELServerWorkspace>& workspaces);
+int readWorkspacesReply(std::string_view body, IZELServerChannel* channel,
+                        IZELServerVector<IZELServerWorkspace>& workspaces);
 
 int readCustomFormatReply(std::string_view body, IZELServerCustomFormat& format);
 int readCustomFormatsReply(std::string_view body, IZELServerVector<IZELServerCustomFormat>& formats);
@@ -51,7 +52,8 @@ int readItemsReply(std::string_view body, IZELServerVector<IZELServerItem>& item
 int readServiceReply(std::string_view body, IZELServerChannel* channel, IZELServerService& service);
 int readServicesReply(std::string_view body, IZELServerChannel* channel, IZELServerVector<IZELServerService>& services);
 
-int readWorkspaceServiceReply(std::string_view body, IZELServerChannel* channel, IZELServerWorkspaceService& workspaceService);
+int readWorkspaceServiceReply(std::string_view body, IZELServerChannel* channel,
+                              IZELServerWorkspaceService& workspaceService);
 int readWorkspaceServicesReply(std::string_view body, IZELServerChannel* channel,
                                IZELServerVector<IZELServerWorkspaceService>& workspaceServices);
 

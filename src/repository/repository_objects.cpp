@@ -181,10 +181,7 @@ bool ZELServerCustomFormat::readFrom(const XmlElement& element)
 }
 
 void ZELServerCustomTransformer::getName(IZELServerString& out) const { copyText(fields_.name, out); }
-void ZELServerCustomTransformer::getDescription(IZELServerString& out) const
-{
-    copyText(fields_.description, out);
-}
+void ZELServerCustomTransformer::getDescription(IZELServerString& out) const { copyText(fields_.description, out); }
 void ZELServerCustomTransformer::getTitle(IZELServerString& out) const { copyText(fields_.title, out); }
 
 bool ZELServerCustomTransformer::readFrom(const XmlElement& element)

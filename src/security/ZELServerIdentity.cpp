@@ -31,10 +31,7 @@ XmlElement* appendElement(XmlDocument& document, XmlElement& parent, const char*
 
 }  // namespace
 
-void ZELServerIdentity::getId(IZELServerString& out) const
-{
-    out.set(id_.data(), static_cast<unsigned>(id_.size()));
-}
+void ZELServerIdentity::getId(IZELServerString& out) const { out.set(id_.data(), static_cast<unsigned>(id_.size())); }
 
 void ZELServerIdentity::getRoles(IZELServerStringArray& out) const
 {

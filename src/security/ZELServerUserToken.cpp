@@ -19,8 +19,7 @@ void copyOut(const std::string& text, IZELServerString& out)
 
 ZELServerUserToken::ZELServerUserToken(std::string token, std::string clientAddress, long long expirationTimeout)
     : token_(std::move(token)), clientAddress_(std::move(clientAddress)), expirationTimeout_(expirationTimeout)
-{
-}
+{}
 
 void ZELServerUserToken::getToken(IZELServerString& out) const { copyOut(token_, out); }
 
@@ -43,10 +42,9 @@ bool ZELServerUserToken::readFrom(const XmlElement& element)
 
 int readUserTokenReply(std::string_view body, IZELServerUserToken& token)
 {
-    return readFirstObject<ZELServerUserToken>(body, "USERTOKEN", token, [](ZELServerUserToken& target,
-                                                                             const XmlElement& element) {
-        return target.readFrom(element);
-    });
+    return readFirstObject<ZELServerUserToken>(
+        body, "USERTOKEN", token,
+        [](ZELServerUserToken& target, const XmlElement& element) { return target.readFrom(element); });
 }
 
 }  // namespace zel

@@ -24,7 +24,8 @@ namespace {
 bool isBlank(char c) { return c == ' ' || c == '\t'; }
 bool isDigit(char c) { return c >= '0' && c <= '9'; }
 
-std::string cataloguePath(const std::string& homeDirectory) {
+std::string cataloguePath(const std::string& homeDirectory)
+{
     std::string path = homeDirectory;
     if (!path.empty() && path.back() != platform::kPathSeparator && path.back() != '/') {
         path += platform::kPathSeparator;
@@ -34,7 +35,8 @@ std::string cataloguePath(const std::string& homeDirectory) {
 }
 
 // Reads the leading number of a catalogue line; false when there are no digits or it overflows.
-bool readNumber(std::string_view line, std::size_t& position, unsigned& number) {
+bool readNumber(std::string_view line, std::size_t& position, unsigned& number)
+{
     const std::size_t start = position;
     unsigned long long value = 0;
     while (position < line.size() && isDigit(line[position])) {
@@ -50,9 +52,9 @@ bool readNumber(std::string_view line, std::size_t& position, unsigned& number) 
 
 // A folder of the catalogue's name opens on some systems and fails only when read: the read error
 // is what counts.
-bool readWholeFile(const std::string& path, std::string& content) {
-    std::unique_ptr<std::FILE, int (*)(std::FILE*)> file(std::fopen(path.c_str(), "rb"),
-                                                         &std::fclose);
+bool readWholeFile(const std::string& path, std::string& content)
+{
+    std::unique_ptr<std::FILE, int (*)(std::FILE*)> file(std::fopen(path.c_str(), "rb"), &std::fclose);
     if (!file) {
         return false;
     }
@@ -66,12 +68,14 @@ bool readWholeFile(const std::string& path, std::string& content) {
 
 }  // namespace
 
-bool ZELLocalizedMessageDatabase::fail(std::string message) {
+bool ZELLocalizedMessageDatabase::fail(std::string message)
+{
     lastError_ = std::move(message);
     return false;
 }
 
-bool ZELLocalizedMessageDatabase::initialize(const std::string& homeDirectory) {
+bool ZELLocalizedMessageDatabase::initialize(const std::string& homeDirectory)
+{
     const std::string path = cataloguePath(homeDirectory);
     std::string content;
     if (!readWholeFile(path, content)) {
@@ -81,7 +85,8 @@ bool ZELLocalizedMessageDatabase::initialize(const std::string& homeDirectory) {
     return load(content, path);
 }
 
-bool ZELLocalizedMessageDatabase::load(std::string_view text, const std::string& origin) {
+bool ZELLocalizedMessageDatabase::load(std::string_view text, const std::string& origin)
+{
     texts_.clear();
     origin_ = origin;
     lastError_.clear();
@@ -109,8 +114,7 @@ bool ZELLocalizedMessageDatabase::load(std::string_view text, const std::string&
         }
         const std::string where = origin + ":" + std::to_string(lineNumber) + ": ";
         unsigned number = 0;
-        if (!readNumber(line, position, number) || position == line.size() ||
-            !isBlank(line[position])) {
+        if (!readNumber(line, position, number) || position == line.size() || !isBlank(line[position])) {
             return fail(where + "expected a message number, a blank and a text");
         }
         while (position < line.size() && isBlank(line[position])) {
@@ -127,14 +131,12 @@ bool ZELLocalizedMessageDatabase::load(std::string_view text, const std::string&
     return true;
 }
 
-bool ZELLocalizedMessageDatabase::createFilledInMessage(unsigned number,
-                                                        const IZELStringArray* parameters,
-                                                        IZELString* output, bool keepUnfilledSlots,
-                                                        bool showNumbers) {
+bool ZELLocalizedMessageDatabase::createFilledInMessage(unsigned number, const IZELStringArray* parameters,
+                                                        IZELString* output, bool keepUnfilledSlots, bool showNumbers)
+{
     const auto found = texts_.find(number);
     if (found == texts_.end()) {
-        return fail("Message " + std::to_string(number) + " is not in the message catalogue " +
-                    origin_);
+        return fail("Message " + std::to_string(number) + " is not in the message catalogue " + origin_);
     }
     const unsigned available = parameters != nullptr ? parameters->entries() : 0;
     const std::string& pattern = found->second;

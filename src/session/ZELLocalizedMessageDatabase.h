@@ -30,8 +30,8 @@ public:
     // `parameters` (null means none). A slot without a parameter becomes empty, or stays as written
     // when `keepUnfilledSlots` is set. With `showNumbers` the text is prefixed "<number>: ".
     // False when the number has no text; `output` is then left alone.
-    bool createFilledInMessage(unsigned number, const IZELStringArray* parameters,
-                               IZELString* output, bool keepUnfilledSlots, bool showNumbers);
+    bool createFilledInMessage(unsigned number, const IZELStringArray* parameters, IZELString* output,
+                               bool keepUnfilledSlots, bool showNumbers);
 
     // Why the last initialize, load or createFilledInMessage failed; empty when none did.
     const char* getLastErrorMessage() const { return lastError_.c_str(); }

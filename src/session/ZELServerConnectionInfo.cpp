@@ -38,10 +38,7 @@ bool readPort(std::string_view text, unsigned short& port)
     return true;
 }
 
-void write(const std::string& text, IZELServerString& out)
-{
-    out.set(text.data(), static_cast<unsigned>(text.size()));
-}
+void write(const std::string& text, IZELServerString& out) { out.set(text.data(), static_cast<unsigned>(text.size())); }
 
 }  // namespace
 
@@ -94,8 +91,7 @@ ZELServerConnectionInfo::ZELServerConnectionInfo(const IZELServerString& host, u
 ZELServerConnectionInfo::ZELServerConnectionInfo(const IZELServerString& host, unsigned short port,
                                                  const IZELServerString& userName, const IZELServerString& password)
     : host_(toStdString(host)), port_(port), userName_(toStdString(userName)), password_(toStdString(password))
-{
-}
+{}
 
 void ZELServerConnectionInfo::takeAddress(const IZELServerString& address)
 {

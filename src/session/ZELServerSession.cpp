@@ -36,10 +36,7 @@ ZELServerSession::ZELServerSession()
     delete xmlPlatform_.acquire();
 }
 
-ZELServerSession::~ZELServerSession()
-{
-    teardown();
-}
+ZELServerSession::~ZELServerSession() { teardown(); }
 
 void ZELServerSession::teardown()
 {
@@ -52,7 +49,8 @@ void ZELServerSession::teardown()
     channel_.reset();
 }
 
-IZELServerStatus* ZELServerSession::init(const IZELServerConnectionInfo& info, const IZELServerStringArray* handshakeOptions)
+IZELServerStatus* ZELServerSession::init(const IZELServerConnectionInfo& info,
+                                         const IZELServerStringArray* handshakeOptions)
 {
     teardown();
     connectionKind_ = info.getConnectionKind();
@@ -82,32 +80,35 @@ void ZELServerSession::makeManagers()
         mountPointManager_.reset(makeMountPointManager(channel));
 }
 
-IZELServerConnectionInfo* ZELServerSession::createConnectionInfo(const IZELServerString& address, const IZELServerStringArray& properties)
+IZELServerConnectionInfo* ZELServerSession::createConnectionInfo(const IZELServerString& address,
+                                                                 const IZELServerStringArray& properties)
 {
     return new ZELServerConnectionInfo(address, properties);
 }
 
-IZELServerConnectionInfo* ZELServerSession::createConnectionInfo(const IZELServerString& address, const IZELServerString& userName, const IZELServerString& password)
+IZELServerConnectionInfo* ZELServerSession::createConnectionInfo(const IZELServerString& address,
+                                                                 const IZELServerString& userName,
+                                                                 const IZELServerString& password)
 {
     return new ZELServerConnectionInfo(address, userName, password);
 }
 
-IZELServerConnectionInfo* ZELServerSession::createConnectionInfo(const IZELServerString& host, unsigned short port, const IZELServerStringArray& properties)
+IZELServerConnectionInfo* ZELServerSession::createConnectionInfo(const IZELServerString& host, unsigned short port,
+                                                                 const IZELServerStringArray& properties)
 {
     return new ZELServerConnectionInfo(host, port, properties);
 }
 
-IZELServerConnectionInfo* ZELServerSession::createConnectionInfo(const IZELServerString& host, unsigned short port, const IZELServerString& userName, const IZELServerString& password)
+IZELServerConnectionInfo* ZELServerSession::createConnectionInfo(const IZELServerString& host, unsigned short port,
+                                                                 const IZELServerString& userName,
+                                                                 const IZELServerString& password)
 {
     return new ZELServerConnectionInfo(host, port, userName, password);
 }
 
 void ZELServerSession::destroyConnectionInfo(IZELServerConnectionInfo** info) { destroyObject(info); }
 
-IZELServerStatus* ZELServerSession::disconnect()
-{
-    return channel_ ? channel_->close() : nullptr;
-}
+IZELServerStatus* ZELServerSession::disconnect() { return channel_ ? channel_->close() : nullptr; }
 
 IZELServerTransformationManager* ZELServerSession::getTransformationManager() { return transformationManager_.get(); }
 IZELServerRepositoryManager* ZELServerSession::getRepositoryManager() { return repositoryManager_.get(); }
@@ -131,26 +132,48 @@ IZELServerStatus* ZELServerSession::getSessionProperty(const IZELServerString& n
     return status;
 }
 
-IZELServerIdentity* ZELServerSession::getIdentity()
-{
-    return channel_ ? channel_->getIdentity() : nullptr;
-}
+IZELServerIdentity* ZELServerSession::getIdentity() { return channel_ ? channel_->getIdentity() : nullptr; }
 
 void ZELServerSession::destroyStatus(IZELServerStatus** status) { destroyObject(status); }
 
 // Objects of the subsystems. Objects that send commands of their own are bound to the session's
 // channel as it is now (null before init): they must not outlive the next init.
 
-IZELServerTransformationRequest* ZELServerSession::createTransformationRequest(const IZELServerString& keyword, const IZELServerString& repository, const IZELServerWorkspace& workspace) { return makeTransformationRequest(keyword, repository, workspace); }
-IZELServerTransformationRequest* ZELServerSession::createTransformationRequest(const IZELServerString& keyword, const IZELServerString& repository, const IZELServerString& workspace) { return makeTransformationRequest(keyword, repository, workspace); }
-IZELServerTransformationRequest* ZELServerSession::createTransformationRequest(const IZELServerString& keyword, const IZELServerString& workspacePath) { return makeTransformationRequest(keyword, workspacePath); }
-void ZELServerSession::destroyTransformationRequest(IZELServerTransformationRequest** request) { destroyObject(request); }
+IZELServerTransformationRequest* ZELServerSession::createTransformationRequest(const IZELServerString& keyword,
+                                                                               const IZELServerString& repository,
+                                                                               const IZELServerWorkspace& workspace)
+{
+    return makeTransformationRequest(keyword, repository, workspace);
+}
+IZELServerTransformationRequest* ZELServerSession::createTransformationRequest(const IZELServerString& keyword,
+                                                                               const IZELServerString& repository,
+                                                                               const IZELServerString& workspace)
+{
+    return makeTransformationRequest(keyword, repository, workspace);
+}
+IZELServerTransformationRequest* ZELServerSession::createTransformationRequest(const IZELServerString& keyword,
+                                                                               const IZELServerString& workspacePath)
+{
+    return makeTransformationRequest(keyword, workspacePath);
+}
+void ZELServerSession::destroyTransformationRequest(IZELServerTransformationRequest** request)
+{
+    destroyObject(request);
+}
 
-IZELServerTransformationResult* ZELServerSession::createTransformationResult(const IZELServerString& resultText) { return makeTransformationResult(resultText); }
+IZELServerTransformationResult* ZELServerSession::createTransformationResult(const IZELServerString& resultText)
+{
+    return makeTransformationResult(resultText);
+}
 IZELServerTransformationResult* ZELServerSession::createTransformationResult() { return makeTransformationResult(); }
 void ZELServerSession::destroyTransformationResult(IZELServerTransformationResult** result) { destroyObject(result); }
 
-IZELServerService* ZELServerSession::createService(const IZELServerString& name, const IZELServerString& displayName, const IZELServerString& description, const IZELServerString& urlPattern) { return makeService(channel_.get(), name, displayName, description, urlPattern); }
+IZELServerService* ZELServerSession::createService(const IZELServerString& name, const IZELServerString& displayName,
+                                                   const IZELServerString& description,
+                                                   const IZELServerString& urlPattern)
+{
+    return makeService(channel_.get(), name, displayName, description, urlPattern);
+}
 IZELServerService* ZELServerSession::createService() { return makeService(channel_.get()); }
 void ZELServerSession::destroyService(IZELServerService** service) { destroyObject(service); }
 IZELServerVector<IZELServerService>* ZELServerSession::createServiceVector() { return makeServiceVector(); }
@@ -164,27 +187,60 @@ void ZELServerSession::destroyWorkspaceVector(IZELServerVector<IZELServerWorkspa
 IZELServerRepository* ZELServerSession::createRepository() { return makeRepository(channel_.get()); }
 void ZELServerSession::destroyRepository(IZELServerRepository** repository) { destroyObject(repository); }
 IZELServerVector<IZELServerRepository>* ZELServerSession::createRepositoryVector() { return makeRepositoryVector(); }
-void ZELServerSession::destroyRepositoryVector(IZELServerVector<IZELServerRepository>** vector) { destroyObject(vector); }
+void ZELServerSession::destroyRepositoryVector(IZELServerVector<IZELServerRepository>** vector)
+{
+    destroyObject(vector);
+}
 
 IZELServerWorkspaceSummary* ZELServerSession::createWorkspaceSummary() { return makeWorkspaceSummary(); }
 void ZELServerSession::destroyWorkspaceSummary(IZELServerWorkspaceSummary** summary) { destroyObject(summary); }
-IZELServerVector<IZELServerWorkspaceSummary>* ZELServerSession::createWorkspaceSummaryVector() { return makeWorkspaceSummaryVector(); }
-void ZELServerSession::destroyWorkspaceSummaryVector(IZELServerVector<IZELServerWorkspaceSummary>** vector) { destroyObject(vector); }
+IZELServerVector<IZELServerWorkspaceSummary>* ZELServerSession::createWorkspaceSummaryVector()
+{
+    return makeWorkspaceSummaryVector();
+}
+void ZELServerSession::destroyWorkspaceSummaryVector(IZELServerVector<IZELServerWorkspaceSummary>** vector)
+{
+    destroyObject(vector);
+}
 
 IZELServerWorkspaceService* ZELServerSession::createWorkspaceService() { return makeWorkspaceService(channel_.get()); }
-void ZELServerSession::destroyWorkspaceService(IZELServerWorkspaceService** workspaceService) { destroyObject(workspaceService); }
-IZELServerVector<IZELServerWorkspaceService>* ZELServerSession::createWorkspaceServiceVector() { return makeWorkspaceServiceVector(); }
-void ZELServerSession::destroyWorkspaceServiceVector(IZELServerVector<IZELServerWorkspaceService>** vector) { destroyObject(vector); }
+void ZELServerSession::destroyWorkspaceService(IZELServerWorkspaceService** workspaceService)
+{
+    destroyObject(workspaceService);
+}
+IZELServerVector<IZELServerWorkspaceService>* ZELServerSession::createWorkspaceServiceVector()
+{
+    return makeWorkspaceServiceVector();
+}
+void ZELServerSession::destroyWorkspaceServiceVector(IZELServerVector<IZELServerWorkspaceService>** vector)
+{
+    destroyObject(vector);
+}
 
 IZELServerCustomFormat* ZELServerSession::createCustomFormat() { return makeCustomFormat(); }
 void ZELServerSession::destroyCustomFormat(IZELServerCustomFormat** customFormat) { destroyObject(customFormat); }
-IZELServerVector<IZELServerCustomFormat>* ZELServerSession::createCustomFormatVector() { return makeCustomFormatVector(); }
-void ZELServerSession::destroyCustomFormatVector(IZELServerVector<IZELServerCustomFormat>** vector) { destroyObject(vector); }
+IZELServerVector<IZELServerCustomFormat>* ZELServerSession::createCustomFormatVector()
+{
+    return makeCustomFormatVector();
+}
+void ZELServerSession::destroyCustomFormatVector(IZELServerVector<IZELServerCustomFormat>** vector)
+{
+    destroyObject(vector);
+}
 
 IZELServerCustomTransformer* ZELServerSession::createCustomTransformer() { return makeCustomTransformer(); }
-void ZELServerSession::destroyCustomTransformer(IZELServerCustomTransformer** customTransformer) { destroyObject(customTransformer); }
-IZELServerVector<IZELServerCustomTransformer>* ZELServerSession::createCustomTransformerVector() { return makeCustomTransformerVector(); }
-void ZELServerSession::destroyCustomTransformerVector(IZELServerVector<IZELServerCustomTransformer>** vector) { destroyObject(vector); }
+void ZELServerSession::destroyCustomTransformer(IZELServerCustomTransformer** customTransformer)
+{
+    destroyObject(customTransformer);
+}
+IZELServerVector<IZELServerCustomTransformer>* ZELServerSession::createCustomTransformerVector()
+{
+    return makeCustomTransformerVector();
+}
+void ZELServerSession::destroyCustomTransformerVector(IZELServerVector<IZELServerCustomTransformer>** vector)
+{
+    destroyObject(vector);
+}
 
 IZELServerResource* ZELServerSession::createResource() { return makeResource(); }
 void ZELServerSession::destroyResource(IZELServerResource** resource) { destroyObject(resource); }
@@ -210,7 +266,10 @@ void ZELServerSession::destroyItemVector(IZELServerVector<IZELServerItem>** vect
 IZELServerMountPoint* ZELServerSession::createMountPoint() { return makeMountPoint(channel_.get()); }
 void ZELServerSession::destroyMountPoint(IZELServerMountPoint** mountPoint) { destroyObject(mountPoint); }
 IZELServerVector<IZELServerMountPoint>* ZELServerSession::createMountPointVector() { return makeMountPointVector(); }
-void ZELServerSession::destroyMountPointVector(IZELServerVector<IZELServerMountPoint>** vector) { destroyObject(vector); }
+void ZELServerSession::destroyMountPointVector(IZELServerVector<IZELServerMountPoint>** vector)
+{
+    destroyObject(vector);
+}
 
 IZELServerFileInfo* ZELServerSession::createFileInfo() { return makeFileInfo(); }
 void ZELServerSession::destroyFileInfo(IZELServerFileInfo** info) { destroyObject(info); }

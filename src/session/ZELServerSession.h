@@ -18,12 +18,18 @@ public:
     ZELServerSession();
     ~ZELServerSession() override;
 
-    IZELServerStatus* init(const IZELServerConnectionInfo& info, const IZELServerStringArray* handshakeOptions) override;
+    IZELServerStatus* init(const IZELServerConnectionInfo& info,
+                           const IZELServerStringArray* handshakeOptions) override;
 
-    IZELServerConnectionInfo* createConnectionInfo(const IZELServerString& address, const IZELServerStringArray& properties) override;
-    IZELServerConnectionInfo* createConnectionInfo(const IZELServerString& address, const IZELServerString& userName, const IZELServerString& password) override;
-    IZELServerConnectionInfo* createConnectionInfo(const IZELServerString& host, unsigned short port, const IZELServerStringArray& properties) override;
-    IZELServerConnectionInfo* createConnectionInfo(const IZELServerString& host, unsigned short port, const IZELServerString& userName, const IZELServerString& password) override;
+    IZELServerConnectionInfo* createConnectionInfo(const IZELServerString& address,
+                                                   const IZELServerStringArray& properties) override;
+    IZELServerConnectionInfo* createConnectionInfo(const IZELServerString& address, const IZELServerString& userName,
+                                                   const IZELServerString& password) override;
+    IZELServerConnectionInfo* createConnectionInfo(const IZELServerString& host, unsigned short port,
+                                                   const IZELServerStringArray& properties) override;
+    IZELServerConnectionInfo* createConnectionInfo(const IZELServerString& host, unsigned short port,
+                                                   const IZELServerString& userName,
+                                                   const IZELServerString& password) override;
     void destroyConnectionInfo(IZELServerConnectionInfo** info) override;
 
     IZELServerStatus* disconnect() override;
@@ -35,16 +41,22 @@ public:
     IZELServerStringArray* createStringArray() override;
     void destroyStringArray(IZELServerStringArray** array) override;
 
-    IZELServerTransformationRequest* createTransformationRequest(const IZELServerString& keyword, const IZELServerString& repository, const IZELServerWorkspace& workspace) override;
-    IZELServerTransformationRequest* createTransformationRequest(const IZELServerString& keyword, const IZELServerString& repository, const IZELServerString& workspace) override;
-    IZELServerTransformationRequest* createTransformationRequest(const IZELServerString& keyword, const IZELServerString& workspacePath) override;
+    IZELServerTransformationRequest* createTransformationRequest(const IZELServerString& keyword,
+                                                                 const IZELServerString& repository,
+                                                                 const IZELServerWorkspace& workspace) override;
+    IZELServerTransformationRequest* createTransformationRequest(const IZELServerString& keyword,
+                                                                 const IZELServerString& repository,
+                                                                 const IZELServerString& workspace) override;
+    IZELServerTransformationRequest* createTransformationRequest(const IZELServerString& keyword,
+                                                                 const IZELServerString& workspacePath) override;
     void destroyTransformationRequest(IZELServerTransformationRequest** request) override;
 
     IZELServerTransformationResult* createTransformationResult(const IZELServerString& resultText) override;
     IZELServerTransformationResult* createTransformationResult() override;
     void destroyTransformationResult(IZELServerTransformationResult** result) override;
 
-    IZELServerService* createService(const IZELServerString& name, const IZELServerString& displayName, const IZELServerString& description, const IZELServerString& urlPattern) override;
+    IZELServerService* createService(const IZELServerString& name, const IZELServerString& displayName,
+                                     const IZELServerString& description, const IZELServerString& urlPattern) override;
     IZELServerService* createService() override;
     void destroyService(IZELServerService** service) override;
     IZELServerVector<IZELServerService>* createServiceVector() override;

@@ -23,5 +23,4 @@ ZEL_API void ZEL_destroyServerSession(IZELServerSession** session)
     delete *session;
     *session = nullptr;
 }
-
 }

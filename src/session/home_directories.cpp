@@ -13,19 +13,22 @@ using platform::kPathSeparator;
 constexpr unsigned kBuildNumber = 18286;
 constexpr const char* kProductKey = "SOFTWARE\\Corvane\\Quorlith";
 
-std::string nonEmptyVariable(const char* name) {
+std::string nonEmptyVariable(const char* name)
+{
     return platform::getEnvironmentVariable(name).value_or(std::string());
 }
 
 // The folder of a module, its separator kept.
-std::string folderOf(const std::string& modulePath) {
+std::string folderOf(const std::string& modulePath)
+{
     const std::size_t cut = modulePath.find_last_of(kPathSeparator);
     return cut == std::string::npos ? std::string() : modulePath.substr(0, cut + 1);
 }
 
 // The module's own file name; the expected name when the module could not be found at all. (When
 // the library is linked into a program, the module is the program.)
-std::string fileNameOf(const std::string& modulePath, const char* expectedName) {
+std::string fileNameOf(const std::string& modulePath, const char* expectedName)
+{
     const std::size_t cut = modulePath.find_last_of(kPathSeparator);
     return cut == std::string::npos || cut + 1 == modulePath.size() ? std::string(expectedName)
                                                                     : modulePath.substr(cut + 1);
@@ -33,7 +36,8 @@ std::string fileNameOf(const std::string& modulePath, const char* expectedName) 
 
 // The folder already ends in a separator; the doubled separator that follows is harmless to a file
 // search.
-bool moduleFolderLooksInstalled(const std::string& folder, const std::string& moduleFileName) {
+bool moduleFolderLooksInstalled(const std::string& folder, const std::string& moduleFileName)
+{
     const std::string prefix = folder + kPathSeparator;
     if (platform::findFirstFile(prefix + moduleFileName)) {
         return true;
@@ -41,15 +45,16 @@ bool moduleFolderLooksInstalled(const std::string& folder, const std::string& mo
     return platform::findFirstFile(prefix + "messages" + kPathSeparator + "*");
 }
 
-void ensureTrailingSeparator(std::string& directory) {
+void ensureTrailingSeparator(std::string& directory)
+{
     if (directory.empty() || directory.back() != kPathSeparator) {
         directory += kPathSeparator;
     }
 }
 
-std::string registryHome() {
-    const std::string buildKey =
-        std::string(kProductKey) + "\\BUILD" + "\\" + std::to_string(kBuildNumber);
+std::string registryHome()
+{
+    const std::string buildKey = std::string(kProductKey) + "\\BUILD" + "\\" + std::to_string(kBuildNumber);
     std::string home = platform::readMachineRegistryString(buildKey.c_str(), "ZEL_HOME");
     if (home.empty()) {
         home = platform::readMachineRegistryString(kProductKey, "ZEL_HOME");
@@ -65,7 +70,8 @@ std::once_flag runtimeEntryOnce;
 // built from the first search's result only.
 char* runtimeEntry = nullptr;
 
-void publishFrameworkHome(const std::string& home) {
+void publishFrameworkHome(const std::string& home)
+{
     std::call_once(runtimeEntryOnce, [&home] {
         static std::string entry = "ZEL_HOME=" + home;
         runtimeEntry = entry.data();
@@ -76,7 +82,8 @@ void publishFrameworkHome(const std::string& home) {
 
 }  // namespace
 
-std::string serverLibraryHomeDirectory() {
+std::string serverLibraryHomeDirectory()
+{
     std::string home = nonEmptyVariable("ZEL_SERVERAPI_HOME");
     if (home.empty()) {
         const std::string modulePath = platform::libraryModulePath();
@@ -89,7 +96,8 @@ std::string serverLibraryHomeDirectory() {
     return home;
 }
 
-std::string frameworkHomeDirectory(const std::string& callerDirectory) {
+std::string frameworkHomeDirectory(const std::string& callerDirectory)
+{
     std::lock_guard<std::mutex> lock(frameworkHomeMutex);
 
     const std::string overrideHome = nonEmptyVariable("ZEL_HOME_OVERRIDE");
@@ -98,16 +106,14 @@ std::string frameworkHomeDirectory(const std::string& callerDirectory) {
         platform::setEnvironmentVariable("ZEL_HOME_OVERRIDE", std::string());
     } else if (!callerDirectory.empty()) {
         frameworkHome = callerDirectory;
-    } else if (std::string fromEnvironment = nonEmptyVariable("ZEL_HOME");
-               !fromEnvironment.empty()) {
+    } else if (std::string fromEnvironment = nonEmptyVariable("ZEL_HOME"); !fromEnvironment.empty()) {
         frameworkHome = fromEnvironment;
     }
 
     if (frameworkHome.empty()) {
         const std::string modulePath = platform::frameworkModulePath();
         const std::string moduleFolder = folderOf(modulePath);
-        if (!moduleFolderLooksInstalled(moduleFolder,
-                                        fileNameOf(modulePath, platform::kFrameworkModuleName))) {
+        if (!moduleFolderLooksInstalled(moduleFolder, fileNameOf(modulePath, platform::kFrameworkModuleName))) {
             frameworkHome = registryHome();
         }
         if (frameworkHome.empty()) {

@@ -24,7 +24,8 @@ char pluginName[kPluginNameLength + 1] = {};
 std::atomic<bool> notYetReported{true};
 char reportBuffer[512];
 
-[[noreturn]] void reportOutOfMemory(int errorCode) {
+[[noreturn]] void reportOutOfMemory(int errorCode)
+{
     IZELLogSink* sink = nullptr;
     {
         std::lock_guard<std::mutex> lock(handlerMutex);
@@ -32,10 +33,9 @@ char reportBuffer[512];
         // already on its way out, typically from the host's log itself running short while it
         // writes the first report.
         if (logSink != nullptr && notYetReported.exchange(false)) {
-            std::snprintf(
-                reportBuffer, sizeof reportBuffer,
-                "Insufficient memory available -- error code was %d. Offending plug-in is '%s'",
-                errorCode, pluginName);
+            std::snprintf(reportBuffer, sizeof reportBuffer,
+                          "Insufficient memory available -- error code was %d. Offending plug-in is '%s'", errorCode,
+                          pluginName);
             sink = logSink;
         }
     }
@@ -49,8 +49,8 @@ char reportBuffer[512];
 
 }  // namespace
 
-extern "C" ZEL_API ZELMemoryFailureRoutine DllSetMemoryErrorHandler(IZELLogSink* sink,
-                                                                    const char* name) {
+extern "C" ZEL_API ZELMemoryFailureRoutine DllSetMemoryErrorHandler(IZELLogSink* sink, const char* name)
+{
     {
         std::lock_guard<std::mutex> lock(handlerMutex);
         logSink = sink;

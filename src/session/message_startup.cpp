@@ -17,14 +17,15 @@ std::mutex databaseMutex;
 ZELLocalizedMessageDatabase* database = nullptr;
 bool showNumbers = false;
 
-StatusInfo* startUpFailure(const std::string& text) {
-    return new StatusInfo(StatusInfo::kDefaultType, text, std::string(), kStartUpFailedLine,
-                          kMessageSourceFile);
+StatusInfo* startUpFailure(const std::string& text)
+{
+    return new StatusInfo(StatusInfo::kDefaultType, text, std::string(), kStartUpFailedLine, kMessageSourceFile);
 }
 
 // Returns the failure record, or null when the database exists afterwards. (When even the record
 // cannot be allocated the caller sees null with the database still absent.)
-StatusInfo* startLocked(const std::string& homeDirectory) {
+StatusInfo* startLocked(const std::string& homeDirectory)
+{
     StatusInfo* failure = nullptr;
     if (database == nullptr) {
         std::unique_ptr<ZELLocalizedMessageDatabase> created(new ZELLocalizedMessageDatabase);
@@ -44,29 +45,34 @@ StatusInfo* startLocked(const std::string& homeDirectory) {
 
 }  // namespace
 
-StatusInfo* startMessageDatabase(const std::string& homeDirectory) {
+StatusInfo* startMessageDatabase(const std::string& homeDirectory)
+{
     std::lock_guard<std::mutex> lock(databaseMutex);
     return startLocked(homeDirectory);
 }
 
-void destroyMessageDatabase() {
+void destroyMessageDatabase()
+{
     std::lock_guard<std::mutex> lock(databaseMutex);
     delete database;
     database = nullptr;
 }
 
-bool messageDatabaseStarted() {
+bool messageDatabaseStarted()
+{
     std::lock_guard<std::mutex> lock(databaseMutex);
     return database != nullptr;
 }
 
-bool showMessageNumbers() {
+bool showMessageNumbers()
+{
     std::lock_guard<std::mutex> lock(databaseMutex);
     return showNumbers;
 }
 
-StatusInfo* fillInMessage(unsigned number, const IZELServerStringArray* parameters,
-                          std::string& output, bool callerFlag) {
+StatusInfo* fillInMessage(unsigned number, const IZELServerStringArray* parameters, std::string& output,
+                          bool callerFlag)
+{
     // Lock order is always the database's, then the framework home search's.
     std::lock_guard<std::mutex> lock(databaseMutex);
     if (database == nullptr) {
@@ -83,10 +89,9 @@ StatusInfo* fillInMessage(unsigned number, const IZELServerStringArray* paramete
     }
     const ZELROStringArrayWrapper wrappedParameters(parameters);
     ZELObsoleteStringImp filled;
-    if (!database->createFilledInMessage(number, &wrappedParameters, &filled, callerFlag,
-                                         showNumbers)) {
-        return new StatusInfo(StatusInfo::kDefaultType, database->getLastErrorMessage(),
-                              std::string(), kFillInFailedLine, kMessageSourceFile);
+    if (!database->createFilledInMessage(number, &wrappedParameters, &filled, callerFlag, showNumbers)) {
+        return new StatusInfo(StatusInfo::kDefaultType, database->getLastErrorMessage(), std::string(),
+                              kFillInFailedLine, kMessageSourceFile);
     }
     output = filled.str();
     return nullptr;

@@ -37,8 +37,8 @@ bool showMessageNumbers();
 // start-up's record with a second frame at line 139, or a record at line 148 with the catalogue's
 // error text when the number has no text. `callerFlag` keeps slots without a parameter as written.
 // (Should memory run out even for the record, null comes back with `output` untouched.)
-StatusInfo* fillInMessage(unsigned number, const IZELServerStringArray* parameters,
-                          std::string& output, bool callerFlag);
+StatusInfo* fillInMessage(unsigned number, const IZELServerStringArray* parameters, std::string& output,
+                          bool callerFlag);
 
 // Held by a status object that started the database: destroying the token destroys the database,
 // so the database never outlives the last status that used it.

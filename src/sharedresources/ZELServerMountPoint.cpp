@@ -36,10 +36,7 @@ void copyOut(const std::string& text, IZELServerString& out)
 
 IZELServerStatus* notConnected() { return makeStatus(msg::kNotConnected); }
 
-IZELServerStatus* readingStatus(int code)
-{
-    return code == 0 ? nullptr : makeStatus(static_cast<unsigned>(code));
-}
+IZELServerStatus* readingStatus(int code) { return code == 0 ? nullptr : makeStatus(static_cast<unsigned>(code)); }
 
 // The stream opening is not enough: on POSIX a directory opens for reading and fails only at the
 // first read, which would be after the command had gone out.

@@ -42,7 +42,8 @@ int readFileInfoReply(std::string_view body, IZELServerFileInfo& info)
 
 int readFileInfosReply(std::string_view body, IZELServerVector<IZELServerFileInfo>& infos)
 {
-    return readObjectList(body, kFileInfoTag, infos, [] { return new ZELServerFileInfo(); }, fillFileInfo);
+    return readObjectList(
+        body, kFileInfoTag, infos, [] { return new ZELServerFileInfo(); }, fillFileInfo);
 }
 
 }  // namespace zel

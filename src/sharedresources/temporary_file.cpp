@@ -39,12 +39,12 @@ std::optional<TemporaryFile> TemporaryFile::createIn(const std::string& director
         // Created only when new: that is what makes the name ours even when another process
         // guesses the same one.
         switch (platform::createNewFile(path)) {
-            case platform::NewFile::Created:
-                return TemporaryFile(path);
-            case platform::NewFile::Exists:
-                continue;
-            case platform::NewFile::Failed:
-                return std::nullopt;
+        case platform::NewFile::Created:
+            return TemporaryFile(path);
+        case platform::NewFile::Exists:
+            continue;
+        case platform::NewFile::Failed:
+            return std::nullopt;
         }
     }
     return std::nullopt;
@@ -60,9 +60,7 @@ std::string TemporaryFile::directoryFor(const std::string& target)
     return error ? std::string() : folder.string();
 }
 
-TemporaryFile::TemporaryFile(TemporaryFile&& other) noexcept : path_(std::exchange(other.path_, std::string()))
-{
-}
+TemporaryFile::TemporaryFile(TemporaryFile&& other) noexcept : path_(std::exchange(other.path_, std::string())) {}
 
 TemporaryFile::~TemporaryFile()
 {

@@ -38,17 +38,22 @@ public:
     virtual IZELServerStatus* close() = 0;
     // A new request for `keyword` carrying the identity and "clientID", with the directive and
     // notification pair lists kept for the result-port exchange.
-    virtual IZELServerRequest* createRequest(const std::string& keyword, const IZELServerStringArray& directives, const IZELServerStringArray& notifications) = 0;
+    virtual IZELServerRequest* createRequest(const std::string& keyword, const IZELServerStringArray& directives,
+                                             const IZELServerStringArray& notifications) = 0;
     virtual IZELServerRequest* createRequest(const std::string& keyword) = 0;
     virtual IZELServerResponse* createResponse() = 0;
     // Direction kUpload sends the local file with the command, kDownload receives one into it.
-    virtual IZELServerStatus* transferFile(IZELServerRequest& request, IZELServerResponse& response, const std::string& localPath, unsigned direction, IZELServerProgressListener* progress) = 0;
+    virtual IZELServerStatus* transferFile(IZELServerRequest& request, IZELServerResponse& response,
+                                           const std::string& localPath, unsigned direction,
+                                           IZELServerProgressListener* progress) = 0;
     // kPlainRequest (or kPlainRequestAlias): one exchange; kResultPortRequest: the server answers on a
     // connection to a port this side listens on.
-    virtual IZELServerStatus* sendRequest(IZELServerRequest& request, IZELServerResponse& response, unsigned requestType) = 0;
+    virtual IZELServerStatus* sendRequest(IZELServerRequest& request, IZELServerResponse& response,
+                                          unsigned requestType) = 0;
     // One exchange with at most one of an upload or a download file (null for none). The files are
     // opened by the caller, so a local file that cannot be opened is reported before anything is sent.
-    virtual IZELServerStatus* exchange(IZELServerRequest& request, IZELServerResponse& response, LocalFile* upload, LocalFile* download, IZELServerProgressListener* progress) = 0;
+    virtual IZELServerStatus* exchange(IZELServerRequest& request, IZELServerResponse& response, LocalFile* upload,
+                                       LocalFile* download, IZELServerProgressListener* progress) = 0;
     virtual void destroyRequest(IZELServerRequest* request) = 0;
     virtual void destroyResponse(IZELServerResponse* response) = 0;
     // The identity received at sign-in (owned by the channel; null before).

@@ -41,7 +41,8 @@ public:
     // The "serviceObject" document: root "REP_ADD_SERVICE", one "SERVICE" element.
     virtual int addServicePayload(const std::string& name, const IZELServerService& service) = 0;
     // The "repositoryObject" document: root "REP_ADD_REPOSITORY", one "REPOSITORY" element.
-    virtual int addRepositoryPayload(const std::string& name, const IZELServerString& repositoryName, const IZELServerString& description) = 0;
+    virtual int addRepositoryPayload(const std::string& name, const IZELServerString& repositoryName,
+                                     const IZELServerString& description) = 0;
     // Builds a document with root `rootName`, lets `object` write into it, and adds the serialised text
     // as value `name`. 0, or 393620 / the serialiser's message number.
     virtual int addXmlValue(const std::string& name, const XmlWritable& object, const std::string& rootName) = 0;

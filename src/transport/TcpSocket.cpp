@@ -23,11 +23,10 @@ std::atomic<std::uint32_t> libraryCleanups{0};
 constexpr int kListenBacklog = 5;
 constexpr std::size_t kHostNameCapacity = 256;
 
-bool isValid(platform::SocketHandle socket) {
-    return socket != platform::kInvalidSocket;
-}
+bool isValid(platform::SocketHandle socket) { return socket != platform::kInvalidSocket; }
 
-std::unique_ptr<char[]> copyText(const char* text) {
+std::unique_ptr<char[]> copyText(const char* text)
+{
     const std::size_t length = std::strlen(text);
     auto copy = std::make_unique<char[]>(length + 1);
     std::memcpy(copy.get(), text, length + 1);
@@ -36,24 +35,25 @@ std::unique_ptr<char[]> copyText(const char* text) {
 
 }  // namespace
 
-TcpSocket::TcpSocket(const char* host, std::uint16_t remotePort) {
+TcpSocket::TcpSocket(const char* host, std::uint16_t remotePort)
+{
     countLibraryUser();
     connectTo(host, remotePort);
 }
 
-TcpSocket::TcpSocket(std::uint16_t& localPort) {
+TcpSocket::TcpSocket(std::uint16_t& localPort)
+{
     countLibraryUser();
     startListening(localPort);
 }
 
-TcpSocket::~TcpSocket() {
-    close();
-}
+TcpSocket::~TcpSocket() { close(); }
 
 // The count is taken before the connect or listen is tried and a failed constructor leaves no main
 // socket for close() to give it back through. Each failed socket therefore keeps the library started
 // for the rest of the process; that is how the library has always behaved and it stays so.
-void TcpSocket::countLibraryUser() {
+void TcpSocket::countLibraryUser()
+{
     const std::lock_guard<std::mutex> lock(libraryMutex);
     if (libraryUsers.load() == 0) {
         platform::socketLibraryStartup();
@@ -62,7 +62,8 @@ void TcpSocket::countLibraryUser() {
     ++libraryUsers;
 }
 
-void TcpSocket::releaseLibraryUser() {
+void TcpSocket::releaseLibraryUser()
+{
     const std::lock_guard<std::mutex> lock(libraryMutex);
     if (libraryUsers.load() == 0) {
         return;
@@ -73,25 +74,21 @@ void TcpSocket::releaseLibraryUser() {
     }
 }
 
-std::uint32_t TcpSocket::socketLibraryUsers() noexcept {
-    return libraryUsers.load();
-}
+std::uint32_t TcpSocket::socketLibraryUsers() noexcept { return libraryUsers.load(); }
 
-std::uint32_t TcpSocket::socketLibraryStartups() noexcept {
-    return libraryStartups.load();
-}
+std::uint32_t TcpSocket::socketLibraryStartups() noexcept { return libraryStartups.load(); }
 
-std::uint32_t TcpSocket::socketLibraryCleanups() noexcept {
-    return libraryCleanups.load();
-}
+std::uint32_t TcpSocket::socketLibraryCleanups() noexcept { return libraryCleanups.load(); }
 
-void TcpSocket::shutdownAndClose(platform::SocketHandle& socket) {
+void TcpSocket::shutdownAndClose(platform::SocketHandle& socket)
+{
     platform::shutdownBoth(socket);
     platform::closeSocket(socket);
     socket = platform::kInvalidSocket;
 }
 
-void TcpSocket::connectTo(const char* name, std::uint16_t remotePort) {
+void TcpSocket::connectTo(const char* name, std::uint16_t remotePort)
+{
     platform::SocketHandle socket = platform::createStreamSocket();
     if (!isValid(socket)) {
         errorCode = SOCK_CREATE_FAILED;
@@ -115,7 +112,8 @@ void TcpSocket::connectTo(const char* name, std::uint16_t remotePort) {
     hostName = copyText(name);
 }
 
-void TcpSocket::startListening(std::uint16_t& localPort) {
+void TcpSocket::startListening(std::uint16_t& localPort)
+{
     platform::SocketHandle socket = platform::createStreamSocket();
     if (!isValid(socket)) {
         errorCode = SOCK_CREATE_FAILED;
@@ -147,19 +145,17 @@ void TcpSocket::startListening(std::uint16_t& localPort) {
     port = localPort;
 }
 
-platform::SocketHandle TcpSocket::ioSocket() const {
-    return isValid(acceptedSocket) ? acceptedSocket : mainSocket;
-}
+platform::SocketHandle TcpSocket::ioSocket() const { return isValid(acceptedSocket) ? acceptedSocket : mainSocket; }
 
-std::int32_t TcpSocket::receiveExact(void* buffer, std::int32_t count, std::int32_t* received) {
+std::int32_t TcpSocket::receiveExact(void* buffer, std::int32_t count, std::int32_t* received)
+{
     if (count < 1) {
         return 0;
     }
     auto* bytes = static_cast<char*>(buffer);
     std::int32_t total = 0;
     for (;;) {
-        const long got = platform::receiveSome(ioSocket(), bytes + total,
-                                               static_cast<std::size_t>(count - total));
+        const long got = platform::receiveSome(ioSocket(), bytes + total, static_cast<std::size_t>(count - total));
         if (got == 0) {
             // A clean close sets no error number; reading one here would report whatever an earlier
             // call (often the probe's would-block) left behind.
@@ -167,12 +163,12 @@ std::int32_t TcpSocket::receiveExact(void* buffer, std::int32_t count, std::int3
         }
         if (got < 0) {
             switch (platform::lastSocketError()) {
-                case platform::SocketError::TimedOut:
-                    return SOCK_TIMED_OUT;
-                case platform::SocketError::WouldBlock:
-                    return SOCK_WOULD_BLOCK;
-                case platform::SocketError::Other:
-                    return SOCK_RECEIVE_FAILED;
+            case platform::SocketError::TimedOut:
+                return SOCK_TIMED_OUT;
+            case platform::SocketError::WouldBlock:
+                return SOCK_WOULD_BLOCK;
+            case platform::SocketError::Other:
+                return SOCK_RECEIVE_FAILED;
             }
             return SOCK_RECEIVE_FAILED;
         }
@@ -188,7 +184,8 @@ std::int32_t TcpSocket::receiveExact(void* buffer, std::int32_t count, std::int3
 
 // Callers hand over whole frames or whole file chunks; a short send is reported rather than resumed,
 // because the far side cannot resynchronise on a partly written frame anyway.
-std::int32_t TcpSocket::sendBuffer(const void* buffer, std::size_t count) {
+std::int32_t TcpSocket::sendBuffer(const void* buffer, std::size_t count)
+{
     const long sent = platform::sendSome(ioSocket(), buffer, count);
     if (sent < 0 || static_cast<std::size_t>(sent) != count) {
         return SOCK_SEND_FAILED;
@@ -196,7 +193,8 @@ std::int32_t TcpSocket::sendBuffer(const void* buffer, std::size_t count) {
     return 0;
 }
 
-std::int32_t TcpSocket::acceptPeer() {
+std::int32_t TcpSocket::acceptPeer()
+{
     if (isValid(acceptedSocket)) {
         shutdownAndClose(acceptedSocket);
     }
@@ -217,7 +215,8 @@ std::int32_t TcpSocket::acceptPeer() {
 
 // No peek: the one byte is consumed. The server never sends anything unasked, so whatever is waiting
 // between commands is stale and losing it does no harm.
-bool TcpSocket::probeConnection() {
+bool TcpSocket::probeConnection()
+{
     const platform::SocketHandle socket = ioSocket();
     // A socket that cannot be made non-blocking must not be read: the read could wait for ever.
     if (!platform::setNonBlocking(socket, true)) {
@@ -233,7 +232,8 @@ bool TcpSocket::probeConnection() {
     return got < 0 && error == platform::SocketError::WouldBlock;
 }
 
-void TcpSocket::localHostAddress(char* buffer, std::int32_t size) {
+void TcpSocket::localHostAddress(char* buffer, std::int32_t size)
+{
     if (buffer == nullptr || size <= 0) {
         return;
     }
@@ -253,7 +253,8 @@ void TcpSocket::localHostAddress(char* buffer, std::int32_t size) {
     std::memcpy(buffer, dotted.c_str(), dotted.size() + 1);
 }
 
-void TcpSocket::close() {
+void TcpSocket::close()
+{
     if (isValid(acceptedSocket)) {
         shutdownAndClose(acceptedSocket);
     }

@@ -123,10 +123,7 @@ int ZELServerResponse::readCustomTransformers(IZELServerVector<IZELServerCustomT
     return readCustomTransformersReply(body_, transformers);
 }
 
-int ZELServerResponse::readResource(IZELServerResource& resource) const
-{
-    return readResourceReply(body_, resource);
-}
+int ZELServerResponse::readResource(IZELServerResource& resource) const { return readResourceReply(body_, resource); }
 
 int ZELServerResponse::readResources(IZELServerVector<IZELServerResource>& resources) const
 {
@@ -158,30 +155,18 @@ int ZELServerResponse::readRepositories(IZELServerVector<IZELServerRepository>& 
     return readRepositoriesReply(body_, channel_, repositories);
 }
 
-int ZELServerResponse::readLogFileInfo(IZELServerLogFileInfo& info) const
-{
-    return readLogFileInfoReply(body_, info);
-}
+int ZELServerResponse::readLogFileInfo(IZELServerLogFileInfo& info) const { return readLogFileInfoReply(body_, info); }
 
-int ZELServerResponse::readTemplate(IZELServerTemplate& templ) const
-{
-    return readTemplateReply(body_, templ);
-}
+int ZELServerResponse::readTemplate(IZELServerTemplate& templ) const { return readTemplateReply(body_, templ); }
 
 int ZELServerResponse::readTemplates(IZELServerVector<IZELServerTemplate>& templates) const
 {
     return readTemplatesReply(body_, templates);
 }
 
-int ZELServerResponse::readItem(IZELServerItem& item) const
-{
-    return readItemReply(body_, item);
-}
+int ZELServerResponse::readItem(IZELServerItem& item) const { return readItemReply(body_, item); }
 
-int ZELServerResponse::readUserToken(IZELServerUserToken& token) const
-{
-    return readUserTokenReply(body_, token);
-}
+int ZELServerResponse::readUserToken(IZELServerUserToken& token) const { return readUserTokenReply(body_, token); }
 
 int ZELServerResponse::readMountPoint(IZELServerMountPoint& mountPoint) const
 {
@@ -193,10 +178,7 @@ int ZELServerResponse::readMountPoints(IZELServerVector<IZELServerMountPoint>& m
     return readMountPointsReply(body_, channel_, mountPoints);
 }
 
-int ZELServerResponse::readFileInfo(IZELServerFileInfo& info) const
-{
-    return readFileInfoReply(body_, info);
-}
+int ZELServerResponse::readFileInfo(IZELServerFileInfo& info) const { return readFileInfoReply(body_, info); }
 
 int ZELServerResponse::readFileInfos(IZELServerVector<IZELServerFileInfo>& infos) const
 {

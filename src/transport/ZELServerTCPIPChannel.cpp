@@ -49,20 +49,11 @@ constexpr std::int32_t kAddressBufferSize = 50;
 using RequestOwner = std::unique_ptr<IZELServerRequest>;
 using ResponseOwner = std::unique_ptr<IZELServerResponse>;
 
-IZELServerStatus* channelError(std::string_view text)
-{
-    return makeStatus(msg::kServerError, std::string(text));
-}
+IZELServerStatus* channelError(std::string_view text) { return makeStatus(msg::kServerError, std::string(text)); }
 
-IZELServerStatus* sendFailed(std::int32_t code)
-{
-    return makeStatus(msg::kSendFailed, decimalText(code));
-}
+IZELServerStatus* sendFailed(std::int32_t code) { return makeStatus(msg::kSendFailed, decimalText(code)); }
 
-IZELServerStatus* receiveFailed(std::int32_t code)
-{
-    return makeStatus(msg::kReceiveFailed, decimalText(code));
-}
+IZELServerStatus* receiveFailed(std::int32_t code) { return makeStatus(msg::kReceiveFailed, decimalText(code)); }
 
 IZELServerStatus* serverErrorStatus(std::string_view body)
 {
@@ -110,12 +101,12 @@ IZELServerStatus* receiveAcknowledgement(TcpSocket& socket)
     }
     const wire::AckReading ack = wire::readAcknowledgement(payload);
     switch (ack.outcome) {
-        case wire::AckOutcome::Ready:
-            return nullptr;
-        case wire::AckOutcome::NotTwoParts:
-            return makeStatus(msg::kReplyWithoutBody, payload);
-        case wire::AckOutcome::Refused:
-            break;
+    case wire::AckOutcome::Ready:
+        return nullptr;
+    case wire::AckOutcome::NotTwoParts:
+        return makeStatus(msg::kReplyWithoutBody, payload);
+    case wire::AckOutcome::Refused:
+        break;
     }
     return serverErrorStatus(ack.body);
 }
@@ -139,10 +130,7 @@ IZELServerStatus* classifyReply(const std::string& reply, IZELServerResponse& re
 
 // Socket failures that leave a listener unable to take the server's call. A refused SO_REUSEADDR
 // does not: the bind that follows decides.
-bool listenerUnusable(std::int32_t errorCode)
-{
-    return errorCode != 0 && errorCode != SOCK_REUSE_FAILED;
-}
+bool listenerUnusable(std::int32_t errorCode) { return errorCode != 0 && errorCode != SOCK_REUSE_FAILED; }
 
 bool peerIsTrusted(std::string_view trustedHostNames, const char* peerAddress)
 {
@@ -218,7 +206,8 @@ ZELServerTCPIPChannel::~ZELServerTCPIPChannel()
 
 // ---- Connection and sign-in -----------------------------------------------------------------------
 
-IZELServerStatus* ZELServerTCPIPChannel::open(const IZELServerConnectionInfo& info, const IZELServerStringArray* options)
+IZELServerStatus* ZELServerTCPIPChannel::open(const IZELServerConnectionInfo& info,
+                                              const IZELServerStringArray* options)
 {
     takeProperties(info);
     if (options != nullptr && options->entries() > 1) {
@@ -283,24 +272,24 @@ IZELServerStatus* ZELServerTCPIPChannel::signIn(const IZELServerConnectionInfo& 
         return makeStatus(msg::kSignInRefused);
     }
     switch (info.getAuthenticationKind()) {
-        case kTokenAuthentication:
-            // A token sign-in is configured through the "USER_TOKEN" connection property.
-            request->addValue("userToken", propertyOf(info, "USER_TOKEN").value_or(std::string()));
-            break;
-        case kSingleSignOnAuthentication:
-            if (const std::optional<std::string> data = propertyOf(info, "SSO_AUTH_DATA")) {
-                request->addValue("ssoAuthData", *data);
-            }
-            break;
-        default: {
-            ZELServerString user;
-            ZELServerString password;
-            info.getUserName(user);
-            info.getPassword(password);
-            request->addValue("userID", user);
-            request->addValue("userPassword", password);
-            break;
+    case kTokenAuthentication:
+        // A token sign-in is configured through the "USER_TOKEN" connection property.
+        request->addValue("userToken", propertyOf(info, "USER_TOKEN").value_or(std::string()));
+        break;
+    case kSingleSignOnAuthentication:
+        if (const std::optional<std::string> data = propertyOf(info, "SSO_AUTH_DATA")) {
+            request->addValue("ssoAuthData", *data);
         }
+        break;
+    default: {
+        ZELServerString user;
+        ZELServerString password;
+        info.getUserName(user);
+        info.getPassword(password);
+        request->addValue("userID", user);
+        request->addValue("userPassword", password);
+        break;
+    }
     }
     if (IZELServerStatus* status = sendRequest(*request, *response, kPlainRequest)) {
         return status;
@@ -330,7 +319,9 @@ IZELServerStatus* ZELServerTCPIPChannel::close()
 
 // ---- Requests and responses -----------------------------------------------------------------------
 
-IZELServerRequest* ZELServerTCPIPChannel::createRequest(const std::string& keyword, const IZELServerStringArray& directives, const IZELServerStringArray& notifications)
+IZELServerRequest* ZELServerTCPIPChannel::createRequest(const std::string& keyword,
+                                                        const IZELServerStringArray& directives,
+                                                        const IZELServerStringArray& notifications)
 {
     IZELServerRequest* request = createRequest(keyword);
     if (request != nullptr) {
@@ -345,29 +336,19 @@ IZELServerRequest* ZELServerTCPIPChannel::createRequest(const std::string& keywo
     return new ZELServerTCPIPRequest(keyword, identity_.get(), clientId_);
 }
 
-IZELServerResponse* ZELServerTCPIPChannel::createResponse()
-{
-    return new ZELServerResponse(this);
-}
+IZELServerResponse* ZELServerTCPIPChannel::createResponse() { return new ZELServerResponse(this); }
 
-void ZELServerTCPIPChannel::destroyRequest(IZELServerRequest* request)
-{
-    delete request;
-}
+void ZELServerTCPIPChannel::destroyRequest(IZELServerRequest* request) { delete request; }
 
-void ZELServerTCPIPChannel::destroyResponse(IZELServerResponse* response)
-{
-    delete response;
-}
+void ZELServerTCPIPChannel::destroyResponse(IZELServerResponse* response) { delete response; }
 
-IZELServerIdentity* ZELServerTCPIPChannel::getIdentity()
-{
-    return identity_.get();
-}
+IZELServerIdentity* ZELServerTCPIPChannel::getIdentity() { return identity_.get(); }
 
 // ---- Commands -------------------------------------------------------------------------------------
 
-IZELServerStatus* ZELServerTCPIPChannel::transferFile(IZELServerRequest& request, IZELServerResponse& response, const std::string& localPath, unsigned direction, IZELServerProgressListener* progress)
+IZELServerStatus* ZELServerTCPIPChannel::transferFile(IZELServerRequest& request, IZELServerResponse& response,
+                                                      const std::string& localPath, unsigned direction,
+                                                      IZELServerProgressListener* progress)
 {
     if (direction == kUpload) {
         LocalFile file(localPath, LocalFile::Mode::Read);
@@ -386,20 +367,23 @@ IZELServerStatus* ZELServerTCPIPChannel::transferFile(IZELServerRequest& request
     return channelError(kInvalidDirection);
 }
 
-IZELServerStatus* ZELServerTCPIPChannel::sendRequest(IZELServerRequest& request, IZELServerResponse& response, unsigned requestType)
+IZELServerStatus* ZELServerTCPIPChannel::sendRequest(IZELServerRequest& request, IZELServerResponse& response,
+                                                     unsigned requestType)
 {
     switch (requestType) {
-        case kPlainRequest:
-        case kPlainRequestAlias:
-            return exchange(request, response, nullptr, nullptr, nullptr);
-        case kResultPortRequest:
-            return resultPortExchange(request, response);
-        default:
-            return channelError(kUnknownRequestType);
+    case kPlainRequest:
+    case kPlainRequestAlias:
+        return exchange(request, response, nullptr, nullptr, nullptr);
+    case kResultPortRequest:
+        return resultPortExchange(request, response);
+    default:
+        return channelError(kUnknownRequestType);
     }
 }
 
-IZELServerStatus* ZELServerTCPIPChannel::exchange(IZELServerRequest& request, IZELServerResponse& response, LocalFile* upload, LocalFile* download, IZELServerProgressListener* progress)
+IZELServerStatus* ZELServerTCPIPChannel::exchange(IZELServerRequest& request, IZELServerResponse& response,
+                                                  LocalFile* upload, LocalFile* download,
+                                                  IZELServerProgressListener* progress)
 {
     if (upload != nullptr && download != nullptr) {
         return channelError(kInvalidArguments);
@@ -420,7 +404,8 @@ IZELServerStatus* ZELServerTCPIPChannel::exchange(IZELServerRequest& request, IZ
         // Length and checksum are settled before the command goes out, so that a file that cannot be
         // read, or is too long for the 32-bit header, is refused while the connection is in step.
         const std::optional<std::uint64_t> size = upload->size();
-        const std::optional<std::uint32_t> crc = size && *size <= std::numeric_limits<std::uint32_t>::max() ? upload->crc32() : std::nullopt;
+        const std::optional<std::uint32_t> crc =
+            size && *size <= std::numeric_limits<std::uint32_t>::max() ? upload->crc32() : std::nullopt;
         if (!crc) {
             return makeStatus(msg::kLocalFileRead, upload->path());
         }
@@ -436,7 +421,8 @@ IZELServerStatus* ZELServerTCPIPChannel::exchange(IZELServerRequest& request, IZ
     return classifyReply(reply, response);
 }
 
-IZELServerStatus* ZELServerTCPIPChannel::sendAndReceive(const std::string& requestText, Transfer& transfer, std::string& reply)
+IZELServerStatus* ZELServerTCPIPChannel::sendAndReceive(const std::string& requestText, Transfer& transfer,
+                                                        std::string& reply)
 {
     if (!socket_) {
         return sendFailed(SOCK_SEND_FAILED);

@@ -36,12 +36,17 @@ public:
 
     IZELServerStatus* open(const IZELServerConnectionInfo& info, const IZELServerStringArray* options) override;
     IZELServerStatus* close() override;
-    IZELServerRequest* createRequest(const std::string& keyword, const IZELServerStringArray& directives, const IZELServerStringArray& notifications) override;
+    IZELServerRequest* createRequest(const std::string& keyword, const IZELServerStringArray& directives,
+                                     const IZELServerStringArray& notifications) override;
     IZELServerRequest* createRequest(const std::string& keyword) override;
     IZELServerResponse* createResponse() override;
-    IZELServerStatus* transferFile(IZELServerRequest& request, IZELServerResponse& response, const std::string& localPath, unsigned direction, IZELServerProgressListener* progress) override;
-    IZELServerStatus* sendRequest(IZELServerRequest& request, IZELServerResponse& response, unsigned requestType) override;
-    IZELServerStatus* exchange(IZELServerRequest& request, IZELServerResponse& response, LocalFile* upload, LocalFile* download, IZELServerProgressListener* progress) override;
+    IZELServerStatus* transferFile(IZELServerRequest& request, IZELServerResponse& response,
+                                   const std::string& localPath, unsigned direction,
+                                   IZELServerProgressListener* progress) override;
+    IZELServerStatus* sendRequest(IZELServerRequest& request, IZELServerResponse& response,
+                                  unsigned requestType) override;
+    IZELServerStatus* exchange(IZELServerRequest& request, IZELServerResponse& response, LocalFile* upload,
+                               LocalFile* download, IZELServerProgressListener* progress) override;
     void destroyRequest(IZELServerRequest* request) override;
     void destroyResponse(IZELServerResponse* response) override;
     IZELServerIdentity* getIdentity() override;

@@ -181,18 +181,20 @@ int ZELServerTCPIPRequest::addValueList(const IZELServerString& /*name*/, const 
 int ZELServerTCPIPRequest::addServicePayload(const std::string& name, const IZELServerService& service)
 {
     const auto* fields = dynamic_cast<const ServicePayloadFields*>(&service);
-    const ElementXml element("SERVICE", {
-        {"service_id", fields != nullptr ? fields->serviceId() : std::string("-1")},
-        {"name", textOf(service, &IZELServerService::getName)},
-        {"display_name", textOf(service, &IZELServerService::getDisplayName)},
-        {"description", textOf(service, &IZELServerService::getDescription)},
-        {"url_pattern", textOf(service, &IZELServerService::getUrlPattern)},
-        {"is_enabled", flagText(service.isEnabled())},
-        {"is_workspace_reg_allowed", flagText(service.isWorkspaceRegistrationAllowed())},
-        {"is_customformat_reg_allowed", flagText(service.isRegistrationAllowed(kCustomFormatType))},
-        {"is_customtransform_reg_allowed", flagText(service.isRegistrationAllowed(kCustomTransformerType))},
-        {"is_template_reg_allowed", flagText(service.isRegistrationAllowed(kTemplateType))},
-    });
+    const ElementXml element(
+        "SERVICE",
+        {
+            {"service_id", fields != nullptr ? fields->serviceId() : std::string("-1")},
+            {"name", textOf(service, &IZELServerService::getName)},
+            {"display_name", textOf(service, &IZELServerService::getDisplayName)},
+            {"description", textOf(service, &IZELServerService::getDescription)},
+            {"url_pattern", textOf(service, &IZELServerService::getUrlPattern)},
+            {"is_enabled", flagText(service.isEnabled())},
+            {"is_workspace_reg_allowed", flagText(service.isWorkspaceRegistrationAllowed())},
+            {"is_customformat_reg_allowed", flagText(service.isRegistrationAllowed(kCustomFormatType))},
+            {"is_customtransform_reg_allowed", flagText(service.isRegistrationAllowed(kCustomTransformerType))},
+            {"is_template_reg_allowed", flagText(service.isRegistrationAllowed(kTemplateType))},
+        });
     // The server looks only at the "SERVICE" element; the root keeps the add command's name even
     // when the service is sent for an update.
     return addXmlValue(name, element, "REP_ADD_SERVICE");
@@ -202,33 +204,34 @@ int ZELServerTCPIPRequest::addRepositoryPayload(const std::string& name, const I
                                                 const IZELServerString& description)
 {
     const ElementXml element("REPOSITORY", {
-        {"name", toStdString(repositoryName)},
-        {"description", toStdString(description)},
-    });
+                                               {"name", toStdString(repositoryName)},
+                                               {"description", toStdString(description)},
+                                           });
     return addXmlValue(name, element, "REP_ADD_REPOSITORY");
 }
 
 int ZELServerTCPIPRequest::addUserTokenPayload(const std::string& name, const IZELServerUserToken& token)
 {
     const auto* dates = dynamic_cast<const UserTokenPayloadFields*>(&token);
-    const ElementXml element("USERTOKEN", {
-        {"token", textOf(token, &IZELServerUserToken::getToken)},
-        {"clientaddress", textOf(token, &IZELServerUserToken::getClientAddress)},
-        {"expirationtimeout", decimalText(token.getExpirationTimeout())},
-        {"firsttokendate", dates != nullptr ? dates->firstTokenDate() : std::string()},
-        {"lasttokendate", dates != nullptr ? dates->lastTokenDate() : std::string()},
-        {"expirationdate", dates != nullptr ? dates->expirationDate() : std::string()},
-    });
+    const ElementXml element("USERTOKEN",
+                             {
+                                 {"token", textOf(token, &IZELServerUserToken::getToken)},
+                                 {"clientaddress", textOf(token, &IZELServerUserToken::getClientAddress)},
+                                 {"expirationtimeout", decimalText(token.getExpirationTimeout())},
+                                 {"firsttokendate", dates != nullptr ? dates->firstTokenDate() : std::string()},
+                                 {"lasttokendate", dates != nullptr ? dates->lastTokenDate() : std::string()},
+                                 {"expirationdate", dates != nullptr ? dates->expirationDate() : std::string()},
+                             });
     return addXmlValue(name, element, rootElementName_);
 }
 
 int ZELServerTCPIPRequest::addPathPayload(const std::string& name, const IZELServerPath& path)
 {
     const ElementXml element("PATH", {
-        {"name", textOf(path, &IZELServerPath::getName)},
-        {"dirpath", textOf(path, &IZELServerPath::getDirectoryPath)},
-        {"abspath", textOf(path, &IZELServerPath::getAbsolutePath)},
-    });
+                                         {"name", textOf(path, &IZELServerPath::getName)},
+                                         {"dirpath", textOf(path, &IZELServerPath::getDirectoryPath)},
+                                         {"abspath", textOf(path, &IZELServerPath::getAbsolutePath)},
+                                     });
     return addXmlValue(name, element, rootElementName_);
 }
 

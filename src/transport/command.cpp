@@ -7,16 +7,14 @@ namespace zel {
 
 Command::Command(IZELServerChannel& channel, const std::string& keyword)
     : channel_(channel), request_(channel.createRequest(keyword)), response_(channel.createResponse())
-{
-}
+{}
 
 Command::Command(IZELServerChannel& channel, const std::string& keyword, const IZELServerStringArray& directives,
                  const IZELServerStringArray& notifications)
     : channel_(channel),
       request_(channel.createRequest(keyword, directives, notifications)),
       response_(channel.createResponse())
-{
-}
+{}
 
 Command::~Command()
 {

@@ -8,7 +8,8 @@ namespace {
 using Table = std::array<std::uint32_t, 256>;
 
 // One entry per byte value: the remainder of that byte shifted through the reflected polynomial.
-Table makeTable() noexcept {
+Table makeTable() noexcept
+{
     Table table{};
     for (std::uint32_t byte = 0; byte < table.size(); ++byte) {
         std::uint32_t remainder = byte;
@@ -21,14 +22,16 @@ Table makeTable() noexcept {
 }
 
 // Built once, on first use, by whichever thread gets there first.
-const Table& table() noexcept {
+const Table& table() noexcept
+{
     static const Table instance = makeTable();
     return instance;
 }
 
 }  // namespace
 
-void Crc32::update(const void* data, std::size_t count) noexcept {
+void Crc32::update(const void* data, std::size_t count) noexcept
+{
     const Table& entries = table();
     const auto* bytes = static_cast<const unsigned char*>(data);
     std::uint32_t state = state_;

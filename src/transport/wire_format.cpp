@@ -48,15 +48,12 @@ std::optional<std::string> encodeFrameOf(std::string_view first, std::string_vie
 
 }  // namespace
 
-std::optional<std::string> encodeFrame(std::string_view payload)
-{
-    return encodeFrameOf(payload, {});
-}
+std::optional<std::string> encodeFrame(std::string_view payload) { return encodeFrameOf(payload, {}); }
 
 std::uint32_t decodeLength(const unsigned char (&prefix)[kLengthPrefixSize])
 {
-    return (std::uint32_t{prefix[0]} << 24) | (std::uint32_t{prefix[1]} << 16) |
-           (std::uint32_t{prefix[2]} << 8) | std::uint32_t{prefix[3]};
+    return (std::uint32_t{prefix[0]} << 24) | (std::uint32_t{prefix[1]} << 16) | (std::uint32_t{prefix[2]} << 8) |
+           std::uint32_t{prefix[3]};
 }
 
 std::string versionHeader()

@@ -26,14 +26,16 @@ constexpr XMLSize_t kInitialTargetCapacity = 1023;
 
 struct ReleaseDom {
     template <class T>
-    void operator()(T* object) const noexcept {
+    void operator()(T* object) const noexcept
+    {
         object->release();
     }
 };
 using SerializerPtr = std::unique_ptr<xercesc::DOMLSSerializer, ReleaseDom>;
 using OutputPtr = std::unique_ptr<xercesc::DOMLSOutput, ReleaseDom>;
 
-void setIfSupported(xercesc::DOMConfiguration& config, const XMLCh* parameter, bool value) {
+void setIfSupported(xercesc::DOMConfiguration& config, const XMLCh* parameter, bool value)
+{
     if (config.canSetParameter(parameter, value)) {
         config.setParameter(parameter, value);
     }
@@ -43,7 +45,8 @@ void setIfSupported(xercesc::DOMConfiguration& config, const XMLCh* parameter, b
 
 XmlDocument::~XmlDocument() { releaseDocument(); }
 
-IZELServerStatus* XmlDocument::startXml() {
+IZELServerStatus* XmlDocument::startXml()
+{
     if (started()) {
         return nullptr;
     }
@@ -58,7 +61,8 @@ IZELServerStatus* XmlDocument::startXml() {
     return nullptr;
 }
 
-XmlElement* XmlDocument::createDocument(std::string_view namespaceUri, std::string_view rootName) {
+XmlElement* XmlDocument::createDocument(std::string_view namespaceUri, std::string_view rootName)
+{
     if (!started()) {
         return nullptr;
     }
@@ -69,15 +73,16 @@ XmlElement* XmlDocument::createDocument(std::string_view namespaceUri, std::stri
         return nullptr;
     }
     try {
-        document_ = implementation_->createDocument(namespaceUri.empty() ? nullptr : xmlNamespace.get(),
-                                                    xmlRoot.get(), nullptr);
+        document_ = implementation_->createDocument(namespaceUri.empty() ? nullptr : xmlNamespace.get(), xmlRoot.get(),
+                                                    nullptr);
     } catch (...) {
         document_ = nullptr;
     }
     return documentElement();
 }
 
-XmlElement* XmlDocument::createElement(std::string_view name) {
+XmlElement* XmlDocument::createElement(std::string_view name)
+{
     if (document_ == nullptr) {
         return nullptr;
     }
@@ -92,20 +97,21 @@ XmlElement* XmlDocument::createElement(std::string_view name) {
     }
 }
 
-XmlElement* XmlDocument::documentElement() {
+XmlElement* XmlDocument::documentElement()
+{
     if (root_ == nullptr && document_ != nullptr) {
         root_ = elements_.wrap(document_->getDocumentElement());
     }
     return root_;
 }
 
-IZELServerStatus* XmlDocument::serialize(std::string& out) const {
+IZELServerStatus* XmlDocument::serialize(std::string& out) const
+{
     if (document_ == nullptr) {
         return makeStatus(msg::kSerializeFailed, "There is no document to write");
     }
     try {
-        xercesc::DOMImplementationLS* ls =
-            xercesc::DOMImplementationRegistry::getDOMImplementation(kLsFeature);
+        xercesc::DOMImplementationLS* ls = xercesc::DOMImplementationRegistry::getDOMImplementation(kLsFeature);
         if (ls == nullptr) {
             return makeStatus(msg::kSerializeFailed, kNotSupported);
         }
@@ -128,7 +134,8 @@ IZELServerStatus* XmlDocument::serialize(std::string& out) const {
     }
 }
 
-void XmlDocument::releaseDocument() noexcept {
+void XmlDocument::releaseDocument() noexcept
+{
     root_ = nullptr;
     elements_.clear();
     if (document_ != nullptr) {

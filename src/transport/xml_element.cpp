@@ -10,7 +10,8 @@ namespace zel {
 
 std::string XmlElement::name() const { return toUtf8(node_->getTagName()); }
 
-bool XmlElement::setAttribute(std::string_view name, std::string_view value) {
+bool XmlElement::setAttribute(std::string_view name, std::string_view value)
+{
     const XmlText xmlName(name);
     const XmlText xmlValue(value);
     if (!xmlName.valid() || !xmlValue.valid()) {
@@ -24,11 +25,13 @@ bool XmlElement::setAttribute(std::string_view name, std::string_view value) {
     }
 }
 
-bool XmlElement::setAttributeLocal(std::string_view name, std::string_view localValue) {
+bool XmlElement::setAttributeLocal(std::string_view name, std::string_view localValue)
+{
     return setAttribute(name, latin1ToUtf8(localValue));
 }
 
-bool XmlElement::appendChild(XmlElement* child) {
+bool XmlElement::appendChild(XmlElement* child)
+{
     if (child == nullptr) {
         return false;
     }
@@ -40,7 +43,8 @@ bool XmlElement::appendChild(XmlElement* child) {
     }
 }
 
-bool XmlElement::appendText(std::string_view text) {
+bool XmlElement::appendText(std::string_view text)
+{
     const XmlText xmlText(text);
     if (!xmlText.valid()) {
         return false;

@@ -39,8 +39,7 @@ public:
 
 private:
     friend class ZELServerDOMNodeList;
-    XmlElement(xercesc::DOMElement* node, ZELServerDOMNodeList& owner) noexcept
-        : node_(node), owner_(&owner) {}
+    XmlElement(xercesc::DOMElement* node, ZELServerDOMNodeList& owner) noexcept : node_(node), owner_(&owner) {}
 
     xercesc::DOMElement* node_;
     ZELServerDOMNodeList* owner_;

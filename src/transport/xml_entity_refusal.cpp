@@ -6,7 +6,8 @@
 
 namespace zel {
 
-xercesc::InputSource* XmlEntityRefusal::resolveEntity(xercesc::XMLResourceIdentifier* resource) {
+xercesc::InputSource* XmlEntityRefusal::resolveEntity(xercesc::XMLResourceIdentifier* resource)
+{
     std::string what = "External entities are not allowed";
     if (resource != nullptr && resource->getSystemId() != nullptr) {
         what += ": " + toUtf8(resource->getSystemId());

@@ -10,12 +10,14 @@ void XmlErrorCollector::error(const xercesc::SAXParseException& exception) { rec
 
 void XmlErrorCollector::fatalError(const xercesc::SAXParseException& exception) { record(exception); }
 
-void XmlErrorCollector::resetErrors() {
+void XmlErrorCollector::resetErrors()
+{
     failed_ = false;
     message_.clear();
 }
 
-void XmlErrorCollector::record(const xercesc::SAXParseException& exception) {
+void XmlErrorCollector::record(const xercesc::SAXParseException& exception)
+{
     if (!failed_) {
         failed_ = true;
         message_ = toUtf8(exception.getMessage());

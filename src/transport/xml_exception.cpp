@@ -12,7 +12,8 @@
 
 namespace zel {
 
-std::string currentXmlExceptionMessage() {
+std::string currentXmlExceptionMessage()
+{
     try {
         throw;
     } catch (const xercesc::OutOfMemoryException&) {

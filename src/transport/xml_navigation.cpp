@@ -14,17 +14,19 @@ namespace {
 using xercesc::DOMElement;
 using xercesc::DOMNode;
 
-DOMElement* asElement(DOMNode* node) {
-    return node != nullptr && node->getNodeType() == DOMNode::ELEMENT_NODE ? static_cast<DOMElement*>(node)
-                                                                          : nullptr;
+DOMElement* asElement(DOMNode* node)
+{
+    return node != nullptr && node->getNodeType() == DOMNode::ELEMENT_NODE ? static_cast<DOMElement*>(node) : nullptr;
 }
 
-bool sameIgnoringCase(const DOMElement* element, const XmlText& name) {
+bool sameIgnoringCase(const DOMElement* element, const XmlText& name)
+{
     return xercesc::XMLString::compareIString(element->getTagName(), name.get()) == 0;
 }
 
 // The node after `node` in document order, staying below `scope`; null at the end of the subtree.
-DOMNode* nextInScope(DOMNode* node, const DOMNode* scope) {
+DOMNode* nextInScope(DOMNode* node, const DOMNode* scope)
+{
     if (DOMNode* child = node->getFirstChild()) {
         return child;
     }
@@ -40,7 +42,8 @@ DOMNode* nextInScope(DOMNode* node, const DOMNode* scope) {
 // Calls `visit` for every element of the subtree of `scope` (itself included) in document order
 // until it returns false.
 template <class Visit>
-void forEachElement(const XmlElement* scope, Visit visit) {
+void forEachElement(const XmlElement* scope, Visit visit)
+{
     DOMNode* const root = scope->node();
     for (DOMNode* node = root; node != nullptr; node = nextInScope(node, root)) {
         if (DOMElement* element = asElement(node); element != nullptr && !visit(element)) {
@@ -50,7 +53,8 @@ void forEachElement(const XmlElement* scope, Visit visit) {
 }
 
 template <class Match>
-std::vector<XmlElement*> collectChildren(const XmlElement* parent, Match match) {
+std::vector<XmlElement*> collectChildren(const XmlElement* parent, Match match)
+{
     std::vector<XmlElement*> found;
     for (DOMNode* node = parent->node()->getFirstChild(); node != nullptr; node = node->getNextSibling()) {
         DOMElement* element = asElement(node);
@@ -66,7 +70,8 @@ std::vector<XmlElement*> collectChildren(const XmlElement* parent, Match match) 
 
 }  // namespace
 
-XmlElement* findChild(const XmlElement* parent, std::string_view name) {
+XmlElement* findChild(const XmlElement* parent, std::string_view name)
+{
     if (parent == nullptr) {
         return nullptr;
     }
@@ -82,14 +87,16 @@ XmlElement* findChild(const XmlElement* parent, std::string_view name) {
     return nullptr;
 }
 
-std::vector<XmlElement*> childElements(const XmlElement* parent) {
+std::vector<XmlElement*> childElements(const XmlElement* parent)
+{
     if (parent == nullptr) {
         return {};
     }
     return collectChildren(parent, [](const DOMElement*) { return true; });
 }
 
-std::vector<XmlElement*> childElements(const XmlElement* parent, std::string_view name) {
+std::vector<XmlElement*> childElements(const XmlElement* parent, std::string_view name)
+{
     if (parent == nullptr) {
         return {};
     }
@@ -100,7 +107,8 @@ std::vector<XmlElement*> childElements(const XmlElement* parent, std::string_vie
     return collectChildren(parent, [&wanted](const DOMElement* element) { return sameIgnoringCase(element, wanted); });
 }
 
-std::vector<XmlElement*> elementsNamed(const XmlElement* scope, std::string_view tag) {
+std::vector<XmlElement*> elementsNamed(const XmlElement* scope, std::string_view tag)
+{
     std::vector<XmlElement*> found;
     if (scope == nullptr) {
         return found;
@@ -120,7 +128,8 @@ std::vector<XmlElement*> elementsNamed(const XmlElement* scope, std::string_view
     return found;
 }
 
-XmlElement* firstElementNamed(const XmlElement* scope, std::string_view tag) {
+XmlElement* firstElementNamed(const XmlElement* scope, std::string_view tag)
+{
     XmlElement* found = nullptr;
     if (scope == nullptr) {
         return found;
@@ -139,7 +148,8 @@ XmlElement* firstElementNamed(const XmlElement* scope, std::string_view tag) {
     return found;
 }
 
-bool getAttribute(const XmlElement* element, std::string_view name, std::string& out) {
+bool getAttribute(const XmlElement* element, std::string_view name, std::string& out)
+{
     out.clear();
     if (element == nullptr) {
         return false;
@@ -156,7 +166,8 @@ bool getAttribute(const XmlElement* element, std::string_view name, std::string&
     return true;
 }
 
-std::string textContent(const XmlElement* element) {
+std::string textContent(const XmlElement* element)
+{
     std::string text;
     if (element == nullptr) {
         return text;

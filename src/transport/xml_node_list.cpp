@@ -8,7 +8,8 @@ namespace zel {
 
 ZELServerDOMNodeList::~ZELServerDOMNodeList() { clear(); }
 
-void ZELServerDOMNodeList::clear() noexcept {
+void ZELServerDOMNodeList::clear() noexcept
+{
     while (!wrappers_.empty()) {
         delete wrappers_.back();
         wrappers_.pop_back();
@@ -16,7 +17,8 @@ void ZELServerDOMNodeList::clear() noexcept {
     byNode_.clear();
 }
 
-XmlElement* ZELServerDOMNodeList::wrap(xercesc::DOMElement* node) noexcept {
+XmlElement* ZELServerDOMNodeList::wrap(xercesc::DOMElement* node) noexcept
+{
     if (node == nullptr) {
         return nullptr;
     }

@@ -22,14 +22,16 @@ struct PlatformState {
 
 // Never destroyed: a reference released from another static object's destructor at process exit
 // must still find the mutex.
-PlatformState& state() {
+PlatformState& state()
+{
     static PlatformState* const instance = new PlatformState;
     return *instance;
 }
 
 // The library failed to start, so its transcoding service may not exist: keep the ASCII part of the
 // message and mark everything else.
-std::string plainText(const XMLCh* text) {
+std::string plainText(const XMLCh* text)
+{
     std::string result;
     for (; text != nullptr && *text != 0; ++text) {
         result += *text < 0x80 ? static_cast<char>(*text) : '?';
@@ -39,7 +41,8 @@ std::string plainText(const XMLCh* text) {
 
 }  // namespace
 
-IZELServerStatus* XmlPlatform::acquire() {
+IZELServerStatus* XmlPlatform::acquire()
+{
     PlatformState& s = state();
     std::lock_guard<std::mutex> lock(s.mutex);
     if (s.references == 0) {
@@ -56,7 +59,8 @@ IZELServerStatus* XmlPlatform::acquire() {
     return nullptr;
 }
 
-void XmlPlatform::release() noexcept {
+void XmlPlatform::release() noexcept
+{
     PlatformState& s = state();
     std::lock_guard<std::mutex> lock(s.mutex);
     if (s.references == 0) {
@@ -68,19 +72,22 @@ void XmlPlatform::release() noexcept {
     }
 }
 
-unsigned XmlPlatform::referenceCount() noexcept {
+unsigned XmlPlatform::referenceCount() noexcept
+{
     PlatformState& s = state();
     std::lock_guard<std::mutex> lock(s.mutex);
     return s.references;
 }
 
-unsigned long XmlPlatform::startCount() noexcept {
+unsigned long XmlPlatform::startCount() noexcept
+{
     PlatformState& s = state();
     std::lock_guard<std::mutex> lock(s.mutex);
     return s.starts;
 }
 
-unsigned long XmlPlatform::stopCount() noexcept {
+unsigned long XmlPlatform::stopCount() noexcept
+{
     PlatformState& s = state();
     std::lock_guard<std::mutex> lock(s.mutex);
     return s.stops;
@@ -88,10 +95,10 @@ unsigned long XmlPlatform::stopCount() noexcept {
 
 XmlPlatformRef::~XmlPlatformRef() { reset(); }
 
-XmlPlatformRef::XmlPlatformRef(XmlPlatformRef&& other) noexcept
-    : held_(std::exchange(other.held_, false)) {}
+XmlPlatformRef::XmlPlatformRef(XmlPlatformRef&& other) noexcept : held_(std::exchange(other.held_, false)) {}
 
-XmlPlatformRef& XmlPlatformRef::operator=(XmlPlatformRef&& other) noexcept {
+XmlPlatformRef& XmlPlatformRef::operator=(XmlPlatformRef&& other) noexcept
+{
     if (this != &other) {
         reset();
         held_ = std::exchange(other.held_, false);
@@ -99,7 +106,8 @@ XmlPlatformRef& XmlPlatformRef::operator=(XmlPlatformRef&& other) noexcept {
     return *this;
 }
 
-IZELServerStatus* XmlPlatformRef::acquire() {
+IZELServerStatus* XmlPlatformRef::acquire()
+{
     if (held_) {
         return nullptr;
     }
@@ -108,7 +116,8 @@ IZELServerStatus* XmlPlatformRef::acquire() {
     return failure;
 }
 
-void XmlPlatformRef::reset() noexcept {
+void XmlPlatformRef::reset() noexcept
+{
     if (std::exchange(held_, false)) {
         XmlPlatform::release();
     }

@@ -26,7 +26,8 @@ XmlReader::~XmlReader() { releaseAll(); }
 
 bool XmlReader::readerInitialisedLibrary() noexcept { return parsingReaders.load() != 0; }
 
-IZELServerStatus* XmlReader::parse(std::string_view text) {
+IZELServerStatus* XmlReader::parse(std::string_view text)
+{
     if (busy_) {
         return nullptr;
     }
@@ -44,14 +45,15 @@ IZELServerStatus* XmlReader::parse(std::string_view text) {
     return failure;
 }
 
-IZELServerStatus* XmlReader::parseText(std::string_view text) {
+IZELServerStatus* XmlReader::parseText(std::string_view text)
+{
     // The frame that carried the text announced its length in 32 bits; nothing longer is a reply.
     if (text.size() > std::numeric_limits<std::uint32_t>::max()) {
         return makeStatus(msg::kXmlFailure, "The XML text is too long");
     }
     try {
-        parser_ = std::make_unique<xercesc::XercesDOMParser>(nullptr, xercesc::XMLPlatformUtils::fgMemoryManager,
-                                                             nullptr);
+        parser_ =
+            std::make_unique<xercesc::XercesDOMParser>(nullptr, xercesc::XMLPlatformUtils::fgMemoryManager, nullptr);
         parser_->setLoadExternalDTD(false);
         parser_->setDisableDefaultEntityResolution(true);
         parser_->setXMLEntityResolver(&refusal_);
@@ -59,9 +61,8 @@ IZELServerStatus* XmlReader::parseText(std::string_view text) {
         parser_->setSecurityManager(&security_);
         parser_->setErrorHandler(&errors_);
 
-        source_ = std::make_unique<xercesc::MemBufInputSource>(reinterpret_cast<const XMLByte*>(text.data()),
-                                                               static_cast<std::uint32_t>(text.size()), kSystemId,
-                                                               false);
+        source_ = std::make_unique<xercesc::MemBufInputSource>(
+            reinterpret_cast<const XMLByte*>(text.data()), static_cast<std::uint32_t>(text.size()), kSystemId, false);
         parser_->parse(*source_);
     } catch (...) {
         return makeStatus(msg::kXmlFailure, currentXmlExceptionMessage());
@@ -77,7 +78,8 @@ IZELServerStatus* XmlReader::parseText(std::string_view text) {
     return nullptr;
 }
 
-void XmlReader::releaseAll() noexcept {
+void XmlReader::releaseAll() noexcept
+{
     root_ = nullptr;
     elements_.clear();
     source_.reset();

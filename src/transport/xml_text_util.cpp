@@ -9,7 +9,8 @@ std::string formatSigned(std::int32_t value) { return std::to_string(value); }
 std::string formatUnsigned(std::uint32_t value) { return std::to_string(value); }
 
 std::size_t splitOnce(std::string_view text, std::string_view delimiters, std::size_t maxParts,
-                      std::vector<std::string>& out) {
+                      std::vector<std::string>& out)
+{
     std::size_t added = 0;
     std::size_t previousEnd = 0;
     while (true) {

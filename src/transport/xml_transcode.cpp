@@ -11,27 +11,30 @@ constexpr const char* kUtf8 = "UTF-8";
 
 }  // namespace
 
-XmlText::XmlText(std::string_view utf8) noexcept {
+XmlText::XmlText(std::string_view utf8) noexcept
+{
     // XML cannot hold a NUL, and the library's text would silently end at it.
     if (utf8.find('\0') != std::string_view::npos) {
         return;
     }
     try {
-        xercesc::TranscodeFromStr transcoded(reinterpret_cast<const XMLByte*>(utf8.data()), utf8.size(),
-                                             kUtf8, xercesc::XMLPlatformUtils::fgMemoryManager);
+        xercesc::TranscodeFromStr transcoded(reinterpret_cast<const XMLByte*>(utf8.data()), utf8.size(), kUtf8,
+                                             xercesc::XMLPlatformUtils::fgMemoryManager);
         text_ = transcoded.adopt();
     } catch (...) {
         text_ = nullptr;
     }
 }
 
-XmlText::~XmlText() {
+XmlText::~XmlText()
+{
     if (text_ != nullptr) {
         xercesc::XMLPlatformUtils::fgMemoryManager->deallocate(text_);
     }
 }
 
-std::string toUtf8(const XMLCh* text) {
+std::string toUtf8(const XMLCh* text)
+{
     if (text == nullptr || *text == 0) {
         return {};
     }

@@ -21,7 +21,8 @@ struct WholeCase {
 };
 
 template <class T, class Reader>
-void checkTable(const std::vector<WholeCase<T>>& cases, Reader reader) {
+void checkTable(const std::vector<WholeCase<T>>& cases, Reader reader)
+{
     for (const auto& c : cases) {
         SCOPED_TRACE("text \"" + c.text + "\"");
         const zel::NumberReading<T> reading = reader(c.text);
@@ -34,62 +35,116 @@ void checkTable(const std::vector<WholeCase<T>>& cases, Reader reader) {
     }
 }
 
-TEST(UnsignedConversion, PlainReader) {
-    checkTable<std::uint32_t>({
-        // decimal, hexadecimal, zero fractions and blanks
-        {"0", true, true, 0}, {"17", true, true, 17}, {"   17", true, true, 17},
-        {"\t17", true, true, 17}, {"17   ", true, true, 17}, {" 0x1F ", true, true, 31},
-        {"0X1f", true, true, 31}, {"0xabcdef", true, true, 0xABCDEF}, {"0x1F.00", true, true, 31},
-        {"010", true, true, 10},  // no octal
-        {"12.000", true, true, 12}, {"12.", true, true, 12}, {"12.0   ", true, true, 12},
-        {"+5", true, true, 5}, {"4294967295", true, true, 4294967295u},
-        {"0xFFFFFFFF", true, true, 4294967295u}, {"0000000000004294967295", true, true, 4294967295u},
-        // what follows the number is refused, but the number is kept
-        {"12.5", true, false, 12}, {"12.05", true, false, 12}, {"12. 0", true, false, 12},
-        {"12 .0", true, false, 12}, {"12abc", true, false, 12}, {"1 2", true, false, 1},
-        {"1x5", true, false, 1}, {"0x", true, false, 0}, {"0xg", true, false, 0},
-        {"-0x1F", true, false, 0},  // a sign hides the x from the base choice
-        {"12..0", true, false, 12},
-        // no number, or overflow
-        {"", false, false, 0}, {"   ", false, false, 0}, {"abc", false, false, 0},
-        {".0", false, false, 0}, {"-", false, false, 0}, {"x1", false, false, 0},
-        {"4294967296", false, false, 0}, {"0x100000000", false, false, 0},
-        {"99999999999999999999999999", false, false, 0}, {"-4294967296", false, false, 0},
-        // a minus wraps
-        {"-1", true, true, 4294967295u}, {"-0", true, true, 0}, {"-4294967295", true, true, 1},
-        {" -2 ", true, true, 4294967294u},
-    }, zel::readUInt32);
+TEST(UnsignedConversion, PlainReader)
+{
+    checkTable<std::uint32_t>(
+        {
+            // decimal, hexadecimal, zero fractions and blanks
+            {"0", true, true, 0},
+            {"17", true, true, 17},
+            {"   17", true, true, 17},
+            {"\t17", true, true, 17},
+            {"17   ", true, true, 17},
+            {" 0x1F ", true, true, 31},
+            {"0X1f", true, true, 31},
+            {"0xabcdef", true, true, 0xABCDEF},
+            {"0x1F.00", true, true, 31},
+            {"010", true, true, 10},  // no octal
+            {"12.000", true, true, 12},
+            {"12.", true, true, 12},
+            {"12.0   ", true, true, 12},
+            {"+5", true, true, 5},
+            {"4294967295", true, true, 4294967295u},
+            {"0xFFFFFFFF", true, true, 4294967295u},
+            {"0000000000004294967295", true, true, 4294967295u},
+            // what follows the number is refused, but the number is kept
+            {"12.5", true, false, 12},
+            {"12.05", true, false, 12},
+            {"12. 0", true, false, 12},
+            {"12 .0", true, false, 12},
+            {"12abc", true, false, 12},
+            {"1 2", true, false, 1},
+            {"1x5", true, false, 1},
+            {"0x", true, false, 0},
+            {"0xg", true, false, 0},
+            {"-0x1F", true, false, 0},  // a sign hides the x from the base choice
+            {"12..0", true, false, 12},
+            // no number, or overflow
+            {"", false, false, 0},
+            {"   ", false, false, 0},
+            {"abc", false, false, 0},
+            {".0", false, false, 0},
+            {"-", false, false, 0},
+            {"x1", false, false, 0},
+            {"4294967296", false, false, 0},
+            {"0x100000000", false, false, 0},
+            {"99999999999999999999999999", false, false, 0},
+            {"-4294967296", false, false, 0},
+            // a minus wraps
+            {"-1", true, true, 4294967295u},
+            {"-0", true, true, 0},
+            {"-4294967295", true, true, 1},
+            {" -2 ", true, true, 4294967294u},
+        },
+        zel::readUInt32);
 }
 
-TEST(UnsignedConversion, AnyBaseReaderRefusesAMinusAtOnce) {
-    checkTable<std::uint32_t>({
-        {"-1", false, false, 0}, {"  -1", false, false, 0}, {"-0", false, false, 0},
-        {"+7", true, true, 7}, {" 0x10", true, true, 16}, {"12.00 ", true, true, 12},
-        {"12.5", true, false, 12}, {"4294967295", true, true, 4294967295u},
-        {"4294967296", false, false, 0}, {"", false, false, 0},
-    }, zel::readUInt32AnyBase);
+TEST(UnsignedConversion, AnyBaseReaderRefusesAMinusAtOnce)
+{
+    checkTable<std::uint32_t>(
+        {
+            {"-1", false, false, 0},
+            {"  -1", false, false, 0},
+            {"-0", false, false, 0},
+            {"+7", true, true, 7},
+            {" 0x10", true, true, 16},
+            {"12.00 ", true, true, 12},
+            {"12.5", true, false, 12},
+            {"4294967295", true, true, 4294967295u},
+            {"4294967296", false, false, 0},
+            {"", false, false, 0},
+        },
+        zel::readUInt32AnyBase);
 }
 
-TEST(UnsignedConversion, SixtyFourBitLimits) {
-    checkTable<std::uint64_t>({
-        {"18446744073709551615", true, true, UINT64_MAX}, {"0xFFFFFFFFFFFFFFFF", true, true, UINT64_MAX},
-        {"4294967296", true, true, 4294967296ull}, {"18446744073709551616", false, false, 0},
-        {"0x10000000000000000", false, false, 0}, {"-1", true, true, UINT64_MAX},
-    }, zel::readUInt64);
+TEST(UnsignedConversion, SixtyFourBitLimits)
+{
+    checkTable<std::uint64_t>(
+        {
+            {"18446744073709551615", true, true, UINT64_MAX},
+            {"0xFFFFFFFFFFFFFFFF", true, true, UINT64_MAX},
+            {"4294967296", true, true, 4294967296ull},
+            {"18446744073709551616", false, false, 0},
+            {"0x10000000000000000", false, false, 0},
+            {"-1", true, true, UINT64_MAX},
+        },
+        zel::readUInt64);
 }
 
-TEST(SignedConversion, TimeoutTexts) {
-    checkTable<std::int64_t>({
-        {"   3600", true, true, 3600}, {"3600.000", true, true, 3600}, {"3600.5", true, false, 3600},
-        {"0x10", true, true, 16}, {"abc", false, false, 0}, {"", false, false, 0},
-        {"-5", true, true, -5}, {"+5 ", true, true, 5},
-        {"9223372036854775807", true, true, INT64_MAX}, {"-9223372036854775808", true, true, INT64_MIN},
-        {"0x7FFFFFFFFFFFFFFF", true, true, INT64_MAX}, {"9223372036854775808", false, false, 0},
-        {"-9223372036854775809", false, false, 0}, {"0x8000000000000000", false, false, 0},
-    }, zel::readInt64);
+TEST(SignedConversion, TimeoutTexts)
+{
+    checkTable<std::int64_t>(
+        {
+            {"   3600", true, true, 3600},
+            {"3600.000", true, true, 3600},
+            {"3600.5", true, false, 3600},
+            {"0x10", true, true, 16},
+            {"abc", false, false, 0},
+            {"", false, false, 0},
+            {"-5", true, true, -5},
+            {"+5 ", true, true, 5},
+            {"9223372036854775807", true, true, INT64_MAX},
+            {"-9223372036854775808", true, true, INT64_MIN},
+            {"0x7FFFFFFFFFFFFFFF", true, true, INT64_MAX},
+            {"9223372036854775808", false, false, 0},
+            {"-9223372036854775809", false, false, 0},
+            {"0x8000000000000000", false, false, 0},
+        },
+        zel::readInt64);
 }
 
-TEST(UnsignedConversion, ConvenienceFormsGiveOnlyWholeConversions) {
+TEST(UnsignedConversion, ConvenienceFormsGiveOnlyWholeConversions)
+{
     EXPECT_EQ(zel::toUInt32(" 0x1F "), 31u);
     EXPECT_FALSE(zel::toUInt32("12.5").has_value());
     EXPECT_FALSE(zel::toUInt32AnyBase("-1").has_value());
@@ -98,13 +153,14 @@ TEST(UnsignedConversion, ConvenienceFormsGiveOnlyWholeConversions) {
     EXPECT_FALSE(zel::toInt64("3600.5").has_value());
 }
 
-TEST(UnsignedConversion, StoreWritesTheNumberBeforeCheckingWhatFollows) {
+TEST(UnsignedConversion, StoreWritesTheNumberBeforeCheckingWhatFollows)
+{
     const struct {
         const char* text;
         bool whole;
         std::uint32_t stored;
-    } cases[] = {{" 7 ", true, 7}, {"12abc", false, 12}, {"abc", false, 99}, {"", false, 99},
-                 {"4294967296", false, 99}};
+    } cases[] = {
+        {" 7 ", true, 7}, {"12abc", false, 12}, {"abc", false, 99}, {"", false, 99}, {"4294967296", false, 99}};
     for (const auto& c : cases) {
         std::uint32_t out = 99;
         EXPECT_EQ(zel::storeUInt32(c.text, out), c.whole) << c.text;
@@ -112,18 +168,45 @@ TEST(UnsignedConversion, StoreWritesTheNumberBeforeCheckingWhatFollows) {
     }
 }
 
-TEST(BooleanConversion, FirstLetterThenNumber) {
+TEST(BooleanConversion, FirstLetterThenNumber)
+{
     const struct {
         std::string text;
         std::optional<bool> expected;
     } cases[] = {
-        {"yes", true}, {"Yes", true}, {"y", true}, {"T", true}, {"true", true}, {"tomato", true},
-        {"No", false}, {"n", false}, {"F", false}, {"false", false}, {"never", false},
-        {"0", false}, {"00", false}, {"0.0", false}, {"-0", false}, {"+0.000", false}, {" 0 ", false},
-        {"1", true}, {"2.5", true}, {"-3", true}, {".5", true}, {"5.", true}, {"0.001", true}, {" 1", true},
+        {"yes", true},
+        {"Yes", true},
+        {"y", true},
+        {"T", true},
+        {"true", true},
+        {"tomato", true},
+        {"No", false},
+        {"n", false},
+        {"F", false},
+        {"false", false},
+        {"never", false},
+        {"0", false},
+        {"00", false},
+        {"0.0", false},
+        {"-0", false},
+        {"+0.000", false},
+        {" 0 ", false},
+        {"1", true},
+        {"2.5", true},
+        {"-3", true},
+        {".5", true},
+        {"5.", true},
+        {"0.001", true},
+        {" 1", true},
         {"99999999999999999999999999999", true},
-        {"maybe", std::nullopt}, {"", std::nullopt}, {"  ", std::nullopt}, {".", std::nullopt},
-        {"+", std::nullopt}, {"1.2.3", std::nullopt}, {"10abc", std::nullopt}, {"1e3", std::nullopt},
+        {"maybe", std::nullopt},
+        {"", std::nullopt},
+        {"  ", std::nullopt},
+        {".", std::nullopt},
+        {"+", std::nullopt},
+        {"1.2.3", std::nullopt},
+        {"10abc", std::nullopt},
+        {"1e3", std::nullopt},
         {" yes", std::nullopt},  // the letter rule looks at the very first character only
     };
     for (const auto& c : cases) {
@@ -133,15 +216,18 @@ TEST(BooleanConversion, FirstLetterThenNumber) {
     }
 }
 
-TEST(FloatConversion, OrdinaryDecimalNotationOnly) {
+TEST(FloatConversion, OrdinaryDecimalNotationOnly)
+{
     const struct {
         std::string text;
         std::optional<float> expected;
     } cases[] = {
-        {"1.5", 1.5f}, {" -2.25 ", -2.25f}, {"+0.5", 0.5f}, {"1e3", 1000.0f}, {".25", 0.25f}, {"7", 7.0f},
-        {"", std::nullopt}, {"abc", std::nullopt}, {"inf", std::nullopt}, {"-inf", std::nullopt},
-        {"nan", std::nullopt}, {"infinity", std::nullopt}, {"1.5x", std::nullopt}, {"+-1", std::nullopt},
-        {"1e39", std::nullopt}, {"0x1p3", std::nullopt}, {"-", std::nullopt}, {"1 2", std::nullopt},
+        {"1.5", 1.5f},           {" -2.25 ", -2.25f},   {"+0.5", 0.5f},
+        {"1e3", 1000.0f},        {".25", 0.25f},        {"7", 7.0f},
+        {"", std::nullopt},      {"abc", std::nullopt}, {"inf", std::nullopt},
+        {"-inf", std::nullopt},  {"nan", std::nullopt}, {"infinity", std::nullopt},
+        {"1.5x", std::nullopt},  {"+-1", std::nullopt}, {"1e39", std::nullopt},
+        {"0x1p3", std::nullopt}, {"-", std::nullopt},   {"1 2", std::nullopt},
     };
     for (const auto& c : cases) {
         SCOPED_TRACE("text \"" + c.text + "\"");
@@ -149,7 +235,8 @@ TEST(FloatConversion, OrdinaryDecimalNotationOnly) {
     }
 }
 
-TEST(DecimalText, WritesIntegersAndTruthValuesThatReadBack) {
+TEST(DecimalText, WritesIntegersAndTruthValuesThatReadBack)
+{
     EXPECT_EQ(zel::decimalText(std::int64_t{0}), "0");
     EXPECT_EQ(zel::decimalText(std::int64_t{-1}), "-1");
     EXPECT_EQ(zel::decimalText(INT64_MIN), "-9223372036854775808");

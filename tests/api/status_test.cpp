@@ -37,7 +37,8 @@ std::string frame(int line) { return "(" + kInternat + ":" + std::to_string(line
 // A home directory of the test's own; `writeCatalogue` fills messages/zelserverapi.msg.
 class TempHome {
 public:
-    void writeCatalogue(const std::string& text) const {
+    void writeCatalogue(const std::string& text) const
+    {
         fs::create_directories(path() / "messages");
         std::ofstream(path() / "messages" / "zelserverapi.msg", std::ios::binary) << text;
     }
@@ -50,7 +51,8 @@ private:
 
 std::string message(const StatusPtr& status) { return status->getMessage(); }
 
-TEST(ServerStatus, TextsComeFromTheShippedCatalogueWithCodeAndParametersFilledIn) {
+TEST(ServerStatus, TextsComeFromTheShippedCatalogueWithCodeAndParametersFilledIn)
+{
     ScopedEnv home("ZEL_SERVERAPI_HOME", nullptr);
     const struct {
         StatusPtr status;
@@ -58,19 +60,16 @@ TEST(ServerStatus, TextsComeFromTheShippedCatalogueWithCodeAndParametersFilledIn
         unsigned code;
         const char* text;
     } cases[] = {
-        {StatusPtr(zel::makeStatus(zel::msg::kConnectFailed)), 393601, 0,
-         "Could not connect to the server."},
+        {StatusPtr(zel::makeStatus(zel::msg::kConnectFailed)), 393601, 0, "Could not connect to the server."},
         {StatusPtr(zel::makeStatus(zel::msg::kSendFailed, "392009")), 393607, 0,
          "Sending a request to the server failed (socket error 392009)."},
-        {StatusPtr(zel::makeStatus(zel::msg::kInvalidArgument,
-                                   std::vector<std::string>{"keyword", "  "})),
-         393617, 0, "The argument \"keyword\" has an invalid value: \"  \"."},
+        {StatusPtr(zel::makeStatus(zel::msg::kInvalidArgument, std::vector<std::string>{"keyword", "  "})), 393617, 0,
+         "The argument \"keyword\" has an invalid value: \"  \"."},
         // A parameter is inserted as it is, its own percent signs and slot-like text included.
-        {StatusPtr(zel::makeStatus(zel::msg::kForbiddenCharacter, "\\/:*?\"<>|&='+%1")),
-         393626, 0,
+        {StatusPtr(zel::makeStatus(zel::msg::kForbiddenCharacter, "\\/:*?\"<>|&='+%1")), 393626, 0,
          "A name may not contain any of these characters: \\/:*?\"<>|&='+%1"},
-        {StatusPtr(zel::makeStatusWithCode(2, zel::msg::kServerError, "Unknown request type")),
-         393625, 2, "Unknown request type"},
+        {StatusPtr(zel::makeStatusWithCode(2, zel::msg::kServerError, "Unknown request type")), 393625, 2,
+         "Unknown request type"},
         {StatusPtr(zel::makeStatusWithCode(7, zel::msg::kNotConnected)), 393622, 7,
          "There is no open connection to close."},
     };
@@ -81,7 +80,8 @@ TEST(ServerStatus, TextsComeFromTheShippedCatalogueWithCodeAndParametersFilledIn
     }
 }
 
-TEST(ServerStatus, MissingUnreadableOrDamagedCatalogueGivesTheFallbackText) {
+TEST(ServerStatus, MissingUnreadableOrDamagedCatalogueGivesTheFallbackText)
+{
     TempHome empty;
     TempHome folderInstead;
     fs::create_directories(folderInstead.path() / "messages" / "zelserverapi.msg");
@@ -102,13 +102,15 @@ TEST(ServerStatus, MissingUnreadableOrDamagedCatalogueGivesTheFallbackText) {
     }
 }
 
-TEST(ServerStatus, NumberWithoutTextGivesTheFallbackText) {
+TEST(ServerStatus, NumberWithoutTextGivesTheFallbackText)
+{
     StatusPtr status(zel::makeStatus(393699));
     EXPECT_STREQ(status->getMessage(), "Could not load resource: 393699");
     EXPECT_EQ(status->getMessageNumber(), 393699u);
 }
 
-TEST(ServerStatus, MessageNumbersAreShownOnceTheVariableWasDefined) {
+TEST(ServerStatus, MessageNumbersAreShownOnceTheVariableWasDefined)
+{
     {
         ScopedEnv numbers("ZEL_MSG_NUM_OUTPUT", nullptr);
         StatusPtr status(zel::makeStatus(zel::msg::kNotConnected));
@@ -126,7 +128,8 @@ TEST(ServerStatus, MessageNumbersAreShownOnceTheVariableWasDefined) {
     EXPECT_EQ(message(later), "393601: Could not connect to the server.");
 }
 
-TEST(ServerStatus, DestroyingAnyTokenHolderTearsTheDatabaseDown) {
+TEST(ServerStatus, DestroyingAnyTokenHolderTearsTheDatabaseDown)
+{
     TempHome temp;
     temp.writeCatalogue("393619 first text\n");
     ScopedEnv home("ZEL_SERVERAPI_HOME", temp.str().c_str());
@@ -160,7 +163,8 @@ TEST(ServerStatus, DestroyingAnyTokenHolderTearsTheDatabaseDown) {
 // Statuses made and destroyed on several threads at once keep starting and tearing down the one
 // database; every text must still come out whole (under the sanitizers a use of a destroyed
 // database would end the test).
-TEST(ServerStatus, StatusesOnSeveralThreadsAllGetTheirText) {
+TEST(ServerStatus, StatusesOnSeveralThreadsAllGetTheirText)
+{
     ScopedEnv home("ZEL_SERVERAPI_HOME", nullptr);
     ScopedEnv framework("ZEL_HOME", ZEL_TEST_OUTPUT_DIR);
     std::atomic<int> wrong{0};
@@ -184,7 +188,8 @@ TEST(ServerStatus, StatusesOnSeveralThreadsAllGetTheirText) {
     EXPECT_FALSE(zel::messageDatabaseStarted());
 }
 
-TEST(ServerStatus, NullWhenMemoryIsExhausted) {
+TEST(ServerStatus, NullWhenMemoryIsExhausted)
+{
     zel::heap::failNextAllocations(1);
     EXPECT_EQ(zel::makeStatus(zel::msg::kConnectFailed), nullptr);
     StatusPtr next(zel::makeStatus(zel::msg::kConnectFailed));
@@ -192,7 +197,8 @@ TEST(ServerStatus, NullWhenMemoryIsExhausted) {
     EXPECT_EQ(message(next), "Could not connect to the server.");
 }
 
-TEST(Heap, FailureRoutineRunsOnEveryExhaustionAndIsReplaceable) {
+TEST(Heap, FailureRoutineRunsOnEveryExhaustionAndIsReplaceable)
+{
     static int seenCode = 0;
     const zel::heap::FailureRoutine routine = [](int code) { seenCode = code; };
     EXPECT_EQ(zel::heap::setFailureRoutine(routine), nullptr);
@@ -213,7 +219,8 @@ TEST(Heap, FailureRoutineRunsOnEveryExhaustionAndIsReplaceable) {
 
 // ---- StatusInfo
 
-TEST(StatusInfo, DefaultsThenFramesNewestFirstCopiedToTheLastErrorRecord) {
+TEST(StatusInfo, DefaultsThenFramesNewestFirstCopiedToTheLastErrorRecord)
+{
     const zel::StatusInfo defaults;
     EXPECT_EQ(defaults.type(), 16u);
     EXPECT_EQ(defaults.message(), "Internal Error -- No Descriptive Message Available");
@@ -250,11 +257,11 @@ TEST(StatusInfo, DefaultsThenFramesNewestFirstCopiedToTheLastErrorRecord) {
 
 std::vector<std::string> hookReports;
 
-TEST(StatusInfo, DiagnosticHookReportsEveryFullyConstructedRecord) {
+TEST(StatusInfo, DiagnosticHookReportsEveryFullyConstructedRecord)
+{
     zel::StatusInfo silent(16, "before", "f", 1, "a");  // no hook yet: nothing to observe, no crash
 
-    EXPECT_EQ(zel::setDiagnosticHook([](const char* text) { hookReports.emplace_back(text); }),
-              nullptr);
+    EXPECT_EQ(zel::setDiagnosticHook([](const char* text) { hookReports.emplace_back(text); }), nullptr);
     zel::StatusInfo info(16, "boom", "f", 7, "a");
     info.addFrame("g", 9, "b");  // frames added later are not reported again
     const zel::StatusInfo defaults;
@@ -268,7 +275,8 @@ TEST(StatusInfo, DiagnosticHookReportsEveryFullyConstructedRecord) {
 
 // ---- The fill-in routine and the start-up records
 
-TEST(MessageStartup, FillInFillsFromTheFrameworkHomeWhenNoDatabaseExists) {
+TEST(MessageStartup, FillInFillsFromTheFrameworkHomeWhenNoDatabaseExists)
+{
     TempHome framework;
     framework.writeCatalogue("393617 %1=%2 (%3)\n");
     ScopedEnv override("ZEL_HOME_OVERRIDE", framework.str().c_str());
@@ -288,7 +296,8 @@ TEST(MessageStartup, FillInFillsFromTheFrameworkHomeWhenNoDatabaseExists) {
     zel::destroyMessageDatabase();
 }
 
-TEST(MessageStartup, FillInReportsAnUnknownNumberWithLine148) {
+TEST(MessageStartup, FillInReportsAnUnknownNumberWithLine148)
+{
     TempHome framework;
     framework.writeCatalogue("393617 known\n");
     ScopedEnv override("ZEL_HOME_OVERRIDE", framework.str().c_str());
@@ -303,7 +312,8 @@ TEST(MessageStartup, FillInReportsAnUnknownNumberWithLine148) {
     zel::destroyMessageDatabase();
 }
 
-TEST(MessageStartup, AFailedStartUpIsReportedWithLines139And100AndRetriedLater) {
+TEST(MessageStartup, AFailedStartUpIsReportedWithLines139And100AndRetriedLater)
+{
     TempHome temp;
     ScopedEnv override("ZEL_HOME_OVERRIDE", temp.str().c_str());
     std::string out = "untouched";
@@ -336,7 +346,8 @@ TEST(MessageStartup, AFailedStartUpIsReportedWithLines139And100AndRetriedLater) 
 
 // ---- The catalogue format
 
-TEST(Catalogue, FillsTheText) {
+TEST(Catalogue, FillsTheText)
+{
     const struct {
         const char* catalogue;
         unsigned number;
@@ -348,13 +359,21 @@ TEST(Catalogue, FillsTheText) {
         {"5 plain", 5, {}, false, false, "plain"},
         {"# comment\n\n  \t\n5 after comments\n", 5, {}, false, false, "after comments"},
         {"5 crlf line\r\n6 next\r\n", 5, {}, false, false, "crlf line"},
-        {"5\t \tblanks before the text are dropped, after it kept  ", 5, {}, false, false,
+        {"5\t \tblanks before the text are dropped, after it kept  ",
+         5,
+         {},
+         false,
+         false,
          "blanks before the text are dropped, after it kept  "},
         {"  5 indented number", 5, {}, false, false, "indented number"},
         {"5 %2 before %1", 5, {"a", "b"}, false, false, "b before a"},
         {"5 %1%1", 5, {"x"}, false, false, "xx"},
         {"5 100%% sure, %%1 is not a slot", 5, {"x"}, false, false, "100% sure, %1 is not a slot"},
-        {"5 50% off, %a and %0 stay, so does a last %", 5, {"x"}, false, false,
+        {"5 50% off, %a and %0 stay, so does a last %",
+         5,
+         {"x"},
+         false,
+         false,
          "50% off, %a and %0 stay, so does a last %"},
         {"5 [%1][%2][%9]", 5, {"x"}, false, false, "[x][][]"},
         {"5 [%1][%2][%9]", 5, {"x"}, true, false, "[x][%2][%9]"},
@@ -370,14 +389,14 @@ TEST(Catalogue, FillsTheText) {
         zel::ZELServerStringArray parameters(c.parameters);
         const zel::ZELROStringArrayWrapper wrapped(&parameters);
         zel::ZELObsoleteStringImp out;
-        ASSERT_TRUE(database.createFilledInMessage(c.number, &wrapped, &out, c.keepUnfilled,
-                                                   c.showNumbers))
+        ASSERT_TRUE(database.createFilledInMessage(c.number, &wrapped, &out, c.keepUnfilled, c.showNumbers))
             << database.getLastErrorMessage();
         EXPECT_EQ(out.str(), c.expected);
     }
 }
 
-TEST(Catalogue, MalformedCataloguesAreRefusedWithTheirLine) {
+TEST(Catalogue, MalformedCataloguesAreRefusedWithTheirLine)
+{
     const std::string layout = "expected a message number, a blank and a text";
     const struct {
         const char* text;
@@ -399,7 +418,8 @@ TEST(Catalogue, MalformedCataloguesAreRefusedWithTheirLine) {
     }
 }
 
-TEST(Catalogue, InitializeReadsTheHomeDirectoryWithOrWithoutSeparator) {
+TEST(Catalogue, InitializeReadsTheHomeDirectoryWithOrWithoutSeparator)
+{
     TempHome temp;
     temp.writeCatalogue("7 seven\n");
     for (const std::string& home : {temp.str(), temp.str() + "/"}) {
@@ -414,7 +434,8 @@ TEST(Catalogue, InitializeReadsTheHomeDirectoryWithOrWithoutSeparator) {
     EXPECT_NE(std::string(missing.getLastErrorMessage()).find("nowhere"), std::string::npos);
 }
 
-TEST(Catalogue, UnknownNumberLeavesTheOutputAlone) {
+TEST(Catalogue, UnknownNumberLeavesTheOutputAlone)
+{
     zel::ZELLocalizedMessageDatabase database;
     ASSERT_TRUE(database.load("5 five", "test"));
     zel::ZELObsoleteStringImp out("kept");
@@ -425,16 +446,16 @@ TEST(Catalogue, UnknownNumberLeavesTheOutputAlone) {
 
 // Every number the library raises has a text in the shipped catalogue, with one slot per parameter
 // that the raising places pass, and no slot beyond them.
-TEST(Catalogue, ShippedCatalogueCoversEveryRaisedNumber) {
+TEST(Catalogue, ShippedCatalogueCoversEveryRaisedNumber)
+{
     const struct {
         unsigned number;
         unsigned parameters;
     } raised[] = {
-        {393601, 0}, {393602, 1}, {393604, 1}, {393607, 1}, {393608, 1}, {393617, 2}, {393618, 0},
-        {393619, 0}, {393620, 1}, {393621, 0}, {393622, 0}, {393623, 1}, {393624, 1}, {393625, 1},
-        {393626, 1}, {393627, 0}, {393630, 1}, {393631, 0}, {393635, 0}, {393638, 1}, {393639, 0},
-        {392001, 0}, {392002, 0}, {392003, 0}, {392004, 0}, {392005, 0}, {392006, 0}, {392007, 0},
-        {392008, 0}, {392009, 0}, {392011, 0}, {392012, 0},
+        {393601, 0}, {393602, 1}, {393604, 1}, {393607, 1}, {393608, 1}, {393617, 2}, {393618, 0}, {393619, 0},
+        {393620, 1}, {393621, 0}, {393622, 0}, {393623, 1}, {393624, 1}, {393625, 1}, {393626, 1}, {393627, 0},
+        {393630, 1}, {393631, 0}, {393635, 0}, {393638, 1}, {393639, 0}, {392001, 0}, {392002, 0}, {392003, 0},
+        {392004, 0}, {392005, 0}, {392006, 0}, {392007, 0}, {392008, 0}, {392009, 0}, {392011, 0}, {392012, 0},
     };
     zel::ZELLocalizedMessageDatabase shipped;
     ASSERT_TRUE(shipped.initialize(ZEL_TEST_SOURCE_DIR)) << shipped.getLastErrorMessage();
@@ -452,7 +473,8 @@ TEST(Catalogue, ShippedCatalogueCoversEveryRaisedNumber) {
     }
 }
 
-TEST(Catalogue, BuildCopiesTheShippedCatalogueBesideTheBinaries) {
+TEST(Catalogue, BuildCopiesTheShippedCatalogueBesideTheBinaries)
+{
     const auto read = [](const fs::path& folder) {
         std::ifstream in(folder / "messages" / "zelserverapi.msg", std::ios::binary);
         EXPECT_TRUE(in) << folder;

@@ -22,11 +22,13 @@ using zel::ZELServerStringArray;
 constexpr int kUtf8 = ZELObsoleteStringImp::kUtf8Selector;
 constexpr int kLatin1 = ZELObsoleteStringImp::kLatin1Selector;
 
-std::string bytesOf(const IZELString& text) {
+std::string bytesOf(const IZELString& text)
+{
     return text.data() ? std::string(text.data(), text.length()) : std::string("(null)");
 }
 
-void reencodeEveryWay(IZELString& text, int selector) {
+void reencodeEveryWay(IZELString& text, int selector)
+{
     text.encodeTo(selector);
     text.decodeFrom(selector);
     text.encodeToSecondary(selector);
@@ -35,7 +37,8 @@ void reencodeEveryWay(IZELString& text, int selector) {
 
 // --- ZELROStringWrapper
 
-TEST(ReadOnlyStringWrapper, NothingBorrowedReadsAsNullAndRebindFollowsTheOther) {
+TEST(ReadOnlyStringWrapper, NothingBorrowedReadsAsNullAndRebindFollowsTheOther)
+{
     ZELROStringWrapper wrapper;
     EXPECT_EQ(wrapper.data(), nullptr);
     EXPECT_EQ(wrapper.c_str(), nullptr);
@@ -55,7 +58,8 @@ TEST(ReadOnlyStringWrapper, NothingBorrowedReadsAsNullAndRebindFollowsTheOther) 
     EXPECT_EQ(first.str(), "first");
 }
 
-TEST(ReadOnlyStringWrapper, ReadsTheBorrowedStringLiveAndNeverWritesIt) {
+TEST(ReadOnlyStringWrapper, ReadsTheBorrowedStringLiveAndNeverWritesIt)
+{
     ZELServerString target("a\0b", 3);
     ZELROStringWrapper wrapper(&target);
     EXPECT_EQ(wrapper.data(), target.data());
@@ -75,7 +79,8 @@ TEST(ReadOnlyStringWrapper, ReadsTheBorrowedStringLiveAndNeverWritesIt) {
 
 // --- ZELROStringArrayWrapper
 
-TEST(ReadOnlyStringArrayWrapper, NothingBorrowedReadsAsEmpty) {
+TEST(ReadOnlyStringArrayWrapper, NothingBorrowedReadsAsEmpty)
+{
     ZELROStringArrayWrapper wrapper;
     EXPECT_EQ(wrapper.entries(), 0u);
     EXPECT_STREQ(wrapper.element(0), "");
@@ -87,7 +92,8 @@ TEST(ReadOnlyStringArrayWrapper, NothingBorrowedReadsAsEmpty) {
     EXPECT_TRUE(wrapper.isReadOnly());
 }
 
-TEST(ReadOnlyStringArrayWrapper, ReadsTheBorrowedListLive) {
+TEST(ReadOnlyStringArrayWrapper, ReadsTheBorrowedListLive)
+{
     ZELServerStringArray list({"one"});
     list.append(ZELServerString("t\0o", 3));
     ZELROStringArrayWrapper wrapper(&list);
@@ -111,11 +117,13 @@ TEST(ReadOnlyStringArrayWrapper, ReadsTheBorrowedListLive) {
 class UncheckedList final : public IZELServerStringArray {
 public:
     explicit UncheckedList(std::vector<std::string> items) : list_(std::move(items)) {}
-    const char* element(unsigned index) const override {
+    const char* element(unsigned index) const override
+    {
         EXPECT_LT(index, list_.entries()) << "element read past the end";
         return list_.element(index);
     }
-    int getElement(unsigned index, IZELServerString& out) const override {
+    int getElement(unsigned index, IZELServerString& out) const override
+    {
         EXPECT_LT(index, list_.entries()) << "getElement past the end";
         return list_.getElement(index, out);
     }
@@ -135,7 +143,8 @@ private:
     ZELServerStringArray list_;
 };
 
-TEST(ReadOnlyStringArrayWrapper, NeverReadsTheBorrowedListPastItsEnd) {
+TEST(ReadOnlyStringArrayWrapper, NeverReadsTheBorrowedListPastItsEnd)
+{
     const UncheckedList list({"only"});
     ZELROStringArrayWrapper wrapper(&list);
     EXPECT_STREQ(wrapper.element(0), "only");
@@ -146,7 +155,8 @@ TEST(ReadOnlyStringArrayWrapper, NeverReadsTheBorrowedListPastItsEnd) {
     EXPECT_EQ(out.str(), "kept");
 }
 
-TEST(ReadOnlyStringArrayWrapper, SearchesAreExact) {
+TEST(ReadOnlyStringArrayWrapper, SearchesAreExact)
+{
     ZELServerStringArray list({"Alpha", "beta"});
     list.append(ZELServerString("n\0l", 3));
     ZELROStringArrayWrapper wrapper(&list);
@@ -163,7 +173,8 @@ TEST(ReadOnlyStringArrayWrapper, SearchesAreExact) {
     EXPECT_TRUE(wrapper.contains(ZELROStringWrapper()));
 }
 
-TEST(ReadOnlyStringArrayWrapper, ModifiersChangeNothingAndReturnZero) {
+TEST(ReadOnlyStringArrayWrapper, ModifiersChangeNothingAndReturnZero)
+{
     ZELServerStringArray list({"a", "b", "a"});
     ZELROStringArrayWrapper wrapper(&list);
     wrapper.append("c");
@@ -179,7 +190,8 @@ TEST(ReadOnlyStringArrayWrapper, ModifiersChangeNothingAndReturnZero) {
 
 // --- ZELObsoleteStringImp
 
-TEST(ObsoleteString, OwnsAWritableCopy) {
+TEST(ObsoleteString, OwnsAWritableCopy)
+{
     ZELObsoleteStringImp text;
     const char* source = "hello";
     EXPECT_EQ(text.assign(source), source);
@@ -199,7 +211,8 @@ TEST(ObsoleteString, OwnsAWritableCopy) {
     EXPECT_EQ(other.str(), "orig");
 }
 
-TEST(ObsoleteString, EncodeToLatin1KeepsTheLossyText) {
+TEST(ObsoleteString, EncodeToLatin1KeepsTheLossyText)
+{
     const struct {
         std::string utf8;
         std::string latin1;
@@ -207,13 +220,19 @@ TEST(ObsoleteString, EncodeToLatin1KeepsTheLossyText) {
         {"plain", "plain"},
         {"caf\xC3\xA9", "caf\xE9"},
         {"\xC2\xA0\xC3\xBF", "\xA0\xFF"},
-        {"price \xE2\x82\xAC" "5", "price ?5"},  // U+20AC has no Latin-1 form
-        {"\xF0\x9F\x98\x80!", "?!"},              // one character outside the BMP, one '?'
-        {"\xFF" "a", "?a"},                       // a byte that starts nothing
-        {"\xC0\xAF", "??"},                       // overlong form of '/'
-        {"\xED\xA0\x80", "???"},                  // encoded surrogate
-        {"ab\xE2\x82", "ab??"},                   // truncated at the end
-        {"a\xC3" "b", "a?b"},                     // lead byte without continuation
+        {"price \xE2\x82\xAC"
+         "5",
+         "price ?5"},                 // U+20AC has no Latin-1 form
+        {"\xF0\x9F\x98\x80!", "?!"},  // one character outside the BMP, one '?'
+        {"\xFF"
+         "a",
+         "?a"},                   // a byte that starts nothing
+        {"\xC0\xAF", "??"},       // overlong form of '/'
+        {"\xED\xA0\x80", "???"},  // encoded surrogate
+        {"ab\xE2\x82", "ab??"},   // truncated at the end
+        {"a\xC3"
+         "b",
+         "a?b"},  // lead byte without continuation
         {std::string("n\0l", 3), std::string("n\0l", 3)},
     };
     for (const auto& c : cases) {
@@ -227,7 +246,8 @@ TEST(ObsoleteString, EncodeToLatin1KeepsTheLossyText) {
     }
 }
 
-TEST(ObsoleteString, DecodeFromLatin1GivesUtf8AndEveryLatin1TextRoundTrips) {
+TEST(ObsoleteString, DecodeFromLatin1GivesUtf8AndEveryLatin1TextRoundTrips)
+{
     ZELObsoleteStringImp text(std::string("caf\xE9 \xFF\x80", 7));
     text.decodeFrom(kLatin1);
     EXPECT_EQ(text.str(), "caf\xC3\xA9 \xC3\xBF\xC2\x80");
@@ -246,7 +266,8 @@ TEST(ObsoleteString, DecodeFromLatin1GivesUtf8AndEveryLatin1TextRoundTrips) {
     EXPECT_EQ(roundTrip.str(), all);
 }
 
-TEST(ObsoleteString, Utf8SelectorAndUnknownSelectorsLeaveTheBytes) {
+TEST(ObsoleteString, Utf8SelectorAndUnknownSelectorsLeaveTheBytes)
+{
     const std::string mixed = "caf\xC3\xA9 \xFF";
     for (const int selector : {kUtf8, 5, -1}) {
         ZELObsoleteStringImp text(mixed);
@@ -255,16 +276,24 @@ TEST(ObsoleteString, Utf8SelectorAndUnknownSelectorsLeaveTheBytes) {
     }
 }
 
-TEST(TextEncoding, RecognisesWellFormedUtf8) {
+TEST(TextEncoding, RecognisesWellFormedUtf8)
+{
     const struct {
         const char* text;
         bool valid;
     } cases[] = {
-        {"", true}, {"plain ascii", true}, {"caf\xC3\xA9 \xE2\x82\xAC \xF0\x9F\x98\x80", true},
+        {"", true},
+        {"plain ascii", true},
+        {"caf\xC3\xA9 \xE2\x82\xAC \xF0\x9F\x98\x80", true},
         {"\xF4\x8F\xBF\xBF", true},   // U+10FFFF
         {"\xF4\x90\x80\x80", false},  // past U+10FFFF
-        {"caf\xE9", false}, {"\xC0\x80", false}, {"\xE0\x80\xAF", false}, {"\xED\xBF\xBF", false},
-        {"\xE2\x82", false}, {"\x80", false}, {"\xF8\x88\x80\x80\x80", false},
+        {"caf\xE9", false},
+        {"\xC0\x80", false},
+        {"\xE0\x80\xAF", false},
+        {"\xED\xBF\xBF", false},
+        {"\xE2\x82", false},
+        {"\x80", false},
+        {"\xF8\x88\x80\x80\x80", false},
     };
     for (const auto& c : cases) {
         EXPECT_EQ(zel::isValidUtf8(c.text), c.valid) << c.text;

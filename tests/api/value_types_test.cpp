@@ -20,7 +20,8 @@ using Items = std::vector<std::string>;
 
 // --- ZELServerString
 
-TEST(ServerString, AssignAndSetReplaceTheContentKeepingNulsAndTheTerminator) {
+TEST(ServerString, AssignAndSetReplaceTheContentKeepingNulsAndTheTerminator)
+{
     ZELServerString text("old content");
     const char* source = "new";
     EXPECT_EQ(text.assign(source), source);
@@ -45,7 +46,8 @@ TEST(ServerString, AssignAndSetReplaceTheContentKeepingNulsAndTheTerminator) {
     EXPECT_EQ(text.str(), "cde");
 }
 
-TEST(ServerString, EqualsComparesLengthAndBytesExactly) {
+TEST(ServerString, EqualsComparesLengthAndBytesExactly)
+{
     const ZELServerString text("abc");
     EXPECT_TRUE(text.equals("abc"));
     EXPECT_FALSE(text.equals("ABC"));
@@ -57,7 +59,8 @@ TEST(ServerString, EqualsComparesLengthAndBytesExactly) {
     EXPECT_TRUE(ZELServerString().equals(nullptr));
 }
 
-TEST(ServerString, CopiesAreIndependent) {
+TEST(ServerString, CopiesAreIndependent)
+{
     ZELServerString original("one");
     ZELServerString copy(original);
     copy.assign("two");
@@ -67,7 +70,8 @@ TEST(ServerString, CopiesAreIndependent) {
     EXPECT_EQ(zel::toStdString(ZELServerString("x\0y", 3)), std::string("x\0y", 3));
 }
 
-TEST(ServerString, AllocationFailureYieldsNull) {
+TEST(ServerString, AllocationFailureYieldsNull)
+{
     zel::heap::failNextAllocations(1);
     IZELServerString* text = new ZELServerString();
     EXPECT_EQ(text, nullptr);
@@ -79,7 +83,8 @@ TEST(ServerString, AllocationFailureYieldsNull) {
 
 // --- ZELServerStringArray
 
-TEST(ServerStringArray, AppendCopiesKeepingOrderDuplicatesAndNuls) {
+TEST(ServerStringArray, AppendCopiesKeepingOrderDuplicatesAndNuls)
+{
     ZELServerStringArray list;
     ZELServerString value("v");
     list.append(value);
@@ -104,7 +109,8 @@ TEST(ServerStringArray, AppendCopiesKeepingOrderDuplicatesAndNuls) {
     EXPECT_EQ(list.items(), (Items{"c"}));
 }
 
-TEST(ServerStringArray, SetElementReplacesOneAndIndexesPastTheEndTouchNothing) {
+TEST(ServerStringArray, SetElementReplacesOneAndIndexesPastTheEndTouchNothing)
+{
     ZELServerStringArray list({"a", "b", "c"});
     EXPECT_EQ(list.setElement(1, ZELServerString("B")), 0);
     EXPECT_EQ(list.setElement(3, ZELServerString("x")), 0);
@@ -115,7 +121,8 @@ TEST(ServerStringArray, SetElementReplacesOneAndIndexesPastTheEndTouchNothing) {
     EXPECT_EQ(out.str(), "kept");
 }
 
-TEST(ServerStringArray, ContainsAndRemoveAllAreExactAndKeepTheOrderOfTheRest) {
+TEST(ServerStringArray, ContainsAndRemoveAllAreExactAndKeepTheOrderOfTheRest)
+{
     ZELServerStringArray list({"Alpha", "beta"});
     EXPECT_TRUE(list.contains("Alpha"));
     EXPECT_FALSE(list.contains("alpha"));
@@ -133,7 +140,8 @@ TEST(ServerStringArray, ContainsAndRemoveAllAreExactAndKeepTheOrderOfTheRest) {
     EXPECT_EQ(longer.items(), (Items{"x", "y", "z"}));
 }
 
-TEST(ServerStringArray, TokenSplitters) {
+TEST(ServerStringArray, TokenSplitters)
+{
     const struct {
         bool anyOf;
         const char* text;
@@ -209,21 +217,24 @@ class ServerVector : public ::testing::Test {
 protected:
     void SetUp() override { destroyed.clear(); }
 
-    static std::vector<int> idsOf(ThingVector& vector) {
+    static std::vector<int> idsOf(ThingVector& vector)
+    {
         std::vector<int> ids;
         for (unsigned i = 0; i < vector.entries(); ++i) {
             ids.push_back(vector.element(i)->id());
         }
         return ids;
     }
-    static void fill(ThingVector& vector, int count) {
+    static void fill(ThingVector& vector, int count)
+    {
         for (int id = 1; id <= count; ++id) {
             vector.append(new Thing(id));
         }
     }
 };
 
-TEST_F(ServerVector, InsertAtPlacesBeforeTheIndexOrAppendsAndNullItemsAreIgnored) {
+TEST_F(ServerVector, InsertAtPlacesBeforeTheIndexOrAppendsAndNullItemsAreIgnored)
+{
     ThingVector vector;
     vector.append(nullptr);
     vector.insertAt(0, nullptr);
@@ -239,7 +250,8 @@ TEST_F(ServerVector, InsertAtPlacesBeforeTheIndexOrAppendsAndNullItemsAreIgnored
     EXPECT_EQ(idsOf(vector), (std::vector<int>{4, 1, 5, 2, 3, 6}));
 }
 
-TEST_F(ServerVector, ElementPastTheEndLendsANullSlotSharedPerTypeAndResetOnEveryCall) {
+TEST_F(ServerVector, ElementPastTheEndLendsANullSlotSharedPerTypeAndResetOnEveryCall)
+{
     ThingVector vector;
     fill(vector, 1);
     IThing*& slot = vector.element(1);
@@ -258,7 +270,8 @@ TEST_F(ServerVector, ElementPastTheEndLendsANullSlotSharedPerTypeAndResetOnEvery
     EXPECT_NE(static_cast<void*>(&second.element(0)), static_cast<void*>(&other.element(0)));
 }
 
-TEST_F(ServerVector, WritingThroughAnElementReplacesIt) {
+TEST_F(ServerVector, WritingThroughAnElementReplacesIt)
+{
     ThingVector vector;
     fill(vector, 1);
     Thing* replaced = static_cast<Thing*>(vector.element(0));
@@ -267,7 +280,8 @@ TEST_F(ServerVector, WritingThroughAnElementReplacesIt) {
     EXPECT_EQ(idsOf(vector), (std::vector<int>{2}));
 }
 
-TEST_F(ServerVector, RemoveLastAndClearHandOwnershipToTheCaller) {
+TEST_F(ServerVector, RemoveLastAndClearHandOwnershipToTheCaller)
+{
     ThingVector vector;
     EXPECT_EQ(vector.removeLast(), nullptr);
     fill(vector, 2);
@@ -284,7 +298,8 @@ TEST_F(ServerVector, RemoveLastAndClearHandOwnershipToTheCaller) {
     EXPECT_EQ(destroyed, (std::vector<int>{2, 1}));
 }
 
-TEST_F(ServerVector, ClearAndDestroyDestroysLastFirstAndGoesPastANullStoredByTheCaller) {
+TEST_F(ServerVector, ClearAndDestroyDestroysLastFirstAndGoesPastANullStoredByTheCaller)
+{
     ThingVector vector;
     fill(vector, 3);
     vector.clearAndDestroy();
@@ -300,7 +315,8 @@ TEST_F(ServerVector, ClearAndDestroyDestroysLastFirstAndGoesPastANullStoredByThe
     delete middle;
 }
 
-TEST_F(ServerVector, DestroyingTheVectorDestroysItsElements) {
+TEST_F(ServerVector, DestroyingTheVectorDestroysItsElements)
+{
     auto* vector = new ThingVector;
     ASSERT_NE(vector, nullptr);
     fill(*vector, 2);
@@ -313,7 +329,8 @@ TEST_F(ServerVector, DestroyingTheVectorDestroysItsElements) {
 
 // --- StringDict
 
-TEST(StringDict, ShortListsAndAnOddLastElementAreIgnoredAndTheFirstOccurrenceWins) {
+TEST(StringDict, ShortListsAndAnOddLastElementAreIgnoredAndTheFirstOccurrenceWins)
+{
     EXPECT_TRUE(zel::StringDict(ZELServerStringArray()).empty());
     EXPECT_TRUE(zel::StringDict(ZELServerStringArray({"lonely"})).empty());
 
@@ -330,7 +347,8 @@ TEST(StringDict, ShortListsAndAnOddLastElementAreIgnoredAndTheFirstOccurrenceWin
     EXPECT_EQ(*built.find("k"), "one");
 }
 
-TEST(StringDict, KeysAreExactBytes) {
+TEST(StringDict, KeysAreExactBytes)
+{
     ZELServerStringArray pairs({"SSO_AUTH_DATA", ""});
     pairs.append(ZELServerString("a\0b", 3));
     pairs.append(ZELServerString("v\0w", 3));
@@ -344,9 +362,9 @@ TEST(StringDict, KeysAreExactBytes) {
     EXPECT_FALSE(dict.contains("a"));
 }
 
-TEST(StringDict, PublicDictionaryFromPairsLetsALaterValueWin) {
-    const ZELServerStringDict dict =
-        zel::toStringDict(ZELServerStringArray({"b", "1", "a", "2", "b", "3", "odd"}));
+TEST(StringDict, PublicDictionaryFromPairsLetsALaterValueWin)
+{
+    const ZELServerStringDict dict = zel::toStringDict(ZELServerStringArray({"b", "1", "a", "2", "b", "3", "odd"}));
     EXPECT_EQ(dict.entries(), 2u);
     EXPECT_STREQ(dict.lookup("b"), "3");
     EXPECT_STREQ(dict.lookup("a"), "2");
@@ -358,15 +376,16 @@ TEST(StringDict, PublicDictionaryFromPairsLetsALaterValueWin) {
     EXPECT_EQ(existing.entries(), 1u);
 }
 
-TEST(StringDict, PublicDictionaryWritesPairsInKeyOrder) {
+TEST(StringDict, PublicDictionaryWritesPairsInKeyOrder)
+{
     ZELServerStringDict dict;
     dict.insert("zeta", "last");
     dict.insert("alpha", "first");
     dict.insert(std::string("n\0ul", 4), std::string("v\0", 2));
     ZELServerStringArray out({"already"});
     zel::appendPairs(dict, out);
-    EXPECT_EQ(out.items(), (Items{"already", "alpha", "first", std::string("n\0ul", 4),
-                                  std::string("v\0", 2), "zeta", "last"}));
+    EXPECT_EQ(out.items(),
+              (Items{"already", "alpha", "first", std::string("n\0ul", 4), std::string("v\0", 2), "zeta", "last"}));
 
     ZELServerStringArray pairsOnly;
     zel::appendPairs(dict, pairsOnly);

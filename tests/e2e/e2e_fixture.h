@@ -20,14 +20,13 @@
 
 namespace zeltest {
 
-inline const char* kE2eConfig =
-    "[user ann]\npassword = pw-ann\nroles = admin\n"
-    "[server]\nworkers = 4\n"
-    "[user bob]\npassword = pw-bob\nroles = user\n"
-    "[user vic]\npassword = pw-vic\nroles = viewer\n"
-    "[role outsider]\nrights = tokens\n"
-    "[user zed]\npassword = pw-zed\nroles = outsider\n"
-    "[sharedresource DATA]\npath = shared\n";
+inline const char* kE2eConfig = "[user ann]\npassword = pw-ann\nroles = admin\n"
+                                "[server]\nworkers = 4\n"
+                                "[user bob]\npassword = pw-bob\nroles = user\n"
+                                "[user vic]\npassword = pw-vic\nroles = viewer\n"
+                                "[role outsider]\nrights = tokens\n"
+                                "[user zed]\npassword = pw-zed\nroles = outsider\n"
+                                "[sharedresource DATA]\npath = shared\n";
 
 inline std::string readAll(const std::string& path)
 {
@@ -49,7 +48,13 @@ constexpr unsigned kRefused = 393625;
 
 // Job status codes of IZELServerTransformationResult::getJobStatus.
 enum JobStatus : unsigned {
-    kQueued = 1, kDelayed = 2, kInProcess = 4, kAborted = 6, kSucceeded = 7, kServiceFailed = 8, kJobFailed = 9
+    kQueued = 1,
+    kDelayed = 2,
+    kInProcess = 4,
+    kAborted = 6,
+    kSucceeded = 7,
+    kServiceFailed = 8,
+    kJobFailed = 9
 };
 
 // A session of the library; strings made for a test are released before the session goes.

@@ -17,7 +17,8 @@ protected:
         IZELServerRepository* repository = client.repository("jobs");
         for (const auto& [name, content] :
              {std::pair{"greet.zlw", "# @parameter WHO | TEXT | nobody | Whom to greet\necho \"Hello $WHO\"\n"},
-              {"fail.zlw", "echo giving up\nexit 3\n"}, {"sleep.zlw", "sleep 30\n"}})
+              {"fail.zlw", "echo giving up\nexit 3\n"},
+              {"sleep.zlw", "sleep 30\n"}})
             ASSERT_EQ(addItem(client, *repository, name, content), 0u) << client.lastMessage();
         session->destroyRepository(&repository);
         result = session->createTransformationResult();

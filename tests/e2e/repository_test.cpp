@@ -7,14 +7,13 @@
 namespace zeltest {
 namespace {
 
-const char* kWorkspace =
-    "#!/bin/sh\n"
-    "# @title Roads\n"
-    "# @parameter SOURCE | FILENAME | in.csv | Where to read\n"
-    "# @source CSV | roads | /data/roads.csv\n"
-    "# @featuretype road | A road\n"
-    "# @attribute id | zel_int32 | 10 | 0\n"
-    "true\n";
+const char* kWorkspace = "#!/bin/sh\n"
+                         "# @title Roads\n"
+                         "# @parameter SOURCE | FILENAME | in.csv | Where to read\n"
+                         "# @source CSV | roads | /data/roads.csv\n"
+                         "# @featuretype road | A road\n"
+                         "# @attribute id | zel_int32 | 10 | 0\n"
+                         "true\n";
 
 class Repositories : public EndToEnd {
 protected:
@@ -25,8 +24,10 @@ protected:
         session = &client.session();
         manager = session->getRepositoryManager();
         repo = client.repository("roads");
-        for (const auto& [name, content] : {std::pair{"roads.zlw", kWorkspace}, {"off.zlw", "# @enabled false\n"},
-                                            {"fmt.zds", "# @title Format\n"}, {"tr.zlx", "plain"},
+        for (const auto& [name, content] : {std::pair{"roads.zlw", kWorkspace},
+                                            {"off.zlw", "# @enabled false\n"},
+                                            {"fmt.zds", "# @title Format\n"},
+                                            {"tr.zlx", "plain"},
                                             {"page.zlwt", "# @title Page\n"}})
             ASSERT_EQ(addItem(client, *repo, name, content), 0u) << name << ": " << client.lastMessage();
     }
@@ -168,8 +169,8 @@ TEST_F(Repositories, ServicesAndRegistrations)
     EXPECT_EQ(client.take(manager->addService(*service)), kRefused) << "a duplicate";
     service->setDescription(text("second"));
     EXPECT_EQ(client.take(manager->updateService(*service)), 0u) << client.lastMessage();
-    auto ghost = client.own(session->createService(text("ghost"), text(""), text(""), text("")),
-                            &Session::destroyService);
+    auto ghost =
+        client.own(session->createService(text("ghost"), text(""), text(""), text("")), &Session::destroyService);
     EXPECT_EQ(client.take(manager->updateService(*ghost)), kRefused) << "an unknown service";
 
     EXPECT_EQ(client.flag([&](unsigned& f) { return manager->serviceExists(text("pub"), f); }), 1);
@@ -235,8 +236,8 @@ TEST_F(Repositories, WorkspaceAndDatasetPropertiesAreReplacedByTheirAccessors)
     EXPECT_TRUE(again->getPropertyAccessor().getPropertyValue(text("ui"), text("colour"), value));
     EXPECT_STREQ(value.c_str(), "green");
     ASSERT_EQ(again->getSourceDatasets().entries(), 1u);
-    EXPECT_TRUE(again->getSourceDatasets().element(0)->getPropertyAccessor().getPropertyValue(
-        text("io"), text("encoding"), value));
+    EXPECT_TRUE(again->getSourceDatasets().element(0)->getPropertyAccessor().getPropertyValue(text("io"),
+                                                                                              text("encoding"), value));
     EXPECT_STREQ(value.c_str(), "utf-8");
 
     ASSERT_EQ(client.flag([&](unsigned& f) { return repo->removeItem(text("roads.zlw"), f); }), 1);

@@ -9,8 +9,8 @@ namespace {
 TEST_F(EndToEnd, SignInIdentityAndSessionProperties)
 {
     Client refused;
-    IZELServerConnectionInfo* info = refused.session().createConnectionInfo(
-        refused.text("127.0.0.1"), server->port(), refused.text("ann"), refused.text("nope"));
+    IZELServerConnectionInfo* info = refused.session().createConnectionInfo(refused.text("127.0.0.1"), server->port(),
+                                                                            refused.text("ann"), refused.text("nope"));
     EXPECT_EQ(refused.take(refused.session().init(*info, nullptr)), kRefused);
     EXPECT_EQ(refused.lastCode(), 1u) << "authentication failures carry kind 1";
     refused.session().destroyConnectionInfo(&info);

@@ -18,18 +18,16 @@
 
 namespace {
 
-const char* kConfig =
-    "[user ann]\npassword = pw-ann\nroles = admin\n"
-    "[user vic]\npassword = pw-vic\nroles = viewer\n"
-    "[sharedresource DATA]\npath = shared\n";
+const char* kConfig = "[user ann]\npassword = pw-ann\nroles = admin\n"
+                      "[user vic]\npassword = pw-vic\nroles = viewer\n"
+                      "[sharedresource DATA]\npath = shared\n";
 
-const char* kWorkspace =
-    "#!/bin/sh\n"
-    "# @title Greeter\n"
-    "# @parameter WHO | TEXT | nobody | Whom to greet\n"
-    "# @parameter CODE | TEXT | 0 | Exit status\n"
-    "echo \"Hello $WHO\"\n"
-    "exit \"$CODE\"\n";
+const char* kWorkspace = "#!/bin/sh\n"
+                         "# @title Greeter\n"
+                         "# @parameter WHO | TEXT | nobody | Whom to greet\n"
+                         "# @parameter CODE | TEXT | 0 | Exit status\n"
+                         "echo \"Hello $WHO\"\n"
+                         "exit \"$CODE\"\n";
 
 struct Outcome {
     int status = -1;
@@ -79,8 +77,8 @@ protected:
             s->set(value.data(), static_cast<unsigned>(value.size()));
             return s;
         };
-        IZELServerString* strings[] = {text("127.0.0.1"), text("ann"), text("pw-ann"), text("demo"),
-                                       text(""), text("greet.zlw"), text(file)};
+        IZELServerString* strings[] = {text("127.0.0.1"), text("ann"),       text("pw-ann"), text("demo"),
+                                       text(""),          text("greet.zlw"), text(file)};
         IZELServerConnectionInfo* info =
             session->createConnectionInfo(*strings[0], server->port(), *strings[1], *strings[2]);
         IZELServerStatus* status = session->init(*info, nullptr);
@@ -122,8 +120,8 @@ TEST_F(Examples, ListRepositoriesReportsARefusedSignIn)
 
 TEST_F(Examples, ExamplesRefuseAnIncompleteCommandLine)
 {
-    for (const char* program : {ZEL_EXAMPLE_LIST_REPOSITORIES, ZEL_EXAMPLE_PUBLISH_AND_RUN, ZEL_EXAMPLE_RUN_JOB,
-                                ZEL_EXAMPLE_UPLOAD_FILE}) {
+    for (const char* program :
+         {ZEL_EXAMPLE_LIST_REPOSITORIES, ZEL_EXAMPLE_PUBLISH_AND_RUN, ZEL_EXAMPLE_RUN_JOB, ZEL_EXAMPLE_UPLOAD_FILE}) {
         const Outcome outcome = run(std::string(program) + " 127.0.0.1");
         EXPECT_EQ(outcome.status, 2) << program;
         EXPECT_NE(outcome.output.find("usage: "), std::string::npos) << outcome.output;
@@ -170,12 +168,14 @@ TEST_F(Examples, PublishAndRunAddsThenReplacesTheItemAndFetchesEachLog)
     const std::string workspace = server->directory() + "/greet.zlw";
     std::ofstream(workspace) << kWorkspace;
     const std::string log = server->directory() + "/job.log";
-    const std::string command = ZEL_EXAMPLE_PUBLISH_AND_RUN + signIn("ann", "pw-ann") + " work " + workspace + " " + log;
+    const std::string command =
+        ZEL_EXAMPLE_PUBLISH_AND_RUN + signIn("ann", "pw-ann") + " work " + workspace + " " + log;
 
     const Outcome first = run(command + " WHO=World");
     EXPECT_EQ(first.status, 0) << first.output;
     EXPECT_EQ(first.output.rfind("added repository work\nadded item greet.zlw\nsubmitted job ", 0), 0u) << first.output;
-    EXPECT_NE(first.output.find("succeeded: 0 Translation was successful\nlog of job "), std::string::npos) << first.output;
+    EXPECT_NE(first.output.find("succeeded: 0 Translation was successful\nlog of job "), std::string::npos)
+        << first.output;
     EXPECT_NE(contentOf(log).find("Hello World"), std::string::npos) << contentOf(log);
 
     // A failing job still has its log fetched, and the same file replaces the item.
@@ -191,7 +191,8 @@ TEST_F(Examples, PublishAndRunStopsBeforeTheJobWhenTheUploadIsRefused)
     const std::string workspace = server->directory() + "/greet.zlw";
     std::ofstream(workspace) << kWorkspace;
     const std::string log = server->directory() + "/job.log";
-    const Outcome outcome = run(ZEL_EXAMPLE_PUBLISH_AND_RUN + signIn("vic", "pw-vic") + " work " + workspace + " " + log);
+    const Outcome outcome =
+        run(ZEL_EXAMPLE_PUBLISH_AND_RUN + signIn("vic", "pw-vic") + " work " + workspace + " " + log);
     EXPECT_EQ(outcome.status, 1) << outcome.output;
     EXPECT_EQ(outcome.output.rfind("error 393625: ", 0), 0u) << outcome.output;
     EXPECT_EQ(outcome.output.find("submitted"), std::string::npos) << outcome.output;
@@ -202,8 +203,7 @@ TEST_F(Examples, UploadFileCreatesTheFolderAndReportsProgress)
 {
     const std::string local = server->directory() + "/data.csv";
     std::ofstream(local) << std::string(1000, 'x');
-    const Outcome outcome =
-        run(ZEL_EXAMPLE_UPLOAD_FILE + signIn("ann", "pw-ann") + " DATA " + local + " /in/data.csv");
+    const Outcome outcome = run(ZEL_EXAMPLE_UPLOAD_FILE + signIn("ann", "pw-ann") + " DATA " + local + " /in/data.csv");
     EXPECT_EQ(outcome.status, 0) << outcome.output;
     EXPECT_EQ(outcome.output.rfind("uploading 1000 bytes\n", 0), 0u) << outcome.output;
     EXPECT_NE(outcome.output.find(" 100%\nDATA:/in/data.csv holds 1000 bytes ("), std::string::npos) << outcome.output;
@@ -216,8 +216,7 @@ TEST_F(Examples, UploadFileIsRefusedWithoutTheRightToWrite)
 {
     const std::string local = server->directory() + "/data.csv";
     std::ofstream(local) << "a,b\n";
-    const Outcome outcome =
-        run(ZEL_EXAMPLE_UPLOAD_FILE + signIn("vic", "pw-vic") + " DATA " + local + " /data.csv");
+    const Outcome outcome = run(ZEL_EXAMPLE_UPLOAD_FILE + signIn("vic", "pw-vic") + " DATA " + local + " /data.csv");
     EXPECT_EQ(outcome.status, 1) << outcome.output;
     EXPECT_EQ(outcome.output, "error 393625: user 'vic' may not run SR_UPLOAD\n");
 }

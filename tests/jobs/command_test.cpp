@@ -17,7 +17,8 @@ namespace {
 
 using StatusPtr = std::unique_ptr<IZELServerStatus>;
 
-TEST(Command, WithoutMemoryNothingIsSentAndTheResponseIsStillReleased) {
+TEST(Command, WithoutMemoryNothingIsSentAndTheResponseIsStillReleased)
+{
     // Never opened: a command that reached the connection would fail with a send error instead.
     ZELServerTCPIPChannel channel;
     heap::failNextAllocations(1);

@@ -16,7 +16,8 @@ namespace {
 constexpr unsigned kFresh = 4294967295u;
 const int kNotXml = static_cast<int>(msg::kXmlFailure);
 
-TEST(LogFileInfo, ReplyGivesTheSizeOfTheFirstChildNamedLogFileInfo) {
+TEST(LogFileInfo, ReplyGivesTheSizeOfTheFirstChildNamedLogFileInfo)
+{
     const struct {
         const char* what;
         std::string body;
@@ -53,7 +54,8 @@ TEST(LogFileInfo, ReplyGivesTheSizeOfTheFirstChildNamedLogFileInfo) {
     EXPECT_EQ(made->getSize(), kFresh);
 }
 
-TEST(LogFileInfo, ReadingAgainReplacesTheSizeAndAForeignImplementationIsNotReadable) {
+TEST(LogFileInfo, ReadingAgainReplacesTheSizeAndAForeignImplementationIsNotReadable)
+{
     ZELServerLogFileInfo info;
     ASSERT_EQ(readLogFileInfoReply(R"(<R><LOGFILEINFO size="5"/></R>)", info), 0);
     ASSERT_EQ(readLogFileInfoReply(R"(<R><LOGFILEINFO size="6"/></R>)", info), 0);

@@ -13,7 +13,8 @@ using namespace std::string_literals;
 namespace zel {
 namespace {
 
-TEST(ResultText, EntriesGiveExactlyTheseProperties) {
+TEST(ResultText, EntriesGiveExactlyTheseProperties)
+{
     const struct {
         const char* what;
         std::string text;
@@ -30,28 +31,35 @@ TEST(ResultText, EntriesGiveExactlyTheseProperties) {
         {"a name with its own star gets a second one", "*x=1"s, {{"**x", "1"}}},
         {"value keeps blanks and colons", "t= 12:00 "s, {{"*t", " 12:00 "}}},
         {"no result entry: nothing split", "StatusNumber=5"s, {{"*StatusNumber", "5"}}},
-        {"result with status and a pair", "result=12:Done|a=b"s,
+        {"result with status and a pair",
+         "result=12:Done|a=b"s,
          {{"*result", "12:Done|a=b"}, {"StatusNumber", "12"}, {"StatusMessage", "Done"}, {"a", "b"}}},
-        {"later status piece wins", "result=1:A|2:B"s,
+        {"later status piece wins",
+         "result=1:A|2:B"s,
          {{"*result", "1:A|2:B"}, {"StatusNumber", "2"}, {"StatusMessage", "B"}}},
         {"empty number leaves StatusNumber alone", "result=:Msg"s, {{"*result", ":Msg"}, {"StatusMessage", "Msg"}}},
         {"empty message leaves StatusMessage alone", "result=7:"s, {{"*result", "7:"}, {"StatusNumber", "7"}}},
-        {"empty side keeps the earlier value", "result=1:A|:B|2:"s,
+        {"empty side keeps the earlier value",
+         "result=1:A|:B|2:"s,
          {{"*result", "1:A|:B|2:"}, {"StatusNumber", "2"}, {"StatusMessage", "B"}}},
-        {"message holding a colon", "result=12:x:y"s,
+        {"message holding a colon",
+         "result=12:x:y"s,
          {{"*result", "12:x:y"}, {"StatusNumber", "12"}, {"StatusMessage", "x:y"}}},
         {"first piece without colon ends the status run", "result=x|1:A"s, {{"*result", "x|1:A"}}},
         {"empty first piece ends the status run", "result=|1:A|k=v"s, {{"*result", "|1:A|k=v"}, {"k", "v"}}},
-        {"status after a pair is ignored, pairs anywhere count", "result=1:A|k=v|2:B|m=n"s,
+        {"status after a pair is ignored, pairs anywhere count",
+         "result=1:A|k=v|2:B|m=n"s,
          {{"*result", "1:A|k=v|2:B|m=n"}, {"StatusNumber", "1"}, {"StatusMessage", "A"}, {"k", "v"}, {"m", "n"}}},
         {"a piece with colon and equals is a pair", "result=1:a=b"s, {{"*result", "1:a=b"}, {"1:a", "b"}}},
         {"equals inside a piece value", "result=a=b=c|d="s, {{"*result", "a=b=c|d="}, {"a", "b=c"}, {"d", ""}}},
         {"repeated piece names: last wins", "result=a=1|a=2"s, {{"*result", "a=1|a=2"}, {"a", "2"}}},
         {"empty result value", "result="s, {{"*result", ""}}},
         {"piece overwriting the result itself", "result=*result=z|k=v"s, {{"*result", "z"}, {"k", "v"}}},
-        {"pieces do not overwrite text entries", "a=text\0result=a=piece"s,
+        {"pieces do not overwrite text entries",
+         "a=text\0result=a=piece"s,
          {{"*a", "text"}, {"*result", "a=piece"}, {"a", "piece"}}},
-        {"repeated result entry: the last is split", "result=1:A\0result=2:B"s,
+        {"repeated result entry: the last is split",
+         "result=1:A\0result=2:B"s,
          {{"*result", "2:B"}, {"StatusNumber", "2"}, {"StatusMessage", "B"}}},
     };
     for (const auto& c : cases) {
@@ -62,7 +70,8 @@ TEST(ResultText, EntriesGiveExactlyTheseProperties) {
     }
 }
 
-TEST(ResultText, ParsingAddsToExistingPropertiesAndSplittingNeedsThePrefixedResult) {
+TEST(ResultText, ParsingAddsToExistingPropertiesAndSplittingNeedsThePrefixedResult)
+{
     ResultProperties properties{{"*kept", "1"}, {"*x", "old"}};
     parseResultEntries("x=new\0y=2"s, properties);
     EXPECT_EQ(properties, (ResultProperties{{"*kept", "1"}, {"*x", "new"}, {"*y", "2"}}));
@@ -72,15 +81,16 @@ TEST(ResultText, ParsingAddsToExistingPropertiesAndSplittingNeedsThePrefixedResu
     EXPECT_EQ(unprefixed, (ResultProperties{{"result", "1:A"}}));
 }
 
-TEST(ResultText, JobStatusWordsMapToTheirCodesAndBack) {
+TEST(ResultText, JobStatusWordsMapToTheirCodesAndBack)
+{
     const struct {
         const char* word;
         int code;  // -1: not a status word
     } cases[] = {
-        {"SUBMITTED", 0}, {"QUEUED", 1}, {"DELAYED", 2}, {"PAUSED", 3}, {"IN_PROCESS", 4}, {"DELETED", 5},
-        {"ABORTED", 6}, {"SUCCESS", 7}, {"ZEL_FAILURE", 8}, {"JOB_FAILURE", 9}, {"PULLED", 10},
-        {"success", -1}, {"SUCCESS ", -1}, {" SUCCESS", -1}, {"", -1}, {"FAILURE", -1}, {"IN PROCESS", -1},
-        {"SUCCESSFUL", -1},
+        {"SUBMITTED", 0}, {"QUEUED", 1},      {"DELAYED", 2},     {"PAUSED", 3},      {"IN_PROCESS", 4},
+        {"DELETED", 5},   {"ABORTED", 6},     {"SUCCESS", 7},     {"ZEL_FAILURE", 8}, {"JOB_FAILURE", 9},
+        {"PULLED", 10},   {"success", -1},    {"SUCCESS ", -1},   {" SUCCESS", -1},   {"", -1},
+        {"FAILURE", -1},  {"IN PROCESS", -1}, {"SUCCESSFUL", -1},
     };
     for (const auto& c : cases) {
         const std::optional<unsigned> code = jobStatusCode(c.word);

@@ -35,12 +35,14 @@ constexpr unsigned kUntouched = 0xDEADBEEFu;
 ZELServerString str(const std::string& text) { return ZELServerString(text); }
 ZELServerStringArray list(std::vector<std::string> items) { return ZELServerStringArray(std::move(items)); }
 
-std::string emptyRequestText(const std::string& path) {
+std::string emptyRequestText(const std::string& path)
+{
     return path + " -XML_PARAMETER " + R"(<?xml version="1.0" encoding="UTF-8" standalone="no" ?>)" +
            "<TRANSFORMATION_REQUEST/>";
 }
 
-std::string invalid(const std::string& name, const std::string& value) {
+std::string invalid(const std::string& name, const std::string& value)
+{
     return "The argument \"" + name + "\" has an invalid value: \"" + value + "\".";
 }
 
@@ -49,8 +51,11 @@ class FixedRequest final : public IZELServerTransformationRequest {
 public:
     FixedRequest(std::string keyword, std::string text, std::vector<std::string> directives,
                  std::vector<std::string> notifications)
-        : keyword_(std::move(keyword)), text_(std::move(text)), directives_(std::move(directives)),
-          notifications_(std::move(notifications)) {}
+        : keyword_(std::move(keyword)),
+          text_(std::move(text)),
+          directives_(std::move(directives)),
+          notifications_(std::move(notifications))
+    {}
     void getKeyword(IZELServerString& out) const override { copy(keyword_, out); }
     void getRequestText(IZELServerString& out) const override { copy(text_, out); }
     void getDirectives(IZELServerStringArray& pairs) const override { appendAll(directives_, pairs); }
@@ -72,10 +77,12 @@ public:
     unsigned getNotification(const IZELServerString&, IZELServerString&) const override { return 0; }
 
 private:
-    static void copy(const std::string& text, IZELServerString& out) {
+    static void copy(const std::string& text, IZELServerString& out)
+    {
         out.set(text.data(), static_cast<unsigned>(text.size()));
     }
-    static void appendAll(const std::vector<std::string>& items, IZELServerStringArray& out) {
+    static void appendAll(const std::vector<std::string>& items, IZELServerStringArray& out)
+    {
         for (const std::string& item : items) {
             out.append(item.c_str());
         }
@@ -90,7 +97,8 @@ class TransformationManagerWire : public SignedInChannelTest {
 protected:
     // Accepts a "JOB_REQUEST" of the result-port exchange: `before` and `after` surround the port and the
     // address, which this side chooses. Everything else must match byte for byte.
-    static FakeServer::Predicate transactFrame(Values before, Values after) {
+    static FakeServer::Predicate transactFrame(Values before, Values after)
+    {
         return [before, after](const Bytes& payload) {
             const std::optional<ParsedRequest> parsed = parseRequest(payload);
             if (!parsed || parsed->values.size() < 2 + before.size() + 2) {
@@ -98,7 +106,8 @@ protected:
             }
             const std::string port = parsed->values[2 + before.size()].second;
             const std::string host = parsed->values[3 + before.size()].second;
-            if (port.empty() || port == "0" || port.find_first_not_of("0123456789") != std::string::npos || host.empty()) {
+            if (port.empty() || port == "0" || port.find_first_not_of("0123456789") != std::string::npos ||
+                host.empty()) {
                 return false;
             }
             Values expected = before;
@@ -114,7 +123,8 @@ protected:
 
 // ---- Submission and scheduling
 
-TEST_F(TransformationManagerWire, SubmitJobStringSendsKeywordAsGivenAndRequestTrimmed) {
+TEST_F(TransformationManagerWire, SubmitJobStringSendsKeywordAsGivenAndRequestTrimmed)
+{
     server.exchange(command("JOB_REQUEST", {{"keyword", " svc "}, {"request", "a b"}, {"d", "1"}, {"e", "2"}}),
                     reply("SUCCESS", " 42"));
     signIn();
@@ -125,13 +135,17 @@ TEST_F(TransformationManagerWire, SubmitJobStringSendsKeywordAsGivenAndRequestTr
     EXPECT_TRUE(server.verify());
 }
 
-TEST_F(TransformationManagerWire, SubmitJobSendsDirectivesThenOneNotificationPerWholePair) {
+TEST_F(TransformationManagerWire, SubmitJobSendsDirectivesThenOneNotificationPerWholePair)
+{
     ZELServerTransformationRequest job(str("svc"), str("R/w/w.ext"));
     job.setDirective(str("priority"), str("5"));
     job.setNotification(str("B"), str("y"));
     job.setNotification(str("A"), str("x"));
-    server.exchange(command("JOB_REQUEST", {{"keyword", "svc"}, {"request", emptyRequestText("R/w/w.ext")},
-                                            {"priority", "5"}, {"notificationMsg", "A:x"}, {"notificationMsg", "B:y"}}),
+    server.exchange(command("JOB_REQUEST", {{"keyword", "svc"},
+                                            {"request", emptyRequestText("R/w/w.ext")},
+                                            {"priority", "5"},
+                                            {"notificationMsg", "A:x"},
+                                            {"notificationMsg", "B:y"}}),
                     reply("SUCCESS", "17"));
     // A caller's list with an odd last entry gives one message for the whole pair only.
     server.exchange(
@@ -148,14 +162,16 @@ TEST_F(TransformationManagerWire, SubmitJobSendsDirectivesThenOneNotificationPer
     EXPECT_TRUE(server.verify());
 }
 
-TEST_F(TransformationManagerWire, SubmissionReplyIsReadWithoutCheckingAndARefusalKeepsTheJobId) {
+TEST_F(TransformationManagerWire, SubmissionReplyIsReadWithoutCheckingAndARefusalKeepsTheJobId)
+{
     const struct {
         const char* status;
         const char* body;
         unsigned jobId;
     } cases[] = {
-        {"SUCCESS", " 42", 42}, {"SUCCESS", "0x2A", 42}, {"SUCCESS", "12abc", 12}, {"SUCCESS", "no number", 99},
-        {"SUCCESS", "4294967296", 99}, {"SUCCESS", "-1", 4294967295u}, {"ERROR", "no such service", 99},
+        {"SUCCESS", " 42", 42},           {"SUCCESS", "0x2A", 42},       {"SUCCESS", "12abc", 12},
+        {"SUCCESS", "no number", 99},     {"SUCCESS", "4294967296", 99}, {"SUCCESS", "-1", 4294967295u},
+        {"ERROR", "no such service", 99},
     };
     for (const auto& c : cases) {
         server.exchange(command("JOB_REQUEST", {{"keyword", "k"}, {"request", "r"}}), reply(c.status, c.body));
@@ -176,10 +192,11 @@ TEST_F(TransformationManagerWire, SubmissionReplyIsReadWithoutCheckingAndARefusa
     EXPECT_TRUE(server.verify());
 }
 
-TEST_F(TransformationManagerWire, ScheduleOverridesTheCallersSecondsFromNowAndSendsNoNotifications) {
-    server.exchange(command("JOB_REQUEST",
-                            {{"keyword", " k"}, {"request", "r"}, {"a", "1"}, {"secondsFromNow", "60"}, {"z", "2"}}),
-                    reply("SUCCESS", "8"));
+TEST_F(TransformationManagerWire, ScheduleOverridesTheCallersSecondsFromNowAndSendsNoNotifications)
+{
+    server.exchange(
+        command("JOB_REQUEST", {{"keyword", " k"}, {"request", "r"}, {"a", "1"}, {"secondsFromNow", "60"}, {"z", "2"}}),
+        reply("SUCCESS", "8"));
     server.exchange(
         command("JOB_REQUEST", {{"keyword", "svc"}, {"request", "job"}, {"d", "1"}, {"secondsFromNow", "4294967295"}}),
         reply("SUCCESS", "9"));
@@ -197,9 +214,11 @@ TEST_F(TransformationManagerWire, ScheduleOverridesTheCallersSecondsFromNowAndSe
 
 // ---- Transaction
 
-TEST_F(TransformationManagerWire, TransactJobStringTrimsKeywordAndTakesResultFromTheResultPort) {
+TEST_F(TransformationManagerWire, TransactJobStringTrimsKeywordAndTakesResultFromTheResultPort)
+{
     const Bytes result = "jobStatus=SUCCESS\0id=17\0result=0:done"s;
-    server.expectFrameWhere("transact JOB_REQUEST", transactFrame({{"keyword", "svc"}, {"request", "a b"}}, {{"d", "1"}}))
+    server
+        .expectFrameWhere("transact JOB_REQUEST", transactFrame({{"keyword", "svc"}, {"request", "a b"}}, {{"d", "1"}}))
         .sendFrame(reply("SUCCESS", "accepted"))
         .connectBackAndSend(result);
     signIn();
@@ -211,13 +230,15 @@ TEST_F(TransformationManagerWire, TransactJobStringTrimsKeywordAndTakesResultFro
     EXPECT_EQ(server.connectionsAccepted(), 1);
 }
 
-TEST_F(TransformationManagerWire, TransactJobParsesTheResultAndSendsNotifications) {
+TEST_F(TransformationManagerWire, TransactJobParsesTheResultAndSendsNotifications)
+{
     ZELServerTransformationRequest job(str("svc"), str("R"), str("w.ext"));
     job.setDirective(str("priority"), str("2"));
     job.setNotification(str("A"), str("x"));
-    server.expectFrameWhere("transact JOB_REQUEST",
-                            transactFrame({{"keyword", "svc"}, {"request", emptyRequestText("R/w/w.ext")}},
-                                          {{"priority", "2"}, {"notificationMsg", "A:x"}}))
+    server
+        .expectFrameWhere("transact JOB_REQUEST",
+                          transactFrame({{"keyword", "svc"}, {"request", emptyRequestText("R/w/w.ext")}},
+                                        {{"priority", "2"}, {"notificationMsg", "A:x"}}))
         .sendFrame(reply("SUCCESS", "accepted"))
         .connectBackAndSend("jobStatus=SUCCESS\0id=17"s);
     signIn();
@@ -231,7 +252,8 @@ TEST_F(TransformationManagerWire, TransactJobParsesTheResultAndSendsNotification
     EXPECT_TRUE(server.verify());
 }
 
-TEST_F(TransformationManagerWire, RefusedTransactionLeavesResultAloneAndHandsOutTheErrorBody) {
+TEST_F(TransformationManagerWire, RefusedTransactionLeavesResultAloneAndHandsOutTheErrorBody)
+{
     server.expectFrameWhere("transact JOB_REQUEST", transactFrame({{"keyword", "svc"}, {"request", "r"}}, {}))
         .sendFrame(reply("ERROR", "Authorization Error: no rights"));
     server.expectFrameWhere("transact JOB_REQUEST", transactFrame({{"keyword", "svc"}, {"request", "r"}}, {}))
@@ -257,15 +279,19 @@ TEST_F(TransformationManagerWire, RefusedTransactionLeavesResultAloneAndHandsOut
 
 // ---- Abort and results
 
-TEST_F(TransformationManagerWire, AbortSendsTheIdAsSigned32BitNumberAndReturnsARefusal) {
+TEST_F(TransformationManagerWire, AbortSendsTheIdAsSigned32BitNumberAndReturnsARefusal)
+{
     const struct {
         unsigned jobId;
         const char* text;
         const char* status;
         const char* body;
     } cases[] = {
-        {0, "0", "SUCCESS", "true"}, {7, "7", "SUCCESS", "true"}, {2147483647u, "2147483647", "SUCCESS", "true"},
-        {2147483648u, "-2147483648", "SUCCESS", "true"}, {4294967295u, "-1", "SUCCESS", "true"},
+        {0, "0", "SUCCESS", "true"},
+        {7, "7", "SUCCESS", "true"},
+        {2147483647u, "2147483647", "SUCCESS", "true"},
+        {2147483648u, "-2147483648", "SUCCESS", "true"},
+        {4294967295u, "-1", "SUCCESS", "true"},
         {5, "5", "ERROR", "job 5 is finished"},
     };
     for (const auto& c : cases) {
@@ -280,7 +306,8 @@ TEST_F(TransformationManagerWire, AbortSendsTheIdAsSigned32BitNumberAndReturnsAR
     EXPECT_TRUE(server.verify());
 }
 
-TEST_F(TransformationManagerWire, JobResultStringHandsOutTheWholeBodyAndNullIsNotFound) {
+TEST_F(TransformationManagerWire, JobResultStringHandsOutTheWholeBodyAndNullIsNotFound)
+{
     const Bytes body = "id=12\0jobStatus=ABORTED\0description=null"s;
     const struct {
         unsigned jobId;
@@ -311,7 +338,8 @@ TEST_F(TransformationManagerWire, JobResultStringHandsOutTheWholeBodyAndNullIsNo
     EXPECT_TRUE(server.verify());
 }
 
-TEST_F(TransformationManagerWire, JobResultParsesRealTextAndEmptiesTextOnNull) {
+TEST_F(TransformationManagerWire, JobResultParsesRealTextAndEmptiesTextOnNull)
+{
     server.exchange(command("GET_JOB_RESULT_STRING", {{"jobID", "12"}}),
                     reply("SUCCESS", "id=12\0jobStatus=QUEUED\0result=3:Waiting"s));
     server.exchange(command("GET_JOB_RESULT_STRING", {{"jobID", "13"}}), reply("SUCCESS", "null"));
@@ -343,7 +371,8 @@ TEST_F(TransformationManagerWire, JobResultParsesRealTextAndEmptiesTextOnNull) {
 
 // ---- Log files
 
-TEST_F(TransformationManagerWire, LogFileExistsReadsTheBodyAsBoolean) {
+TEST_F(TransformationManagerWire, LogFileExistsReadsTheBodyAsBoolean)
+{
     const struct {
         const char* body;
         unsigned exists;
@@ -361,7 +390,8 @@ TEST_F(TransformationManagerWire, LogFileExistsReadsTheBodyAsBoolean) {
     EXPECT_TRUE(server.verify());
 }
 
-TEST_F(TransformationManagerWire, LogFileInfoReadsTheDescriptionAndOnlyAFailedExchangeFails) {
+TEST_F(TransformationManagerWire, LogFileInfoReadsTheDescriptionAndOnlyAFailedExchangeFails)
+{
     const struct {
         const char* status;
         const char* body;
@@ -391,7 +421,8 @@ TEST_F(TransformationManagerWire, LogFileInfoReadsTheDescriptionAndOnlyAFailedEx
 
 class LogDownload : public TransformationManagerWire {
 protected:
-    static Bytes logCommand(const char* jobId) {
+    static Bytes logCommand(const char* jobId)
+    {
         return command("LOG_GET_FILE", {{"jobID", jobId}, {"logFileCRCCheckingEnabled", "false"}});
     }
 
@@ -399,7 +430,8 @@ protected:
     const std::string path = (scratch.path() / "job.log").string();
 };
 
-TEST_F(LogDownload, ReceivesTheLogAndAFinalFalseDeletesIt) {
+TEST_F(LogDownload, ReceivesTheLogAndAFinalFalseDeletesIt)
+{
     const Bytes content = "line one\nline two\0binary\n"s;
     for (const char* answer : {"true", "false"}) {
         server.expectFrame(logCommand(answer[0] == 't' ? "-1" : "3"))
@@ -424,7 +456,8 @@ TEST_F(LogDownload, ReceivesTheLogAndAFinalFalseDeletesIt) {
     EXPECT_TRUE(server.verify());
 }
 
-TEST_F(LogDownload, ServerWithoutALogLeavesNoFileBehind) {
+TEST_F(LogDownload, ServerWithoutALogLeavesNoFileBehind)
+{
     // A first frame that is no file header ends the exchange; the channel reads it as "false".
     server.expectFrame(logCommand("3")).sendFrame(reply("SUCCESS", "false"));
     server.expectFrame(logCommand("4")).sendFrame(reply("ERROR", "no log for job 4"));
@@ -440,7 +473,8 @@ TEST_F(LogDownload, ServerWithoutALogLeavesNoFileBehind) {
     EXPECT_TRUE(server.verify());
 }
 
-TEST_F(LogDownload, UnwritablePathFailsBeforeAnythingIsSent) {
+TEST_F(LogDownload, UnwritablePathFailsBeforeAnythingIsSent)
+{
     signIn();
     const std::string missing = (scratch.path() / "no-such-folder" / "job.log").string();
     for (const std::string& target : {missing, scratch.string()}) {
@@ -455,8 +489,13 @@ TEST_F(LogDownload, UnwritablePathFailsBeforeAnythingIsSent) {
     EXPECT_EQ(server.frames().size(), 1u);  // the sign-in only
 }
 
-TEST_F(LogDownload, BrokenTransferKeepsThePartlyWrittenFile) {
-    server.expectFrame(logCommand("3")).sendFrame(fileHeader(10, 0)).expectFrame(readyAck()).sendRaw("abcd").closeConnection();
+TEST_F(LogDownload, BrokenTransferKeepsThePartlyWrittenFile)
+{
+    server.expectFrame(logCommand("3"))
+        .sendFrame(fileHeader(10, 0))
+        .expectFrame(readyAck())
+        .sendRaw("abcd")
+        .closeConnection();
     signIn();
     unsigned success = kUntouched;
     StatusPtr status(manager.getLogFile(3, str(path), success));
@@ -476,7 +515,8 @@ protected:
     ZELServerTransformationManager manager{&channel};
 };
 
-TEST_F(TransformationManagerChecks, KeywordAndRequestAreRefusedBeforeAnythingIsSent) {
+TEST_F(TransformationManagerChecks, KeywordAndRequestAreRefusedBeforeAnythingIsSent)
+{
     const struct {
         const char* what;
         std::string keyword;
@@ -514,7 +554,8 @@ TEST_F(TransformationManagerChecks, KeywordAndRequestAreRefusedBeforeAnythingIsS
     }
 }
 
-TEST_F(TransformationManagerChecks, OnlySpacesAreTrimmed) {
+TEST_F(TransformationManagerChecks, OnlySpacesAreTrimmed)
+{
     // A tab is part of the keyword: the check passes and the command reaches the (closed) channel.
     unsigned jobId = kUntouched;
     StatusPtr status(manager.submitJobString(str("\t"), str("r\n"), ZELServerStringArray(), jobId));
@@ -523,7 +564,8 @@ TEST_F(TransformationManagerChecks, OnlySpacesAreTrimmed) {
     EXPECT_EQ(jobId, kUntouched);
 }
 
-TEST_F(TransformationManagerChecks, TransactThroughTheBaseInterfaceIsTheSameOperation) {
+TEST_F(TransformationManagerChecks, TransactThroughTheBaseInterfaceIsTheSameOperation)
+{
     IZELServerBaseTransformationManager& base = manager;
     ZELServerTransformationResult result;
     StatusPtr viaBase(base.transactJob(FixedRequest(" ", "r", {}, {}), result));
@@ -537,7 +579,8 @@ TEST_F(TransformationManagerChecks, TransactThroughTheBaseInterfaceIsTheSameOper
     EXPECT_EQ(manager.reserved(), 0u);
 }
 
-TEST_F(TransformationManagerChecks, RequestTextThatCannotBeComposedIsRefused) {
+TEST_F(TransformationManagerChecks, RequestTextThatCannotBeComposedIsRefused)
+{
     ZELServerTransformationRequest job(str("svc"), str("p"));
     job.setPublishedParameter(str("P"), str("a\0b"s));
     unsigned jobId = kUntouched;
@@ -546,7 +589,8 @@ TEST_F(TransformationManagerChecks, RequestTextThatCannotBeComposedIsRefused) {
     EXPECT_EQ(status->getMessage(), invalid("request", ""));
 }
 
-TEST_F(TransformationManagerChecks, FactoryNeedsAChannel) {
+TEST_F(TransformationManagerChecks, FactoryNeedsAChannel)
+{
     EXPECT_EQ(makeTransformationManager(nullptr), nullptr);
     std::unique_ptr<IZELServerTransformationManager> made(makeTransformationManager(&channel));
     ASSERT_NE(made, nullptr);

@@ -25,20 +25,22 @@ using Pairs = std::vector<std::string>;
 
 ZELServerString str(const std::string& text) { return ZELServerString(text); }
 
-std::string requestText(const IZELServerTransformationRequest& request) {
+std::string requestText(const IZELServerTransformationRequest& request)
+{
     ZELServerString out;
     request.getRequestText(out);
     return out.str();
 }
 
-std::string textFor(const std::string& path, const std::string& elements) {
-    const std::string document = elements.empty()
-                                     ? "<TRANSFORMATION_REQUEST/>"
-                                     : "<TRANSFORMATION_REQUEST>" + elements + "</TRANSFORMATION_REQUEST>";
+std::string textFor(const std::string& path, const std::string& elements)
+{
+    const std::string document = elements.empty() ? "<TRANSFORMATION_REQUEST/>"
+                                                  : "<TRANSFORMATION_REQUEST>" + elements + "</TRANSFORMATION_REQUEST>";
     return path + " -XML_PARAMETER " + R"(<?xml version="1.0" encoding="UTF-8" standalone="no" ?>)" + document;
 }
 
-std::string parameter(const std::string& name, const std::string& value) {
+std::string parameter(const std::string& name, const std::string& value)
+{
     return "<PUBLISHED_PARAMETER name=\"" + name + "\">" + value + "</PUBLISHED_PARAMETER>";
 }
 
@@ -62,7 +64,8 @@ public:
     long long getFileSize() const override { unexpected(); }
 
 private:
-    [[noreturn]] static void unexpected() {
+    [[noreturn]] static void unexpected()
+    {
         ADD_FAILURE() << "the request read more than the workspace's name";
         std::abort();
     }
@@ -71,17 +74,24 @@ private:
 
 // ---- Workspace paths and factories
 
-TEST(TransformationRequest, WorkspacePathDropsFourCharactersForTheFolder) {
+TEST(TransformationRequest, WorkspacePathDropsFourCharactersForTheFolder)
+{
     const struct {
         std::string repository;
         std::string workspace;
         std::string path;
     } cases[] = {
-        {"R", "w.ext", "R/w/w.ext"}, {"Samples", "austria.fmw", "Samples/austria/austria.fmw"},
+        {"R", "w.ext", "R/w/w.ext"},
+        {"Samples", "austria.fmw", "Samples/austria/austria.fmw"},
         // Four characters, whatever they are.
-        {"R", "x.fmwt", "R/x./x.fmwt"}, {"R", "noextension", "R/noexten/noextension"}, {"R", "abcd", "R//abcd"},
+        {"R", "x.fmwt", "R/x./x.fmwt"},
+        {"R", "noextension", "R/noexten/noextension"},
+        {"R", "abcd", "R//abcd"},
         // Shorter names lose everything they have, and nothing before them.
-        {"R", "abc", "R//abc"}, {"R", "a", "R//a"}, {"R", "", "R//"}, {"", "w.ext", "/w/w.ext"},
+        {"R", "abc", "R//abc"},
+        {"R", "a", "R//a"},
+        {"R", "", "R//"},
+        {"", "w.ext", "/w/w.ext"},
     };
     for (const auto& c : cases) {
         SCOPED_TRACE(c.repository + " " + c.workspace);
@@ -95,8 +105,10 @@ TEST(TransformationRequest, WorkspacePathDropsFourCharactersForTheFolder) {
     EXPECT_EQ(requestText(byPath), textFor("any/thing here.fmw", ""));
 }
 
-TEST(TransformationRequest, FactoriesMakeTheThreeFormsOrNullOnAnExhaustedHeap) {
-    std::unique_ptr<IZELServerTransformationRequest> byName(makeTransformationRequest(str("S"), str("R"), str("w.ext")));
+TEST(TransformationRequest, FactoriesMakeTheThreeFormsOrNullOnAnExhaustedHeap)
+{
+    std::unique_ptr<IZELServerTransformationRequest> byName(
+        makeTransformationRequest(str("S"), str("R"), str("w.ext")));
     std::unique_ptr<IZELServerTransformationRequest> byPath(makeTransformationRequest(str("S"), str("R/x/y")));
     std::unique_ptr<IZELServerTransformationRequest> byObject(
         makeTransformationRequest(str("S"), str("R"), NamedWorkspace("v.ext")));
@@ -114,18 +126,20 @@ TEST(TransformationRequest, FactoriesMakeTheThreeFormsOrNullOnAnExhaustedHeap) {
 
 // ---- Request text
 
-TEST(TransformationRequest, ParametersInNameOrderWithTheLastValueThenEmbeddedDirectives) {
+TEST(TransformationRequest, ParametersInNameOrderWithTheLastValueThenEmbeddedDirectives)
+{
     Request request(str("S"), str("R"), str("w.ext"));
     request.setEmbeddedDirective(str("LOG_LEVEL"), str("2"));
     request.setPublishedParameter(str("ZONE"), str("first"));
     request.setPublishedParameter(str("AREA"), str("a<b & c>d"));
     request.setPublishedParameter(str("ZONE"), str("north"));
-    EXPECT_EQ(requestText(request), textFor("R/w/w.ext", parameter("AREA", "a&lt;b &amp; c&gt;d") +
-                                                             parameter("ZONE", "north") +
-                                                             R"(<ZEL_DIRECTIVE name="LOG_LEVEL">2</ZEL_DIRECTIVE>)"));
+    EXPECT_EQ(requestText(request),
+              textFor("R/w/w.ext", parameter("AREA", "a&lt;b &amp; c&gt;d") + parameter("ZONE", "north") +
+                                       R"(<ZEL_DIRECTIVE name="LOG_LEVEL">2</ZEL_DIRECTIVE>)"));
 }
 
-TEST(TransformationRequest, AttributeQuotesAreEscapedAndLocalCodePageTextBecomesUtf8) {
+TEST(TransformationRequest, AttributeQuotesAreEscapedAndLocalCodePageTextBecomesUtf8)
+{
     Request request(str("S"), str("p"));
     request.setPublishedParameter(str("a\"b"), str(""));
     request.setPublishedParameter(str("CITY"), str("Z\xFCrich"));
@@ -133,7 +147,8 @@ TEST(TransformationRequest, AttributeQuotesAreEscapedAndLocalCodePageTextBecomes
                                                      R"(<PUBLISHED_PARAMETER name="a&quot;b"></PUBLISHED_PARAMETER>)"));
 }
 
-TEST(TransformationRequest, TextThatCannotBeWrittenLeavesOutUntouchedAndStaysDirty) {
+TEST(TransformationRequest, TextThatCannotBeWrittenLeavesOutUntouchedAndStaysDirty)
+{
     Request request(str("S"), str("p"));
     request.setPublishedParameter(str("P"), str("a\0b"s));
     ZELServerString out("before");
@@ -147,7 +162,8 @@ TEST(TransformationRequest, TextThatCannotBeWrittenLeavesOutUntouchedAndStaysDir
     EXPECT_FALSE(request.dirty());
 }
 
-TEST(TransformationRequest, XmlSupportThatCannotBeMadeIsTriedAgain) {
+TEST(TransformationRequest, XmlSupportThatCannotBeMadeIsTriedAgain)
+{
     Request request(str("S"), str("p"));
     heap::failNextAllocations(1);
     ZELServerString out("before");
@@ -159,7 +175,8 @@ TEST(TransformationRequest, XmlSupportThatCannotBeMadeIsTriedAgain) {
 
 // ---- Dirty flag
 
-TEST(TransformationRequest, EmbeddedDirectivesDoNotRecomposeUntilKeywordIsSetAgain) {
+TEST(TransformationRequest, EmbeddedDirectivesDoNotRecomposeUntilKeywordIsSetAgain)
+{
     Request request(str("S"), str("p"));
     EXPECT_TRUE(request.dirty());
     const std::string first = requestText(request);
@@ -176,7 +193,8 @@ TEST(TransformationRequest, EmbeddedDirectivesDoNotRecomposeUntilKeywordIsSetAga
                                                  R"(<ZEL_DIRECTIVE name="E">2</ZEL_DIRECTIVE>)"));
 }
 
-TEST(TransformationRequest, OnlyKeywordAndPublishedParametersSetTheDirtyFlag) {
+TEST(TransformationRequest, OnlyKeywordAndPublishedParametersSetTheDirtyFlag)
+{
     const ZELServerStringArray pair(Pairs{"N", "1"});
     const struct {
         const char* what;
@@ -184,11 +202,13 @@ TEST(TransformationRequest, OnlyKeywordAndPublishedParametersSetTheDirtyFlag) {
         bool dirty;
     } cases[] = {
         {"keyword", [](Request& r, const ZELServerStringArray&) { r.setKeyword(str("other")); }, true},
-        {"one parameter", [](Request& r, const ZELServerStringArray&) { r.setPublishedParameter(str("P"), str("1")); }, true},
+        {"one parameter", [](Request& r, const ZELServerStringArray&) { r.setPublishedParameter(str("P"), str("1")); },
+         true},
         {"parameter list", [](Request& r, const ZELServerStringArray& p) { r.setPublishedParameters(p); }, true},
         {"directive", [](Request& r, const ZELServerStringArray&) { r.setDirective(str("D"), str("1")); }, false},
         {"directive list", [](Request& r, const ZELServerStringArray& p) { r.setDirectives(p); }, false},
-        {"embedded directive", [](Request& r, const ZELServerStringArray&) { r.setEmbeddedDirective(str("E"), str("1")); }, false},
+        {"embedded directive",
+         [](Request& r, const ZELServerStringArray&) { r.setEmbeddedDirective(str("E"), str("1")); }, false},
         {"notification", [](Request& r, const ZELServerStringArray&) { r.setNotification(str("T"), str("m")); }, false},
         {"notification list", [](Request& r, const ZELServerStringArray& p) { r.setNotifications(p); }, false},
     };
@@ -203,7 +223,8 @@ TEST(TransformationRequest, OnlyKeywordAndPublishedParametersSetTheDirtyFlag) {
 
 // ---- Dictionaries
 
-TEST(TransformationRequest, KeywordIsKeptWithItsBytes) {
+TEST(TransformationRequest, KeywordIsKeptWithItsBytes)
+{
     Request request(str(" svc "), str("p"));
     ZELServerString keyword;
     request.getKeyword(keyword);
@@ -231,7 +252,8 @@ const Dictionary kDictionaries[] = {
      &Request::getNotifications},
 };
 
-TEST(TransformationRequest, DictionaryPairsReplaceByNameComeOutInNameOrderAndStayApart) {
+TEST(TransformationRequest, DictionaryPairsReplaceByNameComeOutInNameOrderAndStayApart)
+{
     for (const Dictionary& d : kDictionaries) {
         SCOPED_TRACE(d.what);
         Request request(str("S"), str("p"));

@@ -22,7 +22,8 @@ namespace {
 using Result = ZELServerTransformationResult;
 constexpr unsigned kUntouched = 0xDEADBEEFu;
 
-std::unique_ptr<Result> parsed(const std::string& text) {
+std::unique_ptr<Result> parsed(const std::string& text)
+{
     auto result = std::make_unique<Result>();
     result->parse(ZELServerString(text));
     return result;
@@ -30,7 +31,8 @@ std::unique_ptr<Result> parsed(const std::string& text) {
 
 // ---- Numbers
 
-TEST(TransformationResult, UnsignedGettersConvertLikeTheServerWritesNumbers) {
+TEST(TransformationResult, UnsignedGettersConvertLikeTheServerWritesNumbers)
+{
     using Getter = unsigned (Result::*)(unsigned&) const;
     const Getter id = &Result::getID;
     const Getter port = &Result::getRequesterResultPort;  // refuses a minus sign
@@ -40,16 +42,27 @@ TEST(TransformationResult, UnsignedGettersConvertLikeTheServerWritesNumbers) {
         unsigned found;
         unsigned value;  // kUntouched when the out value must stay as it was
     } cases[] = {
-        {id, "id=17", 1, 17}, {id, "id=   17", 1, 17}, {id, "id=0x1F", 1, 31}, {id, "id=0XfF", 1, 255},
-        {id, "id=12.000  ", 1, 12}, {id, "id=4294967295", 1, 4294967295u},
+        {id, "id=17", 1, 17},
+        {id, "id=   17", 1, 17},
+        {id, "id=0x1F", 1, 31},
+        {id, "id=0XfF", 1, 255},
+        {id, "id=12.000  ", 1, 12},
+        {id, "id=4294967295", 1, 4294967295u},
         {id, "id=-1", 1, 4294967295u},  // a minus wraps like the server's reader
         // other text behind the number: stored, not found
-        {id, "id=12abc", 0, 12}, {id, "id=12.5", 0, 12}, {port, "requesterResultPort=80x", 0, 80},
-        {id, "id=4294967296", 0, kUntouched}, {id, "id=abc", 0, kUntouched}, {id, "id=", 0, kUntouched},
-        {id, "id=   ", 0, kUntouched}, {id, "other=1", 0, kUntouched},
+        {id, "id=12abc", 0, 12},
+        {id, "id=12.5", 0, 12},
+        {port, "requesterResultPort=80x", 0, 80},
+        {id, "id=4294967296", 0, kUntouched},
+        {id, "id=abc", 0, kUntouched},
+        {id, "id=", 0, kUntouched},
+        {id, "id=   ", 0, kUntouched},
+        {id, "other=1", 0, kUntouched},
         {id, "result=id=5", 0, kUntouched},  // a result piece is not the job's id
-        {port, "requesterResultPort=7071", 1, 7071}, {port, "requesterResultPort=0x10", 1, 16},
-        {port, "requesterResultPort=-1", 0, kUntouched}, {port, "requesterResultPort= -5", 0, kUntouched},
+        {port, "requesterResultPort=7071", 1, 7071},
+        {port, "requesterResultPort=0x10", 1, 16},
+        {port, "requesterResultPort=-1", 0, kUntouched},
+        {port, "requesterResultPort= -5", 0, kUntouched},
         {port, "", 0, kUntouched},
     };
     for (const auto& c : cases) {
@@ -60,7 +73,8 @@ TEST(TransformationResult, UnsignedGettersConvertLikeTheServerWritesNumbers) {
     }
 }
 
-TEST(TransformationResult, PriorityStatusNumberAndMessageUseTheirOwnNames) {
+TEST(TransformationResult, PriorityStatusNumberAndMessageUseTheirOwnNames)
+{
     const auto result = parsed("priority=3\0result=42:Finished|x=y"s);
     unsigned priority = kUntouched;
     unsigned number = kUntouched;
@@ -75,17 +89,18 @@ TEST(TransformationResult, PriorityStatusNumberAndMessageUseTheirOwnNames) {
 
 // ---- Job status and booleans
 
-TEST(TransformationResult, JobStatusComparesTheWholeWordExactly) {
+TEST(TransformationResult, JobStatusComparesTheWholeWordExactly)
+{
     const struct {
         std::string text;
         unsigned found;
         unsigned code;
         unsigned success;
     } cases[] = {
-        {"jobStatus=SUCCESS\0id=17"s, 1, 7, 1}, {"jobStatus=QUEUED", 1, 1, 0},
-        {"jobStatus=PULLED", 1, 10, 0}, {"jobStatus=JOB_FAILURE", 1, 9, 0},
+        {"jobStatus=SUCCESS\0id=17"s, 1, 7, 1},  {"jobStatus=QUEUED", 1, 1, 0},
+        {"jobStatus=PULLED", 1, 10, 0},          {"jobStatus=JOB_FAILURE", 1, 9, 0},
         {"jobStatus=success", 0, kUntouched, 0}, {"jobStatus=SUCCESS ", 0, kUntouched, 0},
-        {"jobStatus=", 0, kUntouched, 0}, {"id=1", 0, kUntouched, 0},
+        {"jobStatus=", 0, kUntouched, 0},        {"id=1", 0, kUntouched, 0},
     };
     for (const auto& c : cases) {
         const auto result = parsed(c.text);
@@ -96,15 +111,16 @@ TEST(TransformationResult, JobStatusComparesTheWholeWordExactly) {
     }
 }
 
-TEST(TransformationResult, BooleansReadFirstLetterOrNumber) {
+TEST(TransformationResult, BooleansReadFirstLetterOrNumber)
+{
     const struct {
         std::string value;
         unsigned found;
         unsigned flag;
     } cases[] = {
-        {"true", 1, 1}, {"Yes", 1, 1}, {"y", 1, 1}, {"T", 1, 1}, {"false", 1, 0}, {"No", 1, 0},
-        {"f", 1, 0}, {"n", 1, 0}, {"1", 1, 1}, {"0", 1, 0}, {"2.5", 1, 1}, {"0.0", 1, 0},
-        {"-3", 1, 1}, {"abc", 0, 0}, {"", 0, 0}, {"xyes", 0, 0},
+        {"true", 1, 1}, {"Yes", 1, 1}, {"y", 1, 1}, {"T", 1, 1},    {"false", 1, 0}, {"No", 1, 0},
+        {"f", 1, 0},    {"n", 1, 0},   {"1", 1, 1}, {"0", 1, 0},    {"2.5", 1, 1},   {"0.0", 1, 0},
+        {"-3", 1, 1},   {"abc", 0, 0}, {"", 0, 0},  {"xyes", 0, 0},
     };
     for (const auto& c : cases) {
         const auto result = parsed("resultSuccess=" + c.value + "\0serviceSuccess="s + c.value);
@@ -122,10 +138,11 @@ TEST(TransformationResult, BooleansReadFirstLetterOrNumber) {
 
 // ---- Texts
 
-TEST(TransformationResult, TextGettersReadTheirProperty) {
-    const auto result = parsed(
-        "result=0:ok\0serviceMsg=a=b\0timeRequested=20240102\0timeStarted=20240103\0timeFinished=20240104\0"
-        "requesterHost=10.0.0.1\0request=R/w/w.ext -XML_PARAMETER x\0requestKeyword=svc\0description=nightly"s);
+TEST(TransformationResult, TextGettersReadTheirProperty)
+{
+    const auto result =
+        parsed("result=0:ok\0serviceMsg=a=b\0timeRequested=20240102\0timeStarted=20240103\0timeFinished=20240104\0"
+               "requesterHost=10.0.0.1\0request=R/w/w.ext -XML_PARAMETER x\0requestKeyword=svc\0description=nightly"s);
     const struct {
         const char* what;
         unsigned (Result::*get)(IZELServerString&) const;
@@ -158,7 +175,8 @@ TEST(TransformationResult, TextGettersReadTheirProperty) {
 
 // ---- Generic lookup
 
-TEST(TransformationResult, GenericNamesAreFoundWithAndWithoutPrefixAndPiecesShadowTextEntries) {
+TEST(TransformationResult, GenericNamesAreFoundWithAndWithoutPrefixAndPiecesShadowTextEntries)
+{
     const auto result = parsed("x=1\0priority=1\0result=12:Done|a=b|priority=9"s);
     std::string value;
     EXPECT_EQ(result->findProperty("x", value), 1u);
@@ -183,7 +201,8 @@ TEST(TransformationResult, GenericNamesAreFoundWithAndWithoutPrefixAndPiecesShad
     EXPECT_EQ(typed, 1u);
 }
 
-TEST(TransformationResult, GenericNumbersFloatsAndBooleansByInterfaceName) {
+TEST(TransformationResult, GenericNumbersFloatsAndBooleansByInterfaceName)
+{
     const auto result = parsed("n=0x20\0b=no"s);
     unsigned n = 0;
     unsigned b = kUntouched;
@@ -201,7 +220,7 @@ TEST(TransformationResult, GenericNumbersFloatsAndBooleansByInterfaceName) {
         float expected;
     } floats[] = {
         {"1.5", 1, 1.5f}, {"-2e3", 1, -2000.0f}, {" 0.25 ", 1, 0.25f}, {"7", 1, 7.0f},
-        {"abc", 0, 0.0f}, {"", 0, 0.0f}, {"1.5x", 0, 0.0f},
+        {"abc", 0, 0.0f}, {"", 0, 0.0f},         {"1.5x", 0, 0.0f},
     };
     for (const auto& c : floats) {
         float value = -99.0f;
@@ -212,7 +231,8 @@ TEST(TransformationResult, GenericNumbersFloatsAndBooleansByInterfaceName) {
 
 // ---- All properties, parsing again
 
-TEST(TransformationResult, NamesAndPairsComeWithoutPrefixInNameOrder) {
+TEST(TransformationResult, NamesAndPairsComeWithoutPrefixInNameOrder)
+{
     const auto result = parsed("zeta=1\0*odd=2\0result=3:M|a=b"s);
     ZELServerStringArray names(std::vector<std::string>{"kept"});
     result->getPropertyNames(names);
@@ -225,7 +245,8 @@ TEST(TransformationResult, NamesAndPairsComeWithoutPrefixInNameOrder) {
                                                        "M", "StatusNumber", "3", "a", "b"}));
 }
 
-TEST(TransformationResult, FreshIsEmptyAndParseAgainAddsAndOverwritesButNeverRemoves) {
+TEST(TransformationResult, FreshIsEmptyAndParseAgainAddsAndOverwritesButNeverRemoves)
+{
     Result result;
     ZELServerString text("before");
     result.getText(text);
@@ -247,7 +268,8 @@ TEST(TransformationResult, FreshIsEmptyAndParseAgainAddsAndOverwritesButNeverRem
 
 // ---- Factories
 
-TEST(TransformationResult, FactoriesParseTheTextOrGiveNullOnAnExhaustedHeap) {
+TEST(TransformationResult, FactoriesParseTheTextOrGiveNullOnAnExhaustedHeap)
+{
     std::unique_ptr<IZELServerTransformationResult> result(makeTransformationResult(ZELServerString("id=5")));
     ASSERT_NE(result, nullptr);
     unsigned id = 0;

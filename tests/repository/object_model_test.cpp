@@ -129,7 +129,8 @@ TEST_F(WorkspaceReading, AttributesAndPropertiesBelongToTheirOwnElementAndRepeat
     EXPECT_EQ(attributes.element(1)->getWidth(), 15);
 
     ZELServerString value;
-    EXPECT_TRUE(a1.getPropertyAccessor().getPropertyValue(ZELServerString("display"), ZELServerString("colour"), value));
+    EXPECT_TRUE(
+        a1.getPropertyAccessor().getPropertyValue(ZELServerString("display"), ZELServerString("colour"), value));
     EXPECT_EQ(value.str(), "red");
     // Properties belong to their own element only.
     ZELServerStringArray categories;
@@ -231,8 +232,8 @@ TEST(SummaryReading, MissingEnabledFlagReadsDisabledAndFlagsFollowTheServersTrut
 TEST(ItemReading, TypeFollowsTheNameEndingCaseSensitivelyAndBadNumbersReadAsZero)
 {
     const std::vector<std::pair<std::string, unsigned>> cases = {
-        {"roads.zlw", 1}, {"reader.zds", 2},   {"clean.zlx", 3}, {"report.zlwt", 4},
-        {"ROADS.ZLW", 0}, {"notes.txt", 0},    {"zlw", 0},       {"a.zlw.bak", 0},
+        {"roads.zlw", 1}, {"reader.zds", 2}, {"clean.zlx", 3}, {"report.zlwt", 4},
+        {"ROADS.ZLW", 0}, {"notes.txt", 0},  {"zlw", 0},       {"a.zlw.bak", 0},
     };
     for (const auto& [name, type] : cases) {
         ZELServerItem item;
@@ -241,8 +242,8 @@ TEST(ItemReading, TypeFollowsTheNameEndingCaseSensitivelyAndBadNumbersReadAsZero
     }
     // Numbers that do not convert or fit read as zero.
     const std::vector<std::pair<std::string, int>> sizes = {
-        {"12", 12}, {"0x10", 16}, {" 7", 7}, {"12.000", 12}, {"-3", -3},
-        {"12abc", 0}, {"", 0}, {"4294967296", 0}, {"2147483648", 0}, {"-2147483648", -2147483647 - 1},
+        {"12", 12},   {"0x10", 16}, {" 7", 7},         {"12.000", 12},    {"-3", -3},
+        {"12abc", 0}, {"", 0},      {"4294967296", 0}, {"2147483648", 0}, {"-2147483648", -2147483647 - 1},
     };
     for (const auto& [size, expected] : sizes) {
         ZELServerItem item;
@@ -278,10 +279,9 @@ TEST(ItemReading, EveryAttributeLandsInItsField)
 
 TEST(StoredFileReading, CustomFormatsTransformersAndTemplatesShareOneLayout)
 {
-    const std::string body =
-        R"(<R><CUSTOMFORMAT name="f.zds" title="F" description="fmt" filesize="5000000000"/>)"
-        R"(<CUSTOMTRANSFORMER name="t.zlx" title="ignored" description="xf" filesize="77"/>)"
-        R"(<TEMPLATE name="p.zlwt" title="P" description="tpl" filesize="9"/></R>)";
+    const std::string body = R"(<R><CUSTOMFORMAT name="f.zds" title="F" description="fmt" filesize="5000000000"/>)"
+                             R"(<CUSTOMTRANSFORMER name="t.zlx" title="ignored" description="xf" filesize="77"/>)"
+                             R"(<TEMPLATE name="p.zlwt" title="P" description="tpl" filesize="9"/></R>)";
     ZELServerCustomFormat format;
     ZELServerCustomTransformer transformer;
     ZELServerTemplate templ;
@@ -305,7 +305,9 @@ TEST(StoredFileReading, CustomFormatsTransformersAndTemplatesShareOneLayout)
 TEST(ReaderResults, SingleReaderTakesTheFirstElementAnywhereOrFailsAndKeepsTheObject)
 {
     ZELServerResource resource;
-    ASSERT_EQ(readResourceReply(R"(<R><X><RESOURCE name="deep" filesize="3"/></X><RESOURCE name="later"/></R>)", resource), 0);
+    ASSERT_EQ(
+        readResourceReply(R"(<R><X><RESOURCE name="deep" filesize="3"/></X><RESOURCE name="later"/></R>)", resource),
+        0);
     EXPECT_EQ(text<IZELServerResource>(resource, &IZELServerResource::getName), "deep");
     EXPECT_EQ(readResourceReply("<R><TEMPLATE name=\"t\"/></R>", resource), static_cast<int>(msg::kUnreadableReply));
     EXPECT_EQ(text<IZELServerResource>(resource, &IZELServerResource::getName), "deep");

@@ -40,7 +40,8 @@ void readInto(ZELServerPropertyAccessor& accessor, const std::string& document)
 TEST(PropertyAccessor, SetAddsOrChangesAndKeepsTheAttributesAndLookupsAreExact)
 {
     ZELServerPropertyAccessor accessor;
-    readInto(accessor, R"(<S><PROPERTY category="c" name="n" value="v1"><ATTRIBUTE name="a" value="1"/></PROPERTY></S>)");
+    readInto(accessor,
+             R"(<S><PROPERTY category="c" name="n" value="v1"><ATTRIBUTE name="a" value="1"/></PROPERTY></S>)");
     accessor.setProperty(S("c"), S("n"), S("v2"));
     accessor.setProperty(S("new"), S("m"), S("x"));
     EXPECT_EQ(valueOf(accessor, "c", "n"), "v2");
@@ -121,9 +122,10 @@ TEST(PropertyAccessor, GetPropertiesAppendsIndependentCopiesAndReadingMergesRepe
     EXPECT_EQ(missing.str(), "untouched");
 
     // Reading merges the attributes of a repeated property.
-    readInto(accessor, R"(<S><PROPERTY category="c" name="n" value="first"><ATTRIBUTE name="a" value="1"/>)"
-                       R"(<ATTRIBUTE name="b" value="old"/></PROPERTY>)"
-                       R"(<PROPERTY category="c" name="n" value="second"><ATTRIBUTE name="b" value="new"/></PROPERTY></S>)");
+    readInto(accessor,
+             R"(<S><PROPERTY category="c" name="n" value="first"><ATTRIBUTE name="a" value="1"/>)"
+             R"(<ATTRIBUTE name="b" value="old"/></PROPERTY>)"
+             R"(<PROPERTY category="c" name="n" value="second"><ATTRIBUTE name="b" value="new"/></PROPERTY></S>)");
     const IZELServerProperty* property = accessor.getProperty(S("c"), S("n"));
     ASSERT_NE(property, nullptr);
     ZELServerStringArray merged;
@@ -148,8 +150,9 @@ std::string writtenDocument(const IZELServerPropertyAccessor& accessor, const st
 TEST(PropertyAccessorXml, WritesEveryPropertyInMapOrderWithItsAttributes)
 {
     ZELServerPropertyAccessor accessor;
-    readInto(accessor, R"(<S><PROPERTY category="run" name="priority" value="high"><ATTRIBUTE name="unit" value="level"/>)"
-                       R"(<ATTRIBUTE name="by" value="ann"/></PROPERTY><PROPERTY category="a" name="b" value="x &amp; y"/></S>)");
+    readInto(accessor,
+             R"(<S><PROPERTY category="run" name="priority" value="high"><ATTRIBUTE name="unit" value="level"/>)"
+             R"(<ATTRIBUTE name="by" value="ann"/></PROPERTY><PROPERTY category="a" name="b" value="x &amp; y"/></S>)");
     EXPECT_EQ(writtenDocument(accessor, "REP_UPDATE_SERVICEPROPERTYACCESSOR"),
               R"(<?xml version="1.0" encoding="UTF-8" standalone="no" ?><REP_UPDATE_SERVICEPROPERTYACCESSOR>)"
               R"(<PROPERTY category="a" name="b" value="x &amp; y"/>)"
@@ -163,9 +166,8 @@ TEST(PropertyAccessorXml, AnEmptyAccessorIsAnEmptyRootAndLocalTextIsWrittenAsUtf
     EXPECT_EQ(writtenDocument(accessor, "REP_UPDATE_DATASETPROPERTYACCESSOR"),
               R"(<?xml version="1.0" encoding="UTF-8" standalone="no" ?><REP_UPDATE_DATASETPROPERTYACCESSOR/>)");
     accessor.setProperty(S("c"), S("city"), S("K\xf6ln"));
-    EXPECT_EQ(writtenDocument(accessor, "R"),
-              "<?xml version=\"1.0\" encoding=\"UTF-8\" standalone=\"no\" ?><R>"
-              "<PROPERTY category=\"c\" name=\"city\" value=\"K\xc3\xb6ln\"/></R>");
+    EXPECT_EQ(writtenDocument(accessor, "R"), "<?xml version=\"1.0\" encoding=\"UTF-8\" standalone=\"no\" ?><R>"
+                                              "<PROPERTY category=\"c\" name=\"city\" value=\"K\xc3\xb6ln\"/></R>");
 }
 
 }  // namespace

@@ -96,16 +96,16 @@ TEST_F(ManagerTest, AddAndUpdateSendTheServiceUnderTheAddRoot)
         R"(<SERVICE description="Serves &amp; stores" display_name="Data Download" is_customformat_reg_allowed="false" )"
         R"(is_customtransform_reg_allowed="false" is_enabled="true" is_template_reg_allowed="true" )"
         R"(is_workspace_reg_allowed="true" name="download" service_id="-1" url_pattern="/dl/{ws}"/>)");
-    const std::string updated = xmlDocument(
-        "REP_ADD_SERVICE",
-        R"(<SERVICE description="" display_name="" is_customformat_reg_allowed="true" )"
-        R"(is_customtransform_reg_allowed="false" is_enabled="false" is_template_reg_allowed="false" )"
-        R"(is_workspace_reg_allowed="false" name="download" service_id="7" url_pattern=""/>)");
+    const std::string updated =
+        xmlDocument("REP_ADD_SERVICE",
+                    R"(<SERVICE description="" display_name="" is_customformat_reg_allowed="true" )"
+                    R"(is_customtransform_reg_allowed="false" is_enabled="false" is_template_reg_allowed="false" )"
+                    R"(is_workspace_reg_allowed="false" name="download" service_id="7" url_pattern=""/>)");
     server.exchange(command("REP_ADD_SERVICE", {{"serviceObject", added}}), success("true"))
         .exchange(command("REP_UPDATE_SERVICE", {{"serviceObject", updated}}), success("true"));
     signIn();
-    ZELServerService fresh(channel.get(), "download", "Data Download", "Serves & stores", "/dl/{ws}", true, true,
-                           false, false, true);
+    ZELServerService fresh(channel.get(), "download", "Data Download", "Serves & stores", "/dl/{ws}", true, true, false,
+                           false, true);
     EXPECT_EQ(StatusPtr(manager.addService(fresh)), nullptr);
 
     ZELServerService stored(channel.get());
@@ -122,8 +122,9 @@ TEST_F(ManagerTest, RepositoryExistsChecksOnlyEmptinessWhileAddAndRemoveCheckCha
 {
     server.exchange(command("REP_REPOSITORYEXISTS", {{"repositoryName", "a/b"}}), success("false"))
         .exchange(command("REP_ADD_REPOSITORY",
-                          {{"repositoryObject", xmlDocument("REP_ADD_REPOSITORY",
-                                                            R"(<REPOSITORY description="Roads &lt;2024>" name="Samples"/>)")}}),
+                          {{"repositoryObject",
+                            xmlDocument("REP_ADD_REPOSITORY",
+                                        R"(<REPOSITORY description="Roads &lt;2024>" name="Samples"/>)")}}),
                   success("true"))
         .exchange(command("REP_REMOVE_REPOSITORY", {{"repositoryName", "Samples"}}), success("true"));
     signIn();
@@ -133,7 +134,8 @@ TEST_F(ManagerTest, RepositoryExistsChecksOnlyEmptinessWhileAddAndRemoveCheckCha
     ZELServerRepository repository(channel.get());
     for (const char forbidden : std::string("\\/:*?\"<>|&='+%")) {
         const std::string name = std::string("a") + forbidden;
-        EXPECT_EQ(numberOf(StatusPtr(manager.getRepository(S(name), repository, flag))), msg::kForbiddenCharacter) << name;
+        EXPECT_EQ(numberOf(StatusPtr(manager.getRepository(S(name), repository, flag))), msg::kForbiddenCharacter)
+            << name;
         EXPECT_EQ(numberOf(StatusPtr(manager.addRepository(S(name), S("d")))), msg::kForbiddenCharacter) << name;
         EXPECT_EQ(numberOf(StatusPtr(manager.removeRepository(S(name), flag))), msg::kForbiddenCharacter) << name;
     }
@@ -149,8 +151,9 @@ TEST_F(ManagerTest, RepositoryExistsChecksOnlyEmptinessWhileAddAndRemoveCheckCha
 
 TEST_F(ManagerTest, RepositoryListAlwaysAsksForAllAndRefusesDirectives)
 {
-    server.exchange(command("REP_GET_REPOSITORIES", {{"enableFilter", "All"}}),
-                    success(R"(<R><REPOSITORY name="Samples" description="d1"/><X><REPOSITORY name="Other"/></X></R>)"))
+    server
+        .exchange(command("REP_GET_REPOSITORIES", {{"enableFilter", "All"}}),
+                  success(R"(<R><REPOSITORY name="Samples" description="d1"/><X><REPOSITORY name="Other"/></X></R>)"))
         .exchange(command("REP_ITEMEXISTS", {{"repositoryName", "Other"}, {"itemName", "a.zlw"}}), success("true"));
     signIn();
     ZELServerVector<IZELServerRepository, ZELServerRepository> repositories;
@@ -170,8 +173,9 @@ TEST_F(ManagerTest, RepositoryListAlwaysAsksForAllAndRefusesDirectives)
 
 TEST_F(ManagerTest, UnknownRepositoryIsSuccessWithFoundAtZero)
 {
-    server.exchange(command("REP_GET_REPOSITORY", {{"repositoryName", "Samples"}}),
-                    success(R"(<R><REPOSITORY name="Samples" description="sample workspaces"/></R>)"))
+    server
+        .exchange(command("REP_GET_REPOSITORY", {{"repositoryName", "Samples"}}),
+                  success(R"(<R><REPOSITORY name="Samples" description="sample workspaces"/></R>)"))
         .exchange(command("REP_GET_REPOSITORY", {{"repositoryName", "Nothing"}}), success("<R/>"))
         .exchange(command("REP_ITEMEXISTS", {{"repositoryName", "Samples"}, {"itemName", "x.zlw"}}), success("false"));
     signIn();
@@ -195,10 +199,11 @@ TEST_F(ManagerTest, UnknownRepositoryIsSuccessWithFoundAtZero)
 
 TEST_F(ManagerTest, GlobalQueryRunsOnlyForExactlyAllItemsAndPassesFailuresOn)
 {
-    server.exchange(command("REP_GLOBAL_GET_ALL_ITEMS", {{"enableFilter", "All"}}),
-                    success(R"(<R><REPOSITORY name="Samples"><PROPERTY category="Samples" name="roads.zlw" value="1">)"
-                            R"(<ATTRIBUTE name="type" value="workspace"/></PROPERTY></REPOSITORY>)"
-                            R"(<PROPERTY category="Other" name="t.zlwt" value="4"/></R>)"))
+    server
+        .exchange(command("REP_GLOBAL_GET_ALL_ITEMS", {{"enableFilter", "All"}}),
+                  success(R"(<R><REPOSITORY name="Samples"><PROPERTY category="Samples" name="roads.zlw" value="1">)"
+                          R"(<ATTRIBUTE name="type" value="workspace"/></PROPERTY></REPOSITORY>)"
+                          R"(<PROPERTY category="Other" name="t.zlwt" value="4"/></R>)"))
         .exchange(command("REP_GLOBAL_GET_ALL_ITEMS", {{"enableFilter", "All"}}), success("not xml"))
         .exchange(command("REP_GLOBAL_GET_ALL_ITEMS", {{"enableFilter", "All"}}), zeltest::reply("ERROR", "busy"));
     signIn();

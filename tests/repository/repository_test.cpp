@@ -78,23 +78,24 @@ TEST_F(RepositoryTest, UploadsAndDownloadsTurnCrcCheckingOffAndReportProgress)
     const std::string item = "workspace bytes\n";
     const std::string resource = "0123456789";
     const std::string destination = (dir / "down.csv").string();
-    expectUpload(repoCommand("REP_ADD_ITEM", {{"itemName", "roads.zlw"}, {"itemFileCRCCheckingEnabled", "false"}}), item);
+    expectUpload(repoCommand("REP_ADD_ITEM", {{"itemName", "roads.zlw"}, {"itemFileCRCCheckingEnabled", "false"}}),
+                 item);
     expectUpload(repoCommand("REP_UPDATE_ITEMRESOURCE", {{"itemName", "roads.zlw"},
                                                          {"resourceName", "codes.csv"},
                                                          {"resourceFileCRCCheckingEnabled", "false"}}),
                  resource);
-    expectUpload(repoCommand("REP_ADD_ITEMRESOURCE", {{"itemName", "a.zlw"},
-                                                      {"resourceName", "up.csv"},
-                                                      {"resourceFileCRCCheckingEnabled", "false"}}),
-                 resource);
+    expectUpload(
+        repoCommand("REP_ADD_ITEMRESOURCE",
+                    {{"itemName", "a.zlw"}, {"resourceName", "up.csv"}, {"resourceFileCRCCheckingEnabled", "false"}}),
+        resource);
     // updateItem deliberately sends an item name that addItem refuses.
-    expectUpload(repoCommand("REP_UPDATE_ITEM", {{"itemName", "dir/roads.zlw"}, {"itemFileCRCCheckingEnabled", "false"}}),
-                 item);
+    expectUpload(
+        repoCommand("REP_UPDATE_ITEM", {{"itemName", "dir/roads.zlw"}, {"itemFileCRCCheckingEnabled", "false"}}), item);
     // The resource is read back straight into its destination.
-    expectDownload(repoCommand("REP_GET_ITEMRESOURCE", {{"itemName", "a.zlw"},
-                                                        {"resourceName", "up.csv"},
-                                                        {"resourceFileCRCCheckingEnabled", "false"}}),
-                   resource, success("true"));
+    expectDownload(
+        repoCommand("REP_GET_ITEMRESOURCE",
+                    {{"itemName", "a.zlw"}, {"resourceName", "up.csv"}, {"resourceFileCRCCheckingEnabled", "false"}}),
+        resource, success("true"));
     signIn();
     const std::string itemFile = file("roads.zlw", item);
     EXPECT_EQ(StatusPtr(repository.addItem(S("roads.zlw"), S(itemFile))), nullptr);
@@ -133,7 +134,8 @@ TEST_F(RepositoryTest, LocalChecksAndFileProblemsAreReportedBeforeAnythingIsSent
     // A resource named like its item is refused before the file is opened; the character check comes
     // first, and names that differ only in case are different names.
     const ZELServerString noFile = S(missing);
-    EXPECT_EQ(numberOf(StatusPtr(repository.addItemResource(S("a.zlw"), S("a.zlw"), noFile))), msg::kResourceNamedAsItem);
+    EXPECT_EQ(numberOf(StatusPtr(repository.addItemResource(S("a.zlw"), S("a.zlw"), noFile))),
+              msg::kResourceNamedAsItem);
     EXPECT_EQ(numberOf(StatusPtr(repository.updateItemResource(S("a.zlw"), S("a.zlw"), noFile))),
               msg::kResourceNamedAsItem);
     EXPECT_EQ(numberOf(StatusPtr(repository.addItemResource(S("a%"), S("a%"), noFile))), msg::kForbiddenCharacter);
@@ -147,8 +149,8 @@ struct Call {
     const char* operation;
     bool takesResource;
     bool takesPath;
-    std::function<IZELServerStatus*(IZELServerRepository&, const ZELServerString& item,
-                                    const ZELServerString& resource, const ZELServerString& path)>
+    std::function<IZELServerStatus*(IZELServerRepository&, const ZELServerString& item, const ZELServerString& resource,
+                                    const ZELServerString& path)>
         call;
 };
 
@@ -185,7 +187,8 @@ TEST_F(RepositoryTest, EmptyOrForbiddenNamesAreRefusedBeforeAnythingIsSent)
             EXPECT_EQ(numberOf(StatusPtr(c.call(repository, S("a.zlw"), S(""), path))), msg::kRequiredValueMissing);
         }
         if (c.takesPath) {
-            EXPECT_EQ(numberOf(StatusPtr(c.call(repository, S("a.zlw"), S("r.csv"), S("")))), msg::kRequiredValueMissing);
+            EXPECT_EQ(numberOf(StatusPtr(c.call(repository, S("a.zlw"), S("r.csv"), S("")))),
+                      msg::kRequiredValueMissing);
         }
         // An empty name wins over a forbidden character in the other name.
         EXPECT_EQ(numberOf(StatusPtr(c.call(repository, S(""), S("r/1"), path))), msg::kRequiredValueMissing);
@@ -207,10 +210,12 @@ TEST_F(RepositoryTest, EmptyOrForbiddenNamesAreRefusedBeforeAnythingIsSent)
 
 TEST_F(RepositoryTest, ViewsAndRegistrationsCheckOnlyForEmptinessWithTheirOwnExceptions)
 {
-    server.exchange(repoCommand("REP_WORKSPACESERVICEEXISTS", {{"workspaceName", "a/b"}, {"serviceName", "c:d"}}),
-                    success("false"))
+    server
+        .exchange(repoCommand("REP_WORKSPACESERVICEEXISTS", {{"workspaceName", "a/b"}, {"serviceName", "c:d"}}),
+                  success("false"))
         .exchange(repoCommand("REP_GET_TEMPLATEVIEW", {{"templateName", "t*"}}), success("<R/>"))
-        .exchange(repoCommand("REP_GET_ITEMRESOURCESVIEW", {{"itemName", ""}, {"enableFilter", "All"}}), success("<R/>"))
+        .exchange(repoCommand("REP_GET_ITEMRESOURCESVIEW", {{"itemName", ""}, {"enableFilter", "All"}}),
+                  success("<R/>"))
         .exchange(repoCommand("REP_GET_ITEMRESOURCEVIEW", {{"itemName", "a.zlw"}, {"resourceName", ""}}),
                   success("<R/>"));
     signIn();
@@ -275,7 +280,8 @@ TEST_F(RepositoryTest, ItemDestinationIsReplacedOnlyByACompleteFileAndNoTemporar
         // The answer is read before the size is looked at.
         {"zero bytes", "c.zlw", msg::kEmptyDownload, 1, old, ""},
         {"error after the whole file", "d.zlw", msg::kServerError, 0, old, ""},
-        {"missing folder", "no-such-dir/e.zlw", msg::kLocalFileWrite, std::nullopt, "", (dir / "no-such-dir/e.zlw").string()},
+        {"missing folder", "no-such-dir/e.zlw", msg::kLocalFileWrite, std::nullopt, "",
+         (dir / "no-such-dir/e.zlw").string()},
     };
     for (const Case& c : cases) {
         SCOPED_TRACE(c.what);
@@ -325,7 +331,8 @@ TEST_F(RepositoryTest, WorkspaceFiltersTranslateTheThreeValuesExactlyAndRefuseAn
             directives.insert("ENABLE_FILTER", filter);
         }
         ZELServerVector<IZELServerWorkspace, ZELServerWorkspace> workspaces;
-        EXPECT_EQ(numberOf(StatusPtr(repository.getWorkspacesView(&directives, workspaces))), msg::kRequiredValueMissing)
+        EXPECT_EQ(numberOf(StatusPtr(repository.getWorkspacesView(&directives, workspaces))),
+                  msg::kRequiredValueMissing)
             << (filter ? filter : "(missing)");
         EXPECT_EQ(numberOf(StatusPtr(repository.getWorkspaceSummariesView(&directives, summaries))),
                   msg::kRequiredValueMissing)
@@ -336,11 +343,13 @@ TEST_F(RepositoryTest, WorkspaceFiltersTranslateTheThreeValuesExactlyAndRefuseAn
 
 TEST_F(RepositoryTest, ListViewsIgnoreTheirDirectivesAndAskForEverything)
 {
-    server.exchange(repoCommand("REP_GET_CUSTOMFORMATSVIEW", {{"enableFilter", "All"}}),
-                    success(R"(<R><CUSTOMFORMAT name="f.zds"/></R>)"))
+    server
+        .exchange(repoCommand("REP_GET_CUSTOMFORMATSVIEW", {{"enableFilter", "All"}}),
+                  success(R"(<R><CUSTOMFORMAT name="f.zds"/></R>)"))
         .exchange(repoCommand("REP_GET_CUSTOMTRANSFORMERSVIEW", {{"enableFilter", "All"}}),
                   success(R"(<R><CUSTOMTRANSFORMER name="t1.zlx"/><CUSTOMTRANSFORMER name="t2.zlx"/></R>)"))
-        .exchange(repoCommand("REP_GET_TEMPLATESVIEW", {{"enableFilter", "All"}}), success(R"(<R><TEMPLATE name="p"/></R>)"))
+        .exchange(repoCommand("REP_GET_TEMPLATESVIEW", {{"enableFilter", "All"}}),
+                  success(R"(<R><TEMPLATE name="p"/></R>)"))
         .exchange(repoCommand("REP_GET_ITEMRESOURCESVIEW", {{"itemName", "a.zlw"}, {"enableFilter", "All"}}),
                   success(R"(<R><RESOURCE name="r1"/><RESOURCE name="r2"/><RESOURCE name="r3"/></R>)"));
     signIn();
@@ -354,16 +363,18 @@ TEST_F(RepositoryTest, ListViewsIgnoreTheirDirectivesAndAskForEverything)
     EXPECT_EQ(StatusPtr(repository.getCustomTransformersView(&directives, transformers)), nullptr);
     EXPECT_EQ(StatusPtr(repository.getTemplatesView(&directives, templates)), nullptr);
     EXPECT_EQ(StatusPtr(repository.getItemResourcesView(S("a.zlw"), &directives, resources)), nullptr);
-    EXPECT_EQ((std::vector<unsigned>{formats.entries(), transformers.entries(), templates.entries(), resources.entries()}),
-              (std::vector<unsigned>{1, 2, 1, 3}));
+    EXPECT_EQ(
+        (std::vector<unsigned>{formats.entries(), transformers.entries(), templates.entries(), resources.entries()}),
+        (std::vector<unsigned>{1, 2, 1, 3}));
     EXPECT_TRUE(server.verify());
 }
 
 TEST_F(RepositoryTest, SingleViewsFillTheCallersObjectAndSetFound)
 {
-    server.exchange(repoCommand("REP_GET_WORKSPACEVIEW", {{"workspaceName", "roads.zlw"}}),
-                    success(R"(<R><WORKSPACE_DEFINITIONS workspace_id="w1" name="roads.zlw">)"
-                            R"(<DATASET name="A" is_source="true"/></WORKSPACE_DEFINITIONS></R>)"))
+    server
+        .exchange(repoCommand("REP_GET_WORKSPACEVIEW", {{"workspaceName", "roads.zlw"}}),
+                  success(R"(<R><WORKSPACE_DEFINITIONS workspace_id="w1" name="roads.zlw">)"
+                          R"(<DATASET name="A" is_source="true"/></WORKSPACE_DEFINITIONS></R>)"))
         .exchange(repoCommand("REP_GET_CUSTOMFORMATVIEW", {{"customFormatName", "f.zds"}}),
                   success(R"(<R><CUSTOMFORMAT name="f.zds" filesize="12"/></R>)"))
         .exchange(repoCommand("REP_GET_CUSTOMTRANSFORMERVIEW", {{"customTransformerName", "t.zlx"}}),
@@ -392,10 +403,11 @@ TEST_F(RepositoryTest, SingleViewsFillTheCallersObjectAndSetFound)
 TEST_F(RepositoryTest, WorkspaceServicesFilterAppendsTheWorkspaceNameAndRegistrationsNameBoth)
 {
     const zeltest::Values names = {{"workspaceName", "roads.zlw"}, {"serviceName", "download"}};
-    server.exchange(repoCommand("REP_GET_WORKSPACESERVICES", {{"enableFilter", "All"}, {"workspaceName", "roads.zlw"}}),
-                    success(R"(<R><WORKSPACE_SERVICE><WORKSPACE_SUMMARY name="roads.zlw" is_enabled="true"/>)"
-                            R"(<SERVICE service_id="3" name="download" is_workspace_reg_allowed="true"/>)"
-                            R"(</WORKSPACE_SERVICE></R>)"))
+    server
+        .exchange(repoCommand("REP_GET_WORKSPACESERVICES", {{"enableFilter", "All"}, {"workspaceName", "roads.zlw"}}),
+                  success(R"(<R><WORKSPACE_SERVICE><WORKSPACE_SUMMARY name="roads.zlw" is_enabled="true"/>)"
+                          R"(<SERVICE service_id="3" name="download" is_workspace_reg_allowed="true"/>)"
+                          R"(</WORKSPACE_SERVICE></R>)"))
         .exchange(repoCommand("REP_GET_WORKSPACESERVICES", {{"enableFilter", "Disabled"}, {"workspaceName", "w"}}),
                   success("<R/>"))
         .exchange(repoCommand("REP_GET_WORKSPACESERVICES", {{"enableFilter", "All"}}), success("<R/>"))
@@ -424,7 +436,8 @@ TEST_F(RepositoryTest, WorkspaceServicesFilterAppendsTheWorkspaceNameAndRegistra
 
     ZELServerStringDict unknown;
     unknown.insert("ENABLE_FILTER", "Enabled");
-    EXPECT_EQ(numberOf(StatusPtr(repository.getWorkspaceServices(&unknown, registrations))), msg::kRequiredValueMissing);
+    EXPECT_EQ(numberOf(StatusPtr(repository.getWorkspaceServices(&unknown, registrations))),
+              msg::kRequiredValueMissing);
     EXPECT_EQ(StatusPtr(repository.registerWorkspaceService(S("roads.zlw"), S("download"))), nullptr);
     unsigned deregistered = 0;
     EXPECT_EQ(StatusPtr(repository.deregisterWorkspaceService(S("roads.zlw"), S("download"), deregistered)), nullptr);

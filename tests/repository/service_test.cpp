@@ -95,7 +95,8 @@ TEST_F(ServiceTest, RegisterItemRefusesKindsTheServiceDoesNotTakeWithoutSending)
                     success("true"));
     signIn();
     for (const char* refused : {"clean.zlx", "report.zlwt", "ROADS.ZLW"}) {
-        EXPECT_EQ(numberOf(StatusPtr(service.registerItem(S("Samples"), S(refused)))), msg::kRegistrationRefused) << refused;
+        EXPECT_EQ(numberOf(StatusPtr(service.registerItem(S("Samples"), S(refused)))), msg::kRegistrationRefused)
+            << refused;
     }
     EXPECT_EQ(numberOf(StatusPtr(service.registerItem(S("Samples"), S("")))), msg::kRequiredValueMissing);
     EXPECT_EQ(StatusPtr(service.registerItem(S("Samples"), S("roads.zlw"))), nullptr);
@@ -109,9 +110,10 @@ TEST_F(ServiceTest, RegisterItemRefusesKindsTheServiceDoesNotTakeWithoutSending)
 
 TEST_F(ServiceTest, ItemCommandsAnswerWithTheServersFlagAndListRegisteredItems)
 {
-    server.exchange(command("REP_ITEMREGISTERED",
-                            {{"serviceName", "download"}, {"repositoryName", "Samples"}, {"itemName", "a.zlw"}}),
-                    success("true"))
+    server
+        .exchange(command("REP_ITEMREGISTERED",
+                          {{"serviceName", "download"}, {"repositoryName", "Samples"}, {"itemName", "a.zlw"}}),
+                  success("true"))
         .exchange(command("REP_DEREGISTERITEM",
                           {{"serviceName", "download"}, {"repositoryName", "Samples"}, {"itemName", "a.zlw"}}),
                   success("false"))

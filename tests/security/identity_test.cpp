@@ -45,9 +45,10 @@ std::string idOf(const IZELServerIdentity& identity)
 
 TEST(Identity, AuthenticatedFlagIsReadByFirstLetterOrAsANumber)
 {
-    const std::pair<const char*, bool> cases[] = {  // null: attribute absent
-        {"yes", true},        {"No", false}, {"0", false},    {"2.5", true}, {"maybe", false},  {"true", true},
-        {"False", false},     {"Yesterday", true}, {"-1", true}, {"0.0", false}, {"", false}, {nullptr, false},
+    const std::pair<const char*, bool> cases[] = {
+        // null: attribute absent
+        {"yes", true},    {"No", false},       {"0", false}, {"2.5", true},  {"maybe", false}, {"true", true},
+        {"False", false}, {"Yesterday", true}, {"-1", true}, {"0.0", false}, {"", false},      {nullptr, false},
     };
     for (const auto& [text, authenticated] : cases) {
         ZELServerIdentity identity;
@@ -86,10 +87,14 @@ TEST(Identity, ReadingAgainReplacesIdAndFlagButAppendsRolesAndAttributeNamesAreE
 
 TEST(SingleSignOnIdentity, StateIsExactlyOneOfTheTwoKnownWordsOrOther)
 {
-    const std::pair<const char*, unsigned> cases[] = {  // null: attribute absent
-        {"SUCCEEDED", kSingleSignOnSucceeded}, {"IN_PROGRESS", kSingleSignOnInProgress},
-        {"succeeded", kSingleSignOnOther},     {"SUCCEEDED ", kSingleSignOnOther},
-        {"", kSingleSignOnOther},              {nullptr, kSingleSignOnOther},
+    const std::pair<const char*, unsigned> cases[] = {
+        // null: attribute absent
+        {"SUCCEEDED", kSingleSignOnSucceeded},
+        {"IN_PROGRESS", kSingleSignOnInProgress},
+        {"succeeded", kSingleSignOnOther},
+        {"SUCCEEDED ", kSingleSignOnOther},
+        {"", kSingleSignOnOther},
+        {nullptr, kSingleSignOnOther},
     };
     for (const auto& [text, state] : cases) {
         ZELServerSingleSignOnIdentity identity;
@@ -105,7 +110,8 @@ TEST(SingleSignOnIdentity, StateIsExactlyOneOfTheTwoKnownWordsOrOther)
 class FixedIdentity final : public IZELServerIdentity {
 public:
     FixedIdentity(std::string id, std::vector<std::string> roles, bool authenticated)
-        : id_(std::move(id)), roles_(std::move(roles)), authenticated_(authenticated) {}
+        : id_(std::move(id)), roles_(std::move(roles)), authenticated_(authenticated)
+    {}
     void getId(IZELServerString& out) const override { out.set(id_.data(), static_cast<unsigned>(id_.size())); }
     void getRoles(IZELServerStringArray& out) const override
     {

@@ -153,8 +153,9 @@ TEST_F(SecurityManagerTest, GetUserTokenFillsTheTokenOnlyWhenTheReplyHoldsOneAnd
 
 TEST_F(SecurityManagerTest, AddUserTokenSendsTheUserTokenDocumentAndAFailureComesBackUnchanged)
 {
-    server.exchange(tokenCommand("SEC_ADD_USERTOKEN", userTokenElement("t&amp;1", "10.0.0.9", "-30")),
-                    zeltest::reply("SUCCESS", "true"))
+    server
+        .exchange(tokenCommand("SEC_ADD_USERTOKEN", userTokenElement("t&amp;1", "10.0.0.9", "-30")),
+                  zeltest::reply("SUCCESS", "true"))
         // An empty token goes with empty texts and timeout zero.
         .exchange(tokenCommand("SEC_ADD_USERTOKEN", userTokenElement("", "", "0")), zeltest::reply("SUCCESS", "true"))
         .exchange(tokenCommand("SEC_ADD_USERTOKEN", userTokenElement("", "", "0")),
@@ -183,12 +184,9 @@ TEST(SecurityManagerWithoutChannel, EveryCommandAnswersNotConnectedButTokensCanB
     ZELServerUserToken token("keep", "", 3);
     bool flag = true;
     const StatusPtr statuses[] = {
-        StatusPtr(manager->userTokenExists(kAccount, flag)),
-        StatusPtr(manager->getUserToken(kAccount, token, flag)),
-        StatusPtr(manager->addUserToken(kAccount, token)),
-        StatusPtr(manager->updateUserToken(kAccount, token)),
-        StatusPtr(manager->removeUserToken(kAccount, flag)),
-        StatusPtr(manager->userTokenExpired(kAccount, flag)),
+        StatusPtr(manager->userTokenExists(kAccount, flag)), StatusPtr(manager->getUserToken(kAccount, token, flag)),
+        StatusPtr(manager->addUserToken(kAccount, token)),   StatusPtr(manager->updateUserToken(kAccount, token)),
+        StatusPtr(manager->removeUserToken(kAccount, flag)), StatusPtr(manager->userTokenExpired(kAccount, flag)),
     };
     for (const StatusPtr& status : statuses) {
         EXPECT_EQ(numberOf(status), msg::kNotConnected);

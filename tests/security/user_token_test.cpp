@@ -46,14 +46,28 @@ TEST(UserTokenReader, ReadsAllSixAttributesWithTheDatesAsTextAndEmptiesAbsentOne
 TEST(UserTokenReader, ExpirationTimeoutConvertsOrFallsBackToZeroWithoutFailingTheReading)
 {
     const std::pair<const char*, long long> cases[] = {
-        {"3600", 3600}, {"   3600", 3600}, {"3600.000", 3600}, {"3600.", 3600}, {"3600  ", 3600}, {"3600.5", 0},
-        {"0x10", 16},   {"0X1f", 31},      {"010", 10},        {"-15", -15},    {"abc", 0},       {"12abc", 0},
-        {"", 0},        {"   ", 0},        {"9223372036854775807", 9223372036854775807LL},
-        {"9223372036854775808", 0},        {"99999999999999999999999", 0},
+        {"3600", 3600},
+        {"   3600", 3600},
+        {"3600.000", 3600},
+        {"3600.", 3600},
+        {"3600  ", 3600},
+        {"3600.5", 0},
+        {"0x10", 16},
+        {"0X1f", 31},
+        {"010", 10},
+        {"-15", -15},
+        {"abc", 0},
+        {"12abc", 0},
+        {"", 0},
+        {"   ", 0},
+        {"9223372036854775807", 9223372036854775807LL},
+        {"9223372036854775808", 0},
+        {"99999999999999999999999", 0},
     };
     for (const auto& [text, expected] : cases) {
         ZELServerUserToken token("old", "", 77);
-        ASSERT_EQ(readUserTokenReply(tokenReply(std::string(R"(token="t" expirationtimeout=")") + text + "\""), token), 0)
+        ASSERT_EQ(readUserTokenReply(tokenReply(std::string(R"(token="t" expirationtimeout=")") + text + "\""), token),
+                  0)
             << text;
         EXPECT_EQ(fieldsOf(token), "t||" + std::to_string(expected) + "|||") << "timeout \"" << text << "\"";
     }

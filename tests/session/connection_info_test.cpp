@@ -18,30 +18,43 @@ using Str = ZELServerString;
 
 ZELServerStringArray listOf(std::vector<std::string> entries) { return ZELServerStringArray(std::move(entries)); }
 
-std::string textOf(const Info& info, void (Info::*get)(IZELServerString&) const) {
+std::string textOf(const Info& info, void (Info::*get)(IZELServerString&) const)
+{
     Str out("stale");
     (info.*get)(out);
     return out.str();
 }
 
-TEST(ConnectionInfo, BothWebAddressFormsGiveTheSameHostAndPort) {
+TEST(ConnectionInfo, BothWebAddressFormsGiveTheSameHostAndPort)
+{
     const struct {
         const char* address;
         const char* host;
         unsigned short port;
     } cases[] = {
-        {"https://srv/x", "srv", 443}, {"https://srv", "srv", 443}, {"http://srv/x/y", "srv", 80},
-        {"https://srv:8443/x", "srv", 8443}, {"http://srv:8080", "srv", 8080},
+        {"https://srv/x", "srv", 443},
+        {"https://srv", "srv", 443},
+        {"http://srv/x/y", "srv", 80},
+        {"https://srv:8443/x", "srv", 8443},
+        {"http://srv:8080", "srv", 8080},
         // a bad explicit port never falls back to 443
-        {"https://srv:abc", "srv", 80}, {"https://srv:/x", "srv", 80}, {"https://srv:-1", "srv", 80},
-        {"https://srv:81x", "srv", 80}, {"https://srv:4294967296", "srv", 80},
+        {"https://srv:abc", "srv", 80},
+        {"https://srv:/x", "srv", 80},
+        {"https://srv:-1", "srv", 80},
+        {"https://srv:81x", "srv", 80},
+        {"https://srv:4294967296", "srv", 80},
         // only the low 16 bits of a port are kept
         {"http://srv:70000/x", "srv", 4464},
         // the colon is searched before the slash, so a colon in the path ends the host
         {"http://h/p:1", "h/p", 1},
         // no scheme, an upper-case one, or anything before it: the whole text is the host
-        {"srv:81", "srv:81", 80}, {"HTTP://srv", "HTTP://srv", 80}, {" http://srv", " http://srv", 80},
-        {"http:/srv", "http:/srv", 80}, {"", "", 80}, {"http://", "", 80}, {"https://:9", "", 9},
+        {"srv:81", "srv:81", 80},
+        {"HTTP://srv", "HTTP://srv", 80},
+        {" http://srv", " http://srv", 80},
+        {"http:/srv", "http:/srv", 80},
+        {"", "", 80},
+        {"http://", "", 80},
+        {"https://:9", "", 9},
     };
     for (const auto& c : cases) {
         const Info withCredentials(Str(c.address), Str("u"), Str("p"));
@@ -55,7 +68,8 @@ TEST(ConnectionInfo, BothWebAddressFormsGiveTheSameHostAndPort) {
     }
 }
 
-TEST(ConnectionInfo, HostFormsKeepHostAndPortAsGivenAndHaveNoAddress) {
+TEST(ConnectionInfo, HostFormsKeepHostAndPortAsGivenAndHaveNoAddress)
+{
     const Info withCredentials(Str("http://srv:1"), 7001, Str("ann"), Str("pw1"));
     EXPECT_EQ(textOf(withCredentials, &Info::getHost), "http://srv:1");
     EXPECT_EQ(withCredentials.getPort(), 7001);
@@ -79,7 +93,8 @@ TEST(ConnectionInfo, HostFormsKeepHostAndPortAsGivenAndHaveNoAddress) {
     EXPECT_EQ(named.getAuthenticationKind(), kPasswordAuthentication);
 }
 
-TEST(ConnectionInfo, AuthenticationKindFollowsTheKeysOfThePropertiesInBothPropertyForms) {
+TEST(ConnectionInfo, AuthenticationKindFollowsTheKeysOfThePropertiesInBothPropertyForms)
+{
     const struct {
         std::vector<std::string> properties;
         unsigned kind;
@@ -90,9 +105,9 @@ TEST(ConnectionInfo, AuthenticationKindFollowsTheKeysOfThePropertiesInBothProper
         {{"SSO_AUTH_DATA", "d", "USER_TOKEN", "t1"}, kSingleSignOnAuthentication},
         {{"CLIENT_ID", "c1"}, kPropertyAuthentication},
         {{}, kPropertyAuthentication},
-        {{"CLIENT_ID", "c1", "USER_TOKEN"}, kPropertyAuthentication},  // a key without value is no key
+        {{"CLIENT_ID", "c1", "USER_TOKEN"}, kPropertyAuthentication},           // a key without value is no key
         {{"user_token", "t1", "sso_auth_data", "d"}, kPropertyAuthentication},  // keys are exact bytes
-        {{"CLIENT_ID", "SSO_AUTH_DATA"}, kPropertyAuthentication},  // a value that reads like a key
+        {{"CLIENT_ID", "SSO_AUTH_DATA"}, kPropertyAuthentication},              // a value that reads like a key
     };
     for (const auto& c : cases) {
         SCOPED_TRACE(::testing::Message() << "case " << (&c - cases));
@@ -101,7 +116,8 @@ TEST(ConnectionInfo, AuthenticationKindFollowsTheKeysOfThePropertiesInBothProper
     }
 }
 
-TEST(ConnectionInfo, GetPropertyComparesKeysExactlyUpToTheirFirstNulAndTheFirstValueWins) {
+TEST(ConnectionInfo, GetPropertyComparesKeysExactlyUpToTheirFirstNulAndTheFirstValueWins)
+{
     const Info info(Str("srv"), 1,
                     listOf({"CLIENT_ID", "c1", "SSO_AUTH_DATA", "", "V", "a\0b"s, "CLIENT_ID", "c2", "odd"}));
     Str value("untouched");

@@ -16,8 +16,8 @@ TEST(Exports, ExactlyTheThreeEntryPoints)
 {
     // The build puts the shared library beside the test programs, under the name it is loaded by.
     const std::string library = zeltest::programFolder() + zel::platform::kLibraryModuleName;
-    const std::set<std::string> expected = {
-        "ZEL_createServerSession", "ZEL_destroyServerSession", "DllSetMemoryErrorHandler"};
+    const std::set<std::string> expected = {"ZEL_createServerSession", "ZEL_destroyServerSession",
+                                            "DllSetMemoryErrorHandler"};
     EXPECT_EQ(zeltest::exportedSymbols(library), expected);
 }
 

@@ -26,21 +26,22 @@ const std::string kSep(1, zel::platform::kPathSeparator);
 
 // A rooted folder name in the platform's own notation: "/opt/x" here, "\opt\x" on Windows, where
 // only a backslash counts as the separator a home directory must end in.
-std::string native(std::string path) {
+std::string native(std::string path)
+{
     std::replace(path.begin(), path.end(), '/', zel::platform::kPathSeparator);
     return path;
 }
 
-std::optional<std::string> env(const char* name) {
-    return zel::platform::getEnvironmentVariable(name);
-}
+std::optional<std::string> env(const char* name) { return zel::platform::getEnvironmentVariable(name); }
 
-TEST(ServerLibraryHome, VariableGetsATrailingSeparatorUnlessItEndsInOne) {
+TEST(ServerLibraryHome, VariableGetsATrailingSeparatorUnlessItEndsInOne)
+{
     const struct {
         const char* value;
         const char* home;
     } cases[] = {
-        {"/opt/zel/x", "/opt/zel/x/"}, {"/opt/zel/x/", "/opt/zel/x/"},
+        {"/opt/zel/x", "/opt/zel/x/"},
+        {"/opt/zel/x/", "/opt/zel/x/"},
         {"relative/and/missing/", "relative/and/missing/"},
     };
     for (const auto& c : cases) {
@@ -49,7 +50,8 @@ TEST(ServerLibraryHome, VariableGetsATrailingSeparatorUnlessItEndsInOne) {
     }
 }
 
-TEST(ServerLibraryHome, UnsetOrEmptyVariableFallsBackToTheModuleFolder) {
+TEST(ServerLibraryHome, UnsetOrEmptyVariableFallsBackToTheModuleFolder)
+{
     ScopedEnv unset("ZEL_SERVERAPI_HOME", nullptr);
     EXPECT_EQ(zel::serverLibraryHomeDirectory(), zeltest::programFolder());
     EXPECT_TRUE(fs::exists(fs::path(zeltest::programFolder()) / "messages" / "zelserverapi.msg"));
@@ -64,7 +66,8 @@ TEST(ServerLibraryHome, UnsetOrEmptyVariableFallsBackToTheModuleFolder) {
     EXPECT_EQ(zel::serverLibraryHomeDirectory(), zeltest::programFolder());
 }
 
-TEST(FrameworkHome, OverrideIsUsedOnceAndThenEmptied) {
+TEST(FrameworkHome, OverrideIsUsedOnceAndThenEmptied)
+{
     ScopedEnv override("ZEL_HOME_OVERRIDE", native("/opt/override"));
     ScopedEnv zelHome("ZEL_HOME", native("/opt/zelhome"));
 
@@ -77,7 +80,8 @@ TEST(FrameworkHome, OverrideIsUsedOnceAndThenEmptied) {
     EXPECT_EQ(env("ZEL_HOME"), native("/opt/caller/"));
 }
 
-TEST(FrameworkHome, CallerFolderComesBeforeZelHomeWhichIsUsedWithoutOverrideOrCaller) {
+TEST(FrameworkHome, CallerFolderComesBeforeZelHomeWhichIsUsedWithoutOverrideOrCaller)
+{
     ScopedEnv override("ZEL_HOME_OVERRIDE", "");
     ScopedEnv zelHome("ZEL_HOME", native("/opt/zelhome"));
     EXPECT_EQ(zel::frameworkHomeDirectory(native("/opt/caller")), native("/opt/caller/"));
@@ -86,7 +90,8 @@ TEST(FrameworkHome, CallerFolderComesBeforeZelHomeWhichIsUsedWithoutOverrideOrCa
     EXPECT_EQ(env("ZEL_HOME"), native("/opt/zelhome/"));
 }
 
-TEST(FrameworkHome, ModuleFolderWhenNothingIsSetAndTheResultIsKept) {
+TEST(FrameworkHome, ModuleFolderWhenNothingIsSetAndTheResultIsKept)
+{
     if (zeltest::kWindows) {
         GTEST_SKIP() << "Windows has a framework module of its own and the registry behind it";
     }
@@ -100,7 +105,8 @@ TEST(FrameworkHome, ModuleFolderWhenNothingIsSetAndTheResultIsKept) {
     EXPECT_EQ(zel::frameworkHomeDirectory(), zeltest::programFolder());
 }
 
-TEST(FrameworkHome, AnEarlierResultOutlivesItsSource) {
+TEST(FrameworkHome, AnEarlierResultOutlivesItsSource)
+{
     ScopedEnv override("ZEL_HOME_OVERRIDE", nullptr);
     ScopedEnv zelHome("ZEL_HOME", nullptr);
     EXPECT_EQ(zel::frameworkHomeDirectory(native("/opt/once")), native("/opt/once/"));
@@ -108,7 +114,8 @@ TEST(FrameworkHome, AnEarlierResultOutlivesItsSource) {
     EXPECT_EQ(zel::frameworkHomeDirectory(), native("/opt/once/"));
 }
 
-TEST(Platform, FileProbes) {
+TEST(Platform, FileProbes)
+{
     const zeltest::TempDir temp("zel-probe");
     const std::string folder = temp.string();
 
@@ -121,7 +128,8 @@ TEST(Platform, FileProbes) {
     EXPECT_TRUE(zel::platform::findFirstFile(folder + kSep + "messages" + kSep + "*"));
 }
 
-TEST(Platform, EnvironmentKeepsEmptyValuesDefinedAndWithoutARegistryValuesAreEmpty) {
+TEST(Platform, EnvironmentKeepsEmptyValuesDefinedAndWithoutARegistryValuesAreEmpty)
+{
     ScopedEnv cleanup("ZEL_TEST_VARIABLE", nullptr);
     EXPECT_EQ(env("ZEL_TEST_VARIABLE"), std::nullopt);
     EXPECT_TRUE(zel::platform::setEnvironmentVariable("ZEL_TEST_VARIABLE", ""));

@@ -38,22 +38,21 @@ constexpr const char* kBuildKey = "SOFTWARE\\Corvane\\Quorlith\\BUILD\\18286";
 constexpr const char* kNumbersKey = "SOFTWARE\\Corvane\\Quorlith\\Numbers";
 constexpr const char* kExpandableKey = "SOFTWARE\\Corvane\\Quorlith\\Expandable";
 
-const std::string kWebAddressRefused =
-    "Connections given as a web address are not supported by this session.";
+const std::string kWebAddressRefused = "Connections given as a web address are not supported by this session.";
 
-std::string readRegistry(const char* key, const char* value) {
+std::string readRegistry(const char* key, const char* value)
+{
     return zel::platform::readMachineRegistryString(key, value);
 }
 
-std::optional<std::string> env(const char* name) {
-    return zel::platform::getEnvironmentVariable(name);
-}
+std::optional<std::string> env(const char* name) { return zel::platform::getEnvironmentVariable(name); }
 
 // A DLL loaded for one test and unloaded afterwards.
 class LoadedDll {
 public:
     explicit LoadedDll(const fs::path& file) : module_(::LoadLibraryA(file.string().c_str())) {}
-    ~LoadedDll() {
+    ~LoadedDll()
+    {
         if (module_ != nullptr) {
             ::FreeLibrary(module_);
         }
@@ -64,7 +63,8 @@ public:
     HMODULE module() const { return module_; }
 
     template <typename Function>
-    Function entry(const char* name) const {
+    Function entry(const char* name) const
+    {
         return reinterpret_cast<Function>(reinterpret_cast<void*>(::GetProcAddress(module_, name)));
     }
 
@@ -74,7 +74,8 @@ private:
 
 // The text of a status that the DLL's own code makes and fills in from the catalogue of its own
 // home: a session refuses a connection given as a web address without touching the network.
-std::string statusTextFromTheDll(const LoadedDll& dll) {
+std::string statusTextFromTheDll(const LoadedDll& dll)
+{
     const auto create = dll.entry<decltype(&ZEL_createServerSession)>("ZEL_createServerSession");
     const auto destroy = dll.entry<decltype(&ZEL_destroyServerSession)>("ZEL_destroyServerSession");
     if (create == nullptr || destroy == nullptr) {
@@ -108,25 +109,26 @@ std::string statusTextFromTheDll(const LoadedDll& dll) {
     return text;
 }
 
-std::string statusTextHere(unsigned number) {
+std::string statusTextHere(unsigned number)
+{
     std::unique_ptr<IZELServerStatus> status(zel::makeStatus(number));
     return status ? status->getMessage() : std::string("(no status)");
 }
 
-fs::path shippedCatalogue() {
-    return fs::path(zeltest::programFolder()) / "messages" / "zelserverapi.msg";
-}
+fs::path shippedCatalogue() { return fs::path(zeltest::programFolder()) / "messages" / "zelserverapi.msg"; }
 
 // ---- The registry
 // --------------------------------------------------------------------------------
 
-TEST(WindowsRegistry, TextValuesUnderTheMachineKeyAreReadAsStored) {
+TEST(WindowsRegistry, TextValuesUnderTheMachineKeyAreReadAsStored)
+{
     EXPECT_EQ(readRegistry(kProductKey, "ZEL_HOME"), "C:\\zel\\product\\");
     EXPECT_EQ(readRegistry(kBuildKey, "ZEL_HOME"), "C:\\zel\\build18286\\");
     EXPECT_EQ(readRegistry(kExpandableKey, "ZEL_HOME"), "C:\\zel\\expandable\\");
 }
 
-TEST(WindowsRegistry, NonTextValuesMissingKeysAndMissingValuesGiveEmptyText) {
+TEST(WindowsRegistry, NonTextValuesMissingKeysAndMissingValuesGiveEmptyText)
+{
     EXPECT_EQ(readRegistry(kNumbersKey, "ZEL_HOME"), "");
     EXPECT_EQ(readRegistry("SOFTWARE\\Corvane\\Quorlith\\BUILD\\18287", "ZEL_HOME"), "");
     EXPECT_EQ(readRegistry("SOFTWARE\\Corvane\\Nothing", "ZEL_HOME"), "");
@@ -135,7 +137,8 @@ TEST(WindowsRegistry, NonTextValuesMissingKeysAndMissingValuesGiveEmptyText) {
     EXPECT_EQ(readRegistry("SOFTWARE\\Corvane\\Quorlith\\BUILD", "ZEL_HOME"), "");
 }
 
-TEST(WindowsFrameworkHome, RegistryBuildKeyWhenNoFrameworkModuleIsLoadedAndNothingIsSet) {
+TEST(WindowsFrameworkHome, RegistryBuildKeyWhenNoFrameworkModuleIsLoadedAndNothingIsSet)
+{
     ASSERT_EQ(::GetModuleHandleA(zel::platform::kFrameworkModuleName), nullptr);
     ScopedEnv override("ZEL_HOME_OVERRIDE", nullptr);
     ScopedEnv zelHome("ZEL_HOME", nullptr);
@@ -151,13 +154,15 @@ TEST(WindowsFrameworkHome, RegistryBuildKeyWhenNoFrameworkModuleIsLoadedAndNothi
     EXPECT_EQ(zel::frameworkHomeDirectory(), "C:\\zel\\build18286\\");
 }
 
-TEST(WindowsFrameworkHome, EnvironmentComesBeforeTheRegistry) {
+TEST(WindowsFrameworkHome, EnvironmentComesBeforeTheRegistry)
+{
     ScopedEnv override("ZEL_HOME_OVERRIDE", nullptr);
     ScopedEnv zelHome("ZEL_HOME", "D:\\family");
     EXPECT_EQ(zel::frameworkHomeDirectory(), "D:\\family\\");
 }
 
-TEST(WindowsFrameworkHome, TheLoadedFrameworkDllsFolderNeedsNoRegistry) {
+TEST(WindowsFrameworkHome, TheLoadedFrameworkDllsFolderNeedsNoRegistry)
+{
     const zeltest::TempDir folder("zel-framework");
     fs::copy_file(fs::path(zeltest::programFolder()) / zel::platform::kLibraryModuleName,
                   folder.path() / zel::platform::kFrameworkModuleName);
@@ -172,7 +177,8 @@ TEST(WindowsFrameworkHome, TheLoadedFrameworkDllsFolderNeedsNoRegistry) {
 // ---- Separators
 // ----------------------------------------------------------------------------------
 
-TEST(WindowsSeparators, HomeDirectoriesEndInABackslash) {
+TEST(WindowsSeparators, HomeDirectoriesEndInABackslash)
+{
     {
         ScopedEnv home("ZEL_SERVERAPI_HOME", "C:\\x");
         EXPECT_EQ(zel::serverLibraryHomeDirectory(), "C:\\x\\");
@@ -191,7 +197,8 @@ TEST(WindowsSeparators, HomeDirectoriesEndInABackslash) {
     EXPECT_EQ(zel::frameworkHomeDirectory("D:\\caller\\"), "D:\\caller\\");
 }
 
-TEST(WindowsSeparators, TheCatalogueIsLookedForBehindBackslashes) {
+TEST(WindowsSeparators, TheCatalogueIsLookedForBehindBackslashes)
+{
     for (const char* home : {"C:\\nowhere", "C:\\nowhere\\"}) {
         zel::ZELLocalizedMessageDatabase database;
         EXPECT_FALSE(database.initialize(home));
@@ -211,7 +218,8 @@ TEST(WindowsSeparators, TheCatalogueIsLookedForBehindBackslashes) {
 // ---- File-search probes
 // --------------------------------------------------------------------------
 
-TEST(WindowsFileProbes, FilesFoldersPatternsAndMissingNames) {
+TEST(WindowsFileProbes, FilesFoldersPatternsAndMissingNames)
+{
     const zeltest::TempDir dir("zel-probe");
     const std::string root = dir.string();
 
@@ -234,7 +242,8 @@ TEST(WindowsFileProbes, FilesFoldersPatternsAndMissingNames) {
 // ---- Homes from loaded DLLs
 // ----------------------------------------------------------------------
 
-TEST(WindowsModuleHome, TheLibraryDllBesideTheProgramIsTheHomeUnlessTheVariableIsSet) {
+TEST(WindowsModuleHome, TheLibraryDllBesideTheProgramIsTheHomeUnlessTheVariableIsSet)
+{
     // The program carries the library's code itself and does not import the DLL.
     ASSERT_EQ(::GetModuleHandleA(zel::platform::kLibraryModuleName), nullptr);
     ScopedEnv unset("ZEL_SERVERAPI_HOME", nullptr);
@@ -253,7 +262,8 @@ TEST(WindowsModuleHome, TheLibraryDllBesideTheProgramIsTheHomeUnlessTheVariableI
     EXPECT_EQ(statusTextFromTheDll(dll), "Could not load resource: 393639");
 }
 
-TEST(WindowsModuleHome, ACopyOfTheDllElsewhereReadsTheCatalogueInItsOwnFolder) {
+TEST(WindowsModuleHome, ACopyOfTheDllElsewhereReadsTheCatalogueInItsOwnFolder)
+{
     ScopedEnv unset("ZEL_SERVERAPI_HOME", nullptr);
     const zeltest::TempDir folder("zel-dll-copy");
     fs::copy_file(fs::path(zeltest::programFolder()) / zel::platform::kLibraryModuleName,

@@ -18,20 +18,21 @@ namespace fs = std::filesystem;
 
 namespace {
 
-const std::string kReport =
-    "Insufficient memory available -- error code was 12. Offending plug-in is '";
+const std::string kReport = "Insufficient memory available -- error code was 12. Offending plug-in is '";
 
 // Appends "<severity>|<message>\n" to a file per message. With `failWhileWriting` set it runs out
 // of memory itself while writing, the way a host's log can when the whole process is short.
 class FileSink : public IZELLogSink {
 public:
     explicit FileSink(std::string path, bool failWhileWriting = false)
-        : path_(std::move(path)), failWhileWriting_(failWhileWriting) {}
+        : path_(std::move(path)), failWhileWriting_(failWhileWriting)
+    {}
 
     void setSeverityThreshold(int severity) override { threshold_ = severity; }
     int getSeverityThreshold() const override { return threshold_; }
     void flush() override {}
-    void logMessageString(const char* message, int severity) override {
+    void logMessageString(const char* message, int severity) override
+    {
         if (std::FILE* file = std::fopen(path_.c_str(), "ab")) {
             std::fprintf(file, "%d|%s\n", severity, message);
             std::fclose(file);
@@ -55,7 +56,8 @@ constexpr const char* kReportVariable = "ZEL_TEST_OOM_REPORT";
 
 class MemoryHandler : public ::testing::Test {
 protected:
-    MemoryHandler() {
+    MemoryHandler()
+    {
         if (std::optional<std::string> inherited = zeltest::getEnv(kReportVariable)) {
             path_ = *inherited;
         } else {
@@ -66,13 +68,14 @@ protected:
     }
     ~MemoryHandler() override { zel::heap::setFailureRoutine(nullptr); }
 
-    std::string recorded() const {
+    std::string recorded() const
+    {
         std::ifstream file(path_, std::ios::binary);
-        return std::string((std::istreambuf_iterator<char>(file)),
-                           std::istreambuf_iterator<char>());
+        return std::string((std::istreambuf_iterator<char>(file)), std::istreambuf_iterator<char>());
     }
 
-    static void exhaust() {
+    static void exhaust()
+    {
         zel::heap::failNextAllocations(1);
         zel::heap::allocate(32);
     }
@@ -93,7 +96,8 @@ struct ReportCase {
 
 class MemoryReport : public MemoryHandler, public ::testing::WithParamInterface<ReportCase> {};
 
-TEST_P(MemoryReport, IsSentOnceAndTheProcessExitsWithOne) {
+TEST_P(MemoryReport, IsSentOnceAndTheProcessExitsWithOne)
+{
     const ReportCase& c = GetParam();
     EXPECT_EXIT(
         {
@@ -124,7 +128,8 @@ const ReportCase kReportCases[] = {
 INSTANTIATE_TEST_SUITE_P(Table, MemoryReport, ::testing::ValuesIn(kReportCases),
                          [](const auto& info) { return "case" + std::to_string(info.index); });
 
-TEST_F(MemoryHandler, ReturnsThePreviousRoutine) {
+TEST_F(MemoryHandler, ReturnsThePreviousRoutine)
+{
     const ZELMemoryFailureRoutine own = [](int) {};
     EXPECT_EQ(zel::heap::setFailureRoutine(own), nullptr);
 

@@ -20,13 +20,15 @@ const std::string kSignedIn =
     "<SERVER_SESSION_INIT security_enabled=\"true\"><IDENTITY id=\"ann\" is_authenticated=\"true\">"
     "<ROLES><ROLE name=\"admin\"/></ROLES></IDENTITY></SERVER_SESSION_INIT>";
 
-std::string identityDocument(const std::string& keyword) {
+std::string identityDocument(const std::string& keyword)
+{
     return "<?xml version=\"1.0\" encoding=\"UTF-8\" standalone=\"no\" ?><" + keyword +
            "><IDENTITY id=\"ann\" is_authenticated=\"true\"><ROLES><ROLE name=\"admin\"/></ROLES></IDENTITY></" +
            keyword + ">";
 }
 
-zeltest::Bytes firstHandshake() {
+zeltest::Bytes firstHandshake()
+{
     return zeltest::request("SERVER_SESSION_INIT", {{"clientID", ""}, {"userID", "ann"}, {"userPassword", "pw1"}});
 }
 
@@ -34,7 +36,8 @@ zeltest::Bytes firstHandshake() {
 class SessionTest : public ::testing::Test {
 protected:
     void SetUp() override { ASSERT_NE(ZEL_createServerSession(&session), nullptr); }
-    void TearDown() override {
+    void TearDown() override
+    {
         session->destroyConnectionInfo(&info);
         strings.clear();
         ZEL_destroyServerSession(&session);
@@ -71,14 +74,16 @@ protected:
     std::vector<std::unique_ptr<IZELServerString, Releaser>> strings;
 };
 
-void expectNoManagers(IZELServerSession& session) {
+void expectNoManagers(IZELServerSession& session)
+{
     EXPECT_EQ(session.getTransformationManager(), nullptr);
     EXPECT_EQ(session.getRepositoryManager(), nullptr);
     EXPECT_EQ(session.getSecurityManager(), nullptr);
     EXPECT_EQ(session.getMountPointManager(), nullptr);
 }
 
-TEST_F(SessionTest, FailedInitsLeaveTheSessionEmpty) {
+TEST_F(SessionTest, FailedInitsLeaveTheSessionEmpty)
+{
     EXPECT_EQ(numberOf(session->disconnect()), 0u) << "disconnect before init is harmless";
     expectNoManagers(*session);
 
@@ -95,7 +100,8 @@ TEST_F(SessionTest, FailedInitsLeaveTheSessionEmpty) {
     expectNoManagers(*session);
 }
 
-TEST_F(SessionTest, SignInMakesTheManagersAndDisconnectTwiceReportsTheSecond) {
+TEST_F(SessionTest, SignInMakesTheManagersAndDisconnectTwiceReportsTheSecond)
+{
     FakeServer server;
     server.expectFrame(firstHandshake()).sendFrame(zeltest::reply("SUCCESS", kSignedIn)).expectPeerClose();
     server.start();
@@ -120,11 +126,13 @@ TEST_F(SessionTest, SignInMakesTheManagersAndDisconnectTwiceReportsTheSecond) {
     EXPECT_TRUE(server.verify());
 }
 
-TEST_F(SessionTest, SessionPropertyIsOneExchangeCarryingTheIdentity) {
+TEST_F(SessionTest, SessionPropertyIsOneExchangeCarryingTheIdentity)
+{
     FakeServer server;
-    server.exchange(zeltest::request("SERVER_SESSION_INIT",
-                                     {{"clientID", "tool-7"}, {"userID", "ann"}, {"userPassword", "pw1"}}),
-                    zeltest::reply("SUCCESS", kSignedIn))
+    server
+        .exchange(zeltest::request("SERVER_SESSION_INIT",
+                                   {{"clientID", "tool-7"}, {"userID", "ann"}, {"userPassword", "pw1"}}),
+                  zeltest::reply("SUCCESS", kSignedIn))
         .exchange(zeltest::request("SERVER_SESSION_GET_PROP",
                                    {{"identityObject", identityDocument("SERVER_SESSION_GET_PROP")},
                                     {"clientID", "tool-7"},
@@ -144,7 +152,8 @@ TEST_F(SessionTest, SessionPropertyIsOneExchangeCarryingTheIdentity) {
     EXPECT_TRUE(server.verify());
 }
 
-TEST_F(SessionTest, ServerErrorOnASessionPropertyKeepsTheOutputAndCarriesTheText) {
+TEST_F(SessionTest, ServerErrorOnASessionPropertyKeepsTheOutputAndCarriesTheText)
+{
     FakeServer server;
     server.exchange(firstHandshake(), zeltest::reply("SUCCESS", kSignedIn))
         .expectAnyFrame()
@@ -164,10 +173,10 @@ TEST_F(SessionTest, ServerErrorOnASessionPropertyKeepsTheOutputAndCarriesTheText
     EXPECT_TRUE(server.verify());
 }
 
-TEST_F(SessionTest, RefusedSignInKeepsOnlyTheConnection) {
+TEST_F(SessionTest, RefusedSignInKeepsOnlyTheConnection)
+{
     FakeServer server;
-    server.exchange(firstHandshake(), zeltest::reply("ERROR", "Authentication Error: bad password"))
-        .expectPeerClose();
+    server.exchange(firstHandshake(), zeltest::reply("ERROR", "Authentication Error: bad password")).expectPeerClose();
     server.start();
     useCredentials("127.0.0.1", server.port());
 
@@ -181,7 +190,8 @@ TEST_F(SessionTest, RefusedSignInKeepsOnlyTheConnection) {
     EXPECT_TRUE(server.verify());
 }
 
-TEST_F(SessionTest, InitAfterTheServerDroppedTheConnectionReconnects) {
+TEST_F(SessionTest, InitAfterTheServerDroppedTheConnectionReconnects)
+{
     FakeServer server;
     server.exchange(firstHandshake(), zeltest::reply("SUCCESS", kSignedIn))
         .closeConnection()
@@ -201,7 +211,8 @@ TEST_F(SessionTest, InitAfterTheServerDroppedTheConnectionReconnects) {
 }
 
 // A token in the properties signs in with the token; the client id of the options wins over theirs.
-TEST_F(SessionTest, TokenSignInTakesTheClientIdFromTheOptionsBeforeTheProperties) {
+TEST_F(SessionTest, TokenSignInTakesTheClientIdFromTheOptionsBeforeTheProperties)
+{
     FakeServer server;
     server.exchange(zeltest::request("SERVER_SESSION_INIT", {{"clientID", "from-options"}, {"userToken", "t"}}),
                     zeltest::reply("SUCCESS", kSignedIn));
@@ -220,15 +231,16 @@ TEST_F(SessionTest, TokenSignInTakesTheClientIdFromTheOptionsBeforeTheProperties
 
 // Every factory hands out a live object that its destroy operation takes back, leaving null.
 template <class T>
-void roundTrip(IZELServerSession& session, T* (IZELServerSession::*create)(),
-               void (IZELServerSession::*destroy)(T**)) {
+void roundTrip(IZELServerSession& session, T* (IZELServerSession::*create)(), void (IZELServerSession::*destroy)(T**))
+{
     T* object = (session.*create)();
     EXPECT_NE(object, nullptr);
     (session.*destroy)(&object);
     EXPECT_EQ(object, nullptr);
 }
 
-TEST_F(SessionTest, EveryFactoryMakesAnObjectItsDestroyTakesBackAndNullIsAccepted) {
+TEST_F(SessionTest, EveryFactoryMakesAnObjectItsDestroyTakesBackAndNullIsAccepted)
+{
     IZELServerSession& s = *session;
     using S = IZELServerSession;
     roundTrip<IZELServerString>(s, &S::createString, &S::destroyString);
@@ -241,13 +253,16 @@ TEST_F(SessionTest, EveryFactoryMakesAnObjectItsDestroyTakesBackAndNullIsAccepte
     roundTrip<IZELServerRepository>(s, &S::createRepository, &S::destroyRepository);
     roundTrip<IZELServerVector<IZELServerRepository>>(s, &S::createRepositoryVector, &S::destroyRepositoryVector);
     roundTrip<IZELServerWorkspaceSummary>(s, &S::createWorkspaceSummary, &S::destroyWorkspaceSummary);
-    roundTrip<IZELServerVector<IZELServerWorkspaceSummary>>(s, &S::createWorkspaceSummaryVector, &S::destroyWorkspaceSummaryVector);
+    roundTrip<IZELServerVector<IZELServerWorkspaceSummary>>(s, &S::createWorkspaceSummaryVector,
+                                                            &S::destroyWorkspaceSummaryVector);
     roundTrip<IZELServerWorkspaceService>(s, &S::createWorkspaceService, &S::destroyWorkspaceService);
-    roundTrip<IZELServerVector<IZELServerWorkspaceService>>(s, &S::createWorkspaceServiceVector, &S::destroyWorkspaceServiceVector);
+    roundTrip<IZELServerVector<IZELServerWorkspaceService>>(s, &S::createWorkspaceServiceVector,
+                                                            &S::destroyWorkspaceServiceVector);
     roundTrip<IZELServerCustomFormat>(s, &S::createCustomFormat, &S::destroyCustomFormat);
     roundTrip<IZELServerVector<IZELServerCustomFormat>>(s, &S::createCustomFormatVector, &S::destroyCustomFormatVector);
     roundTrip<IZELServerCustomTransformer>(s, &S::createCustomTransformer, &S::destroyCustomTransformer);
-    roundTrip<IZELServerVector<IZELServerCustomTransformer>>(s, &S::createCustomTransformerVector, &S::destroyCustomTransformerVector);
+    roundTrip<IZELServerVector<IZELServerCustomTransformer>>(s, &S::createCustomTransformerVector,
+                                                             &S::destroyCustomTransformerVector);
     roundTrip<IZELServerResource>(s, &S::createResource, &S::destroyResource);
     roundTrip<IZELServerVector<IZELServerResource>>(s, &S::createResourceVector, &S::destroyResourceVector);
     roundTrip<IZELServerPropertyAccessor>(s, &S::createPropertyAccessor, &S::destroyPropertyAccessor);
@@ -271,7 +286,8 @@ TEST_F(SessionTest, EveryFactoryMakesAnObjectItsDestroyTakesBackAndNullIsAccepte
     EXPECT_EQ(none, nullptr);
 }
 
-TEST_F(SessionTest, ANewServiceIsEnabledAndTakesWorkspacesOnly) {
+TEST_F(SessionTest, ANewServiceIsEnabledAndTakesWorkspacesOnly)
+{
     IZELServerService* service = session->createService(*text("s"), *text("S"), *text("d"), *text("u"));
     ASSERT_NE(service, nullptr);
     EXPECT_EQ(service->isEnabled(), 1u);
@@ -284,7 +300,8 @@ TEST_F(SessionTest, ANewServiceIsEnabledAndTakesWorkspacesOnly) {
     session->destroyService(&service);
 }
 
-TEST_F(SessionTest, TransformationFactoriesComposeTheWorkspacePath) {
+TEST_F(SessionTest, TransformationFactoriesComposeTheWorkspacePath)
+{
     IZELServerTransformationRequest* request =
         session->createTransformationRequest(*text("jobs"), *text("R"), *text("w.zlw"));
     ASSERT_NE(request, nullptr);

@@ -44,9 +44,10 @@ protected:
 TEST_F(MountPointManagerTest, GetSharedResourcesListsThemAndTheyTalkThroughTheSameConnection)
 {
     server.exchange(command("SR_GET_SHAREDRESOURCES"), zeltest::reply("SUCCESS", kTwoResources))
-        .exchange(command("SR_MAKE", {{"srName", "OUT"},
-                                      {"srPath", xmlDocument("SR_MAKE", R"(<PATH abspath="/new" dirpath="" name="new"/>)")}}),
-                  zeltest::reply("SUCCESS", "true"));
+        .exchange(
+            command("SR_MAKE", {{"srName", "OUT"},
+                                {"srPath", xmlDocument("SR_MAKE", R"(<PATH abspath="/new" dirpath="" name="new"/>)")}}),
+            zeltest::reply("SUCCESS", "true"));
     signIn();
     const MountPoints mountPoints(makeMountPointVector());
     mountPoints->append(makeMountPoint(nullptr));
@@ -88,17 +89,21 @@ TEST_F(MountPointManagerTest, GetSharedResourceFillsAndBindsTheMountPointOrLeave
     server.exchange(lookUp("NOPE"), zeltest::reply("SUCCESS", "<SR_GET_SHAREDRESOURCE/>"))
         .exchange(lookUp("DATA"), zeltest::reply("ERROR", "down"))
         .exchange(lookUp("DATA"), zeltest::reply("SUCCESS", "<unclosed"))
-        .exchange(lookUp("DATA"), zeltest::reply("SUCCESS", R"(<SR_GET_SHAREDRESOURCE><SHAREDRESOURCE name="DATA" )"
-                                                            R"(displayname="Input data" description="d"/></SR_GET_SHAREDRESOURCE>)"))
-        .exchange(command("SR_EXISTS", {{"srName", "DATA"},
-                                        {"srPath", xmlDocument("SR_EXISTS", R"(<PATH abspath="/a" dirpath="" name="a"/>)")}}),
-                  zeltest::reply("SUCCESS", "true"));
+        .exchange(lookUp("DATA"),
+                  zeltest::reply("SUCCESS", R"(<SR_GET_SHAREDRESOURCE><SHAREDRESOURCE name="DATA" )"
+                                            R"(displayname="Input data" description="d"/></SR_GET_SHAREDRESOURCE>)"))
+        .exchange(
+            command("SR_EXISTS", {{"srName", "DATA"},
+                                  {"srPath", xmlDocument("SR_EXISTS", R"(<PATH abspath="/a" dirpath="" name="a"/>)")}}),
+            zeltest::reply("SUCCESS", "true"));
     signIn();
     const std::unique_ptr<IZELServerMountPoint> mountPoint(makeMountPoint(nullptr));
-    const std::pair<const char*, unsigned> failures[] = {{"NOPE", 0}, {"DATA", msg::kServerError}, {"DATA", msg::kXmlFailure}};
+    const std::pair<const char*, unsigned> failures[] = {
+        {"NOPE", 0}, {"DATA", msg::kServerError}, {"DATA", msg::kXmlFailure}};
     for (const auto& [name, number] : failures) {
         unsigned found = 7;
-        EXPECT_EQ(numberOf(StatusPtr(manager->getSharedResource(ZELServerString(name), *mountPoint, found)).get()), number);
+        EXPECT_EQ(numberOf(StatusPtr(manager->getSharedResource(ZELServerString(name), *mountPoint, found)).get()),
+                  number);
         EXPECT_EQ(found, 0u) << number;
         EXPECT_EQ(textsOf(*mountPoint), "|");
     }

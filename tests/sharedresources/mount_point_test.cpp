@@ -92,7 +92,8 @@ protected:
 
     PathPtr path(const char* whole)
     {
-        return PathPtr(mountPoint->createPath(ZELServerString(whole)), [this](IZELServerPath* p) { mountPoint->releaseObject(p); });
+        return PathPtr(mountPoint->createPath(ZELServerString(whole)),
+                       [this](IZELServerPath* p) { mountPoint->releaseObject(p); });
     }
 
     // A path value as the mount point sends it: a "PATH" document named after the command (the XML
@@ -171,14 +172,17 @@ TEST_F(MountPointTest, FlagsFollowTheAnswerAndReadZeroAfterAFailureOrAnAnswerTha
         unsigned flag;
     };
     const Case cases[] = {
-        {"exists true", true, "in/a.csv", 0, 1},   {"exists false", true, "b.csv", 0, 0},
-        {"remove", false, "in/old", 0, 1},         {"exists failing", true, "x", msg::kServerError, 0},
-        {"remove failing", false, "x", msg::kServerError, 0}, {"exists not boolean", true, "x", 0, 0},
+        {"exists true", true, "in/a.csv", 0, 1},
+        {"exists false", true, "b.csv", 0, 0},
+        {"remove", false, "in/old", 0, 1},
+        {"exists failing", true, "x", msg::kServerError, 0},
+        {"remove failing", false, "x", msg::kServerError, 0},
+        {"exists not boolean", true, "x", 0, 0},
     };
     for (const Case& c : cases) {
         unsigned flag = 7;
-        const unsigned number = numberOf(c.exists ? mountPoint->exists(*path(c.path), flag)
-                                                  : mountPoint->remove(*path(c.path), flag));
+        const unsigned number =
+            numberOf(c.exists ? mountPoint->exists(*path(c.path), flag) : mountPoint->remove(*path(c.path), flag));
         EXPECT_EQ(number, c.number) << c.what;
         EXPECT_EQ(flag, c.flag) << c.what;
     }
@@ -209,7 +213,8 @@ TEST_F(MountPointTest, MakeDirectoryCopyAndMoveSendTheirPathsSourceFirst)
 TEST_F(MountPointTest, GetFileInfoSendsSrGetAndFillsTheDescriptionOrFails)
 {
     const Bytes expected = pathCommand("SR_GET", "a.csv", "in", "in/a.csv");
-    const Bytes answer = zeltest::reply("SUCCESS", "<SR_GET>" + fileInfoElement("FILE", "2048", "in", "a.csv") + "</SR_GET>");
+    const Bytes answer =
+        zeltest::reply("SUCCESS", "<SR_GET>" + fileInfoElement("FILE", "2048", "in", "a.csv") + "</SR_GET>");
     server.exchange(expected, answer)
         .exchange(expected, answer)
         .exchange(expected, zeltest::reply("SUCCESS", "<SR_GET/>"))
@@ -328,10 +333,11 @@ TEST_F(MountPointTest, UploadSendsTheCommandThenTheFile)
 {
     const std::string content = "a;b\n1;2\n";
     const std::string source = file("up.csv", content);
-    server.exchange(command("SR_UPLOAD", {{"srName", "DATA"},
-                                          {"srDestPath", pathDocument("SR_UPLOAD", "up.csv", "in", "in/up.csv")},
-                                          {"itemFileCRCCheckingEnabled", "true"}}),
-                    zeltest::readyAck())
+    server
+        .exchange(command("SR_UPLOAD", {{"srName", "DATA"},
+                                        {"srDestPath", pathDocument("SR_UPLOAD", "up.csv", "in", "in/up.csv")},
+                                        {"itemFileCRCCheckingEnabled", "true"}}),
+                  zeltest::readyAck())
         .exchange(zeltest::fileHeader(content.size(), zeltest::crc32(content)), zeltest::readyAck())
         .expectRawBytes(content)
         .sendFrame(zeltest::reply("SUCCESS", "true"));
@@ -348,7 +354,8 @@ TEST_F(MountPointTest, RefusedArgumentsAndUnusableLocalFilesSendNothing)
     ZELServerFileInfo info;
     EXPECT_EQ(numberOf(mountPoint->getFileInfo(*path("a"), 3, info)), msg::kInvalidArgument) << "flags other than 0";
     for (const std::string& source : {(dir / "missing.csv").string(), dir.string(), std::string()}) {
-        EXPECT_EQ(numberOf(mountPoint->upload(ZELServerString(source), *path("in/x.csv"), nullptr)), msg::kInvalidArgument)
+        EXPECT_EQ(numberOf(mountPoint->upload(ZELServerString(source), *path("in/x.csv"), nullptr)),
+                  msg::kInvalidArgument)
             << "upload of \"" << source << '"';
     }
     unsigned received = 9;
@@ -373,11 +380,11 @@ TEST(MountPointWithoutChannel, EveryCommandAnswersNotConnectedAndSetsTheFlagsToZ
     unsigned present = 5;
     unsigned removed = 5;
     unsigned received = 5;
-    for (IZELServerStatus* status : {mountPoint->exists(path, present), mountPoint->remove(path, removed),
-                                     mountPoint->download(path, ZELServerString(""), received, nullptr),
-                                     mountPoint->copy(path, path), mountPoint->move(path, path),
-                                     mountPoint->getFileInfo(path, info), mountPoint->list(path, entries),
-                                     mountPoint->makeDirectory(path)}) {
+    for (IZELServerStatus* status :
+         {mountPoint->exists(path, present), mountPoint->remove(path, removed),
+          mountPoint->download(path, ZELServerString(""), received, nullptr), mountPoint->copy(path, path),
+          mountPoint->move(path, path), mountPoint->getFileInfo(path, info), mountPoint->list(path, entries),
+          mountPoint->makeDirectory(path)}) {
         EXPECT_EQ(numberOf(status), msg::kNotConnected);
     }
     EXPECT_EQ((std::vector<unsigned>{present, removed, received}), (std::vector<unsigned>{0, 0, 0}));

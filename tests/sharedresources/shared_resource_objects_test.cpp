@@ -49,17 +49,24 @@ std::string textsOf(const IZELServerMountPoint& mountPoint)
 }
 
 // A channel the readers can bind objects to; nothing is ever sent through it.
-IZELServerChannel* fakeChannel(int n) { return reinterpret_cast<IZELServerChannel*>(static_cast<std::uintptr_t>(0x1000 * n)); }
+IZELServerChannel* fakeChannel(int n)
+{
+    return reinterpret_cast<IZELServerChannel*>(static_cast<std::uintptr_t>(0x1000 * n));
+}
 
 // ---- Paths ------------------------------------------------------------------------------------------
 
 TEST(Path, FromAWholePathSplitsAtTheLastSlashAndFromPartsJoinsThemWithOneSlash)
 {
     const std::pair<const char*, const char*> wholes[] = {
-        {"in/2024/data.csv", "data.csv|in/2024|in/2024/data.csv"}, {"data.csv", "data.csv||/data.csv"},
-        {"/data.csv", "data.csv||/data.csv"},                      {"/in/data.csv", "data.csv|/in|/in/data.csv"},
-        {"in/", "|in|in/"},                                        {"a//b", "b|a/|a/b"},
-        {"in\\data.csv", "in\\data.csv||/in\\data.csv"},           {"", "||/"},
+        {"in/2024/data.csv", "data.csv|in/2024|in/2024/data.csv"},
+        {"data.csv", "data.csv||/data.csv"},
+        {"/data.csv", "data.csv||/data.csv"},
+        {"/in/data.csv", "data.csv|/in|/in/data.csv"},
+        {"in/", "|in|in/"},
+        {"a//b", "b|a/|a/b"},
+        {"in\\data.csv", "in\\data.csv||/in\\data.csv"},
+        {"", "||/"},
     };
     const std::unique_ptr<IZELServerMountPoint> mountPoint(makeMountPoint(nullptr));
     for (const auto& [whole, expected] : wholes) {
@@ -70,9 +77,12 @@ TEST(Path, FromAWholePathSplitsAtTheLastSlashAndFromPartsJoinsThemWithOneSlash)
     }
     // Both parts are kept as given; only the absolute path joins them.
     const std::pair<std::pair<const char*, const char*>, const char*> parts[] = {
-        {{"in/2024", "data.csv"}, "in/2024/data.csv"}, {{"in/2024/", "data.csv"}, "in/2024/data.csv"},
-        {{"in", "/data.csv"}, "in/data.csv"},          {{"in//", "//data.csv"}, "in/data.csv"},
-        {{"", "data.csv"}, "/data.csv"},               {{"/", "data.csv"}, "/data.csv"},
+        {{"in/2024", "data.csv"}, "in/2024/data.csv"},
+        {{"in/2024/", "data.csv"}, "in/2024/data.csv"},
+        {{"in", "/data.csv"}, "in/data.csv"},
+        {{"in//", "//data.csv"}, "in/data.csv"},
+        {{"", "data.csv"}, "/data.csv"},
+        {{"/", "data.csv"}, "/data.csv"},
         {{"in", ""}, "in/"},
     };
     for (const auto& [given, absolute] : parts) {
@@ -117,9 +127,10 @@ TEST(FileInfoReader, OnlyTheExactTextDirIsADirectoryAndSizeIsAnUnsignedNumberOrZ
         ASSERT_EQ(readFileInfoReply(fileInfoReply(std::string(R"(<FILEINFO filetype=")") + type + R"("/>)"), info), 0);
         EXPECT_EQ(info.isDirectory(), std::string(type) == "DIR") << "filetype \"" << type << "\"";
     }
-    const std::pair<const char*, unsigned> sizes[] = {  // null text: attribute absent
-        {"1024", 1024},    {"  77", 77}, {"0x10", 16}, {"0XfF", 255},  {"4294967295", 4294967295u},
-        {"4294967296", 0}, {"-1", 0},    {"-0", 0},    {"12abc", 0},   {"12.000", 12},
+    const std::pair<const char*, unsigned> sizes[] = {
+        // null text: attribute absent
+        {"1024", 1024},    {"  77", 77}, {"0x10", 16}, {"0XfF", 255}, {"4294967295", 4294967295u},
+        {"4294967296", 0}, {"-1", 0},    {"-0", 0},    {"12abc", 0},  {"12.000", 12},
         {"", 0},           {nullptr, 0},
     };
     for (const auto& [text, expected] : sizes) {
@@ -174,10 +185,11 @@ TEST(FileInfoReader, AListHoldsOneDescriptionPerElementInOrderAndReplacesTheOldC
 TEST(SharedResourceReader, FillsTheMountPointAndBindsItOrLeavesItAloneOnFailure)
 {
     ZELServerMountPoint mountPoint(fakeChannel(1));
-    ASSERT_EQ(readMountPointReply(R"(<SR_GET_SHAREDRESOURCE><SHAREDRESOURCE name="DATA" displayname="Input &amp; output" )"
-                                  R"(description="Files the jobs read"/></SR_GET_SHAREDRESOURCE>)",
-                                  fakeChannel(2), mountPoint),
-              0);
+    ASSERT_EQ(
+        readMountPointReply(R"(<SR_GET_SHAREDRESOURCE><SHAREDRESOURCE name="DATA" displayname="Input &amp; output" )"
+                            R"(description="Files the jobs read"/></SR_GET_SHAREDRESOURCE>)",
+                            fakeChannel(2), mountPoint),
+        0);
     EXPECT_EQ(textsOf(mountPoint), "DATA|Input & output|Files the jobs read");
     EXPECT_EQ(mountPoint.channel(), fakeChannel(2));
     EXPECT_EQ(readMountPointReply("<SR_GET_SHAREDRESOURCE/>", fakeChannel(3), mountPoint),
@@ -191,9 +203,10 @@ TEST(SharedResourceReader, AListMakesOneBoundMountPointPerElement)
 {
     const std::unique_ptr<IZELServerVector<IZELServerMountPoint>> mountPoints(makeMountPointVector());
     mountPoints->append(makeMountPoint(nullptr));
-    ASSERT_EQ(readMountPointsReply(R"(<SR_GET_SHAREDRESOURCES><SHAREDRESOURCE name="A" displayname="a" description=""/>)"
-                                   R"(<SHAREDRESOURCE name="B" displayname="b" description="second"/></SR_GET_SHAREDRESOURCES>)",
-                                   fakeChannel(4), *mountPoints),
+    ASSERT_EQ(readMountPointsReply(
+                  R"(<SR_GET_SHAREDRESOURCES><SHAREDRESOURCE name="A" displayname="a" description=""/>)"
+                  R"(<SHAREDRESOURCE name="B" displayname="b" description="second"/></SR_GET_SHAREDRESOURCES>)",
+                  fakeChannel(4), *mountPoints),
               0);
     ASSERT_EQ(mountPoints->entries(), 2u);
     EXPECT_EQ(textsOf(*mountPoints->element(0)), "A|a|");

@@ -17,7 +17,8 @@
 
 namespace zeltest {
 
-std::optional<std::string> getEnv(const char* name) {
+std::optional<std::string> getEnv(const char* name)
+{
 #if defined(_WIN32)
     char buffer[32768];
     ::SetLastError(ERROR_SUCCESS);
@@ -32,7 +33,8 @@ std::optional<std::string> getEnv(const char* name) {
 #endif
 }
 
-void setEnv(const char* name, const std::optional<std::string>& value) {
+void setEnv(const char* name, const std::optional<std::string>& value)
+{
 #if defined(_WIN32)
     // The runtime's copy first: _putenv_s with an empty value removes the variable there and in the
     // process block, so the process block is set last.
@@ -47,14 +49,15 @@ void setEnv(const char* name, const std::optional<std::string>& value) {
 #endif
 }
 
-ScopedEnv::ScopedEnv(const char* name, std::optional<std::string> value)
-    : name_(name), old_(getEnv(name)) {
+ScopedEnv::ScopedEnv(const char* name, std::optional<std::string> value) : name_(name), old_(getEnv(name))
+{
     setEnv(name, value);
 }
 
 ScopedEnv::~ScopedEnv() { setEnv(name_.c_str(), old_); }
 
-std::filesystem::path makeTempDir(const std::string& prefix) {
+std::filesystem::path makeTempDir(const std::string& prefix)
+{
     namespace fs = std::filesystem;
     static std::atomic<unsigned> counter{0};
 #if defined(_WIN32)
@@ -62,12 +65,10 @@ std::filesystem::path makeTempDir(const std::string& prefix) {
 #else
     const auto pid = static_cast<unsigned long>(::getpid());
 #endif
-    std::mt19937_64 random(static_cast<std::uint64_t>(
-        std::chrono::steady_clock::now().time_since_epoch().count()));
+    std::mt19937_64 random(static_cast<std::uint64_t>(std::chrono::steady_clock::now().time_since_epoch().count()));
     const fs::path base = fs::temp_directory_path();
     for (int attempt = 0; attempt < 100; ++attempt) {
-        const fs::path candidate = base / (prefix + "-" + std::to_string(pid) + "-" +
-                                           std::to_string(counter++) + "-" +
+        const fs::path candidate = base / (prefix + "-" + std::to_string(pid) + "-" + std::to_string(counter++) + "-" +
                                            std::to_string(random() % 1000000));
         std::error_code error;
         // create_directory answers false, without an error, when the folder was there already.
@@ -80,7 +81,8 @@ std::filesystem::path makeTempDir(const std::string& prefix) {
 
 TempDir::TempDir(const std::string& prefix) : path_(makeTempDir(prefix)) {}
 
-TempDir::~TempDir() {
+TempDir::~TempDir()
+{
     std::error_code ignored;
     std::filesystem::remove_all(path_, ignored);
 }

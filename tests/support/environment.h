@@ -14,7 +14,8 @@ class ScopedEnv {
 public:
     ScopedEnv(const char* name, std::optional<std::string> value);
     ScopedEnv(const char* name, const char* value)
-        : ScopedEnv(name, value != nullptr ? std::optional<std::string>(value) : std::nullopt) {}
+        : ScopedEnv(name, value != nullptr ? std::optional<std::string>(value) : std::nullopt)
+    {}
     ~ScopedEnv();
     ScopedEnv(const ScopedEnv&) = delete;
     ScopedEnv& operator=(const ScopedEnv&) = delete;

@@ -17,7 +17,8 @@ using Clock = std::chrono::steady_clock;
 constexpr std::uint32_t kMaxFrameLength = 64u << 20;
 constexpr std::size_t kLabelLimit = 48;
 
-std::chrono::milliseconds leftUntil(Clock::time_point deadline) {
+std::chrono::milliseconds leftUntil(Clock::time_point deadline)
+{
     return std::max(std::chrono::ceil<std::chrono::milliseconds>(deadline - Clock::now()),
                     std::chrono::milliseconds(0));
 }
@@ -31,7 +32,8 @@ struct IoOutcome {
 };
 
 // The socket is non-blocking; waits happen here, bounded by the deadline.
-IoOutcome readExact(const Socket& socket, char* out, std::size_t count, Clock::time_point deadline) {
+IoOutcome readExact(const Socket& socket, char* out, std::size_t count, Clock::time_point deadline)
+{
     IoOutcome outcome;
     while (outcome.done < count) {
         const long got = receiveSome(socket, out + outcome.done, count - outcome.done);
@@ -61,7 +63,8 @@ IoOutcome readExact(const Socket& socket, char* out, std::size_t count, Clock::t
     return outcome;
 }
 
-IoOutcome writeAll(const Socket& socket, std::string_view data, Clock::time_point deadline) {
+IoOutcome writeAll(const Socket& socket, std::string_view data, Clock::time_point deadline)
+{
     IoOutcome outcome;
     while (outcome.done < data.size()) {
         const long sent = sendSome(socket, data.data() + outcome.done, data.size() - outcome.done);
@@ -87,25 +90,26 @@ IoOutcome writeAll(const Socket& socket, std::string_view data, Clock::time_poin
     return outcome;
 }
 
-std::string explain(const IoOutcome& outcome, std::size_t wanted, const std::string& what) {
-    const std::string progress =
-        std::to_string(outcome.done) + " of " + std::to_string(wanted) + " bytes of " + what;
+std::string explain(const IoOutcome& outcome, std::size_t wanted, const std::string& what)
+{
+    const std::string progress = std::to_string(outcome.done) + " of " + std::to_string(wanted) + " bytes of " + what;
     switch (outcome.result) {
-        case Io::Ok:
-            return "no error";
-        case Io::Closed:
-            return "the client closed the connection after " + progress;
-        case Io::TimedOut:
-            return "timed out after " + progress;
-        case Io::Failed:
-            return "socket error (" + socketErrorText(outcome.error) + ") after " + progress;
+    case Io::Ok:
+        return "no error";
+    case Io::Closed:
+        return "the client closed the connection after " + progress;
+    case Io::TimedOut:
+        return "timed out after " + progress;
+    case Io::Failed:
+        return "socket error (" + socketErrorText(outcome.error) + ") after " + progress;
     }
     return "unknown outcome";
 }
 
 // Reads whatever is waiting; used to find bytes that no step consumed. Every socket of the run is
 // non-blocking, so this never waits.
-Bytes drainWaiting(const Socket& socket) {
+Bytes drainWaiting(const Socket& socket)
+{
     Bytes waiting;
     char chunk[4096];
     for (;;) {
@@ -121,16 +125,19 @@ Bytes drainWaiting(const Socket& socket) {
     }
 }
 
-bool connectionWaiting(const Socket& listener) {
+bool connectionWaiting(const Socket& listener)
+{
     return listener.valid() && waitReadable(listener, std::chrono::milliseconds(0));
 }
 
-std::uint32_t decodeLength(const unsigned char prefix[4]) {
-    return (std::uint32_t{prefix[0]} << 24) | (std::uint32_t{prefix[1]} << 16) |
-           (std::uint32_t{prefix[2]} << 8) | std::uint32_t{prefix[3]};
+std::uint32_t decodeLength(const unsigned char prefix[4])
+{
+    return (std::uint32_t{prefix[0]} << 24) | (std::uint32_t{prefix[1]} << 16) | (std::uint32_t{prefix[2]} << 8) |
+           std::uint32_t{prefix[3]};
 }
 
-std::optional<std::uint16_t> parsePort(std::string_view text) {
+std::optional<std::uint16_t> parsePort(std::string_view text)
+{
     unsigned value = 0;
     const char* end = text.data() + text.size();
     const auto [stop, error] = std::from_chars(text.data(), end, value);
@@ -144,7 +151,8 @@ std::optional<std::uint16_t> parsePort(std::string_view text) {
 
 // ---- Payload builders -------------------------------------------------------------------------------
 
-Bytes request(std::string_view keyword, const Values& values) {
+Bytes request(std::string_view keyword, const Values& values)
+{
     Bytes payload("APIVERSION=1");
     payload.push_back('\0');
     payload.append(keyword);
@@ -157,25 +165,26 @@ Bytes request(std::string_view keyword, const Values& values) {
     return payload;
 }
 
-Bytes reply(std::string_view status, std::string_view body) {
+Bytes reply(std::string_view status, std::string_view body)
+{
     Bytes payload(status);
     payload.push_back('\0');
     payload.append(body);
     return payload;
 }
 
-Bytes fileHeader(std::uint64_t length, std::uint32_t crc) {
+Bytes fileHeader(std::uint64_t length, std::uint32_t crc)
+{
     Bytes payload = "fileLength=" + std::to_string(length);
     payload.push_back('\0');
     payload.append("fileCRC=" + std::to_string(crc));
     return payload;
 }
 
-Bytes readyAck() {
-    return reply("SUCCESS", "ready_to_transfer");
-}
+Bytes readyAck() { return reply("SUCCESS", "ready_to_transfer"); }
 
-Bytes frame(std::string_view payload) {
+Bytes frame(std::string_view payload)
+{
     const auto length = static_cast<std::uint32_t>(payload.size());
     Bytes wire;
     wire.reserve(4 + payload.size());
@@ -188,7 +197,8 @@ Bytes frame(std::string_view payload) {
 }
 
 // Bit by bit, without a table: an independent check on the library's table-driven checksum.
-std::uint32_t crc32(std::string_view data) {
+std::uint32_t crc32(std::string_view data)
+{
     std::uint32_t crc = 0xFFFFFFFFu;
     for (const char c : data) {
         crc ^= static_cast<unsigned char>(c);
@@ -201,7 +211,8 @@ std::uint32_t crc32(std::string_view data) {
 
 // ---- Payload readers --------------------------------------------------------------------------------
 
-std::vector<Bytes> fields(std::string_view payload) {
+std::vector<Bytes> fields(std::string_view payload)
+{
     std::vector<Bytes> parts;
     std::size_t start = 0;
     for (;;) {
@@ -215,7 +226,8 @@ std::vector<Bytes> fields(std::string_view payload) {
     }
 }
 
-std::optional<ParsedRequest> parseRequest(std::string_view payload) {
+std::optional<ParsedRequest> parseRequest(std::string_view payload)
+{
     static constexpr std::string_view kVersionPrefix = "APIVERSION=";
     const std::vector<Bytes> parts = fields(payload);
     if (parts.size() < 2 || parts[0].rfind(kVersionPrefix, 0) != 0 || parts[1].empty()) {
@@ -234,7 +246,8 @@ std::optional<ParsedRequest> parseRequest(std::string_view payload) {
     return parsed;
 }
 
-std::optional<Bytes> requestValue(std::string_view payload, std::string_view name) {
+std::optional<Bytes> requestValue(std::string_view payload, std::string_view name)
+{
     const std::optional<ParsedRequest> parsed = parseRequest(payload);
     if (!parsed) {
         return std::nullopt;
@@ -247,33 +260,47 @@ std::optional<Bytes> requestValue(std::string_view payload, std::string_view nam
     return std::nullopt;
 }
 
-bool isRequestFor(std::string_view payload, std::string_view keyword) {
+bool isRequestFor(std::string_view payload, std::string_view keyword)
+{
     const std::optional<ParsedRequest> parsed = parseRequest(payload);
     return parsed && parsed->keyword == keyword;
 }
 
 // ---- Diagnostics ------------------------------------------------------------------------------------
 
-std::string printable(std::string_view data, std::size_t limit) {
+std::string printable(std::string_view data, std::size_t limit)
+{
     std::string text;
     const std::size_t shown = std::min(data.size(), limit);
     for (std::size_t i = 0; i < shown; ++i) {
         const auto byte = static_cast<unsigned char>(data[i]);
         switch (byte) {
-            case '\0': text += "\\0"; break;
-            case '\n': text += "\\n"; break;
-            case '\r': text += "\\r"; break;
-            case '\t': text += "\\t"; break;
-            case '\\': text += "\\\\"; break;
-            case '"': text += "\\\""; break;
-            default:
-                if (byte >= 0x20 && byte < 0x7F) {
-                    text.push_back(static_cast<char>(byte));
-                } else {
-                    char escaped[8];
-                    std::snprintf(escaped, sizeof escaped, "\\x%02X", byte);
-                    text += escaped;
-                }
+        case '\0':
+            text += "\\0";
+            break;
+        case '\n':
+            text += "\\n";
+            break;
+        case '\r':
+            text += "\\r";
+            break;
+        case '\t':
+            text += "\\t";
+            break;
+        case '\\':
+            text += "\\\\";
+            break;
+        case '"':
+            text += "\\\"";
+            break;
+        default:
+            if (byte >= 0x20 && byte < 0x7F) {
+                text.push_back(static_cast<char>(byte));
+            } else {
+                char escaped[8];
+                std::snprintf(escaped, sizeof escaped, "\\x%02X", byte);
+                text += escaped;
+            }
         }
     }
     if (shown < data.size()) {
@@ -282,7 +309,8 @@ std::string printable(std::string_view data, std::size_t limit) {
     return text;
 }
 
-std::string hexDump(std::string_view data, std::size_t from, std::size_t to) {
+std::string hexDump(std::string_view data, std::size_t from, std::size_t to)
+{
     to = std::min(to, data.size());
     std::string dump;
     for (std::size_t line = from - from % 16; line < to; line += 16) {
@@ -306,7 +334,8 @@ std::string hexDump(std::string_view data, std::size_t from, std::size_t to) {
     return dump;
 }
 
-std::string describeDifference(std::string_view expected, std::string_view actual) {
+std::string describeDifference(std::string_view expected, std::string_view actual)
+{
     if (expected == actual) {
         return {};
     }
@@ -318,14 +347,12 @@ std::string describeDifference(std::string_view expected, std::string_view actua
     const std::size_t from = first >= 32 ? first - first % 16 - 16 : 0;
     const std::size_t to = from + 64;
     std::string text = "first difference at byte " + std::to_string(first) + " (expected " +
-                       std::to_string(expected.size()) + " bytes, received " +
-                       std::to_string(actual.size()) + ")\n";
+                       std::to_string(expected.size()) + " bytes, received " + std::to_string(actual.size()) + ")\n";
     text += "  expected: \"" + printable(expected) + "\"\n";
     text += "  received: \"" + printable(actual) + "\"\n";
-    text += "  expected bytes " + std::to_string(from) + ".." + std::to_string(to) + ":\n" +
-            hexDump(expected, from, to);
-    text += "  received bytes " + std::to_string(from) + ".." + std::to_string(to) + ":\n" +
-            hexDump(actual, from, to);
+    text +=
+        "  expected bytes " + std::to_string(from) + ".." + std::to_string(to) + ":\n" + hexDump(expected, from, to);
+    text += "  received bytes " + std::to_string(from) + ".." + std::to_string(to) + ":\n" + hexDump(actual, from, to);
     return text;
 }
 
@@ -336,7 +363,8 @@ class FakeServer::Run {
 public:
     explicit Run(FakeServer& server) : server(server) {}
 
-    bool execute() {
+    bool execute()
+    {
         for (index = 0; index < server.steps.size(); ++index) {
             if (!perform(server.steps[index])) {
                 return false;
@@ -347,7 +375,8 @@ public:
     }
 
     // After a clean script: unread bytes on the connection are a failure of the test.
-    void closeAfterScript() {
+    void closeAfterScript()
+    {
         if (connection.valid()) {
             const Bytes unread = drainWaiting(connection);
             connection.reset();
@@ -359,7 +388,8 @@ public:
         callbacks.clear();
     }
 
-    void abandon() {
+    void abandon()
+    {
         connection.reset();
         callbacks.clear();
     }
@@ -367,74 +397,77 @@ public:
 private:
     Clock::time_point deadline() const { return Clock::now() + server.stepTimeout; }
 
-    std::string label(const Step& step) const {
+    std::string label(const Step& step) const
+    {
         switch (step.kind) {
-            case Kind::ExpectFrame:
-                return "expect frame \"" + printable(step.data, kLabelLimit) + "\"";
-            case Kind::ExpectFrameWhere:
-                return "expect frame where " + step.name;
-            case Kind::ExpectRaw:
-                return "expect " + std::to_string(step.count) + " raw bytes";
-            case Kind::ExpectRawBytes:
-                return "expect raw bytes \"" + printable(step.data, kLabelLimit) + "\"";
-            case Kind::ExpectPeerClose:
-                return "expect the client to close";
-            case Kind::SendFrame:
-                return "send frame \"" + printable(step.data, kLabelLimit) + "\"";
-            case Kind::SendRaw:
-                return "send " + std::to_string(step.data.size()) + " raw bytes";
-            case Kind::Close:
-                return "close the connection";
-            case Kind::AcceptNext:
-                return "accept the next connection";
-            case Kind::ConnectBack:
-                return "connect back to the port in \"" + step.name + "\"" +
-                       (step.source.empty() ? std::string() : " from " + step.source) + " and send a frame";
-            case Kind::ConnectToPort:
-                return "connect to port " + std::to_string(step.port) + " and send a frame";
+        case Kind::ExpectFrame:
+            return "expect frame \"" + printable(step.data, kLabelLimit) + "\"";
+        case Kind::ExpectFrameWhere:
+            return "expect frame where " + step.name;
+        case Kind::ExpectRaw:
+            return "expect " + std::to_string(step.count) + " raw bytes";
+        case Kind::ExpectRawBytes:
+            return "expect raw bytes \"" + printable(step.data, kLabelLimit) + "\"";
+        case Kind::ExpectPeerClose:
+            return "expect the client to close";
+        case Kind::SendFrame:
+            return "send frame \"" + printable(step.data, kLabelLimit) + "\"";
+        case Kind::SendRaw:
+            return "send " + std::to_string(step.data.size()) + " raw bytes";
+        case Kind::Close:
+            return "close the connection";
+        case Kind::AcceptNext:
+            return "accept the next connection";
+        case Kind::ConnectBack:
+            return "connect back to the port in \"" + step.name + "\"" +
+                   (step.source.empty() ? std::string() : " from " + step.source) + " and send a frame";
+        case Kind::ConnectToPort:
+            return "connect to port " + std::to_string(step.port) + " and send a frame";
         }
         return "unknown step";
     }
 
-    bool stepFailed(const std::string& detail) {
+    bool stepFailed(const std::string& detail)
+    {
         const Step& step = server.steps[index];
-        server.fail("step " + std::to_string(index + 1) + " of " + std::to_string(server.steps.size()) +
-                    " (" + label(step) + "): " + detail);
+        server.fail("step " + std::to_string(index + 1) + " of " + std::to_string(server.steps.size()) + " (" +
+                    label(step) + "): " + detail);
         return false;
     }
 
-    bool perform(const Step& step) {
+    bool perform(const Step& step)
+    {
         switch (step.kind) {
-            case Kind::ExpectFrame:
-            case Kind::ExpectFrameWhere:
-                return expectFrame(step);
-            case Kind::ExpectRaw:
-            case Kind::ExpectRawBytes:
-                return expectRaw(step);
-            case Kind::ExpectPeerClose:
-                return expectPeerClose();
-            case Kind::SendFrame:
-                return send(frame(step.data), "the frame");
-            case Kind::SendRaw:
-                return send(step.data, "the raw bytes");
-            case Kind::Close:
-                return ensureConnection() && closeChecked();
-            case Kind::AcceptNext:
-                return (!connection.valid() || closeChecked()) && acceptConnection();
-            case Kind::ConnectBack:
-                return connectBack(step);
-            case Kind::ConnectToPort:
-                return connectAndSend(step.port, step.data, step.source);
+        case Kind::ExpectFrame:
+        case Kind::ExpectFrameWhere:
+            return expectFrame(step);
+        case Kind::ExpectRaw:
+        case Kind::ExpectRawBytes:
+            return expectRaw(step);
+        case Kind::ExpectPeerClose:
+            return expectPeerClose();
+        case Kind::SendFrame:
+            return send(frame(step.data), "the frame");
+        case Kind::SendRaw:
+            return send(step.data, "the raw bytes");
+        case Kind::Close:
+            return ensureConnection() && closeChecked();
+        case Kind::AcceptNext:
+            return (!connection.valid() || closeChecked()) && acceptConnection();
+        case Kind::ConnectBack:
+            return connectBack(step);
+        case Kind::ConnectToPort:
+            return connectAndSend(step.port, step.data, step.source);
         }
         return stepFailed("unknown step kind");
     }
 
-    bool acceptConnection() {
+    bool acceptConnection()
+    {
         const Clock::time_point until = deadline();
         for (;;) {
             if (!waitReadable(server.listener, leftUntil(until))) {
-                return stepFailed("no client connected within " +
-                                  std::to_string(server.stepTimeout.count()) + " ms");
+                return stepFailed("no client connected within " + std::to_string(server.stepTimeout.count()) + " ms");
             }
             Socket accepted = acceptFrom(server.listener);
             if (accepted.valid()) {
@@ -455,7 +488,8 @@ private:
         return true;
     }
 
-    bool ensureConnection() {
+    bool ensureConnection()
+    {
         if (connection.valid()) {
             return true;
         }
@@ -465,17 +499,19 @@ private:
         return acceptConnection();
     }
 
-    bool closeChecked() {
+    bool closeChecked()
+    {
         const Bytes unread = drainWaiting(connection);
         connection.reset();
         if (!unread.empty()) {
-            return stepFailed("the client sent " + std::to_string(unread.size()) +
-                              " bytes that no step read: \"" + printable(unread) + "\"");
+            return stepFailed("the client sent " + std::to_string(unread.size()) + " bytes that no step read: \"" +
+                              printable(unread) + "\"");
         }
         return true;
     }
 
-    bool readFrame(Bytes& payload) {
+    bool readFrame(Bytes& payload)
+    {
         const Clock::time_point until = deadline();
         unsigned char prefix[4];
         const IoOutcome head = readExact(connection, reinterpret_cast<char*>(prefix), 4, until);
@@ -493,34 +529,34 @@ private:
         if (body.result != Io::Ok) {
             payload.resize(body.done);
             server.recordFrame(payload);
-            return stepFailed(explain(body, length, "the payload") + "; received so far: \"" +
-                              printable(payload) + "\"");
+            return stepFailed(explain(body, length, "the payload") + "; received so far: \"" + printable(payload) +
+                              "\"");
         }
         server.recordFrame(payload);
         return true;
     }
 
-    bool expectFrame(const Step& step) {
+    bool expectFrame(const Step& step)
+    {
         Bytes payload;
         if (!ensureConnection() || !readFrame(payload)) {
             return false;
         }
         if (step.kind == Kind::ExpectFrame) {
             if (payload != step.data) {
-                return stepFailed("the frame differs from the expected one: " +
-                                  describeDifference(step.data, payload));
+                return stepFailed("the frame differs from the expected one: " + describeDifference(step.data, payload));
             }
             return true;
         }
         if (!step.predicate(payload)) {
-            return stepFailed("the frame does not match; received " + std::to_string(payload.size()) +
-                              " bytes: \"" + printable(payload) + "\"\n" +
-                              hexDump(payload, 0, 64));
+            return stepFailed("the frame does not match; received " + std::to_string(payload.size()) + " bytes: \"" +
+                              printable(payload) + "\"\n" + hexDump(payload, 0, 64));
         }
         return true;
     }
 
-    bool expectRaw(const Step& step) {
+    bool expectRaw(const Step& step)
+    {
         if (!ensureConnection()) {
             return false;
         }
@@ -538,34 +574,36 @@ private:
         return true;
     }
 
-    bool expectPeerClose() {
+    bool expectPeerClose()
+    {
         if (!ensureConnection()) {
             return false;
         }
         char byte = 0;
         const IoOutcome outcome = readExact(connection, &byte, 1, deadline());
         switch (outcome.result) {
-            case Io::Closed:
+        case Io::Closed:
+            connection.reset();
+            return true;
+        case Io::Failed:
+            if (isConnectionReset(outcome.error)) {
                 connection.reset();
                 return true;
-            case Io::Failed:
-                if (isConnectionReset(outcome.error)) {
-                    connection.reset();
-                    return true;
-                }
-                return stepFailed(explain(outcome, 0, "anything"));
-            case Io::TimedOut:
-                return stepFailed("the client did not close the connection within " +
-                                  std::to_string(server.stepTimeout.count()) + " ms");
-            case Io::Ok:
-                break;
+            }
+            return stepFailed(explain(outcome, 0, "anything"));
+        case Io::TimedOut:
+            return stepFailed("the client did not close the connection within " +
+                              std::to_string(server.stepTimeout.count()) + " ms");
+        case Io::Ok:
+            break;
         }
         const Bytes rest = std::string(1, byte) + drainWaiting(connection);
-        return stepFailed("the client sent " + std::to_string(rest.size()) +
-                          " bytes instead of closing: \"" + printable(rest) + "\"");
+        return stepFailed("the client sent " + std::to_string(rest.size()) + " bytes instead of closing: \"" +
+                          printable(rest) + "\"");
     }
 
-    bool send(std::string_view bytes, const std::string& what) {
+    bool send(std::string_view bytes, const std::string& what)
+    {
         if (!ensureConnection()) {
             return false;
         }
@@ -576,12 +614,13 @@ private:
         return true;
     }
 
-    bool connectBack(const Step& step) {
+    bool connectBack(const Step& step)
+    {
         const Bytes last = server.lastFrame();
         const std::optional<Bytes> value = requestValue(last, step.name);
         if (!value) {
-            return stepFailed("the last frame received has no value \"" + step.name + "\": \"" +
-                              printable(last) + "\"");
+            return stepFailed("the last frame received has no value \"" + step.name + "\": \"" + printable(last) +
+                              "\"");
         }
         const std::optional<std::uint16_t> port = parsePort(*value);
         if (!port) {
@@ -590,7 +629,8 @@ private:
         return connectAndSend(*port, step.data, step.source);
     }
 
-    bool connectAndSend(std::uint16_t port, const Bytes& payload, const std::string& source) {
+    bool connectAndSend(std::uint16_t port, const Bytes& payload, const std::string& source)
+    {
         Socket peer = openTcpSocket();
         if (!peer.valid() || !setNonBlocking(peer, true)) {
             return stepFailed("socket failed: " + socketErrorText(lastSocketError()));
@@ -601,8 +641,7 @@ private:
                 return stepFailed("\"" + source + "\" is not a dotted IPv4 address");
             }
             if (!bindTo(peer, *local, 0)) {
-                return stepFailed("cannot leave from " + source + ": " +
-                                  socketErrorText(lastSocketError()));
+                return stepFailed("cannot leave from " + source + ": " + socketErrorText(lastSocketError()));
             }
         }
         const Clock::time_point until = deadline();
@@ -617,14 +656,12 @@ private:
             }
             const std::optional<int> outcome = pendingError(peer);
             if (!outcome || *outcome != 0) {
-                return stepFailed(target + " failed: " +
-                                  socketErrorText(outcome ? *outcome : lastSocketError()));
+                return stepFailed(target + " failed: " + socketErrorText(outcome ? *outcome : lastSocketError()));
             }
         }
         const IoOutcome outcome = writeAll(peer, frame(payload), until);
         if (outcome.result != Io::Ok) {
-            return stepFailed("could not send the frame: " +
-                              explain(outcome, payload.size() + 4, "the frame"));
+            return stepFailed("could not send the frame: " + explain(outcome, payload.size() + 4, "the frame"));
         }
         callbacks.push_back(std::move(peer));
         return true;
@@ -639,7 +676,8 @@ private:
 
 // ---- The server -------------------------------------------------------------------------------------
 
-FakeServer::FakeServer() : listener(listenOnLoopback(16)) {
+FakeServer::FakeServer() : listener(listenOnLoopback(16))
+{
     std::optional<std::uint16_t> port;
     if (listener.valid() && setNonBlocking(listener, true)) {
         port = localPort(listener);
@@ -650,19 +688,14 @@ FakeServer::FakeServer() : listener(listenOnLoopback(16)) {
     listenPort = *port;
 }
 
-FakeServer::~FakeServer() {
-    finish();
-}
+FakeServer::~FakeServer() { finish(); }
 
-void FakeServer::setStepTimeout(Milliseconds timeout) {
-    stepTimeout = timeout;
-}
+void FakeServer::setStepTimeout(Milliseconds timeout) { stepTimeout = timeout; }
 
-void FakeServer::setHoldTimeout(Milliseconds timeout) {
-    holdTimeout = timeout;
-}
+void FakeServer::setHoldTimeout(Milliseconds timeout) { holdTimeout = timeout; }
 
-FakeServer& FakeServer::add(Step step) {
+FakeServer& FakeServer::add(Step step)
+{
     if (started) {
         throw std::logic_error("fake server: steps must be added before start()");
     }
@@ -670,67 +703,57 @@ FakeServer& FakeServer::add(Step step) {
     return *this;
 }
 
-FakeServer& FakeServer::expectFrame(Bytes payload) {
-    return add({Kind::ExpectFrame, std::move(payload), {}, {}});
-}
+FakeServer& FakeServer::expectFrame(Bytes payload) { return add({Kind::ExpectFrame, std::move(payload), {}, {}}); }
 
-FakeServer& FakeServer::expectFrameWhere(std::string what, Predicate predicate) {
+FakeServer& FakeServer::expectFrameWhere(std::string what, Predicate predicate)
+{
     return add({Kind::ExpectFrameWhere, {}, std::move(what), std::move(predicate)});
 }
 
-FakeServer& FakeServer::expectAnyFrame() {
+FakeServer& FakeServer::expectAnyFrame()
+{
     return expectFrameWhere("(any)", [](const Bytes&) { return true; });
 }
 
-FakeServer& FakeServer::expectRaw(std::size_t count) {
-    return add({Kind::ExpectRaw, {}, {}, {}, count});
-}
+FakeServer& FakeServer::expectRaw(std::size_t count) { return add({Kind::ExpectRaw, {}, {}, {}, count}); }
 
-FakeServer& FakeServer::expectRawBytes(Bytes bytes) {
-    return add({Kind::ExpectRawBytes, std::move(bytes), {}, {}});
-}
+FakeServer& FakeServer::expectRawBytes(Bytes bytes) { return add({Kind::ExpectRawBytes, std::move(bytes), {}, {}}); }
 
-FakeServer& FakeServer::expectPeerClose() {
-    return add({Kind::ExpectPeerClose, {}, {}, {}});
-}
+FakeServer& FakeServer::expectPeerClose() { return add({Kind::ExpectPeerClose, {}, {}, {}}); }
 
-FakeServer& FakeServer::sendFrame(Bytes payload) {
-    return add({Kind::SendFrame, std::move(payload), {}, {}});
-}
+FakeServer& FakeServer::sendFrame(Bytes payload) { return add({Kind::SendFrame, std::move(payload), {}, {}}); }
 
-FakeServer& FakeServer::sendRaw(Bytes bytes) {
-    return add({Kind::SendRaw, std::move(bytes), {}, {}});
-}
+FakeServer& FakeServer::sendRaw(Bytes bytes) { return add({Kind::SendRaw, std::move(bytes), {}, {}}); }
 
-FakeServer& FakeServer::closeConnection() {
-    return add({Kind::Close, {}, {}, {}});
-}
+FakeServer& FakeServer::closeConnection() { return add({Kind::Close, {}, {}, {}}); }
 
-FakeServer& FakeServer::acceptNext() {
-    return add({Kind::AcceptNext, {}, {}, {}});
-}
+FakeServer& FakeServer::acceptNext() { return add({Kind::AcceptNext, {}, {}, {}}); }
 
-FakeServer& FakeServer::connectBackAndSend(Bytes payload, std::string portValueName) {
+FakeServer& FakeServer::connectBackAndSend(Bytes payload, std::string portValueName)
+{
     return add({Kind::ConnectBack, std::move(payload), std::move(portValueName), {}});
 }
 
-FakeServer& FakeServer::connectToPortAndSend(std::uint16_t port, Bytes payload) {
+FakeServer& FakeServer::connectToPortAndSend(std::uint16_t port, Bytes payload)
+{
     return add({Kind::ConnectToPort, std::move(payload), {}, {}, 0, port});
 }
 
-FakeServer& FakeServer::connectBackFromAndSend(std::string sourceAddress, Bytes payload,
-                                               std::string portValueName) {
+FakeServer& FakeServer::connectBackFromAndSend(std::string sourceAddress, Bytes payload, std::string portValueName)
+{
     Step step{Kind::ConnectBack, std::move(payload), std::move(portValueName), {}};
     step.source = std::move(sourceAddress);
     return add(std::move(step));
 }
 
-FakeServer& FakeServer::exchange(Bytes expected, Bytes answer) {
+FakeServer& FakeServer::exchange(Bytes expected, Bytes answer)
+{
     expectFrame(std::move(expected));
     return sendFrame(std::move(answer));
 }
 
-void FakeServer::start() {
+void FakeServer::start()
+{
     if (started) {
         throw std::logic_error("fake server: start() called twice");
     }
@@ -738,7 +761,8 @@ void FakeServer::start() {
     worker = std::thread([this] { runScript(); });
 }
 
-void FakeServer::runScript() {
+void FakeServer::runScript()
+{
     Run run(*this);
     const bool completed = run.execute();
     {
@@ -758,7 +782,8 @@ void FakeServer::runScript() {
     run.closeAfterScript();
 }
 
-bool FakeServer::waitForScript() {
+bool FakeServer::waitForScript()
+{
     if (!started) {
         return passed();
     }
@@ -767,7 +792,8 @@ bool FakeServer::waitForScript() {
     return firstFailure.empty();
 }
 
-bool FakeServer::waitForSteps(std::size_t count) {
+bool FakeServer::waitForSteps(std::size_t count)
+{
     if (!started) {
         return count == 0;
     }
@@ -776,7 +802,8 @@ bool FakeServer::waitForSteps(std::size_t count) {
     return stepsDone >= count;
 }
 
-bool FakeServer::finish() {
+bool FakeServer::finish()
+{
     if (finished) {
         return passed();
     }
@@ -800,31 +827,36 @@ bool FakeServer::finish() {
     return passed();
 }
 
-::testing::AssertionResult FakeServer::verify() {
+::testing::AssertionResult FakeServer::verify()
+{
     if (finish()) {
         return ::testing::AssertionSuccess();
     }
     return ::testing::AssertionFailure() << "fake server: " << failure();
 }
 
-void FakeServer::fail(std::string message) {
+void FakeServer::fail(std::string message)
+{
     const std::lock_guard<std::mutex> lock(mutex);
     if (firstFailure.empty()) {
         firstFailure = std::move(message);
     }
 }
 
-void FakeServer::recordFrame(Bytes payload) {
+void FakeServer::recordFrame(Bytes payload)
+{
     const std::lock_guard<std::mutex> lock(mutex);
     receivedFrames.push_back(std::move(payload));
 }
 
-void FakeServer::recordRaw(Bytes bytes) {
+void FakeServer::recordRaw(Bytes bytes)
+{
     const std::lock_guard<std::mutex> lock(mutex);
     receivedRaw.push_back(std::move(bytes));
 }
 
-void FakeServer::stepDone() {
+void FakeServer::stepDone()
+{
     {
         const std::lock_guard<std::mutex> lock(mutex);
         ++stepsDone;
@@ -832,32 +864,38 @@ void FakeServer::stepDone() {
     changed.notify_all();
 }
 
-bool FakeServer::passed() const {
+bool FakeServer::passed() const
+{
     const std::lock_guard<std::mutex> lock(mutex);
     return firstFailure.empty();
 }
 
-std::string FakeServer::failure() const {
+std::string FakeServer::failure() const
+{
     const std::lock_guard<std::mutex> lock(mutex);
     return firstFailure;
 }
 
-std::vector<Bytes> FakeServer::frames() const {
+std::vector<Bytes> FakeServer::frames() const
+{
     const std::lock_guard<std::mutex> lock(mutex);
     return receivedFrames;
 }
 
-Bytes FakeServer::lastFrame() const {
+Bytes FakeServer::lastFrame() const
+{
     const std::lock_guard<std::mutex> lock(mutex);
     return receivedFrames.empty() ? Bytes() : receivedFrames.back();
 }
 
-std::vector<Bytes> FakeServer::rawChunks() const {
+std::vector<Bytes> FakeServer::rawChunks() const
+{
     const std::lock_guard<std::mutex> lock(mutex);
     return receivedRaw;
 }
 
-int FakeServer::connectionsAccepted() const {
+int FakeServer::connectionsAccepted() const
+{
     const std::lock_guard<std::mutex> lock(mutex);
     return accepted;
 }

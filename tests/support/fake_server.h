@@ -69,9 +69,9 @@ std::uint32_t crc32(std::string_view data);
 std::vector<Bytes> fields(std::string_view payload);
 
 struct ParsedRequest {
-    Bytes version;    // the text after "APIVERSION="
+    Bytes version;  // the text after "APIVERSION="
     Bytes keyword;
-    Values values;    // every NUL-separated "name=value" after the keyword, in order
+    Values values;  // every NUL-separated "name=value" after the keyword, in order
 };
 // Reads a command payload; nullopt when it does not start with "APIVERSION=" or has no keyword.
 std::optional<ParsedRequest> parseRequest(std::string_view payload);
@@ -137,8 +137,7 @@ public:
     // Connects to 127.0.0.1 at the port named by the value `portValueName` of the last frame
     // received (a command payload) and sends one frame with `payload` on that new connection, which
     // stays open until the run ends.
-    FakeServer& connectBackAndSend(Bytes payload,
-                                   std::string portValueName = "requesterResultPort");
+    FakeServer& connectBackAndSend(Bytes payload, std::string portValueName = "requesterResultPort");
     // The same with a port given directly.
     FakeServer& connectToPortAndSend(std::uint16_t port, Bytes payload);
     // As connectBackAndSend, but the connection leaves from `sourceAddress` (a dotted IPv4 address

@@ -72,10 +72,10 @@ void LocalServer::start(const std::string& executable)
                                      O_WRONLY | O_CREAT | O_APPEND, 0600);
     const std::string data = directory_ + "/data";
     const std::string config = directory_ + "/zelserverd.conf";
-    const char* argv[] = {executable.c_str(), "--data", data.c_str(), "--listen", "127.0.0.1:0",
-                          "--config", config.c_str(), nullptr};
-    const int spawned = ::posix_spawn(&pid_, executable.c_str(), &actions, nullptr,
-                                      const_cast<char* const*>(argv), environ);
+    const char* argv[] = {executable.c_str(), "--data",   data.c_str(),   "--listen",
+                          "127.0.0.1:0",      "--config", config.c_str(), nullptr};
+    const int spawned =
+        ::posix_spawn(&pid_, executable.c_str(), &actions, nullptr, const_cast<char* const*>(argv), environ);
     posix_spawn_file_actions_destroy(&actions);
     ::close(out[1]);
     if (spawned != 0) {

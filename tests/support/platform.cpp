@@ -6,7 +6,8 @@
 
 namespace zeltest {
 
-std::string programFolder() {
+std::string programFolder()
+{
 #if defined(_WIN32)
     char buffer[MAX_PATH * 4] = {};
     const DWORD length = ::GetModuleFileNameA(nullptr, buffer, sizeof buffer);
@@ -25,6 +26,7 @@ constexpr const char* kTemporaryFolderVariable = "TMPDIR";
 #endif
 
 ScopedTemporaryFolder::ScopedTemporaryFolder(const std::filesystem::path& folder)
-    : variable_(kTemporaryFolderVariable, folder.string()) {}
+    : variable_(kTemporaryFolderVariable, folder.string())
+{}
 
 }  // namespace zeltest

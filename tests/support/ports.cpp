@@ -6,7 +6,8 @@
 namespace zeltest {
 
 // Exclusive, so that on Winsock a later socket asking for address reuse cannot bind over it either.
-ClosedPort::ClosedPort() : socket(openTcpSocket()) {
+ClosedPort::ClosedPort() : socket(openTcpSocket())
+{
     std::optional<std::uint16_t> port;
     if (socket.valid() && setExclusiveAddress(socket) && bindTo(socket, kLoopback, 0)) {
         port = localPort(socket);
@@ -17,7 +18,8 @@ ClosedPort::ClosedPort() : socket(openTcpSocket()) {
     number = *port;
 }
 
-std::uint16_t releasedPort() {
+std::uint16_t releasedPort()
+{
     const Socket socket = openTcpSocket();
     std::optional<std::uint16_t> port;
     if (socket.valid() && bindTo(socket, kLoopback, 0)) {

@@ -52,7 +52,8 @@ protected:
     // client identifier, then the command's own values.
     static Bytes command(const std::string& keyword, const Values& values = {})
     {
-        Values all{{"identityObject", xmlDocument(keyword, R"(<IDENTITY id="ann" is_authenticated="true"><ROLES/></IDENTITY>)")},
+        Values all{{"identityObject",
+                    xmlDocument(keyword, R"(<IDENTITY id="ann" is_authenticated="true"><ROLES/></IDENTITY>)")},
                    {"clientID", ""}};
         all.insert(all.end(), values.begin(), values.end());
         return request(keyword, all);

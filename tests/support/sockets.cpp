@@ -38,11 +38,10 @@ using Native = int;
 using Length = socklen_t;
 #endif
 
-Native native(const Socket& socket) {
-    return static_cast<Native>(socket.get());
-}
+Native native(const Socket& socket) { return static_cast<Native>(socket.get()); }
 
-void closeHandle(SocketHandle handle) {
+void closeHandle(SocketHandle handle)
+{
 #if defined(_WIN32)
     ::closesocket(static_cast<SOCKET>(handle));
 #else
@@ -51,7 +50,8 @@ void closeHandle(SocketHandle handle) {
 }
 
 // Closing a socket may overwrite the error number of the call that made the caller give up.
-void restoreSocketError(int error) {
+void restoreSocketError(int error)
+{
 #if defined(_WIN32)
     ::WSASetLastError(error);
 #else
@@ -59,14 +59,16 @@ void restoreSocketError(int error) {
 #endif
 }
 
-Socket giveUp(Socket& socket) {
+Socket giveUp(Socket& socket)
+{
     const int error = lastSocketError();
     socket.reset();
     restoreSocketError(error);
     return Socket();
 }
 
-sockaddr_in endpoint(std::uint32_t address, std::uint16_t port) {
+sockaddr_in endpoint(std::uint32_t address, std::uint16_t port)
+{
     sockaddr_in result{};
     result.sin_family = AF_INET;
     result.sin_port = htons(port);
@@ -74,7 +76,8 @@ sockaddr_in endpoint(std::uint32_t address, std::uint16_t port) {
     return result;
 }
 
-int leftOf(Clock::time_point deadline) {
+int leftOf(Clock::time_point deadline)
+{
     const auto left = std::chrono::ceil<std::chrono::milliseconds>(deadline - Clock::now()).count();
     return static_cast<int>(std::clamp<long long>(left, 0, INT_MAX));
 }
@@ -82,7 +85,8 @@ int leftOf(Clock::time_point deadline) {
 #if defined(_WIN32)
 // select rather than WSAPoll: some Windows releases never report a refused connect through WSAPoll,
 // while select puts it in the exception set.
-bool waitReady(const Socket& socket, bool forWriting, std::chrono::milliseconds timeout) {
+bool waitReady(const Socket& socket, bool forWriting, std::chrono::milliseconds timeout)
+{
     const Clock::time_point deadline = Clock::now() + timeout;
     for (;;) {
         const int left = leftOf(deadline);
@@ -93,8 +97,7 @@ bool waitReady(const Socket& socket, bool forWriting, std::chrono::milliseconds 
         FD_SET(native(socket), &ready);
         FD_SET(native(socket), &failed);
         timeval limit{left / 1000, (left % 1000) * 1000};
-        const int result = ::select(0, forWriting ? nullptr : &ready, forWriting ? &ready : nullptr,
-                                    &failed, &limit);
+        const int result = ::select(0, forWriting ? nullptr : &ready, forWriting ? &ready : nullptr, &failed, &limit);
         if (result != SOCKET_ERROR) {
             return result > 0;
         }
@@ -104,7 +107,8 @@ bool waitReady(const Socket& socket, bool forWriting, std::chrono::milliseconds 
     }
 }
 #else
-bool waitReady(const Socket& socket, bool forWriting, std::chrono::milliseconds timeout) {
+bool waitReady(const Socket& socket, bool forWriting, std::chrono::milliseconds timeout)
+{
     const Clock::time_point deadline = Clock::now() + timeout;
     for (;;) {
         pollfd entry{native(socket), static_cast<short>(forWriting ? POLLOUT : POLLIN), 0};
@@ -125,18 +129,18 @@ bool waitReady(const Socket& socket, bool forWriting, std::chrono::milliseconds 
 
 Socket::Socket(Socket&& other) noexcept : handle(std::exchange(other.handle, kNoSocket)) {}
 
-Socket& Socket::operator=(Socket&& other) noexcept {
+Socket& Socket::operator=(Socket&& other) noexcept
+{
     if (this != &other) {
         reset(std::exchange(other.handle, kNoSocket));
     }
     return *this;
 }
 
-SocketHandle Socket::release() {
-    return std::exchange(handle, kNoSocket);
-}
+SocketHandle Socket::release() { return std::exchange(handle, kNoSocket); }
 
-void Socket::reset(SocketHandle replacement) {
+void Socket::reset(SocketHandle replacement)
+{
     if (handle != kNoSocket) {
         closeHandle(handle);
     }
@@ -147,15 +151,13 @@ void Socket::reset(SocketHandle replacement) {
 
 #if defined(_WIN32)
 
-int lastSocketError() {
-    return ::WSAGetLastError();
-}
+int lastSocketError() { return ::WSAGetLastError(); }
 
-std::string socketErrorText(int error) {
+std::string socketErrorText(int error)
+{
     char text[512] = {};
-    const DWORD length =
-        ::FormatMessageA(FORMAT_MESSAGE_FROM_SYSTEM | FORMAT_MESSAGE_IGNORE_INSERTS, nullptr,
-                         static_cast<DWORD>(error), 0, text, sizeof text, nullptr);
+    const DWORD length = ::FormatMessageA(FORMAT_MESSAGE_FROM_SYSTEM | FORMAT_MESSAGE_IGNORE_INSERTS, nullptr,
+                                          static_cast<DWORD>(error), 0, text, sizeof text, nullptr);
     std::string message(text, length);
     while (!message.empty() && std::isspace(static_cast<unsigned char>(message.back()))) {
         message.pop_back();
@@ -174,11 +176,10 @@ bool isConnectionAborted(int error) { return error == WSAECONNABORTED; }
 
 #else
 
-int lastSocketError() {
-    return errno;
-}
+int lastSocketError() { return errno; }
 
-std::string socketErrorText(int error) {
+std::string socketErrorText(int error)
+{
     return std::string(std::strerror(error)) + " (" + std::to_string(error) + ")";
 }
 
@@ -201,33 +202,32 @@ std::atomic<bool> started{false};
 
 // Never cleaned up: sockets of the fake servers may still be closing when the process ends, and the
 // library's own start-ups and clean-ups must not be able to take Winsock away from them.
-void startSockets() {
+void startSockets()
+{
     std::call_once(startOnce, [] {
         WSADATA data;
         started = ::WSAStartup(MAKEWORD(2, 2), &data) == 0;
     });
 }
 
-bool socketsStarted() {
-    return started.load();
-}
+bool socketsStarted() { return started.load(); }
 
 #else
 
 void startSockets() {}
 
-bool socketsStarted() {
-    return false;
-}
+bool socketsStarted() { return false; }
 
 #endif
 
-Socket openTcpSocket() {
+Socket openTcpSocket()
+{
     startSockets();
     return Socket(static_cast<SocketHandle>(::socket(AF_INET, SOCK_STREAM, 0)));
 }
 
-bool setNonBlocking(const Socket& socket, bool enabled) {
+bool setNonBlocking(const Socket& socket, bool enabled)
+{
 #if defined(_WIN32)
     u_long mode = enabled ? 1 : 0;
     return ::ioctlsocket(native(socket), FIONBIO, &mode) == 0;
@@ -240,7 +240,8 @@ bool setNonBlocking(const Socket& socket, bool enabled) {
 #endif
 }
 
-bool setReceiveTimeout(const Socket& socket, std::chrono::milliseconds timeout) {
+bool setReceiveTimeout(const Socket& socket, std::chrono::milliseconds timeout)
+{
 #if defined(_WIN32)
     const DWORD limit = static_cast<DWORD>(timeout.count());
 #else
@@ -251,23 +252,25 @@ bool setReceiveTimeout(const Socket& socket, std::chrono::milliseconds timeout) 
                         static_cast<Length>(sizeof limit)) == 0;
 }
 
-bool setExclusiveAddress(const Socket& socket) {
+bool setExclusiveAddress(const Socket& socket)
+{
 #if defined(_WIN32)
     const BOOL enabled = TRUE;
-    return ::setsockopt(native(socket), SOL_SOCKET, SO_EXCLUSIVEADDRUSE,
-                        reinterpret_cast<const char*>(&enabled), sizeof enabled) == 0;
+    return ::setsockopt(native(socket), SOL_SOCKET, SO_EXCLUSIVEADDRUSE, reinterpret_cast<const char*>(&enabled),
+                        sizeof enabled) == 0;
 #else
     return socket.valid();
 #endif
 }
 
-bool bindTo(const Socket& socket, std::uint32_t address, std::uint16_t port) {
+bool bindTo(const Socket& socket, std::uint32_t address, std::uint16_t port)
+{
     const sockaddr_in local = endpoint(address, port);
-    return ::bind(native(socket), reinterpret_cast<const sockaddr*>(&local),
-                  static_cast<Length>(sizeof local)) == 0;
+    return ::bind(native(socket), reinterpret_cast<const sockaddr*>(&local), static_cast<Length>(sizeof local)) == 0;
 }
 
-std::optional<std::uint16_t> localPort(const Socket& socket) {
+std::optional<std::uint16_t> localPort(const Socket& socket)
+{
     sockaddr_in local{};
     Length length = sizeof local;
     if (::getsockname(native(socket), reinterpret_cast<sockaddr*>(&local), &length) != 0) {
@@ -276,31 +279,32 @@ std::optional<std::uint16_t> localPort(const Socket& socket) {
     return ntohs(local.sin_port);
 }
 
-bool listenOn(const Socket& socket, int backlog) {
-    return ::listen(native(socket), backlog) == 0;
-}
+bool listenOn(const Socket& socket, int backlog) { return ::listen(native(socket), backlog) == 0; }
 
-Socket acceptFrom(const Socket& listener) {
+Socket acceptFrom(const Socket& listener)
+{
     return Socket(static_cast<SocketHandle>(::accept(native(listener), nullptr, nullptr)));
 }
 
-bool connectTo(const Socket& socket, std::uint32_t address, std::uint16_t port) {
+bool connectTo(const Socket& socket, std::uint32_t address, std::uint16_t port)
+{
     const sockaddr_in remote = endpoint(address, port);
-    return ::connect(native(socket), reinterpret_cast<const sockaddr*>(&remote),
-                     static_cast<Length>(sizeof remote)) == 0;
+    return ::connect(native(socket), reinterpret_cast<const sockaddr*>(&remote), static_cast<Length>(sizeof remote)) ==
+           0;
 }
 
-std::optional<int> pendingError(const Socket& socket) {
+std::optional<int> pendingError(const Socket& socket)
+{
     int error = 0;
     Length length = sizeof error;
-    if (::getsockopt(native(socket), SOL_SOCKET, SO_ERROR, reinterpret_cast<char*>(&error), &length) !=
-        0) {
+    if (::getsockopt(native(socket), SOL_SOCKET, SO_ERROR, reinterpret_cast<char*>(&error), &length) != 0) {
         return std::nullopt;
     }
     return error;
 }
 
-long sendSome(const Socket& socket, const char* data, std::size_t count) {
+long sendSome(const Socket& socket, const char* data, std::size_t count)
+{
 #if defined(_WIN32)
     return ::send(native(socket), data, static_cast<int>(std::min<std::size_t>(count, INT_MAX)), 0);
 #else
@@ -308,7 +312,8 @@ long sendSome(const Socket& socket, const char* data, std::size_t count) {
 #endif
 }
 
-long receiveSome(const Socket& socket, char* data, std::size_t count) {
+long receiveSome(const Socket& socket, char* data, std::size_t count)
+{
 #if defined(_WIN32)
     return ::recv(native(socket), data, static_cast<int>(std::min<std::size_t>(count, INT_MAX)), 0);
 #else
@@ -316,15 +321,12 @@ long receiveSome(const Socket& socket, char* data, std::size_t count) {
 #endif
 }
 
-bool waitReadable(const Socket& socket, std::chrono::milliseconds timeout) {
-    return waitReady(socket, false, timeout);
-}
+bool waitReadable(const Socket& socket, std::chrono::milliseconds timeout) { return waitReady(socket, false, timeout); }
 
-bool waitWritable(const Socket& socket, std::chrono::milliseconds timeout) {
-    return waitReady(socket, true, timeout);
-}
+bool waitWritable(const Socket& socket, std::chrono::milliseconds timeout) { return waitReady(socket, true, timeout); }
 
-std::optional<std::uint32_t> parseDottedAddress(std::string_view text) {
+std::optional<std::uint32_t> parseDottedAddress(std::string_view text)
+{
     std::uint32_t address = 0;
     std::size_t at = 0;
     for (int part = 0; part < 4; ++part) {
@@ -355,7 +357,8 @@ std::optional<std::uint32_t> parseDottedAddress(std::string_view text) {
 
 // ---- Shorthands -------------------------------------------------------------------------------------
 
-Socket listenOnLoopback(int backlog) {
+Socket listenOnLoopback(int backlog)
+{
     Socket listener = openTcpSocket();
     if (!listener.valid() || !setExclusiveAddress(listener) || !bindTo(listener, kLoopback, 0) ||
         !listenOn(listener, backlog)) {
@@ -364,7 +367,8 @@ Socket listenOnLoopback(int backlog) {
     return listener;
 }
 
-Socket connectToLoopback(std::uint16_t port) {
+Socket connectToLoopback(std::uint16_t port)
+{
     Socket client = openTcpSocket();
     if (!client.valid() || !connectTo(client, kLoopback, port)) {
         return giveUp(client);
@@ -372,7 +376,8 @@ Socket connectToLoopback(std::uint16_t port) {
     return client;
 }
 
-bool sendAll(const Socket& socket, std::string_view bytes) {
+bool sendAll(const Socket& socket, std::string_view bytes)
+{
     std::size_t done = 0;
     while (done < bytes.size()) {
         const long sent = sendSome(socket, bytes.data() + done, bytes.size() - done);

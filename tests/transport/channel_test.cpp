@@ -43,27 +43,27 @@ using RequestPtr = std::unique_ptr<IZELServerRequest>;
 using ResponsePtr = std::unique_ptr<IZELServerResponse>;
 using InfoPtr = std::unique_ptr<IZELServerConnectionInfo>;
 
-const std::string kSessionDocument =
-    R"(<SESSION security_enabled="true"><IDENTITY id="ann" is_authenticated="true">)"
-    R"(<ROLES><ROLE name="admin"/><ROLE name="ops"/></ROLES></IDENTITY></SESSION>)";
+const std::string kSessionDocument = R"(<SESSION security_enabled="true"><IDENTITY id="ann" is_authenticated="true">)"
+                                     R"(<ROLES><ROLE name="admin"/><ROLE name="ops"/></ROLES></IDENTITY></SESSION>)";
 
 // What the channel attaches to every request once the sign-in above went through; the root element
 // is named after the command.
-std::string identityDocument(const std::string& keyword) {
+std::string identityDocument(const std::string& keyword)
+{
     return R"(<?xml version="1.0" encoding="UTF-8" standalone="no" ?><)" + keyword +
            R"(><IDENTITY id="ann" is_authenticated="true"><ROLES><ROLE name="admin"/><ROLE name="ops"/></ROLES></IDENTITY></)" +
            keyword + ">";
 }
 
-Bytes firstHandshake() {
+Bytes firstHandshake()
+{
     return zeltest::request("SERVER_SESSION_INIT", {{"clientID", ""}, {"userID", "ann"}, {"userPassword", "pw1"}});
 }
 
-Bytes signedIn() {
-    return zeltest::reply("SUCCESS", kSessionDocument);
-}
+Bytes signedIn() { return zeltest::reply("SUCCESS", kSessionDocument); }
 
-std::string describe(const IZELServerStatus* status) {
+std::string describe(const IZELServerStatus* status)
+{
     if (status == nullptr) {
         return "(no status)";
     }
@@ -81,7 +81,8 @@ public:
     std::vector<std::string> calls;
 };
 
-std::string pattern(std::size_t size) {
+std::string pattern(std::size_t size)
+{
     std::string data(size, '\0');
     for (std::size_t i = 0; i < size; ++i) {
         data[i] = static_cast<char>((i * 131 + i / 509) & 0xFF);
@@ -93,22 +94,26 @@ class ChannelTest : public ::testing::Test {
 protected:
     void TearDown() override { channel.reset(); }
 
-    InfoPtr passwordInfo(const char* user = "ann", const char* password = "pw1", std::uint16_t port = 0) const {
+    InfoPtr passwordInfo(const char* user = "ann", const char* password = "pw1", std::uint16_t port = 0) const
+    {
         return InfoPtr(new ZELServerConnectionInfo(ZELServerString("127.0.0.1"), port != 0 ? port : server.port(),
                                                    ZELServerString(user), ZELServerString(password)));
     }
-    InfoPtr propertyInfo(std::vector<std::string> properties) const {
+    InfoPtr propertyInfo(std::vector<std::string> properties) const
+    {
         return InfoPtr(new ZELServerConnectionInfo(ZELServerString("127.0.0.1"), server.port(),
                                                    ZELServerStringArray(std::move(properties))));
     }
 
     // Opens with ann / pw1; the script must begin with the first handshake.
-    void open(const IZELServerStringArray* options = nullptr) {
+    void open(const IZELServerStringArray* options = nullptr)
+    {
         const StatusPtr status(channel->open(*passwordInfo(), options));
         ASSERT_EQ(status, nullptr) << describe(status.get());
     }
 
-    StatusPtr plain(const std::string& keyword, const Values& values, std::string* body = nullptr) {
+    StatusPtr plain(const std::string& keyword, const Values& values, std::string* body = nullptr)
+    {
         const RequestPtr request(channel->createRequest(keyword));
         const ResponsePtr response(channel->createResponse());
         for (const auto& [name, value] : values) {
@@ -121,12 +126,14 @@ protected:
         return status;
     }
 
-    std::string file(const std::string& name, const std::string& content) const {
+    std::string file(const std::string& name, const std::string& content) const
+    {
         const fs::path path = dir / name;
         std::ofstream(path, std::ios::binary) << content;
         return path.string();
     }
-    static std::string slurp(const std::string& path) {
+    static std::string slurp(const std::string& path)
+    {
         std::ifstream in(path, std::ios::binary);
         return std::string(std::istreambuf_iterator<char>(in), {});
     }
@@ -139,9 +146,11 @@ protected:
 
 // ---- Sign-in ----------------------------------------------------------------------------------------
 
-TEST_F(ChannelTest, FirstHandshakeIsByteExact) {
-    server.expectRawBytes("\x00\x00\x00\x46"
-                          "APIVERSION=1\0SERVER_SESSION_INIT\0clientID=\0userID=ann\0userPassword=pw1"s)
+TEST_F(ChannelTest, FirstHandshakeIsByteExact)
+{
+    server
+        .expectRawBytes("\x00\x00\x00\x46"
+                        "APIVERSION=1\0SERVER_SESSION_INIT\0clientID=\0userID=ann\0userPassword=pw1"s)
         .sendFrame(signedIn());
     server.start();
     open();
@@ -158,13 +167,16 @@ TEST_F(ChannelTest, FirstHandshakeIsByteExact) {
     EXPECT_EQ(roles.items(), (std::vector<std::string>{"admin", "ops"}));
 }
 
-TEST_F(ChannelTest, LaterRequestCarriesTheIdentityDocumentAndTheClientId) {
-    server.expectFrame(zeltest::request("SERVER_SESSION_INIT",
-                                        {{"clientID", "tool-7"}, {"userID", "ann"}, {"userPassword", "pw1"}}))
+TEST_F(ChannelTest, LaterRequestCarriesTheIdentityDocumentAndTheClientId)
+{
+    server
+        .expectFrame(zeltest::request("SERVER_SESSION_INIT",
+                                      {{"clientID", "tool-7"}, {"userID", "ann"}, {"userPassword", "pw1"}}))
         .sendFrame(signedIn())
-        .expectFrame(zeltest::request("SERVER_SESSION_GET_PROP", {{"identityObject", identityDocument("SERVER_SESSION_GET_PROP")},
-                                                                  {"clientID", "tool-7"},
-                                                                  {"sessionPropName", "version"}}))
+        .expectFrame(zeltest::request("SERVER_SESSION_GET_PROP",
+                                      {{"identityObject", identityDocument("SERVER_SESSION_GET_PROP")},
+                                       {"clientID", "tool-7"},
+                                       {"sessionPropName", "version"}}))
         .sendFrame(zeltest::reply("SUCCESS", "2.1"));
     server.start();
     const ZELServerStringArray options({"IGNORED", "x", "CLIENT_ID", "tool-7"});
@@ -176,8 +188,8 @@ TEST_F(ChannelTest, LaterRequestCarriesTheIdentityDocumentAndTheClientId) {
     EXPECT_TRUE(server.verify());
 }
 
-
-TEST_F(ChannelTest, SignInValuesFollowTheAuthenticationKind) {
+TEST_F(ChannelTest, SignInValuesFollowTheAuthenticationKind)
+{
     struct Case {
         const char* name;
         std::vector<std::string> properties;
@@ -185,7 +197,9 @@ TEST_F(ChannelTest, SignInValuesFollowTheAuthenticationKind) {
     };
     const Case cases[] = {
         {"token", {"USER_TOKEN", "tok-1"}, {{"clientID", ""}, {"userToken", "tok-1"}}},
-        {"single sign-on", {"SSO_AUTH_DATA", "sso=1", "USER_TOKEN", "ignored"}, {{"clientID", ""}, {"ssoAuthData", "sso=1"}}},
+        {"single sign-on",
+         {"SSO_AUTH_DATA", "sso=1", "USER_TOKEN", "ignored"},
+         {{"clientID", ""}, {"ssoAuthData", "sso=1"}}},
         {"single sign-on with empty data", {"SSO_AUTH_DATA", ""}, {{"clientID", ""}, {"ssoAuthData", ""}}},
         {"other properties", {"SOMETHING", "x"}, {{"clientID", ""}, {"userID", ""}, {"userPassword", ""}}},
     };
@@ -203,9 +217,11 @@ TEST_F(ChannelTest, SignInValuesFollowTheAuthenticationKind) {
     }
 }
 
-TEST_F(ChannelTest, SingleSignOnReplyReplacesTheIdentity) {
+TEST_F(ChannelTest, SingleSignOnReplyReplacesTheIdentity)
+{
     server.expectAnyFrame().sendFrame(zeltest::reply(
-        "SUCCESS", R"(<SESSION><SSO_IDENTITY id="sam" is_authenticated="yes" state="IN_PROGRESS" auth_data="next"/></SESSION>)"));
+        "SUCCESS",
+        R"(<SESSION><SSO_IDENTITY id="sam" is_authenticated="yes" state="IN_PROGRESS" auth_data="next"/></SESSION>)"));
     server.start();
     const StatusPtr status(channel->open(*propertyInfo({"SSO_AUTH_DATA", "first"}), nullptr));
     EXPECT_EQ(status, nullptr) << describe(status.get());
@@ -218,7 +234,8 @@ TEST_F(ChannelTest, SingleSignOnReplyReplacesTheIdentity) {
     EXPECT_TRUE(server.verify());
 }
 
-TEST_F(ChannelTest, RefusedOrUnreadableSignIn) {
+TEST_F(ChannelTest, RefusedOrUnreadableSignIn)
+{
     struct Case {
         const char* name;
         Bytes reply;
@@ -251,7 +268,8 @@ TEST_F(ChannelTest, RefusedOrUnreadableSignIn) {
 
 // ---- Connection -------------------------------------------------------------------------------------
 
-TEST_F(ChannelTest, ConnectFailureKeepsTheFailedSocketUntilTheNextOpen) {
+TEST_F(ChannelTest, ConnectFailureKeepsTheFailedSocketUntilTheNextOpen)
+{
     const zeltest::ClosedPort closed;
     const StatusPtr failed(channel->open(*passwordInfo("ann", "pw1", closed.port()), nullptr));
     ASSERT_NE(failed, nullptr);
@@ -273,10 +291,13 @@ TEST_F(ChannelTest, ConnectFailureKeepsTheFailedSocketUntilTheNextOpen) {
     EXPECT_EQ(second->getMessageNumber(), msg::kNotConnected);
 }
 
-TEST_F(ChannelTest, ReconnectsWhenTheServerDroppedTheConnection) {
-    const Bytes secondHandshake = zeltest::request(
-        "SERVER_SESSION_INIT", {{"identityObject", identityDocument("SERVER_SESSION_INIT")}, {"clientID", ""},
-                                {"userID", "ann"}, {"userPassword", "pw1"}});
+TEST_F(ChannelTest, ReconnectsWhenTheServerDroppedTheConnection)
+{
+    const Bytes secondHandshake =
+        zeltest::request("SERVER_SESSION_INIT", {{"identityObject", identityDocument("SERVER_SESSION_INIT")},
+                                                 {"clientID", ""},
+                                                 {"userID", "ann"},
+                                                 {"userPassword", "pw1"}});
     server.expectFrame(firstHandshake())
         .sendFrame(signedIn())
         .closeConnection()
@@ -293,7 +314,8 @@ TEST_F(ChannelTest, ReconnectsWhenTheServerDroppedTheConnection) {
     EXPECT_EQ(server.connectionsAccepted(), 2);
 }
 
-TEST_F(ChannelTest, OpenOnALiveConnectionRepeatsOnlyTheHandshake) {
+TEST_F(ChannelTest, OpenOnALiveConnectionRepeatsOnlyTheHandshake)
+{
     server.expectFrame(firstHandshake())
         .sendFrame(signedIn())
         .expectFrameWhere("a second handshake with the identity",
@@ -310,7 +332,8 @@ TEST_F(ChannelTest, OpenOnALiveConnectionRepeatsOnlyTheHandshake) {
     EXPECT_EQ(server.connectionsAccepted(), 1);
 }
 
-TEST_F(ChannelTest, CloseDropsTheConnection) {
+TEST_F(ChannelTest, CloseDropsTheConnection)
+{
     server.expectFrame(firstHandshake()).sendFrame(signedIn()).expectPeerClose();
     server.start();
     open();
@@ -323,7 +346,8 @@ TEST_F(ChannelTest, CloseDropsTheConnection) {
     EXPECT_NE(channel->getIdentity(), nullptr);
 }
 
-TEST_F(ChannelTest, DestroyingTheChannelDropsTheConnection) {
+TEST_F(ChannelTest, DestroyingTheChannelDropsTheConnection)
+{
     server.expectFrame(firstHandshake()).sendFrame(signedIn()).expectPeerClose();
     server.start();
     open();
@@ -331,7 +355,8 @@ TEST_F(ChannelTest, DestroyingTheChannelDropsTheConnection) {
     EXPECT_TRUE(server.verify());
 }
 
-TEST_F(ChannelTest, SendAndReceiveFailuresCarryTheSocketCode) {
+TEST_F(ChannelTest, SendAndReceiveFailuresCarryTheSocketCode)
+{
     server.expectFrame(firstHandshake()).sendFrame(signedIn()).expectAnyFrame().closeConnection();
     server.start();
     open();
@@ -350,7 +375,8 @@ TEST_F(ChannelTest, SendAndReceiveFailuresCarryTheSocketCode) {
 
 // ---- Plain commands and replies ---------------------------------------------------------------------
 
-TEST_F(ChannelTest, RepliesAreClassifiedByTheirStatusWord) {
+TEST_F(ChannelTest, RepliesAreClassifiedByTheirStatusWord)
+{
     struct Case {
         const char* name;
         Bytes reply;
@@ -379,7 +405,9 @@ TEST_F(ChannelTest, RepliesAreClassifiedByTheirStatusWord) {
     };
     server.expectFrame(firstHandshake()).sendFrame(signedIn());
     for (const Case& c : cases) {
-        server.expectFrame(zeltest::request("CMD", {{"identityObject", identityDocument("CMD")}, {"clientID", ""}, {"case", c.name}}))
+        server
+            .expectFrame(zeltest::request(
+                "CMD", {{"identityObject", identityDocument("CMD")}, {"clientID", ""}, {"case", c.name}}))
             .sendFrame(c.reply);
     }
     server.start();
@@ -406,12 +434,15 @@ TEST_F(ChannelTest, RepliesAreClassifiedByTheirStatusWord) {
     EXPECT_TRUE(server.verify());
 }
 
-TEST_F(ChannelTest, RequestTextThatIsNotUtf8IsSentAsUtf8FromLatin1) {
+TEST_F(ChannelTest, RequestTextThatIsNotUtf8IsSentAsUtf8FromLatin1)
+{
     server.expectFrame(firstHandshake())
         .sendFrame(signedIn())
-        .expectFrame(zeltest::request("CMD", {{"identityObject", identityDocument("CMD")}, {"clientID", ""}, {"name", "caf\xC3\xA9"}}))
+        .expectFrame(zeltest::request(
+            "CMD", {{"identityObject", identityDocument("CMD")}, {"clientID", ""}, {"name", "caf\xC3\xA9"}}))
         .sendFrame(zeltest::reply("SUCCESS", "1"))
-        .expectFrame(zeltest::request("CMD", {{"identityObject", identityDocument("CMD")}, {"clientID", ""}, {"name", "caf\xC3\xA9"}}))
+        .expectFrame(zeltest::request(
+            "CMD", {{"identityObject", identityDocument("CMD")}, {"clientID", ""}, {"name", "caf\xC3\xA9"}}))
         .sendFrame(zeltest::reply("SUCCESS", "2"));
     server.start();
     open();
@@ -420,7 +451,8 @@ TEST_F(ChannelTest, RequestTextThatIsNotUtf8IsSentAsUtf8FromLatin1) {
     EXPECT_TRUE(server.verify());
 }
 
-TEST_F(ChannelTest, RefusedArgumentsSendNothing) {
+TEST_F(ChannelTest, RefusedArgumentsSendNothing)
+{
     server.expectFrame(firstHandshake()).sendFrame(signedIn());
     server.start();
     open();
@@ -450,7 +482,8 @@ TEST_F(ChannelTest, RefusedArgumentsSendNothing) {
     EXPECT_EQ(server.frames().size(), 1u);
 }
 
-TEST_F(ChannelTest, RequestsCarryTheListsGivenAtCreation) {
+TEST_F(ChannelTest, RequestsCarryTheListsGivenAtCreation)
+{
     const ZELServerStringArray directives({"a", "1", "b", "2"});
     const ZELServerStringArray notifications({"n", "v"});
     const RequestPtr request(channel->createRequest("CMD", directives, notifications));
@@ -468,12 +501,14 @@ TEST_F(ChannelTest, RequestsCarryTheListsGivenAtCreation) {
 
 // ---- Uploads ----------------------------------------------------------------------------------------
 
-TEST_F(ChannelTest, UploadSendsHeaderAndContentBetweenTwoAcknowledgements) {
+TEST_F(ChannelTest, UploadSendsHeaderAndContentBetweenTwoAcknowledgements)
+{
     const std::string content = "hello, world\n";
     const std::string path = file("up.txt", content);
     server.expectFrame(firstHandshake())
         .sendFrame(signedIn())
-        .expectFrame(zeltest::request("SR_UPLOAD", {{"identityObject", identityDocument("SR_UPLOAD")}, {"clientID", ""}, {"srPath", "/a"}}))
+        .expectFrame(zeltest::request(
+            "SR_UPLOAD", {{"identityObject", identityDocument("SR_UPLOAD")}, {"clientID", ""}, {"srPath", "/a"}}))
         .sendFrame(zeltest::readyAck())
         .expectFrame("fileLength=13\0fileCRC="s + std::to_string(zeltest::crc32(content)))
         .sendFrame(zeltest::readyAck())
@@ -494,7 +529,8 @@ TEST_F(ChannelTest, UploadSendsHeaderAndContentBetweenTwoAcknowledgements) {
     EXPECT_TRUE(server.verify());
 }
 
-TEST_F(ChannelTest, UploadOfSeveralChunksReportsEachPosition) {
+TEST_F(ChannelTest, UploadOfSeveralChunksReportsEachPosition)
+{
     const std::string content = pattern(300000);
     const std::string path = file("big", content);
     server.expectFrame(firstHandshake())
@@ -517,7 +553,8 @@ TEST_F(ChannelTest, UploadOfSeveralChunksReportsEachPosition) {
     EXPECT_TRUE(server.verify());
 }
 
-TEST_F(ChannelTest, UploadOfAnEmptyFileSendsNoContent) {
+TEST_F(ChannelTest, UploadOfAnEmptyFileSendsNoContent)
+{
     const std::string path = file("empty", "");
     server.expectFrame(firstHandshake())
         .sendFrame(signedIn())
@@ -537,7 +574,8 @@ TEST_F(ChannelTest, UploadOfAnEmptyFileSendsNoContent) {
     EXPECT_TRUE(server.verify());
 }
 
-TEST_F(ChannelTest, UploadStopsAtARefusedAcknowledgement) {
+TEST_F(ChannelTest, UploadStopsAtARefusedAcknowledgement)
+{
     struct Case {
         const char* name;
         bool atSecond;
@@ -573,7 +611,8 @@ TEST_F(ChannelTest, UploadStopsAtARefusedAcknowledgement) {
     }
 }
 
-TEST_F(ChannelTest, UploadThatCannotBeReadSendsNothing) {
+TEST_F(ChannelTest, UploadThatCannotBeReadSendsNothing)
+{
     server.expectFrame(firstHandshake()).sendFrame(signedIn());
     server.start();
     open();
@@ -594,7 +633,8 @@ TEST_F(ChannelTest, UploadThatCannotBeReadSendsNothing) {
     EXPECT_EQ(server.frames().size(), 1u);
 }
 
-TEST_F(ChannelTest, UploadOfFourGibibytesIsRefusedBeforeAnythingIsSent) {
+TEST_F(ChannelTest, UploadOfFourGibibytesIsRefusedBeforeAnythingIsSent)
+{
     const std::string path = file("huge", "");
     std::error_code error;
     fs::resize_file(path, std::uint64_t{1} << 32, error);
@@ -618,12 +658,14 @@ TEST_F(ChannelTest, UploadOfFourGibibytesIsRefusedBeforeAnythingIsSent) {
 
 // ---- Downloads --------------------------------------------------------------------------------------
 
-TEST_F(ChannelTest, DownloadReceivesTheFileBetweenTwoAcknowledgements) {
+TEST_F(ChannelTest, DownloadReceivesTheFileBetweenTwoAcknowledgements)
+{
     const std::string content = pattern(300000);
     const std::string path = (dir / "down").string();
     server.expectFrame(firstHandshake())
         .sendFrame(signedIn())
-        .expectFrame(zeltest::request("LOG_GET_FILE", {{"identityObject", identityDocument("LOG_GET_FILE")}, {"clientID", ""}}))
+        .expectFrame(
+            zeltest::request("LOG_GET_FILE", {{"identityObject", identityDocument("LOG_GET_FILE")}, {"clientID", ""}}))
         .sendFrame(zeltest::fileHeader(content.size(), zeltest::crc32(content)))
         .expectFrame(zeltest::readyAck())
         .sendRaw(content)
@@ -645,7 +687,8 @@ TEST_F(ChannelTest, DownloadReceivesTheFileBetweenTwoAcknowledgements) {
     EXPECT_TRUE(server.verify());
 }
 
-TEST_F(ChannelTest, DownloadDoesNotCheckTheAnnouncedChecksum) {
+TEST_F(ChannelTest, DownloadDoesNotCheckTheAnnouncedChecksum)
+{
     const std::string path = (dir / "down").string();
     server.expectFrame(firstHandshake())
         .sendFrame(signedIn())
@@ -665,7 +708,8 @@ TEST_F(ChannelTest, DownloadDoesNotCheckTheAnnouncedChecksum) {
     EXPECT_TRUE(server.verify());
 }
 
-TEST_F(ChannelTest, DownloadWithoutAFileGivesFalseAndReadsNothingMore) {
+TEST_F(ChannelTest, DownloadWithoutAFileGivesFalseAndReadsNothingMore)
+{
     const std::string path = (dir / "down").string();
     server.expectFrame(firstHandshake())
         .sendFrame(signedIn())
@@ -691,7 +735,8 @@ TEST_F(ChannelTest, DownloadWithoutAFileGivesFalseAndReadsNothingMore) {
     EXPECT_TRUE(server.verify());
 }
 
-TEST_F(ChannelTest, DownloadHeaderWithoutTwoPartsIsAnUnusableReply) {
+TEST_F(ChannelTest, DownloadHeaderWithoutTwoPartsIsAnUnusableReply)
+{
     server.expectFrame(firstHandshake()).sendFrame(signedIn()).expectAnyFrame().sendFrame("fileLength=3"s);
     server.start();
     open();
@@ -703,7 +748,8 @@ TEST_F(ChannelTest, DownloadHeaderWithoutTwoPartsIsAnUnusableReply) {
     EXPECT_TRUE(server.verify());
 }
 
-TEST_F(ChannelTest, DownloadOfAnEmptyFile) {
+TEST_F(ChannelTest, DownloadOfAnEmptyFile)
+{
     const std::string path = file("down", "old content");
     server.expectFrame(firstHandshake())
         .sendFrame(signedIn())
@@ -725,7 +771,8 @@ TEST_F(ChannelTest, DownloadOfAnEmptyFile) {
     EXPECT_TRUE(server.verify());
 }
 
-TEST_F(ChannelTest, DownloadToAPathThatCannotBeWrittenSendsNothing) {
+TEST_F(ChannelTest, DownloadToAPathThatCannotBeWrittenSendsNothing)
+{
     server.expectFrame(firstHandshake()).sendFrame(signedIn());
     server.start();
     open();
@@ -740,7 +787,8 @@ TEST_F(ChannelTest, DownloadToAPathThatCannotBeWrittenSendsNothing) {
     EXPECT_EQ(server.frames().size(), 1u);
 }
 
-TEST_F(ChannelTest, DownloadThatFailsToWriteStillReadsEverythingThenReports) {
+TEST_F(ChannelTest, DownloadThatFailsToWriteStillReadsEverythingThenReports)
+{
     // Only POSIX systems have a device that takes the open but refuses every write; Windows has no
     // file that fails mid-stream on demand.
     if (!fs::exists("/dev/full")) {
@@ -772,7 +820,8 @@ TEST_F(ChannelTest, DownloadThatFailsToWriteStillReadsEverythingThenReports) {
 
 // ---- Result port ------------------------------------------------------------------------------------
 
-std::string localAddress() {
+std::string localAddress()
+{
     TcpSocket probe("127.0.0.1", 9);  // only for its localHostAddress; the connect may fail
     char text[50] = {};
     probe.localHostAddress(text, sizeof text);
@@ -781,7 +830,8 @@ std::string localAddress() {
 
 // The values of a result-port request after the identity: the client id, the bound port, this
 // machine's address, then `rest`. The bound port is returned through `port`.
-FakeServer::Predicate resultPortRequest(Values rest, std::string* port = nullptr) {
+FakeServer::Predicate resultPortRequest(Values rest, std::string* port = nullptr)
+{
     return [rest, port](const Bytes& payload) {
         const auto parsed = zeltest::parseRequest(payload);
         if (!parsed || parsed->keyword != "JOB" || parsed->values.size() != 4 + rest.size()) {
@@ -800,7 +850,8 @@ FakeServer::Predicate resultPortRequest(Values rest, std::string* port = nullptr
     };
 }
 
-TEST_F(ChannelTest, ResultPortExchangeTakesTheResultFromTheServersCall) {
+TEST_F(ChannelTest, ResultPortExchangeTakesTheResultFromTheServersCall)
+{
     const Bytes result = "<RESULT id=\"7\"/>\0tail"s;
     server.expectFrame(firstHandshake())
         .sendFrame(signedIn())
@@ -823,7 +874,8 @@ TEST_F(ChannelTest, ResultPortExchangeTakesTheResultFromTheServersCall) {
     EXPECT_TRUE(server.verify());
 }
 
-TEST_F(ChannelTest, ResultPortDirectiveIsSentTwice) {
+TEST_F(ChannelTest, ResultPortDirectiveIsSentTwice)
+{
     std::string bound;
     server.expectFrame(firstHandshake())
         .sendFrame(signedIn())
@@ -833,8 +885,8 @@ TEST_F(ChannelTest, ResultPortDirectiveIsSentTwice) {
         .connectBackAndSend("R");
     server.start();
     open();
-    const RequestPtr request(channel->createRequest("JOB", ZELServerStringArray({"requesterResultPort", "0", "tag", "y"}),
-                                                    ZELServerStringArray()));
+    const RequestPtr request(channel->createRequest(
+        "JOB", ZELServerStringArray({"requesterResultPort", "0", "tag", "y"}), ZELServerStringArray()));
     const ResponsePtr response(channel->createResponse());
     const StatusPtr status(channel->sendRequest(*request, *response, kResultPortRequest));
     EXPECT_EQ(status, nullptr) << describe(status.get());
@@ -842,7 +894,8 @@ TEST_F(ChannelTest, ResultPortDirectiveIsSentTwice) {
     EXPECT_NE(bound, "0");
 }
 
-TEST_F(ChannelTest, ResultPortListensOnTheRequestedPort) {
+TEST_F(ChannelTest, ResultPortListensOnTheRequestedPort)
+{
     const std::string wanted = std::to_string(zeltest::releasedPort());
     server.expectFrame(firstHandshake())
         .sendFrame(signedIn())
@@ -852,8 +905,8 @@ TEST_F(ChannelTest, ResultPortListensOnTheRequestedPort) {
         .connectBackAndSend("R");
     server.start();
     open();
-    const RequestPtr request(channel->createRequest("JOB", ZELServerStringArray({"requesterResultPort", wanted}),
-                                                    ZELServerStringArray()));
+    const RequestPtr request(
+        channel->createRequest("JOB", ZELServerStringArray({"requesterResultPort", wanted}), ZELServerStringArray()));
     const ResponsePtr response(channel->createResponse());
     const StatusPtr status(channel->sendRequest(*request, *response, kResultPortRequest));
     EXPECT_EQ(status, nullptr) << describe(status.get());
@@ -861,7 +914,8 @@ TEST_F(ChannelTest, ResultPortListensOnTheRequestedPort) {
     EXPECT_EQ(zeltest::requestValue(server.frames().at(1), "requesterResultPort"), wanted);
 }
 
-TEST_F(ChannelTest, ResultPortCallerNotInTheTrustedListIsSkipped) {
+TEST_F(ChannelTest, ResultPortCallerNotInTheTrustedListIsSkipped)
+{
     server.expectFrame(firstHandshake())
         .sendFrame(signedIn())
         .expectAnyFrame()
@@ -881,10 +935,11 @@ TEST_F(ChannelTest, ResultPortCallerNotInTheTrustedListIsSkipped) {
     EXPECT_TRUE(server.verify());
 }
 
-TEST_F(ChannelTest, ResultPortTrustsLocalhostAsThisMachinesName) {
+TEST_F(ChannelTest, ResultPortTrustsLocalhostAsThisMachinesName)
+{
     const std::string name = platform::localHostName(296);
-    const std::vector<platform::Ipv4Address> addresses = name.empty() ? std::vector<platform::Ipv4Address>{}
-                                                                       : platform::resolveIPv4(name.c_str());
+    const std::vector<platform::Ipv4Address> addresses =
+        name.empty() ? std::vector<platform::Ipv4Address>{} : platform::resolveIPv4(name.c_str());
     if (addresses.empty() || platform::dottedAddress(addresses.front()) == "127.0.0.2") {
         GTEST_SKIP() << "this machine's name does not resolve to a usable address";
     }
@@ -907,7 +962,8 @@ TEST_F(ChannelTest, ResultPortTrustsLocalhostAsThisMachinesName) {
     EXPECT_TRUE(server.verify());
 }
 
-TEST_F(ChannelTest, ResultPortServerErrorEndsTheExchangeBeforeAnyCall) {
+TEST_F(ChannelTest, ResultPortServerErrorEndsTheExchangeBeforeAnyCall)
+{
     server.expectFrame(firstHandshake())
         .sendFrame(signedIn())
         .expectAnyFrame()
@@ -924,7 +980,8 @@ TEST_F(ChannelTest, ResultPortServerErrorEndsTheExchangeBeforeAnyCall) {
     EXPECT_TRUE(server.verify());
 }
 
-TEST_F(ChannelTest, ResultPortThatCannotBeOpenedSendsNothing) {
+TEST_F(ChannelTest, ResultPortThatCannotBeOpenedSendsNothing)
+{
     // A port another socket listens on cannot be bound again.
     std::uint16_t busyPort = 0;
     TcpSocket busy(busyPort);

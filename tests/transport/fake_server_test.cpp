@@ -20,7 +20,8 @@ namespace {
 // Blocking client with a receive time-out, so that a broken server fails the test instead of hanging.
 class Client {
 public:
-    explicit Client(std::uint16_t port) : socket(connectToLoopback(port)) {
+    explicit Client(std::uint16_t port) : socket(connectToLoopback(port))
+    {
         connected = socket.valid() && setReceiveTimeout(socket, std::chrono::seconds(5));
     }
 
@@ -29,7 +30,8 @@ public:
     void send(std::string_view bytes) { ASSERT_TRUE(sendAll(socket, bytes)) << "send failed"; }
 
     // Up to `count` bytes; fewer when the server closed or went quiet.
-    Bytes read(std::size_t count) {
+    Bytes read(std::size_t count)
+    {
         Bytes bytes(count, '\0');
         std::size_t done = 0;
         while (done < count) {
@@ -43,7 +45,8 @@ public:
         return bytes;
     }
 
-    std::optional<Bytes> readFrame() {
+    std::optional<Bytes> readFrame()
+    {
         const Bytes prefix = read(4);
         if (prefix.size() != 4) {
             return std::nullopt;
@@ -60,7 +63,8 @@ public:
     }
 
     // True when the server closed the connection (end of stream or reset), not merely went quiet.
-    bool seesClose() {
+    bool seesClose()
+    {
         char byte;
         const long got = receiveSome(socket, &byte, 1);
         return got == 0 || (got < 0 && isConnectionReset(lastSocketError()));
@@ -78,7 +82,8 @@ public:
     Listener() : socket(listenOnLoopback(4)) { port = localPort(socket).value_or(0); }
 
     // The accepted socket; invalid when nobody connected within a few seconds.
-    Socket accept() {
+    Socket accept()
+    {
         if (!waitReadable(socket, std::chrono::seconds(5))) {
             return Socket();
         }
@@ -95,16 +100,18 @@ private:
 
 // ---- Builders and readers ---------------------------------------------------------------------------
 
-TEST(FakeServerPayloads, RequestIsVersionHeaderKeywordAndNamedValues) {
-    const Bytes payload = request("SERVER_SESSION_INIT",
-                                  {{"clientID", ""}, {"userID", "ann"}, {"userPassword", "pw1"}});
+TEST(FakeServerPayloads, RequestIsVersionHeaderKeywordAndNamedValues)
+{
+    const Bytes payload =
+        request("SERVER_SESSION_INIT", {{"clientID", ""}, {"userID", "ann"}, {"userPassword", "pw1"}});
     EXPECT_EQ(payload, "APIVERSION=1\0SERVER_SESSION_INIT\0clientID=\0userID=ann\0userPassword=pw1"s);
     EXPECT_EQ(payload.size(), 70u);
     EXPECT_EQ(frame(payload).substr(0, 4), "\x00\x00\x00\x46"s);
     EXPECT_EQ(request("REP_GET_REPOSITORIES"), "APIVERSION=1\0REP_GET_REPOSITORIES"s);
 }
 
-TEST(FakeServerPayloads, RepliesHeadersAndAcknowledgement) {
+TEST(FakeServerPayloads, RepliesHeadersAndAcknowledgement)
+{
     EXPECT_EQ(reply("SUCCESS", "true"), "SUCCESS\0true"s);
     EXPECT_EQ(reply("ERROR", ""), "ERROR\0"s);
     EXPECT_EQ(fileHeader(0, 0), "fileLength=0\0fileCRC=0"s);
@@ -114,14 +121,16 @@ TEST(FakeServerPayloads, RepliesHeadersAndAcknowledgement) {
     EXPECT_EQ(crc32(""), 0u);
 }
 
-TEST(FakeServerPayloads, FrameLengthIsBigEndian) {
+TEST(FakeServerPayloads, FrameLengthIsBigEndian)
+{
     EXPECT_EQ(frame(""), "\0\0\0\0"s);
     const Bytes wire = frame(Bytes(0x01022C, 'p'));
     EXPECT_EQ(wire.substr(0, 4), "\x00\x01\x02\x2C"s);
     EXPECT_EQ(wire.size(), 4u + 0x01022C);
 }
 
-TEST(FakeServerPayloads, ParsesRequests) {
+TEST(FakeServerPayloads, ParsesRequests)
+{
     const auto parsed = parseRequest("APIVERSION=1\0JOB_REQUEST\0a=1\0b=x=y\0a=2"s);
     ASSERT_TRUE(parsed);
     EXPECT_EQ(parsed->version, "1");
@@ -133,13 +142,14 @@ TEST(FakeServerPayloads, ParsesRequests) {
     EXPECT_TRUE(isRequestFor("APIVERSION=1\0JOB_REQUEST\0a=1"s, "JOB_REQUEST"));
     EXPECT_FALSE(isRequestFor("APIVERSION=1\0JOB_REQUEST_X"s, "JOB_REQUEST"));
 
-    for (const Bytes& malformed : {"JOB_REQUEST\0a=1"s, "APIVERSION=1"s, "APIVERSION=1\0\0a=1"s,
-                                   "APIVERSION=1\0JOB_REQUEST\0novalue"s}) {
+    for (const Bytes& malformed :
+         {"JOB_REQUEST\0a=1"s, "APIVERSION=1"s, "APIVERSION=1\0\0a=1"s, "APIVERSION=1\0JOB_REQUEST\0novalue"s}) {
         EXPECT_FALSE(parseRequest(malformed)) << printable(malformed);
     }
 }
 
-TEST(FakeServerPayloads, DescribesTheFirstDifference) {
+TEST(FakeServerPayloads, DescribesTheFirstDifference)
+{
     EXPECT_EQ(describeDifference("same", "same"), "");
     const Bytes expected = Bytes(40, 'a') + "X\0tail"s;
     const Bytes actual = Bytes(40, 'a') + "Y\0tail"s;
@@ -150,16 +160,15 @@ TEST(FakeServerPayloads, DescribesTheFirstDifference) {
     EXPECT_NE(text.find("aX\\0tail"), std::string::npos) << text;
 
     const std::string shorter = describeDifference("abc", "ab");
-    EXPECT_NE(shorter.find("first difference at byte 2 (expected 3 bytes, received 2)"),
-              std::string::npos)
-        << shorter;
+    EXPECT_NE(shorter.find("first difference at byte 2 (expected 3 bytes, received 2)"), std::string::npos) << shorter;
     EXPECT_EQ(printable("a\0\x01\"\n"s), "a\\0\\x01\\\"\\n");
     EXPECT_EQ(printable("abcdef", 3), "abc... (6 bytes in all)");
 }
 
 // ---- Frames -----------------------------------------------------------------------------------------
 
-TEST(FakeServerFrames, MatchingExchangePassesAndRecordsTheFrames) {
+TEST(FakeServerFrames, MatchingExchangePassesAndRecordsTheFrames)
+{
     FakeServer server;
     const Bytes question = request("SERVER_SESSION_INIT", {{"userID", "ann"}});
     const Bytes answer = reply("SUCCESS", "<SESSION/>");
@@ -183,7 +192,8 @@ TEST(FakeServerFrames, MatchingExchangePassesAndRecordsTheFrames) {
     EXPECT_EQ(server.connectionsAccepted(), 1);
 }
 
-TEST(FakeServerFrames, MismatchStopsTheScriptAndClosesTheConnection) {
+TEST(FakeServerFrames, MismatchStopsTheScriptAndClosesTheConnection)
+{
     FakeServer server;
     server.exchange(request("REP_GET_REPOSITORIES", {{"enableFilter", "All"}}), reply("SUCCESS", "x"));
     server.start();
@@ -195,8 +205,7 @@ TEST(FakeServerFrames, MismatchStopsTheScriptAndClosesTheConnection) {
 
     EXPECT_FALSE(server.finish());
     const std::string report = server.failure();
-    EXPECT_NE(report.find("step 1 of 2 (expect frame \"APIVERSION=1\\0REP_GET_REPOSITORIES"),
-              std::string::npos)
+    EXPECT_NE(report.find("step 1 of 2 (expect frame \"APIVERSION=1\\0REP_GET_REPOSITORIES"), std::string::npos)
         << report;
     EXPECT_NE(report.find("first difference at byte 48"), std::string::npos) << report;
     EXPECT_NE(report.find("|"), std::string::npos) << report;
@@ -207,13 +216,11 @@ TEST(FakeServerFrames, MismatchStopsTheScriptAndClosesTheConnection) {
     EXPECT_NE(std::string(verdict.message()).find("first difference"), std::string::npos);
 }
 
-TEST(FakeServerFrames, PredicateStepsAcceptAndReject) {
+TEST(FakeServerFrames, PredicateStepsAcceptAndReject)
+{
     FakeServer server;
-    server
-        .expectFrameWhere("a JOB_REQUEST",
-                          [](const Bytes& payload) { return isRequestFor(payload, "JOB_REQUEST"); })
-        .expectFrameWhere("a JOB_REQUEST",
-                          [](const Bytes& payload) { return isRequestFor(payload, "JOB_REQUEST"); });
+    server.expectFrameWhere("a JOB_REQUEST", [](const Bytes& payload) { return isRequestFor(payload, "JOB_REQUEST"); })
+        .expectFrameWhere("a JOB_REQUEST", [](const Bytes& payload) { return isRequestFor(payload, "JOB_REQUEST"); });
     server.start();
 
     Client client(server.port());
@@ -226,7 +233,8 @@ TEST(FakeServerFrames, PredicateStepsAcceptAndReject) {
     EXPECT_EQ(server.frames().size(), 2u);
 }
 
-TEST(FakeServerFrames, LargeFramesTravelBothWays) {
+TEST(FakeServerFrames, LargeFramesTravelBothWays)
+{
     Bytes big(300000, '\0');
     for (std::size_t i = 0; i < big.size(); ++i) {
         big[i] = static_cast<char>(i * 7);
@@ -241,18 +249,19 @@ TEST(FakeServerFrames, LargeFramesTravelBothWays) {
     EXPECT_TRUE(server.verify());
 }
 
-TEST(FakeServerFrames, ImpossibleLengthPrefixIsReported) {
+TEST(FakeServerFrames, ImpossibleLengthPrefixIsReported)
+{
     FakeServer server;
     server.expectAnyFrame();
     server.start();
     Client client(server.port());
     client.send("\xFF\xFF\xFF\xF0"s);
     EXPECT_FALSE(server.finish());
-    EXPECT_NE(server.failure().find("announces 4294967280 bytes"), std::string::npos)
-        << server.failure();
+    EXPECT_NE(server.failure().find("announces 4294967280 bytes"), std::string::npos) << server.failure();
 }
 
-TEST(FakeServerFrames, ClientClosingInsideAFrameIsReportedWithWhatArrived) {
+TEST(FakeServerFrames, ClientClosingInsideAFrameIsReportedWithWhatArrived)
+{
     FakeServer server;
     server.expectAnyFrame();
     server.start();
@@ -270,7 +279,8 @@ TEST(FakeServerFrames, ClientClosingInsideAFrameIsReportedWithWhatArrived) {
 
 // ---- Raw bytes --------------------------------------------------------------------------------------
 
-TEST(FakeServerRaw, RawReadsAreRecordedAndCompared) {
+TEST(FakeServerRaw, RawReadsAreRecordedAndCompared)
+{
     FakeServer server;
     server.expectRaw(5).expectRawBytes("xyz").sendRaw("ok").expectRawBytes("123");
     server.start();
@@ -290,7 +300,8 @@ TEST(FakeServerRaw, RawReadsAreRecordedAndCompared) {
 
 // ---- Connections ------------------------------------------------------------------------------------
 
-TEST(FakeServerConnections, CloseAfterATornFrame) {
+TEST(FakeServerConnections, CloseAfterATornFrame)
+{
     FakeServer server;
     server.sendFrame("whole").sendRaw(frame("torn").substr(0, 6)).closeConnection();
     server.start();
@@ -301,7 +312,8 @@ TEST(FakeServerConnections, CloseAfterATornFrame) {
     EXPECT_TRUE(server.verify());
 }
 
-TEST(FakeServerConnections, StepAfterCloseHasNoConnection) {
+TEST(FakeServerConnections, StepAfterCloseHasNoConnection)
+{
     FakeServer server;
     server.closeConnection().sendFrame("late");
     server.start();
@@ -312,7 +324,8 @@ TEST(FakeServerConnections, StepAfterCloseHasNoConnection) {
         << server.failure();
 }
 
-TEST(FakeServerConnections, BytesNoStepReadAreAFailure) {
+TEST(FakeServerConnections, BytesNoStepReadAreAFailure)
+{
     FakeServer server;
     server.expectFrame("a").sendFrame("ok").closeConnection();
     server.start();
@@ -328,7 +341,8 @@ TEST(FakeServerConnections, BytesNoStepReadAreAFailure) {
         << server.failure();
 }
 
-TEST(FakeServerConnections, ConnectionStaysOpenAfterTheScriptUntilFinish) {
+TEST(FakeServerConnections, ConnectionStaysOpenAfterTheScriptUntilFinish)
+{
     FakeServer server;
     server.sendFrame("hello");
     server.start();
@@ -344,7 +358,8 @@ TEST(FakeServerConnections, ConnectionStaysOpenAfterTheScriptUntilFinish) {
     EXPECT_TRUE(client.seesClose());
 }
 
-TEST(FakeServerConnections, AcceptNextServesAReconnectingClient) {
+TEST(FakeServerConnections, AcceptNextServesAReconnectingClient)
+{
     FakeServer server;
     server.exchange("one", "1").closeConnection().acceptNext().exchange("two", "2");
     server.start();
@@ -362,7 +377,8 @@ TEST(FakeServerConnections, AcceptNextServesAReconnectingClient) {
     EXPECT_EQ(server.frames(), (std::vector<Bytes>{"one", "two"}));
 }
 
-TEST(FakeServerConnections, UnacceptedConnectionIsAFailure) {
+TEST(FakeServerConnections, UnacceptedConnectionIsAFailure)
+{
     FakeServer server;
     server.exchange("one", "1");
     server.start();
@@ -376,7 +392,8 @@ TEST(FakeServerConnections, UnacceptedConnectionIsAFailure) {
     EXPECT_EQ(server.failure(), "a client connected but no step accepted the connection");
 }
 
-TEST(FakeServerConnections, EmptyScriptWantsNoClient) {
+TEST(FakeServerConnections, EmptyScriptWantsNoClient)
+{
     {
         FakeServer server;
         server.start();
@@ -389,14 +406,16 @@ TEST(FakeServerConnections, EmptyScriptWantsNoClient) {
     EXPECT_FALSE(server.finish());
 }
 
-TEST(FakeServerConnections, ScriptThatWasNeverStartedFails) {
+TEST(FakeServerConnections, ScriptThatWasNeverStartedFails)
+{
     FakeServer server;
     server.expectAnyFrame();
     EXPECT_FALSE(server.finish());
     EXPECT_EQ(server.failure(), "the script was never started");
 }
 
-TEST(FakeServerConnections, WaitsAreBounded) {
+TEST(FakeServerConnections, WaitsAreBounded)
+{
     FakeServer quiet;
     quiet.setStepTimeout(std::chrono::milliseconds(200));
     quiet.expectAnyFrame();
@@ -404,8 +423,7 @@ TEST(FakeServerConnections, WaitsAreBounded) {
     Client client(quiet.port());
     EXPECT_TRUE(client.seesClose());
     EXPECT_FALSE(quiet.finish());
-    EXPECT_NE(quiet.failure().find("timed out after 0 of 4 bytes of the length prefix"),
-              std::string::npos)
+    EXPECT_NE(quiet.failure().find("timed out after 0 of 4 bytes of the length prefix"), std::string::npos)
         << quiet.failure();
 
     FakeServer lonely;
@@ -413,11 +431,11 @@ TEST(FakeServerConnections, WaitsAreBounded) {
     lonely.sendFrame("anyone?");
     lonely.start();
     EXPECT_FALSE(lonely.finish());
-    EXPECT_NE(lonely.failure().find("no client connected within 100 ms"), std::string::npos)
-        << lonely.failure();
+    EXPECT_NE(lonely.failure().find("no client connected within 100 ms"), std::string::npos) << lonely.failure();
 }
 
-TEST(FakeServerConnections, ExpectPeerClose) {
+TEST(FakeServerConnections, ExpectPeerClose)
+{
     {
         FakeServer server;
         server.expectPeerClose();
@@ -432,14 +450,14 @@ TEST(FakeServerConnections, ExpectPeerClose) {
     Client client(server.port());
     client.send("no");
     EXPECT_FALSE(server.finish());
-    EXPECT_NE(server.failure().find("the client sent 2 bytes instead of closing: \"no\""),
-              std::string::npos)
+    EXPECT_NE(server.failure().find("the client sent 2 bytes instead of closing: \"no\""), std::string::npos)
         << server.failure();
 }
 
 // ---- Connect-back -----------------------------------------------------------------------------------
 
-TEST(FakeServerConnectBack, SendsTheResultToThePortNamedInTheRequest) {
+TEST(FakeServerConnectBack, SendsTheResultToThePortNamedInTheRequest)
+{
     Listener results;
     FakeServer server;
     server.expectAnyFrame().sendFrame(reply("SUCCESS", "queued")).connectBackAndSend("job result");
@@ -467,9 +485,9 @@ TEST(FakeServerConnectBack, SendsTheResultToThePortNamedInTheRequest) {
     EXPECT_TRUE(server.verify());
 }
 
-TEST(FakeServerConnectBack, MissingOrBadPortValueIsReported) {
-    for (const auto& [values, expected] :
-         std::vector<std::pair<Values, std::string>>{
+TEST(FakeServerConnectBack, MissingOrBadPortValueIsReported)
+{
+    for (const auto& [values, expected] : std::vector<std::pair<Values, std::string>>{
              {{{"requesterHost", "127.0.0.1"}}, "has no value \"requesterResultPort\""},
              {{{"requesterResultPort", "70000"}}, "\"requesterResultPort=70000\" is not a port"},
              {{{"requesterResultPort", "12ab"}}, "\"requesterResultPort=12ab\" is not a port"}}) {
@@ -483,14 +501,14 @@ TEST(FakeServerConnectBack, MissingOrBadPortValueIsReported) {
     }
 }
 
-TEST(FakeServerConnectBack, RefusedPortIsReported) {
+TEST(FakeServerConnectBack, RefusedPortIsReported)
+{
     const ClosedPort closed;
     const std::uint16_t closedPort = closed.port();
     FakeServer server;
     server.connectToPortAndSend(closedPort, "result");
     server.start();
     EXPECT_FALSE(server.finish());
-    EXPECT_NE(server.failure().find("connect to port " + std::to_string(closedPort) + " failed"),
-              std::string::npos)
+    EXPECT_NE(server.failure().find("connect to port " + std::to_string(closedPort) + " failed"), std::string::npos)
         << server.failure();
 }

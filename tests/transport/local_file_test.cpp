@@ -24,7 +24,8 @@ namespace fs = std::filesystem;
 // The fake server's bitwise CRC-32 checks the library's table-driven one.
 using zeltest::crc32;
 
-std::string pattern(std::size_t size) {
+std::string pattern(std::size_t size)
+{
     std::string data(size, '\0');
     for (std::size_t i = 0; i < size; ++i) {
         data[i] = static_cast<char>((i * 7919 + i / 251) & 0xFF);
@@ -34,12 +35,14 @@ std::string pattern(std::size_t size) {
 
 class LocalFileTest : public ::testing::Test {
 protected:
-    std::string make(const std::string& name, const std::string& content) const {
+    std::string make(const std::string& name, const std::string& content) const
+    {
         const fs::path path = dir / name;
         std::ofstream(path, std::ios::binary) << content;
         return path.string();
     }
-    static std::string slurp(const std::string& path) {
+    static std::string slurp(const std::string& path)
+    {
         std::ifstream in(path, std::ios::binary);
         return std::string(std::istreambuf_iterator<char>(in), {});
     }
@@ -48,13 +51,15 @@ protected:
     const fs::path dir{scratch.path()};
 };
 
-TEST_F(LocalFileTest, OpenFailsForAMissingFileOrAnUnwritablePath) {
+TEST_F(LocalFileTest, OpenFailsForAMissingFileOrAnUnwritablePath)
+{
     EXPECT_FALSE(LocalFile((dir / "absent").string(), LocalFile::Mode::Read).isOpen());
     EXPECT_FALSE(LocalFile((dir / "no" / "such" / "dir" / "f").string(), LocalFile::Mode::Write).isOpen());
     EXPECT_FALSE(fs::exists(dir / "absent"));
 }
 
-TEST_F(LocalFileTest, WriteModeCreatesOrEmptiesTheFile) {
+TEST_F(LocalFileTest, WriteModeCreatesOrEmptiesTheFile)
+{
     const std::string path = make("f", "old content");
     LocalFile file(path, LocalFile::Mode::Write);
     ASSERT_TRUE(file.isOpen());
@@ -69,7 +74,8 @@ TEST_F(LocalFileTest, WriteModeCreatesOrEmptiesTheFile) {
     EXPECT_TRUE(fs::exists(dir / "created"));
 }
 
-TEST_F(LocalFileTest, SizeSeeksToTheEndAndLeavesTheStreamAtTheStart) {
+TEST_F(LocalFileTest, SizeSeeksToTheEndAndLeavesTheStreamAtTheStart)
+{
     const std::string content = pattern(300000);
     LocalFile file(make("f", content), LocalFile::Mode::Read);
     ASSERT_TRUE(file.isOpen());
@@ -82,7 +88,8 @@ TEST_F(LocalFileTest, SizeSeeksToTheEndAndLeavesTheStreamAtTheStart) {
     EXPECT_EQ(empty.size(), std::optional<std::uint64_t>(0));
 }
 
-TEST_F(LocalFileTest, SizeOfAFileBeyondFourGibibytes) {
+TEST_F(LocalFileTest, SizeOfAFileBeyondFourGibibytes)
+{
     const std::string path = make("sparse", "");
     const std::uint64_t size = (std::uint64_t{5} << 30) + 3;
     std::error_code error;
@@ -94,7 +101,8 @@ TEST_F(LocalFileTest, SizeOfAFileBeyondFourGibibytes) {
     EXPECT_EQ(file.size(), std::optional<std::uint64_t>(size));
 }
 
-TEST_F(LocalFileTest, ReadsInPiecesUntilTheEndAndRewinds) {
+TEST_F(LocalFileTest, ReadsInPiecesUntilTheEndAndRewinds)
+{
     const std::string content = pattern(25);
     LocalFile file(make("f", content), LocalFile::Mode::Read);
     char buffer[10];
@@ -113,7 +121,8 @@ TEST_F(LocalFileTest, ReadsInPiecesUntilTheEndAndRewinds) {
     EXPECT_EQ(std::string(buffer, 3), content.substr(0, 3));
 }
 
-TEST_F(LocalFileTest, EachDirectionRefusesTheOther) {
+TEST_F(LocalFileTest, EachDirectionRefusesTheOther)
+{
     LocalFile reader(make("r", "abc"), LocalFile::Mode::Read);
     EXPECT_FALSE(reader.write("x", 1));
     EXPECT_EQ(slurp(reader.path()), "abc");
@@ -123,7 +132,8 @@ TEST_F(LocalFileTest, EachDirectionRefusesTheOther) {
     EXPECT_EQ(writer.read(&byte, 1), std::nullopt);
 }
 
-TEST_F(LocalFileTest, ClosedFileDoesNothing) {
+TEST_F(LocalFileTest, ClosedFileDoesNothing)
+{
     LocalFile file(make("f", "abc"), LocalFile::Mode::Read);
     EXPECT_TRUE(file.close());
     char byte;
@@ -133,12 +143,14 @@ TEST_F(LocalFileTest, ClosedFileDoesNothing) {
     EXPECT_FALSE(file.close());
 }
 
-TEST_F(LocalFileTest, DirectoryCannotBeRead) {
+TEST_F(LocalFileTest, DirectoryCannotBeRead)
+{
     LocalFile file(dir.string(), LocalFile::Mode::Read);
     EXPECT_EQ(file.crc32(), std::nullopt);
 }
 
-TEST_F(LocalFileTest, ChecksumMatchesTheStandardCrc32) {
+TEST_F(LocalFileTest, ChecksumMatchesTheStandardCrc32)
+{
     struct Case {
         const char* name;
         std::string content;
@@ -159,7 +171,8 @@ TEST_F(LocalFileTest, ChecksumMatchesTheStandardCrc32) {
     EXPECT_EQ(file.crc32(), std::optional<std::uint32_t>(crc32(big)));
 }
 
-TEST(Crc32Test, PiecesAddUpToTheWhole) {
+TEST(Crc32Test, PiecesAddUpToTheWhole)
+{
     const std::string data = pattern(5000);
     for (const std::size_t cut : {std::size_t{0}, std::size_t{1}, std::size_t{1023}, std::size_t{4999}}) {
         Crc32 crc;
@@ -170,7 +183,8 @@ TEST(Crc32Test, PiecesAddUpToTheWhole) {
     EXPECT_EQ(Crc32().value(), 0u);
 }
 
-TEST_F(LocalFileTest, ChecksumReadsTheFileAfreshThroughItsPath) {
+TEST_F(LocalFileTest, ChecksumReadsTheFileAfreshThroughItsPath)
+{
     const std::string path = make("f", "first");
     LocalFile file(path, LocalFile::Mode::Read);
     char buffer[2];

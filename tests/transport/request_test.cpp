@@ -257,7 +257,8 @@ TEST(RequestPayload, UserTokenDocumentUnderTheKeyword)
               "SEC_ADD_USERTOKEN\0clientID=\0userTokenObject="s + kDeclaration +
                   R"(<SEC_ADD_USERTOKEN><USERTOKEN clientaddress="10.0.0.1" expirationdate="2025-01-01" )"
                   R"(expirationtimeout="-3600" firsttokendate="2024-01-01" lasttokendate="2024-02-01" token="tk-1"/>)"
-                  "</SEC_ADD_USERTOKEN>\0userTokenObject="s + kDeclaration +
+                  "</SEC_ADD_USERTOKEN>\0userTokenObject="s +
+                  kDeclaration +
                   R"(<SEC_ADD_USERTOKEN><USERTOKEN clientaddress="10.0.0.1" expirationdate="" )"
                   R"(expirationtimeout="-3600" firsttokendate="" lasttokendate="" token="tk-1"/></SEC_ADD_USERTOKEN>)");
 }
@@ -348,10 +349,12 @@ TEST(RequestPayload, ServiceDocumentKeepsTheAddRootAndWritesFlagsAsWords)
     ZELServerTCPIPRequest request("REP_UPDATE_SERVICE", nullptr, "");
     EXPECT_EQ(request.addServicePayload("serviceObject", ServerService()), 0);
     const auto document = [](const std::string& id) {
-        return kDeclaration + R"(<REP_ADD_SERVICE><SERVICE description="" display_name="Service &lt;1>" )"
-                              R"(is_customformat_reg_allowed="true" is_customtransform_reg_allowed="false" )"
-                              R"(is_enabled="true" is_template_reg_allowed="true" is_workspace_reg_allowed="false" )"
-                              R"(name="svc" service_id=")" + id + R"(" url_pattern="/svc/*"/></REP_ADD_SERVICE>)";
+        return kDeclaration +
+               R"(<REP_ADD_SERVICE><SERVICE description="" display_name="Service &lt;1>" )"
+               R"(is_customformat_reg_allowed="true" is_customtransform_reg_allowed="false" )"
+               R"(is_enabled="true" is_template_reg_allowed="true" is_workspace_reg_allowed="false" )"
+               R"(name="svc" service_id=")" +
+               id + R"(" url_pattern="/svc/*"/></REP_ADD_SERVICE>)";
     };
     EXPECT_EQ(textOf(request), "REP_UPDATE_SERVICE\0clientID=\0serviceObject="s + document("42"));
 

@@ -215,16 +215,18 @@ std::vector<std::string> namesOf(ThingVector& things)
 
 int readThings(const std::string& body, ThingVector& things, int* alive = nullptr)
 {
-    return readObjectList(body, "THING", things, [alive] { return new Thing(alive); }, fillThing);
+    return readObjectList(
+        body, "THING", things, [alive] { return new Thing(alive); }, fillThing);
 }
 
 TEST(ObjectReader, DocumentElementIsHandedToTheReader)
 {
     std::string seen;
-    EXPECT_EQ(readReplyDocument("<ROOT a='1'><C/></ROOT>", [&](const XmlElement& root) {
-                  seen = root.name();
-                  return true;
-              }),
+    EXPECT_EQ(readReplyDocument("<ROOT a='1'><C/></ROOT>",
+                                [&](const XmlElement& root) {
+                                    seen = root.name();
+                                    return true;
+                                }),
               0);
     EXPECT_EQ(seen, "ROOT");
     EXPECT_EQ(readReplyDocument("<ROOT/>", [](const XmlElement&) { return false; }), kNotReadable);
@@ -274,7 +276,8 @@ TEST(ObjectReader, ListBodyThatDoesNotParseLeavesTheVectorAlone)
 TEST(ObjectReader, ListObjectThatCannotBeMadeFails)
 {
     ThingVector things;
-    EXPECT_EQ(readObjectList("<R><THING/></R>", "THING", things, []() -> Thing* { return nullptr; }, fillThing),
+    EXPECT_EQ(readObjectList(
+                  "<R><THING/></R>", "THING", things, []() -> Thing* { return nullptr; }, fillThing),
               kNotReadable);
     EXPECT_EQ(things.entries(), 0u);
 }

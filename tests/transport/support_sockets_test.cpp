@@ -14,7 +14,8 @@
 using namespace zeltest;
 using std::chrono::milliseconds;
 
-TEST(TestSockets, DottedAddressesAreParsedStrictly) {
+TEST(TestSockets, DottedAddressesAreParsedStrictly)
+{
     const struct {
         const char* text;
         std::optional<std::uint32_t> address;
@@ -41,7 +42,8 @@ TEST(TestSockets, DottedAddressesAreParsedStrictly) {
     }
 }
 
-TEST(TestSockets, ConnectedPairCarriesBytesBothWays) {
+TEST(TestSockets, ConnectedPairCarriesBytesBothWays)
+{
     const Socket listener = listenOnLoopback(1);
     ASSERT_TRUE(listener.valid()) << socketErrorText(lastSocketError());
     const std::optional<std::uint16_t> port = localPort(listener);
@@ -69,7 +71,8 @@ TEST(TestSockets, ConnectedPairCarriesBytesBothWays) {
     EXPECT_EQ(std::string(buffer, 4), "down");
 }
 
-TEST(TestSockets, NonBlockingReceiveOnAQuietSocketWouldBlock) {
+TEST(TestSockets, NonBlockingReceiveOnAQuietSocketWouldBlock)
+{
     const Socket listener = listenOnLoopback(1);
     ASSERT_TRUE(listener.valid());
     const Socket client = connectToLoopback(localPort(listener).value_or(0));
@@ -80,7 +83,8 @@ TEST(TestSockets, NonBlockingReceiveOnAQuietSocketWouldBlock) {
     EXPECT_TRUE(isWouldBlock(lastSocketError())) << socketErrorText(lastSocketError());
 }
 
-TEST(TestSockets, ConnectToAClosedPortFailsBothWays) {
+TEST(TestSockets, ConnectToAClosedPortFailsBothWays)
+{
     const ClosedPort closed;
     const Socket blocking = connectToLoopback(closed.port());
     EXPECT_FALSE(blocking.valid());
@@ -99,7 +103,8 @@ TEST(TestSockets, ConnectToAClosedPortFailsBothWays) {
     EXPECT_NE(*error, 0);
 }
 
-TEST(TestSockets, ClosedPortKeepsItsPortFromOtherListeners) {
+TEST(TestSockets, ClosedPortKeepsItsPortFromOtherListeners)
+{
     const ClosedPort closed;
     const Socket intruder = openTcpSocket();
     ASSERT_TRUE(intruder.valid());

@@ -22,7 +22,8 @@ namespace {
 
 // Loopback delivery of a close may lag behind the call that caused it; probe until the connection
 // reads as dead, within a bound.
-bool becomesUnusable(TcpSocket& socket) {
+bool becomesUnusable(TcpSocket& socket)
+{
     const auto until = std::chrono::steady_clock::now() + std::chrono::seconds(5);
     while (std::chrono::steady_clock::now() < until) {
         if (!socket.probeConnection()) {
@@ -39,7 +40,8 @@ struct ConnectedPair {
     std::unique_ptr<TcpSocket> listener;
     std::unique_ptr<TcpSocket> client;
 
-    ConnectedPair() {
+    ConnectedPair()
+    {
         listener = std::make_unique<TcpSocket>(port);
         client = std::make_unique<TcpSocket>("127.0.0.1", port);
         EXPECT_EQ(listener->errorCode, 0);
@@ -52,7 +54,8 @@ struct ConnectedPair {
 
 // ---- receiveExact -----------------------------------------------------------------------------------
 
-TEST(TcpSocketReceive, CountBelowOneReturnsAtOnceWithoutReading) {
+TEST(TcpSocketReceive, CountBelowOneReturnsAtOnceWithoutReading)
+{
     ConnectedPair pair;
     ASSERT_EQ(pair.listener->sendBuffer("xy", 2), 0);
     char buffer[4] = {'-', '-', '-', '-'};
@@ -70,7 +73,8 @@ TEST(TcpSocketReceive, CountBelowOneReturnsAtOnceWithoutReading) {
     EXPECT_EQ(failed.receiveExact(buffer, 0, nullptr), 0);
 }
 
-TEST(TcpSocketReceive, AssemblesBytesThatArriveInPieces) {
+TEST(TcpSocketReceive, AssemblesBytesThatArriveInPieces)
+{
     FakeServer server;
     const std::string payload = "SUCCESS\0body with \0 NULs"s;
     const std::string wire = zeltest::frame(payload);
@@ -87,10 +91,12 @@ TEST(TcpSocketReceive, AssemblesBytesThatArriveInPieces) {
     EXPECT_TRUE(server.verify());
 }
 
-TEST(TcpSocketReceive, PeerClosingInsideAFrameGivesReceiveFailedWithThePartialCount) {
+TEST(TcpSocketReceive, PeerClosingInsideAFrameGivesReceiveFailedWithThePartialCount)
+{
     FakeServer server;
-    server.sendRaw("\x00\x00\x00\x0a"
-                   "abc"s)
+    server
+        .sendRaw("\x00\x00\x00\x0a"
+                 "abc"s)
         .closeConnection();
     server.start();
 
@@ -107,7 +113,8 @@ TEST(TcpSocketReceive, PeerClosingInsideAFrameGivesReceiveFailedWithThePartialCo
     EXPECT_TRUE(server.verify());
 }
 
-TEST(TcpSocketReceive, CloseBeforeAnyByteIsAReceiveFailureEvenAfterAWouldBlockProbe) {
+TEST(TcpSocketReceive, CloseBeforeAnyByteIsAReceiveFailureEvenAfterAWouldBlockProbe)
+{
     FakeServer server;
     server.expectFrame("ping").closeConnection();
     server.start();
@@ -127,7 +134,8 @@ TEST(TcpSocketReceive, CloseBeforeAnyByteIsAReceiveFailureEvenAfterAWouldBlockPr
 
 // ---- sendBuffer -------------------------------------------------------------------------------------
 
-TEST(TcpSocketSend, SendsAWholeFrameByteForByte) {
+TEST(TcpSocketSend, SendsAWholeFrameByteForByte)
+{
     FakeServer server;
     const std::string payload = zeltest::request("SERVER_SESSION_INIT", {{"clientID", ""}});
     server.expectFrame(payload);
@@ -140,7 +148,8 @@ TEST(TcpSocketSend, SendsAWholeFrameByteForByte) {
     EXPECT_TRUE(server.verify());
 }
 
-TEST(TcpSocketSend, SendToAClosedPeerEventuallyFails) {
+TEST(TcpSocketSend, SendToAClosedPeerEventuallyFails)
+{
     FakeServer server;
     server.closeConnection();
     server.start();
@@ -164,7 +173,8 @@ TEST(TcpSocketSend, SendToAClosedPeerEventuallyFails) {
 
 // ---- client constructor -----------------------------------------------------------------------------
 
-TEST(TcpSocketConnect, ConnectsByNameAndRecordsHostAndPort) {
+TEST(TcpSocketConnect, ConnectsByNameAndRecordsHostAndPort)
+{
     FakeServer server;
     server.expectPeerClose();
     server.start();
@@ -179,7 +189,8 @@ TEST(TcpSocketConnect, ConnectsByNameAndRecordsHostAndPort) {
     EXPECT_TRUE(server.verify());
 }
 
-TEST(TcpSocketConnect, ClosedPortGivesConnectFailed) {
+TEST(TcpSocketConnect, ClosedPortGivesConnectFailed)
+{
     const zeltest::ClosedPort closed;
     TcpSocket client("127.0.0.1", closed.port());
     EXPECT_EQ(client.errorCode, zel::SOCK_CONNECT_FAILED);
@@ -188,7 +199,8 @@ TEST(TcpSocketConnect, ClosedPortGivesConnectFailed) {
     EXPECT_FALSE(client.probeConnection());
 }
 
-TEST(TcpSocketConnect, UnknownHostGivesHostUnknown) {
+TEST(TcpSocketConnect, UnknownHostGivesHostUnknown)
+{
     TcpSocket client("no-such-host.invalid", 4000);
     EXPECT_EQ(client.errorCode, zel::SOCK_HOST_UNKNOWN);
     EXPECT_EQ(client.getHostName(), nullptr);
@@ -196,7 +208,8 @@ TEST(TcpSocketConnect, UnknownHostGivesHostUnknown) {
 
 // ---- listener constructor ---------------------------------------------------------------------------
 
-TEST(TcpSocketListen, PortZeroWritesTheChosenPortBack) {
+TEST(TcpSocketListen, PortZeroWritesTheChosenPortBack)
+{
     std::uint16_t port = 0;
     TcpSocket listener(port);
     ASSERT_EQ(listener.errorCode, 0);
@@ -211,7 +224,8 @@ TEST(TcpSocketListen, PortZeroWritesTheChosenPortBack) {
     EXPECT_STREQ(listener.getPeerAddress(), "127.0.0.1");
 }
 
-TEST(TcpSocketListen, FixedPortCanBeListenedOnAgainWhileTheOldConnectionLingers) {
+TEST(TcpSocketListen, FixedPortCanBeListenedOnAgainWhileTheOldConnectionLingers)
+{
     std::uint16_t port = 0;
     std::uint16_t requested = 0;
     {
@@ -241,7 +255,8 @@ TEST(TcpSocketListen, FixedPortCanBeListenedOnAgainWhileTheOldConnectionLingers)
     EXPECT_EQ(client.errorCode, 0);
 }
 
-TEST(TcpSocketListen, PortHeldByAnotherListenerGivesBindFailed) {
+TEST(TcpSocketListen, PortHeldByAnotherListenerGivesBindFailed)
+{
     std::uint16_t port = 0;
     TcpSocket first(port);
     ASSERT_EQ(first.errorCode, 0);
@@ -259,7 +274,8 @@ TEST(TcpSocketListen, PortHeldByAnotherListenerGivesBindFailed) {
 
 // ---- acceptPeer -------------------------------------------------------------------------------------
 
-TEST(TcpSocketAccept, SecondAcceptReplacesThePeer) {
+TEST(TcpSocketAccept, SecondAcceptReplacesThePeer)
+{
     std::uint16_t port = 0;
     TcpSocket listener(port);
     ASSERT_EQ(listener.errorCode, 0);
@@ -282,7 +298,8 @@ TEST(TcpSocketAccept, SecondAcceptReplacesThePeer) {
     EXPECT_EQ(byte, '2');
 }
 
-TEST(TcpSocketAccept, AcceptOnAClientSocketFails) {
+TEST(TcpSocketAccept, AcceptOnAClientSocketFails)
+{
     FakeServer server;
     server.expectPeerClose();
     server.start();
@@ -296,7 +313,8 @@ TEST(TcpSocketAccept, AcceptOnAClientSocketFails) {
 
 // ---- probeConnection --------------------------------------------------------------------------------
 
-TEST(TcpSocketProbe, IdleOpenConnectionIsUsableAndStaysBlocking) {
+TEST(TcpSocketProbe, IdleOpenConnectionIsUsableAndStaysBlocking)
+{
     FakeServer server;
     server.exchange("ping", "pong");
     server.start();
@@ -313,7 +331,8 @@ TEST(TcpSocketProbe, IdleOpenConnectionIsUsableAndStaysBlocking) {
     EXPECT_TRUE(server.verify());
 }
 
-TEST(TcpSocketProbe, ConnectionClosedByTheServerIsNotUsable) {
+TEST(TcpSocketProbe, ConnectionClosedByTheServerIsNotUsable)
+{
     FakeServer server;
     server.closeConnection();
     server.start();
@@ -325,7 +344,8 @@ TEST(TcpSocketProbe, ConnectionClosedByTheServerIsNotUsable) {
     EXPECT_TRUE(server.verify());
 }
 
-TEST(TcpSocketProbe, PendingByteMakesTheConnectionUsableAndIsConsumed) {
+TEST(TcpSocketProbe, PendingByteMakesTheConnectionUsableAndIsConsumed)
+{
     FakeServer server;
     // One write, so "AB" is already waiting when "pong" has been read.
     server.expectFrame("ping").sendRaw("pongAB");
@@ -346,7 +366,8 @@ TEST(TcpSocketProbe, PendingByteMakesTheConnectionUsableAndIsConsumed) {
 
 // ---- localHostAddress -------------------------------------------------------------------------------
 
-TEST(TcpSocketLocalAddress, WritesTheAddressOnlyWhenItFits) {
+TEST(TcpSocketLocalAddress, WritesTheAddressOnlyWhenItFits)
+{
     std::uint16_t port = 0;
     TcpSocket socket(port);
     char full[64];
@@ -375,7 +396,8 @@ TEST(TcpSocketLocalAddress, WritesTheAddressOnlyWhenItFits) {
 
 // ---- start-up counting and close --------------------------------------------------------------------
 
-TEST(TcpSocketLibrary, TwoSocketsStartTheLibraryOnceAndCleanUpOnce) {
+TEST(TcpSocketLibrary, TwoSocketsStartTheLibraryOnceAndCleanUpOnce)
+{
     const std::uint32_t users = TcpSocket::socketLibraryUsers();
     const std::uint32_t startups = TcpSocket::socketLibraryStartups();
     const std::uint32_t cleanups = TcpSocket::socketLibraryCleanups();
@@ -402,7 +424,8 @@ TEST(TcpSocketLibrary, TwoSocketsStartTheLibraryOnceAndCleanUpOnce) {
     EXPECT_EQ(TcpSocket::socketLibraryStartups(), startups + firstUse);
 }
 
-TEST(TcpSocketLibrary, FailedConnectKeepsItsCountForGood) {
+TEST(TcpSocketLibrary, FailedConnectKeepsItsCountForGood)
+{
     const std::uint32_t users = TcpSocket::socketLibraryUsers();
     const std::uint32_t cleanups = TcpSocket::socketLibraryCleanups();
     {
@@ -425,7 +448,8 @@ TEST(TcpSocketLibrary, FailedConnectKeepsItsCountForGood) {
     EXPECT_EQ(TcpSocket::socketLibraryCleanups(), cleanups);
 }
 
-TEST(TcpSocketClose, ClosingAListenerAlsoClosesItsAcceptedPeer) {
+TEST(TcpSocketClose, ClosingAListenerAlsoClosesItsAcceptedPeer)
+{
     ConnectedPair pair;
     pair.listener->close();
     EXPECT_TRUE(becomesUnusable(*pair.client));

@@ -26,7 +26,8 @@ namespace {
 
 // The error a plain socket() call gets right now: 0 when Winsock is up (the socket is closed again),
 // WSANOTINITIALISED when nobody in the process holds a start-up.
-int socketCallError() {
+int socketCallError()
+{
     const SOCKET probe = ::socket(AF_INET, SOCK_STREAM, 0);
     if (probe == INVALID_SOCKET) {
         return ::WSAGetLastError();
@@ -36,7 +37,8 @@ int socketCallError() {
 }
 
 // Whether this process is fresh as far as Winsock goes; otherwise the case cannot show anything.
-std::optional<std::string> notFresh() {
+std::optional<std::string> notFresh()
+{
     if (zeltest::socketsStarted()) {
         return "the tests' own sockets have started Winsock in this process";
     }
@@ -48,7 +50,8 @@ std::optional<std::string> notFresh() {
 
 }  // namespace
 
-TEST(WinsockStartup, LibrarySocketsWorkWithoutAStartUpOfTheCallerAndCleanUpAfterTheLast) {
+TEST(WinsockStartup, LibrarySocketsWorkWithoutAStartUpOfTheCallerAndCleanUpAfterTheLast)
+{
     if (const auto reason = notFresh()) {
         GTEST_SKIP() << *reason;
     }
@@ -84,7 +87,8 @@ TEST(WinsockStartup, LibrarySocketsWorkWithoutAStartUpOfTheCallerAndCleanUpAfter
     EXPECT_EQ(::WSAGetLastError(), WSANOTINITIALISED);
 }
 
-TEST(WinsockStartup, FailedSocketKeepsExactlyOneStartUpForTheRestOfTheProcess) {
+TEST(WinsockStartup, FailedSocketKeepsExactlyOneStartUpForTheRestOfTheProcess)
+{
     if (const auto reason = notFresh()) {
         GTEST_SKIP() << *reason;
     }

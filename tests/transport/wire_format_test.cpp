@@ -17,7 +17,8 @@ namespace {
 using namespace std::string_literals;
 using zeltest::printable;
 
-TEST(WireFrame, PrefixIsBigEndianLengthFollowedByThePayload) {
+TEST(WireFrame, PrefixIsBigEndianLengthFollowedByThePayload)
+{
     struct Case {
         std::string payload;
         std::string prefix;
@@ -37,7 +38,8 @@ TEST(WireFrame, PrefixIsBigEndianLengthFollowedByThePayload) {
     }
 }
 
-TEST(WireFrame, DecodesEveryBitOfThePrefix) {
+TEST(WireFrame, DecodesEveryBitOfThePrefix)
+{
     struct Case {
         unsigned char prefix[4];
         std::uint32_t length;
@@ -55,7 +57,8 @@ TEST(WireFrame, DecodesEveryBitOfThePrefix) {
     }
 }
 
-TEST(WireFrame, CommandFrameOfTheFirstHandshake) {
+TEST(WireFrame, CommandFrameOfTheFirstHandshake)
+{
     const std::string text = "SERVER_SESSION_INIT\0clientID=\0userID=ann\0userPassword=pw1"s;
     const std::optional<std::string> frame = encodeCommandFrame(text);
     ASSERT_TRUE(frame);
@@ -64,14 +67,17 @@ TEST(WireFrame, CommandFrameOfTheFirstHandshake) {
         << printable(*frame);
 }
 
-TEST(WireFrame, FixedPayloads) {
+TEST(WireFrame, FixedPayloads)
+{
     EXPECT_EQ(versionHeader(), "APIVERSION=1\0"s);
     EXPECT_EQ(acknowledgement(), "SUCCESS\0ready_to_transfer"s);
     EXPECT_EQ(noFileReply(), "SUCCESS\0false"s);
-    EXPECT_EQ(encodeCommandFrame(""), "\0\0\0\x0D" "APIVERSION=1\0"s);
+    EXPECT_EQ(encodeCommandFrame(""), "\0\0\0\x0D"
+                                      "APIVERSION=1\0"s);
 }
 
-TEST(WireReply, SplitsIntoStatusWordAndBody) {
+TEST(WireReply, SplitsIntoStatusWordAndBody)
+{
     struct Case {
         const char* name;
         std::string payload;
@@ -101,13 +107,15 @@ TEST(WireReply, SplitsIntoStatusWordAndBody) {
     }
 }
 
-TEST(WireFileHeader, Encodes) {
+TEST(WireFileHeader, Encodes)
+{
     EXPECT_EQ(encodeFileHeader({0, 0}), "fileLength=0\0fileCRC=0"s);
     EXPECT_EQ(encodeFileHeader({12, 3421780262u}), "fileLength=12\0fileCRC=3421780262"s);
     EXPECT_EQ(encodeFileHeader({0xFFFFFFFFu, 0xFFFFFFFFu}), "fileLength=4294967295\0fileCRC=4294967295"s);
 }
 
-TEST(WireFileHeader, Parses) {
+TEST(WireFileHeader, Parses)
+{
     struct Case {
         const char* name;
         std::string payload;
@@ -153,7 +161,8 @@ TEST(WireFileHeader, Parses) {
     }
 }
 
-TEST(WireFileHeader, RoundTrips) {
+TEST(WireFileHeader, RoundTrips)
+{
     for (const FileHeader header : {FileHeader{0, 0}, FileHeader{1, 0xCBF43926u}, FileHeader{0xFFFFFFFFu, 7}}) {
         const FileHeaderReading reading = parseFileHeader(encodeFileHeader(header));
         ASSERT_EQ(reading.outcome, HeaderParse::Header);
@@ -162,7 +171,8 @@ TEST(WireFileHeader, RoundTrips) {
     }
 }
 
-TEST(WireServerError, ClassifiesByPrefixAtTheVeryStart) {
+TEST(WireServerError, ClassifiesByPrefixAtTheVeryStart)
+{
     struct Case {
         std::string body;
         ServerErrorKind kind;
@@ -192,7 +202,8 @@ TEST(WireServerError, ClassifiesByPrefixAtTheVeryStart) {
     EXPECT_EQ(static_cast<unsigned>(ServerErrorKind::Authorization), 2u);
 }
 
-TEST(WireAcknowledgement, OnlyTheExactReadyReplyLetsATransferGoOn) {
+TEST(WireAcknowledgement, OnlyTheExactReadyReplyLetsATransferGoOn)
+{
     struct Case {
         std::string payload;
         AckOutcome outcome;

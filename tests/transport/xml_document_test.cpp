@@ -20,12 +20,14 @@ constexpr const char* kDeclaration = R"(<?xml version="1.0" encoding="UTF-8" sta
 
 class XmlDocumentTest : public ::testing::Test {
 protected:
-    void SetUp() override {
+    void SetUp() override
+    {
         StatusPtr failure(doc.startXml());
         ASSERT_EQ(failure, nullptr) << failure->getMessage();
     }
 
-    std::string written() {
+    std::string written()
+    {
         std::string out;
         StatusPtr failure(doc.serialize(out));
         EXPECT_EQ(failure, nullptr) << failure->getMessage();
@@ -35,12 +37,14 @@ protected:
     XmlDocument doc;
 };
 
-TEST_F(XmlDocumentTest, RootOnlyDocumentIsDeclarationAndEmptyElementWithoutBreaksOrBom) {
+TEST_F(XmlDocumentTest, RootOnlyDocumentIsDeclarationAndEmptyElementWithoutBreaksOrBom)
+{
     ASSERT_NE(doc.createDocument("", "ROOT"), nullptr);
     EXPECT_EQ(written(), std::string(kDeclaration) + "<ROOT/>");
 }
 
-TEST_F(XmlDocumentTest, IdentityDocumentHasExactBytes) {
+TEST_F(XmlDocumentTest, IdentityDocumentHasExactBytes)
+{
     XmlElement* root = doc.createDocument("", "REP_GET_REPOSITORIES");
     ASSERT_NE(root, nullptr);
     XmlElement* identity = doc.createElement("IDENTITY");
@@ -58,7 +62,8 @@ TEST_F(XmlDocumentTest, IdentityDocumentHasExactBytes) {
                              R"(<ROLES><ROLE name="admin"/></ROLES></IDENTITY></REP_GET_REPOSITORIES>)");
 }
 
-TEST_F(XmlDocumentTest, TextChildrenAreEscaped) {
+TEST_F(XmlDocumentTest, TextChildrenAreEscaped)
+{
     XmlElement* root = doc.createDocument("", "TRANSFORMATION_REQUEST");
     XmlElement* parameter = doc.createElement("PUBLISHED_PARAMETER");
     ASSERT_TRUE(root && parameter);
@@ -71,17 +76,19 @@ TEST_F(XmlDocumentTest, TextChildrenAreEscaped) {
 }
 
 // "v0", "v1", ... Built by appending: g++ 12 at -O2 warns falsely (-Wrestrict) about "v" + to_string(i).
-std::string attributeName(std::size_t i) {
+std::string attributeName(std::size_t i)
+{
     std::string name = "v";
     name += std::to_string(i);
     return name;
 }
 
 // Values the server sends back to us must come back unchanged through our own reader.
-TEST_F(XmlDocumentTest, SpecialCharactersInAttributesRoundTrip) {
+TEST_F(XmlDocumentTest, SpecialCharactersInAttributesRoundTrip)
+{
     const std::string values[] = {
-        R"(a<b>c)", R"(x & y)", R"(say "hi")", "it's", R"(&amp; literal)", "]]>", "tab\there", "line\nbreak",
-        "cr\rhere", "  padded  ", "",
+        R"(a<b>c)",    R"(x & y)", R"(say "hi")", "it's", R"(&amp; literal)", "]]>", "tab\there",
+        "line\nbreak", "cr\rhere", "  padded  ",  "",
     };
     XmlElement* root = doc.createDocument("", "R");
     ASSERT_NE(root, nullptr);
@@ -100,7 +107,8 @@ TEST_F(XmlDocumentTest, SpecialCharactersInAttributesRoundTrip) {
     }
 }
 
-TEST_F(XmlDocumentTest, NonAsciiUtf8IsWrittenAsUtf8AndReadBack) {
+TEST_F(XmlDocumentTest, NonAsciiUtf8IsWrittenAsUtf8AndReadBack)
+{
     const std::string city = "Z\xC3\xBCrich \xE2\x80\x93 \xE6\x9D\xB1\xE4\xBA\xAC \xF0\x9F\x98\x80";
     XmlElement* root = doc.createDocument("", "R");
     XmlElement* child = doc.createElement("C");
@@ -120,14 +128,16 @@ TEST_F(XmlDocumentTest, NonAsciiUtf8IsWrittenAsUtf8AndReadBack) {
     EXPECT_EQ(textContent(findChild(reader.rootOf(), "C")), city);
 }
 
-TEST_F(XmlDocumentTest, LocalValuesAreConvertedFromLatin1) {
+TEST_F(XmlDocumentTest, LocalValuesAreConvertedFromLatin1)
+{
     XmlElement* root = doc.createDocument("", "R");
     ASSERT_NE(root, nullptr);
     EXPECT_TRUE(root->setAttributeLocal("name", "caf\xE9 \xFF"));
     EXPECT_EQ(written(), std::string(kDeclaration) + "<R name=\"caf\xC3\xA9 \xC3\xBF\"/>");
 }
 
-TEST_F(XmlDocumentTest, InvalidUtf8AndNulAreRefusedAndLeaveTheElementUnchanged) {
+TEST_F(XmlDocumentTest, InvalidUtf8AndNulAreRefusedAndLeaveTheElementUnchanged)
+{
     XmlElement* root = doc.createDocument("", "R");
     ASSERT_NE(root, nullptr);
     EXPECT_FALSE(root->setAttribute("name", "caf\xE9"));
@@ -138,7 +148,8 @@ TEST_F(XmlDocumentTest, InvalidUtf8AndNulAreRefusedAndLeaveTheElementUnchanged) 
     EXPECT_EQ(written(), std::string(kDeclaration) + "<R/>");
 }
 
-TEST_F(XmlDocumentTest, AppendingNullChildLeavesParentUnchanged) {
+TEST_F(XmlDocumentTest, AppendingNullChildLeavesParentUnchanged)
+{
     XmlElement* root = doc.createDocument("", "R");
     XmlElement* child = doc.createElement("C");
     ASSERT_TRUE(root && child);
@@ -149,7 +160,8 @@ TEST_F(XmlDocumentTest, AppendingNullChildLeavesParentUnchanged) {
     EXPECT_EQ(childElements(root).size(), 1u);
 }
 
-TEST_F(XmlDocumentTest, RefusedChildrenLeaveTheTreeUnchanged) {
+TEST_F(XmlDocumentTest, RefusedChildrenLeaveTheTreeUnchanged)
+{
     XmlElement* root = doc.createDocument("", "R");
     XmlElement* child = doc.createElement("C");
     ASSERT_TRUE(root && child);
@@ -165,7 +177,8 @@ TEST_F(XmlDocumentTest, RefusedChildrenLeaveTheTreeUnchanged) {
     EXPECT_EQ(written(), std::string(kDeclaration) + "<R><C/></R>");
 }
 
-TEST_F(XmlDocumentTest, IllegalNamesGiveNoElement) {
+TEST_F(XmlDocumentTest, IllegalNamesGiveNoElement)
+{
     EXPECT_EQ(doc.createDocument("", "1ROOT"), nullptr);
     EXPECT_EQ(doc.createDocument("", ""), nullptr);
     ASSERT_NE(doc.createDocument("", "R"), nullptr);
@@ -175,7 +188,8 @@ TEST_F(XmlDocumentTest, IllegalNamesGiveNoElement) {
     EXPECT_EQ(written(), std::string(kDeclaration) + "<R/>");
 }
 
-TEST_F(XmlDocumentTest, DocumentElementIsCachedAndDiesWithTheDocument) {
+TEST_F(XmlDocumentTest, DocumentElementIsCachedAndDiesWithTheDocument)
+{
     XmlElement* root = doc.createDocument("", "R");
     ASSERT_NE(root, nullptr);
     EXPECT_EQ(doc.documentElement(), root);
@@ -195,7 +209,8 @@ TEST_F(XmlDocumentTest, DocumentElementIsCachedAndDiesWithTheDocument) {
     EXPECT_EQ(written(), std::string(kDeclaration) + "<NEXT/>");
 }
 
-TEST_F(XmlDocumentTest, CreatingADocumentReplacesTheEarlierOne) {
+TEST_F(XmlDocumentTest, CreatingADocumentReplacesTheEarlierOne)
+{
     XmlElement* first = doc.createDocument("", "FIRST");
     ASSERT_NE(first, nullptr);
     ASSERT_TRUE(first->appendChild(doc.createElement("C")));
@@ -203,7 +218,8 @@ TEST_F(XmlDocumentTest, CreatingADocumentReplacesTheEarlierOne) {
     EXPECT_EQ(written(), std::string(kDeclaration) + "<SECOND/>");
 }
 
-TEST_F(XmlDocumentTest, IllegalCharacterFailsSerialisationWithLibraryMessage) {
+TEST_F(XmlDocumentTest, IllegalCharacterFailsSerialisationWithLibraryMessage)
+{
     XmlElement* root = doc.createDocument("", "R");
     ASSERT_NE(root, nullptr);
     ASSERT_TRUE(root->setAttribute("a", "bell\x07"));
@@ -216,7 +232,8 @@ TEST_F(XmlDocumentTest, IllegalCharacterFailsSerialisationWithLibraryMessage) {
     EXPECT_EQ(out, "untouched");
 }
 
-TEST(XmlDocumentLifecycle, NothingIsBuiltBeforeTheLibraryStarts) {
+TEST(XmlDocumentLifecycle, NothingIsBuiltBeforeTheLibraryStarts)
+{
     XmlDocument doc;
     EXPECT_FALSE(doc.started());
     EXPECT_EQ(doc.createDocument("", "R"), nullptr);
@@ -224,7 +241,8 @@ TEST(XmlDocumentLifecycle, NothingIsBuiltBeforeTheLibraryStarts) {
     EXPECT_EQ(doc.documentElement(), nullptr);
 }
 
-TEST(XmlDocumentLifecycle, DocumentHoldsOneLibraryReferenceUntilDestroyed) {
+TEST(XmlDocumentLifecycle, DocumentHoldsOneLibraryReferenceUntilDestroyed)
+{
     const unsigned before = XmlPlatform::referenceCount();
     {
         XmlDocument doc;
@@ -240,7 +258,8 @@ TEST(XmlDocumentLifecycle, DocumentHoldsOneLibraryReferenceUntilDestroyed) {
     EXPECT_EQ(XmlPlatform::referenceCount(), before);
 }
 
-TEST(XmlNodeList, WrapsEachNodeOnceAndClearsLastFirst) {
+TEST(XmlNodeList, WrapsEachNodeOnceAndClearsLastFirst)
+{
     XmlDocument doc;
     StatusPtr failure(doc.startXml());
     ASSERT_EQ(failure, nullptr);

@@ -28,7 +28,8 @@ constexpr const char* kSecret = "SECRET-MARKER-7f3a9c";
 // A file holding the secret marker, removed again at the end of the test.
 class SecretFile {
 public:
-    SecretFile() : path_(folder_.path() / "secret.txt") {
+    SecretFile() : path_(folder_.path() / "secret.txt")
+    {
         std::ofstream out(path_, std::ios::binary);
         out << kSecret << "\n";
         ok_ = static_cast<bool>(out.flush());
@@ -37,7 +38,8 @@ public:
     // The path as the system writes it (a drive letter and backslashes on Windows).
     std::string path() const { return path_.string(); }
     // file:///tmp/... or file:///C:/...
-    std::string url() const {
+    std::string url() const
+    {
         const std::string generic = path_.generic_string();
         return "file://" + std::string(generic.front() == '/' ? "" : "/") + generic;
     }
@@ -53,33 +55,31 @@ private:
 // for an answer forever.
 class Tripwire {
 public:
-    Tripwire() : listener_(zeltest::listenOnLoopback(8)) {
-        const std::optional<std::uint16_t> port =
-            listener_.valid() ? zeltest::localPort(listener_) : std::nullopt;
+    Tripwire() : listener_(zeltest::listenOnLoopback(8))
+    {
+        const std::optional<std::uint16_t> port = listener_.valid() ? zeltest::localPort(listener_) : std::nullopt;
         if (port) {
             port_ = *port;
             watcher_ = std::thread([this] { watch(); });
         }
     }
-    ~Tripwire() {
+    ~Tripwire()
+    {
         stop_ = true;
         if (watcher_.joinable()) {
             watcher_.join();
         }
     }
     unsigned port() const { return port_; }
-    std::string url(const std::string& path) const {
-        return "http://127.0.0.1:" + std::to_string(port_) + path;
-    }
+    std::string url(const std::string& path) const { return "http://127.0.0.1:" + std::to_string(port_) + path; }
     // A connection completes in the kernel's accept queue even before anyone accepts it, so a look
     // with no wait sees one the watcher has not taken yet.
     bool touched() const { return connected_ || pending(std::chrono::milliseconds(0)); }
 
 private:
-    bool pending(std::chrono::milliseconds wait) const {
-        return zeltest::waitReadable(listener_, wait);
-    }
-    void watch() {
+    bool pending(std::chrono::milliseconds wait) const { return zeltest::waitReadable(listener_, wait); }
+    void watch()
+    {
         while (!stop_) {
             if (pending(std::chrono::milliseconds(20))) {
                 if (zeltest::acceptFrom(listener_).valid()) {
@@ -101,7 +101,8 @@ struct Outcome {
     std::string text;  // the document's text when it parsed
 };
 
-Outcome parse(const std::string& body) {
+Outcome parse(const std::string& body)
+{
     XmlReader reader;
     Outcome outcome;
     outcome.failure.reset(reader.parse(body));
@@ -109,7 +110,8 @@ Outcome parse(const std::string& body) {
     return outcome;
 }
 
-TEST(XmlHardening, ExternalEntityNamingALocalFileIsNotRead) {
+TEST(XmlHardening, ExternalEntityNamingALocalFileIsNotRead)
+{
     SecretFile secret;
     ASSERT_TRUE(secret.ok());
     const std::string path = secret.path();
@@ -120,7 +122,8 @@ TEST(XmlHardening, ExternalEntityNamingALocalFileIsNotRead) {
     } cases[] = {
         {"file url", "<!DOCTYPE r [<!ENTITY x SYSTEM \"" + url + "\">]><r>&x;</r>"},
         {"plain path", "<!DOCTYPE r [<!ENTITY x SYSTEM \"" + path + "\">]><r>&x;</r>"},
-        {"in an attribute default", "<!DOCTYPE r [<!ENTITY x SYSTEM \"" + path + "\"><!ATTLIST r a CDATA \"&x;\">]><r/>"},
+        {"in an attribute default",
+         "<!DOCTYPE r [<!ENTITY x SYSTEM \"" + path + "\"><!ATTLIST r a CDATA \"&x;\">]><r/>"},
         {"parameter entity", "<!DOCTYPE r [<!ENTITY % p SYSTEM \"" + url + "\"> %p;]><r>x</r>"},
         {"external subset", "<!DOCTYPE r SYSTEM \"" + url + "\"><r>x</r>"},
         {"public identifier", "<!DOCTYPE r [<!ENTITY x PUBLIC \"-//A//B\" \"" + path + "\">]><r>&x;</r>"},
@@ -135,7 +138,8 @@ TEST(XmlHardening, ExternalEntityNamingALocalFileIsNotRead) {
     }
 }
 
-TEST(XmlHardening, ReferencedExternalEntityFailsTheParse) {
+TEST(XmlHardening, ReferencedExternalEntityFailsTheParse)
+{
     SecretFile secret;
     ASSERT_TRUE(secret.ok());
     const Outcome outcome = parse("<!DOCTYPE r [<!ENTITY x SYSTEM \"" + secret.path() + "\">]><r>&x;</r>");
@@ -145,7 +149,8 @@ TEST(XmlHardening, ReferencedExternalEntityFailsTheParse) {
         << outcome.failure->getMessage();
 }
 
-TEST(XmlHardening, ExternalReferencesMakeNoConnection) {
+TEST(XmlHardening, ExternalReferencesMakeNoConnection)
+{
     // @ stands for the address of a fresh tripwire.
     const struct {
         const char* name;
@@ -171,7 +176,8 @@ TEST(XmlHardening, ExternalReferencesMakeNoConnection) {
     }
 }
 
-TEST(XmlHardening, NestedEntityBombFails) {
+TEST(XmlHardening, NestedEntityBombFails)
+{
     std::string body = "<?xml version=\"1.0\"?><!DOCTYPE lolz [<!ENTITY lol0 \"lol\">";
     for (int level = 1; level <= 9; ++level) {
         body += "<!ENTITY lol" + std::to_string(level) + " \"";
@@ -187,7 +193,8 @@ TEST(XmlHardening, NestedEntityBombFails) {
     EXPECT_TRUE(outcome.text.empty());
 }
 
-TEST(XmlHardening, WideEntityBlowUpFails) {
+TEST(XmlHardening, WideEntityBlowUpFails)
+{
     const std::string big(20000, 'a');
     std::string body = "<!DOCTYPE r [<!ENTITY big \"" + big + "\">]><r>";
     for (int i = 0; i < 1000; ++i) {
@@ -199,7 +206,8 @@ TEST(XmlHardening, WideEntityBlowUpFails) {
     EXPECT_EQ(outcome.failure->getMessageNumber(), msg::kXmlFailure);
 }
 
-TEST(XmlHardening, OrdinaryReferencesStillParse) {
+TEST(XmlHardening, OrdinaryReferencesStillParse)
+{
     std::string body = "<r a=\"&lt;&amp;&gt;&quot;&apos;\">";
     std::string expected;
     for (int i = 0; i < 1000; ++i) {

@@ -15,7 +15,8 @@ namespace {
 
 using StatusPtr = std::unique_ptr<IZELServerStatus>;
 
-TEST(XmlPlatform, FirstReferenceStartsAndLastStops) {
+TEST(XmlPlatform, FirstReferenceStartsAndLastStops)
+{
     ASSERT_EQ(XmlPlatform::referenceCount(), 0u);
     const unsigned long starts = XmlPlatform::startCount();
     const unsigned long stops = XmlPlatform::stopCount();
@@ -46,7 +47,8 @@ TEST(XmlPlatform, FirstReferenceStartsAndLastStops) {
     EXPECT_EQ(XmlPlatform::stopCount(), stops + 1);
 }
 
-TEST(XmlPlatform, LibraryCanBeStartedAgainAfterStopping) {
+TEST(XmlPlatform, LibraryCanBeStartedAgainAfterStopping)
+{
     ASSERT_EQ(XmlPlatform::referenceCount(), 0u);
     const unsigned long starts = XmlPlatform::startCount();
     for (int round = 0; round < 3; ++round) {
@@ -58,7 +60,8 @@ TEST(XmlPlatform, LibraryCanBeStartedAgainAfterStopping) {
     EXPECT_EQ(XmlPlatform::referenceCount(), 0u);
 }
 
-TEST(XmlPlatform, MovedReferenceIsReleasedOnce) {
+TEST(XmlPlatform, MovedReferenceIsReleasedOnce)
+{
     ASSERT_EQ(XmlPlatform::referenceCount(), 0u);
     {
         XmlPlatformRef first;
@@ -80,7 +83,8 @@ TEST(XmlPlatform, MovedReferenceIsReleasedOnce) {
 
 // Sessions on different threads start and stop the library concurrently; the count must end where
 // it began, with every start matched by one stop.
-TEST(XmlPlatform, ConcurrentUsersBalance) {
+TEST(XmlPlatform, ConcurrentUsersBalance)
+{
     ASSERT_EQ(XmlPlatform::referenceCount(), 0u);
     const unsigned long starts = XmlPlatform::startCount();
     const unsigned long stops = XmlPlatform::stopCount();

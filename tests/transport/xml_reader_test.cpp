@@ -16,7 +16,8 @@ namespace {
 
 using StatusPtr = std::unique_ptr<IZELServerStatus>;
 
-std::vector<std::string> namesOf(const std::vector<XmlElement*>& elements) {
+std::vector<std::string> namesOf(const std::vector<XmlElement*>& elements)
+{
     std::vector<std::string> names;
     for (const XmlElement* element : elements) {
         names.push_back(element->name());
@@ -24,7 +25,8 @@ std::vector<std::string> namesOf(const std::vector<XmlElement*>& elements) {
     return names;
 }
 
-std::vector<std::string> attributesOf(const std::vector<XmlElement*>& elements, const std::string& name) {
+std::vector<std::string> attributesOf(const std::vector<XmlElement*>& elements, const std::string& name)
+{
     std::vector<std::string> values;
     for (const XmlElement* element : elements) {
         std::string value;
@@ -36,7 +38,8 @@ std::vector<std::string> attributesOf(const std::vector<XmlElement*>& elements, 
 
 class XmlReaderTest : public ::testing::Test {
 protected:
-    XmlElement* parsed(const std::string& text) {
+    XmlElement* parsed(const std::string& text)
+    {
         StatusPtr failure(reader.parse(text));
         EXPECT_EQ(failure, nullptr) << failure->getMessage();
         return reader.rootOf();
@@ -45,7 +48,8 @@ protected:
     XmlReader reader;
 };
 
-TEST_F(XmlReaderTest, FindsChildIgnoringCaseButAttributesExactly) {
+TEST_F(XmlReaderTest, FindsChildIgnoringCaseButAttributesExactly)
+{
     XmlElement* root = parsed(R"(<SERVER_SESSION_INIT security_enabled="true">)"
                               R"(<IDENTITY id="ann" is_authenticated="true"/></SERVER_SESSION_INIT>)");
     ASSERT_NE(root, nullptr);
@@ -65,14 +69,16 @@ TEST_F(XmlReaderTest, FindsChildIgnoringCaseButAttributesExactly) {
     EXPECT_EQ(value, "true");
 }
 
-TEST_F(XmlReaderTest, EmptyAttributeIsPresent) {
+TEST_F(XmlReaderTest, EmptyAttributeIsPresent)
+{
     XmlElement* root = parsed(R"(<R a=""/>)");
     std::string value = "stale";
     EXPECT_TRUE(getAttribute(root, "a", value));
     EXPECT_EQ(value, "");
 }
 
-TEST_F(XmlReaderTest, FindChildTakesTheFirstDirectChildElementOnly) {
+TEST_F(XmlReaderTest, FindChildTakesTheFirstDirectChildElementOnly)
+{
     XmlElement* root = parsed("<R>text<!--IDENTITY--><?IDENTITY x?><OTHER><IDENTITY n='deep'/></OTHER>"
                               "<identity n='first'/><IDENTITY n='second'/></R>");
     XmlElement* found = findChild(root, "IDENTITY");
@@ -83,7 +89,8 @@ TEST_F(XmlReaderTest, FindChildTakesTheFirstDirectChildElementOnly) {
     EXPECT_EQ(findChild(findChild(root, "OTHER"), "OTHER"), nullptr);
 }
 
-TEST_F(XmlReaderTest, HelpersOnNullFindNothing) {
+TEST_F(XmlReaderTest, HelpersOnNullFindNothing)
+{
     std::string value = "stale";
     EXPECT_EQ(findChild(nullptr, "A"), nullptr);
     EXPECT_TRUE(childElements(nullptr).empty());
@@ -95,7 +102,8 @@ TEST_F(XmlReaderTest, HelpersOnNullFindNothing) {
     EXPECT_EQ(textContent(nullptr), "");
 }
 
-TEST_F(XmlReaderTest, ChildElementsInDocumentOrderWithCaseInsensitiveFilter) {
+TEST_F(XmlReaderTest, ChildElementsInDocumentOrderWithCaseInsensitiveFilter)
+{
     XmlElement* identity = parsed("<IDENTITY id='x'>"
                                   "<ROLES><ROLE name='a'/><Role/><role name='b'/></ROLES>"
                                   "<OTHER><ROLE name='no'/></OTHER>"
@@ -114,7 +122,8 @@ TEST_F(XmlReaderTest, ChildElementsInDocumentOrderWithCaseInsensitiveFilter) {
     EXPECT_EQ(roles, (std::vector<std::string>{"a", "b", "c"}));
 }
 
-TEST_F(XmlReaderTest, ElementsNamedFindsEveryMatchAnywhereInDocumentOrder) {
+TEST_F(XmlReaderTest, ElementsNamedFindsEveryMatchAnywhereInDocumentOrder)
+{
     XmlElement* root = parsed("<REPOSITORY name='root'>"
                               "<LIST><REPOSITORY name='one'><REPOSITORY name='two'/></REPOSITORY></LIST>"
                               "<repository name='case differs'/>"
@@ -132,20 +141,23 @@ TEST_F(XmlReaderTest, ElementsNamedFindsEveryMatchAnywhereInDocumentOrder) {
     EXPECT_EQ(name, "one");
 }
 
-TEST_F(XmlReaderTest, WalkingTwiceReusesTheSameHandles) {
+TEST_F(XmlReaderTest, WalkingTwiceReusesTheSameHandles)
+{
     XmlElement* root = parsed("<R><A/><A/><B><A/></B></R>");
     const std::vector<XmlElement*> first = elementsNamed(root, "A");
     EXPECT_EQ(elementsNamed(root, "A"), first);
     EXPECT_EQ(findChild(root, "A"), first.front());
 }
 
-TEST_F(XmlReaderTest, TextContentJoinsTextCdataAndEntitiesOfAllDescendants) {
+TEST_F(XmlReaderTest, TextContentJoinsTextCdataAndEntitiesOfAllDescendants)
+{
     XmlElement* root = parsed("<R>a &amp; b<!-- not this --><X>&lt;c&gt;<![CDATA[<raw>&amp;]]></X>&#x41;&#66;</R>");
     EXPECT_EQ(textContent(root), "a & b<c><raw>&amp;AB");
     EXPECT_EQ(textContent(findChild(root, "X")), "<c><raw>&amp;");
 }
 
-TEST_F(XmlReaderTest, DeepNestingIsWalkedWithoutRecursion) {
+TEST_F(XmlReaderTest, DeepNestingIsWalkedWithoutRecursion)
+{
     constexpr int kDepth = 5000;
     std::string text;
     for (int i = 0; i < kDepth; ++i) {
@@ -160,7 +172,8 @@ TEST_F(XmlReaderTest, DeepNestingIsWalkedWithoutRecursion) {
     EXPECT_EQ(textContent(root), "deep");
 }
 
-TEST_F(XmlReaderTest, NonAsciiUtf8IsReadAsUtf8) {
+TEST_F(XmlReaderTest, NonAsciiUtf8IsReadAsUtf8)
+{
     const std::string word = "\xC3\xA9t\xC3\xA9 \xE6\x97\xA5\xE6\x9C\xAC \xF0\x9F\x98\x80";
     XmlElement* root = parsed("<R v=\"" + word + "\">" + word + "</R>");
     std::string value;
@@ -169,14 +182,16 @@ TEST_F(XmlReaderTest, NonAsciiUtf8IsReadAsUtf8) {
     EXPECT_EQ(textContent(root), word);
 }
 
-TEST_F(XmlReaderTest, EmptyBodyFailsWithXmlStatus) {
+TEST_F(XmlReaderTest, EmptyBodyFailsWithXmlStatus)
+{
     StatusPtr failure(reader.parse(""));
     ASSERT_NE(failure, nullptr);
     EXPECT_EQ(failure->getMessageNumber(), msg::kXmlFailure);
     EXPECT_EQ(reader.rootOf(), nullptr);
 }
 
-TEST_F(XmlReaderTest, AReaderParsesOnceAndThenIsBusy) {
+TEST_F(XmlReaderTest, AReaderParsesOnceAndThenIsBusy)
+{
     EXPECT_FALSE(reader.busy());
     XmlElement* root = parsed("<FIRST/>");
     EXPECT_TRUE(reader.busy());
@@ -186,7 +201,8 @@ TEST_F(XmlReaderTest, AReaderParsesOnceAndThenIsBusy) {
     EXPECT_EQ(reader.rootOf()->name(), "FIRST");
 }
 
-TEST_F(XmlReaderTest, AFailedReaderStaysBusyWithoutDocument) {
+TEST_F(XmlReaderTest, AFailedReaderStaysBusyWithoutDocument)
+{
     StatusPtr failure(reader.parse("<broken"));
     ASSERT_NE(failure, nullptr);
     EXPECT_TRUE(reader.busy());
@@ -195,7 +211,8 @@ TEST_F(XmlReaderTest, AFailedReaderStaysBusyWithoutDocument) {
     EXPECT_EQ(reader.rootOf(), nullptr);
 }
 
-TEST(XmlReaderFailures, MalformedBodiesFailWithTheParsersMessage) {
+TEST(XmlReaderFailures, MalformedBodiesFailWithTheParsersMessage)
+{
     const struct {
         const char* name;
         std::string text;
@@ -221,7 +238,8 @@ TEST(XmlReaderFailures, MalformedBodiesFailWithTheParsersMessage) {
     }
 }
 
-TEST(XmlReaderFailures, StatusCarriesTheParsersMessage) {
+TEST(XmlReaderFailures, StatusCarriesTheParsersMessage)
+{
     XmlReader reader;
     StatusPtr failure(reader.parse("<R><A></R>"));
     ASSERT_NE(failure, nullptr);
@@ -231,7 +249,8 @@ TEST(XmlReaderFailures, StatusCarriesTheParsersMessage) {
     EXPECT_NE(message.find("expected end of tag 'A'"), std::string::npos) << message;
 }
 
-TEST(XmlReaderPlatform, TwoReadersAliveStartTheLibraryOnceAndStopItOnce) {
+TEST(XmlReaderPlatform, TwoReadersAliveStartTheLibraryOnceAndStopItOnce)
+{
     ASSERT_EQ(XmlPlatform::referenceCount(), 0u);
     const unsigned long starts = XmlPlatform::startCount();
     const unsigned long stops = XmlPlatform::stopCount();
@@ -262,7 +281,8 @@ TEST(XmlReaderPlatform, TwoReadersAliveStartTheLibraryOnceAndStopItOnce) {
     EXPECT_FALSE(XmlReader::readerInitialisedLibrary());
 }
 
-TEST(XmlReaderPlatform, ASessionReferenceKeepsTheLibraryUpAcrossManyReplies) {
+TEST(XmlReaderPlatform, ASessionReferenceKeepsTheLibraryUpAcrossManyReplies)
+{
     ASSERT_EQ(XmlPlatform::referenceCount(), 0u);
     const unsigned long starts = XmlPlatform::startCount();
     const unsigned long stops = XmlPlatform::stopCount();
@@ -281,7 +301,8 @@ TEST(XmlReaderPlatform, ASessionReferenceKeepsTheLibraryUpAcrossManyReplies) {
     EXPECT_EQ(XmlPlatform::stopCount(), stops + 1);
 }
 
-TEST(XmlReaderPlatform, FailedParseStillReleasesTheLibrary) {
+TEST(XmlReaderPlatform, FailedParseStillReleasesTheLibrary)
+{
     ASSERT_EQ(XmlPlatform::referenceCount(), 0u);
     {
         XmlReader reader;

@@ -23,7 +23,8 @@ struct SplitCase {
     Parts expected;
 };
 
-TEST(SplitOnce, Table) {
+TEST(SplitOnce, Table)
+{
     const std::string nul("\0", 1);
     const SplitCase cases[] = {
         // How the transport cuts a reply: status word, then the body verbatim.
@@ -54,13 +55,15 @@ TEST(SplitOnce, Table) {
     }
 }
 
-TEST(SplitOnce, AppendsToTheList) {
+TEST(SplitOnce, AppendsToTheList)
+{
     Parts out{"kept"};
     EXPECT_EQ(splitOnce("x y", " ", 0, out), 2u);
     EXPECT_EQ(out, (Parts{"kept", "x", "y"}));
 }
 
-TEST(FormatNumbers, DecimalOf32BitValues) {
+TEST(FormatNumbers, DecimalOf32BitValues)
+{
     EXPECT_EQ(formatSigned(0), "0");
     EXPECT_EQ(formatSigned(-1), "-1");
     EXPECT_EQ(formatSigned(std::numeric_limits<std::int32_t>::min()), "-2147483648");

@@ -10,7 +10,8 @@ TEST_F(Zelctl, ServicesAndRegistrations)
     ASSERT_EQ(ann({"repo", "create", "demo"}).status, 0);
     ASSERT_EQ(ann({"item", "put", "demo", local("greet.zlw")}).status, 0);
     EXPECT_EQ(annJson({"service", "create", "svc", "--display-name", "Service", "--description", "first",
-                       "--workspace-registration", "true"})["created"], true);
+                       "--workspace-registration", "true"})["created"],
+              true);
     nlohmann::json shown = annJson({"service", "show", "svc"});
     EXPECT_EQ(shown["display name"], "Service");
     EXPECT_EQ(shown["description"], "first");

@@ -22,8 +22,8 @@ TEST_F(Jobs, RunSubmitWaitResultAndLog)
     EXPECT_EQ(run["status"], "SUCCESS");
     EXPECT_GT(run["id"].get<unsigned>(), 0u);
 
-    const Outcome submitted = ann({"job", "submit", "zeljob", "demo", "greet.zlw", "-p", "WHO=World",
-                                   "-d", "PRIORITY=50", "--notify", "done=ok"});
+    const Outcome submitted = ann({"job", "submit", "zeljob", "demo", "greet.zlw", "-p", "WHO=World", "-d",
+                                   "PRIORITY=50", "--notify", "done=ok"});
     ASSERT_EQ(submitted.status, 0) << submitted.err;
     const std::string id = submitted.out.substr(0, submitted.out.find('\n'));
     ASSERT_FALSE(id.empty());

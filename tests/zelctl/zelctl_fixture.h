@@ -18,17 +18,15 @@
 
 namespace zeltest {
 
-inline const char* kZelctlConfig =
-    "[user ann]\npassword = pw-ann\nroles = admin\n"
-    "[user bob]\npassword = pw-bob\nroles = viewer\n"
-    "[sharedresource DATA]\npath = shared\n";
+inline const char* kZelctlConfig = "[user ann]\npassword = pw-ann\nroles = admin\n"
+                                   "[user bob]\npassword = pw-bob\nroles = viewer\n"
+                                   "[sharedresource DATA]\npath = shared\n";
 
-inline const char* kGreeter =
-    "#!/bin/sh\n"
-    "# @title Greeter\n"
-    "# @description Says hello\n"
-    "# @parameter WHO | TEXT | nobody | Whom to greet\n"
-    "echo \"Hello $WHO\"\n";
+inline const char* kGreeter = "#!/bin/sh\n"
+                              "# @title Greeter\n"
+                              "# @description Says hello\n"
+                              "# @parameter WHO | TEXT | nobody | Whom to greet\n"
+                              "echo \"Hello $WHO\"\n";
 
 struct Outcome {
     int status = -1;
@@ -68,8 +66,8 @@ protected:
     // `environment` is put before the command for the child alone.
     Outcome raw(const std::vector<std::string>& arguments, const std::string& environment = "")
     {
-        std::string command = "cd " + quoted(server->directory()) + " && " + environment + " " + quoted(ZEL_TEST_ZELCTL) +
-                              " --port " + std::to_string(server->port());
+        std::string command = "cd " + quoted(server->directory()) + " && " + environment + " " +
+                              quoted(ZEL_TEST_ZELCTL) + " --port " + std::to_string(server->port());
         for (const std::string& argument : arguments)
             command += " " + quoted(argument);
         command += " > " + quoted(local("zelctl.out")) + " 2> " + quoted(local("zelctl.err")) + " < /dev/null";

@@ -12,7 +12,8 @@ namespace {
 // Adds one row per item of one kind. Workspaces, custom formats, custom transformers and
 // templates share their getters, so one template reads all four.
 template <typename Item, typename Create, typename Destroy, typename View>
-Outcome collect(Context& context, const char* kind, Create create, Destroy destroy, View view, nlohmann::ordered_json& rows)
+Outcome collect(Context& context, const char* kind, Create create, Destroy destroy, View view,
+                nlohmann::ordered_json& rows)
 {
     IZELServerVector<Item>* items = create();
     if (items == nullptr)
@@ -54,8 +55,8 @@ Outcome list(Context& context, const std::string& name)
     if (!failure)
         failure = collect<IZELServerTemplate>(
             context, "template", [&] { return session.createTemplateVector(); },
-            [&](auto* v) { session.destroyTemplateVector(&v); }, [&](auto& v) { return r.getTemplatesView(nullptr, v); },
-            rows);
+            [&](auto* v) { session.destroyTemplateVector(&v); },
+            [&](auto& v) { return r.getTemplatesView(nullptr, v); }, rows);
     if (!failure)
         context.output.print(rows);
     return failure;
@@ -72,10 +73,9 @@ Outcome get(Context& context, const std::string& name, const std::string& item, 
     Connection& c = context.connection;
     ProgressBar bar(resource.empty() ? item : resource, !context.output.quiet());
     unsigned received = 0;
-    IZELServerStatus* status =
-        resource.empty()
-            ? repository.get().getItem(c.text(item), c.text(file), received, &bar)
-            : repository.get().getItemResource(c.text(item), c.text(resource), c.text(file), received, &bar);
+    IZELServerStatus* status = resource.empty() ? repository.get().getItem(c.text(item), c.text(file), received, &bar)
+                                                : repository.get().getItemResource(c.text(item), c.text(resource),
+                                                                                   c.text(file), received, &bar);
     if (Outcome failure = c.check(status))
         return failure;
     if (!received)
@@ -97,7 +97,8 @@ Outcome put(Context& context, const std::string& name, const std::string& item, 
     ProgressBar bar(target, !context.output.quiet());
     IZELServerStatus* status = nullptr;
     if (item.empty())
-        status = update ? r.updateItem(c.text(target), c.text(file), &bar) : r.addItem(c.text(target), c.text(file), &bar);
+        status =
+            update ? r.updateItem(c.text(target), c.text(file), &bar) : r.addItem(c.text(target), c.text(file), &bar);
     else
         status = update ? r.updateItemResource(c.text(item), c.text(target), c.text(file), &bar)
                         : r.addItemResource(c.text(item), c.text(target), c.text(file), &bar);
@@ -114,8 +115,9 @@ Outcome remove(Context& context, const std::string& name, const std::string& ite
         return failure;
     Connection& c = context.connection;
     unsigned removed = 0;
-    IZELServerStatus* status = resource.empty() ? repository.get().removeItem(c.text(item), removed)
-                                                : repository.get().removeItemResource(c.text(item), c.text(resource), removed);
+    IZELServerStatus* status = resource.empty()
+                                   ? repository.get().removeItem(c.text(item), removed)
+                                   : repository.get().removeItemResource(c.text(item), c.text(resource), removed);
     if (Outcome failure = c.check(status))
         return failure;
     const std::string what = resource.empty() ? item : resource;
@@ -134,13 +136,15 @@ Outcome resources(Context& context, const std::string& name, const std::string& 
     IZELServerVector<IZELServerResource>* list = session.createResourceVector();
     if (list == nullptr)
         return complaint("out of memory for the list");
-    Outcome failure = context.connection.check(repository.get().getItemResourcesView(context.connection.text(item), nullptr, *list));
+    Outcome failure =
+        context.connection.check(repository.get().getItemResourcesView(context.connection.text(item), nullptr, *list));
     nlohmann::ordered_json rows = nlohmann::ordered_json::array();
     for (unsigned i = 0; !failure && i < list->entries(); ++i) {
         const IZELServerResource& resource = *list->element(i);
-        rows.push_back({{"name", context.connection.read([&](IZELServerString& out) { resource.getName(out); })},
-                        {"description", context.connection.read([&](IZELServerString& out) { resource.getDescription(out); })},
-                        {"size", resource.getFileSize()}});
+        rows.push_back(
+            {{"name", context.connection.read([&](IZELServerString& out) { resource.getName(out); })},
+             {"description", context.connection.read([&](IZELServerString& out) { resource.getDescription(out); })},
+             {"size", resource.getFileSize()}});
     }
     session.destroyResourceVector(&list);
     if (!failure)

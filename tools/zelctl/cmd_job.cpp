@@ -25,10 +25,7 @@ std::string statusWord(unsigned code)
 }
 
 // A job is still going while its code is one of SUBMITTED through IN_PROCESS.
-bool stillGoing(unsigned code)
-{
-    return code <= 4;
-}
+bool stillGoing(unsigned code) { return code <= 4; }
 
 struct RequestArguments {
     std::string service;
@@ -63,9 +60,9 @@ public:
 
     Outcome build(const RequestArguments& arguments)
     {
-        request_ = connection_.session().createTransformationRequest(
-            connection_.text(arguments.service), connection_.text(arguments.repository),
-            connection_.text(arguments.workspace));
+        request_ = connection_.session().createTransformationRequest(connection_.text(arguments.service),
+                                                                     connection_.text(arguments.repository),
+                                                                     connection_.text(arguments.workspace));
         if (request_ == nullptr)
             return complaint("out of memory for the job request");
         using Setter = void (IZELServerTransformationRequest::*)(const IZELServerString&, const IZELServerString&);
@@ -121,13 +118,13 @@ nlohmann::ordered_json describe(Connection& connection, const IZELServerTransfor
         return connection.read([&](IZELServerString& out) { (result.*getter)(out); });
     };
     nlohmann::ordered_json json = {{"id", id},
-                           {"status", hasCode ? statusWord(code) : ""},
-                           {"success", result.isSuccess() != 0},
-                           {"message", text(&IZELServerTransformationResult::getStatusMessage)},
-                           {"result", text(&IZELServerTransformationResult::getResult)},
-                           {"requested", text(&IZELServerTransformationResult::getTimeRequested)},
-                           {"started", text(&IZELServerTransformationResult::getTimeStarted)},
-                           {"finished", text(&IZELServerTransformationResult::getTimeFinished)}};
+                                   {"status", hasCode ? statusWord(code) : ""},
+                                   {"success", result.isSuccess() != 0},
+                                   {"message", text(&IZELServerTransformationResult::getStatusMessage)},
+                                   {"result", text(&IZELServerTransformationResult::getResult)},
+                                   {"requested", text(&IZELServerTransformationResult::getTimeRequested)},
+                                   {"started", text(&IZELServerTransformationResult::getTimeStarted)},
+                                   {"finished", text(&IZELServerTransformationResult::getTimeFinished)}};
     return json;
 }
 
@@ -138,7 +135,8 @@ Outcome submit(Context& context, const RequestArguments& arguments, const unsign
         return failure;
     IZELServerTransformationManager* jobs = context.connection.session().getTransformationManager();
     unsigned id = 0;
-    IZELServerStatus* status = delay ? jobs->scheduleJob(request.get(), *delay, id) : jobs->submitJob(request.get(), id);
+    IZELServerStatus* status =
+        delay ? jobs->scheduleJob(request.get(), *delay, id) : jobs->submitJob(request.get(), id);
     if (Outcome failure = context.connection.check(status))
         return failure;
     if (context.output.json())
@@ -253,7 +251,8 @@ void addJobCommands(CLI::App& app, Action& chosen)
     auto* scheduleCommand = job->add_subcommand("schedule", "Submit a job to start SECONDS from now");
     scheduleCommand->add_option("SECONDS", *delay, "Delay in seconds")->required();
     addRequestOptions(scheduleCommand, *scheduleArguments);
-    on(scheduleCommand, chosen, [scheduleArguments, delay](Context& c) { return submit(c, *scheduleArguments, delay.get()); });
+    on(scheduleCommand, chosen,
+       [scheduleArguments, delay](Context& c) { return submit(c, *scheduleArguments, delay.get()); });
 
     auto id = std::make_shared<unsigned>(0);
     auto* abortCommand = job->add_subcommand("abort", "Abort a job");

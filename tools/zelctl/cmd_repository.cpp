@@ -71,8 +71,9 @@ Outcome create(Context& context, const std::string& name, const std::string& des
 Outcome remove(Context& context, const std::string& name)
 {
     unsigned removed = 0;
-    if (Outcome failure = context.connection.check(
-            context.connection.session().getRepositoryManager()->removeRepository(context.connection.text(name), removed)))
+    if (Outcome failure =
+            context.connection.check(context.connection.session().getRepositoryManager()->removeRepository(
+                context.connection.text(name), removed)))
         return failure;
     if (!removed)
         return complaint("no repository '" + name + "'");

@@ -34,8 +34,8 @@ public:
         if (service_ == nullptr)
             return complaint("out of memory for the service");
         unsigned found = 0;
-        if (Outcome failure = connection.check(
-                session_.getRepositoryManager()->getService(connection.text(name), *service_, found)))
+        if (Outcome failure =
+                connection.check(session_.getRepositoryManager()->getService(connection.text(name), *service_, found)))
             return failure;
         if (!found)
             return complaint("no service '" + name + "'");
@@ -123,8 +123,9 @@ void apply(Connection& connection, const Arguments& a, IZELServerService& servic
 Outcome create(Context& context, const Arguments& a)
 {
     Connection& c = context.connection;
-    IZELServerService* service = c.session().createService(c.text(a.name), c.text(a.displayName.value_or(a.name)),
-                                                           c.text(a.description.value_or("")), c.text(a.urlPattern.value_or("")));
+    IZELServerService* service =
+        c.session().createService(c.text(a.name), c.text(a.displayName.value_or(a.name)),
+                                  c.text(a.description.value_or("")), c.text(a.urlPattern.value_or("")));
     if (service == nullptr)
         return complaint("out of memory for the service");
     apply(c, a, *service);
@@ -141,7 +142,8 @@ Outcome update(Context& context, const Arguments& a)
     if (Outcome failure = service.fetch(context.connection, a.name))
         return failure;
     apply(context.connection, a, service.get());
-    if (Outcome failure = context.connection.check(context.connection.session().getRepositoryManager()->updateService(service.get())))
+    if (Outcome failure =
+            context.connection.check(context.connection.session().getRepositoryManager()->updateService(service.get())))
         return failure;
     context.output.confirm({{"service", a.name}, {"updated", true}});
     return std::nullopt;
@@ -172,7 +174,10 @@ Outcome registration(Context& context, const Arguments& a, bool add)
         return failure;
     if (!add && !deregistered)
         return complaint("'" + a.item + "' is not registered with '" + a.name + "'");
-    context.output.confirm({{"service", a.name}, {"repository", a.repository}, {"item", a.item}, {add ? "registered" : "deregistered", true}});
+    context.output.confirm({{"service", a.name},
+                            {"repository", a.repository},
+                            {"item", a.item},
+                            {add ? "registered" : "deregistered", true}});
     return std::nullopt;
 }
 

@@ -76,9 +76,10 @@ Outcome resources(Context& context)
     nlohmann::ordered_json rows = nlohmann::ordered_json::array();
     for (unsigned i = 0; !failure && i < areas->entries(); ++i) {
         const IZELServerMountPoint& area = *areas->element(i);
-        rows.push_back({{"name", context.connection.read([&](IZELServerString& out) { area.getName(out); })},
-                        {"display name", context.connection.read([&](IZELServerString& out) { area.getDisplayName(out); })},
-                        {"description", context.connection.read([&](IZELServerString& out) { area.getDescription(out); })}});
+        rows.push_back(
+            {{"name", context.connection.read([&](IZELServerString& out) { area.getName(out); })},
+             {"display name", context.connection.read([&](IZELServerString& out) { area.getDisplayName(out); })},
+             {"description", context.connection.read([&](IZELServerString& out) { area.getDescription(out); })}});
     }
     session.destroyMountPointVector(&areas);
     if (!failure)
@@ -159,7 +160,8 @@ Outcome download(Context& context, const Arguments& a)
         return complaint("name the local file with -o");
     ProgressBar bar(file, !context.output.quiet());
     unsigned received = 0;
-    if (Outcome failure = context.connection.check(area.get().download(area.path(a.path), context.connection.text(file), received, &bar)))
+    if (Outcome failure = context.connection.check(
+            area.get().download(area.path(a.path), context.connection.text(file), received, &bar)))
         return failure;
     if (!received)
         return complaint("nothing received for '" + a.path + "'");
@@ -173,7 +175,8 @@ Outcome upload(Context& context, const Arguments& a)
     if (Outcome failure = area.open(a.resource))
         return failure;
     ProgressBar bar(a.file, !context.output.quiet());
-    if (Outcome failure = context.connection.check(area.get().upload(context.connection.text(a.file), area.path(a.path), &bar)))
+    if (Outcome failure =
+            context.connection.check(area.get().upload(context.connection.text(a.file), area.path(a.path), &bar)))
         return failure;
     context.output.confirm({{"resource", a.resource}, {"path", a.path}, {"file", a.file}});
     return std::nullopt;
@@ -200,13 +203,15 @@ void addSharedResourceCommands(CLI::App& app, Action& chosen)
     on(statCommand, chosen, [a](Context& c) { return stat(c, *a); });
 
     for (const char* what : {"mkdir", "rm"}) {
-        auto* command = sr->add_subcommand(what, std::string(what) == "rm" ? "Remove a file or folder" : "Make a folder");
+        auto* command =
+            sr->add_subcommand(what, std::string(what) == "rm" ? "Remove a file or folder" : "Make a folder");
         command->add_option("RESOURCE", a->resource)->required();
         command->add_option("PATH", a->path)->required();
         on(command, chosen, [a, what](Context& c) { return change(c, *a, what); });
     }
     for (const char* what : {"cp", "mv"}) {
-        auto* command = sr->add_subcommand(what, std::string(what) == "cp" ? "Copy within the resource" : "Move within the resource");
+        auto* command = sr->add_subcommand(what, std::string(what) == "cp" ? "Copy within the resource"
+                                                                           : "Move within the resource");
         command->add_option("RESOURCE", a->resource)->required();
         command->add_option("SOURCE", a->path)->required();
         command->add_option("TARGET", a->target)->required();

@@ -30,10 +30,7 @@ private:
     IZELServerUserToken* token_;
 };
 
-IZELServerSecurityManager* security(Context& context)
-{
-    return context.connection.session().getSecurityManager();
-}
+IZELServerSecurityManager* security(Context& context) { return context.connection.session().getSecurityManager(); }
 
 Outcome show(Context& context, const std::string& account)
 {
@@ -76,7 +73,8 @@ Outcome set(Context& context, const Arguments& a)
 Outcome remove(Context& context, const std::string& account)
 {
     bool removed = false;
-    if (Outcome failure = context.connection.check(security(context)->removeUserToken(context.connection.text(account), removed)))
+    if (Outcome failure =
+            context.connection.check(security(context)->removeUserToken(context.connection.text(account), removed)))
         return failure;
     if (!removed)
         return complaint("no token for '" + account + "'");
@@ -87,7 +85,8 @@ Outcome remove(Context& context, const std::string& account)
 Outcome expired(Context& context, const std::string& account)
 {
     bool isExpired = false;
-    if (Outcome failure = context.connection.check(security(context)->userTokenExpired(context.connection.text(account), isExpired)))
+    if (Outcome failure =
+            context.connection.check(security(context)->userTokenExpired(context.connection.text(account), isExpired)))
         return failure;
     context.output.print({{"account", account}, {"expired", isExpired}});
     return std::nullopt;

@@ -108,17 +108,16 @@ Outcome show(Context& context, const std::string& name, const std::string& works
         failure = complaint("no workspace '" + workspaceName + "' in '" + name + "'");
     if (!failure) {
         IZELServerWorkspace& w = *workspace;
-        context.output.print(
-            {{"name", c.read([&](IZELServerString& out) { w.getName(out); })},
-             {"title", c.read([&](IZELServerString& out) { w.getTitle(out); })},
-             {"description", c.read([&](IZELServerString& out) { w.getDescription(out); })},
-             {"enabled", w.isEnabled()},
-             {"size", w.getFileSize()},
-             {"parameters", parameters(c, w.getParameters())},
-             {"source datasets", datasets(c, w.getSourceDatasets())},
-             {"destination datasets", datasets(c, w.getDestinationDatasets())},
-             {"source feature types", featureTypes(c, w.getSourceFeatureTypes())},
-             {"destination feature types", featureTypes(c, w.getDestinationFeatureTypes())}});
+        context.output.print({{"name", c.read([&](IZELServerString& out) { w.getName(out); })},
+                              {"title", c.read([&](IZELServerString& out) { w.getTitle(out); })},
+                              {"description", c.read([&](IZELServerString& out) { w.getDescription(out); })},
+                              {"enabled", w.isEnabled()},
+                              {"size", w.getFileSize()},
+                              {"parameters", parameters(c, w.getParameters())},
+                              {"source datasets", datasets(c, w.getSourceDatasets())},
+                              {"destination datasets", datasets(c, w.getDestinationDatasets())},
+                              {"source feature types", featureTypes(c, w.getSourceFeatureTypes())},
+                              {"destination feature types", featureTypes(c, w.getDestinationFeatureTypes())}});
     }
     c.session().destroyWorkspace(&workspace);
     return failure;

@@ -35,9 +35,6 @@ inline void on(CLI::App* command, Action& chosen, Action action)
 }
 
 // The client's own complaint, with no message number.
-inline Failure complaint(const std::string& text)
-{
-    return Failure{0, text};
-}
+inline Failure complaint(const std::string& text) { return Failure{0, text}; }
 
 }  // namespace zelctl

@@ -2,10 +2,7 @@
 
 namespace zelctl {
 
-Connection::Connection(const GlobalOptions& options) : options_(options)
-{
-    ZEL_createServerSession(&session_);
-}
+Connection::Connection(const GlobalOptions& options) : options_(options) { ZEL_createServerSession(&session_); }
 
 Connection::~Connection()
 {

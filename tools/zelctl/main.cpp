@@ -27,8 +27,12 @@ int run(int argc, char** argv)
     GlobalOptions options;
     if (const char* password = std::getenv("ZEL_PASSWORD"))
         options.password = password;
-    app.add_option("--host", options.host, "Server host")->capture_default_str()->multi_option_policy(CLI::MultiOptionPolicy::TakeLast);
-    app.add_option("--port", options.port, "Server port")->capture_default_str()->multi_option_policy(CLI::MultiOptionPolicy::TakeLast);
+    app.add_option("--host", options.host, "Server host")
+        ->capture_default_str()
+        ->multi_option_policy(CLI::MultiOptionPolicy::TakeLast);
+    app.add_option("--port", options.port, "Server port")
+        ->capture_default_str()
+        ->multi_option_policy(CLI::MultiOptionPolicy::TakeLast);
     app.add_option("--user", options.user, "User name");
     app.add_option("--password", options.password, "Password (better: the environment variable ZEL_PASSWORD)");
     app.add_option("--token", options.token, "Sign in with this user token");

@@ -101,7 +101,8 @@ void Output::table(const nlohmann::ordered_json& rows, const std::string& indent
     std::vector<std::string> upper;
     for (const std::string& column : columns) {
         std::string heading = column;
-        std::transform(heading.begin(), heading.end(), heading.begin(), [](unsigned char c) { return std::toupper(c); });
+        std::transform(heading.begin(), heading.end(), heading.begin(),
+                       [](unsigned char c) { return std::toupper(c); });
         upper.push_back(heading);
     }
     line([&](std::size_t i) { return upper[i]; });

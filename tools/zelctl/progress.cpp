@@ -19,7 +19,8 @@ bool stderrIsTerminal()
 #endif
 }
 
-ProgressBar::ProgressBar(const std::string& label, bool wanted) : label_(label), active_(wanted && stderrIsTerminal()) {}
+ProgressBar::ProgressBar(const std::string& label, bool wanted) : label_(label), active_(wanted && stderrIsTerminal())
+{}
 
 void ProgressBar::start()
 {
@@ -27,10 +28,7 @@ void ProgressBar::start()
     draw(0);
 }
 
-void ProgressBar::position(unsigned bytesSoFar)
-{
-    draw(bytesSoFar);
-}
+void ProgressBar::position(unsigned bytesSoFar) { draw(bytesSoFar); }
 
 void ProgressBar::finish()
 {

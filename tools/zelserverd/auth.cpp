@@ -27,80 +27,101 @@ constexpr std::uint32_t kAuthorRights = kUserRights | kRightRepositoryWrite;
 
 }  // namespace
 
-std::optional<std::uint32_t> rightFromName(std::string_view name) {
-  for (const auto& [text, right] : kRightNames)
-    if (text == name) return right;
-  return std::nullopt;
+std::optional<std::uint32_t> rightFromName(std::string_view name)
+{
+    for (const auto& [text, right] : kRightNames)
+        if (text == name)
+            return right;
+    return std::nullopt;
 }
 
-std::optional<std::uint32_t> builtInRoleRights(std::string_view role) {
-  if (role == "admin") return kRightAll;
-  if (role == "author") return kAuthorRights;
-  if (role == "user") return kUserRights;
-  if (role == "viewer") return kViewerRights;
-  return std::nullopt;
+std::optional<std::uint32_t> builtInRoleRights(std::string_view role)
+{
+    if (role == "admin")
+        return kRightAll;
+    if (role == "author")
+        return kAuthorRights;
+    if (role == "user")
+        return kUserRights;
+    if (role == "viewer")
+        return kViewerRights;
+    return std::nullopt;
 }
 
-std::uint32_t rightsOfRoles(const Config& config, const std::vector<std::string>& roles) {
-  std::uint32_t rights = 0;
-  for (const auto& role : roles) {
-    auto defined = config.roleRights.find(role);
-    if (defined != config.roleRights.end()) {
-      for (const auto& name : defined->second) rights |= rightFromName(name).value_or(0);
-    } else {
-      rights |= builtInRoleRights(role).value_or(0);
+std::uint32_t rightsOfRoles(const Config& config, const std::vector<std::string>& roles)
+{
+    std::uint32_t rights = 0;
+    for (const auto& role : roles) {
+        auto defined = config.roleRights.find(role);
+        if (defined != config.roleRights.end()) {
+            for (const auto& name : defined->second)
+                rights |= rightFromName(name).value_or(0);
+        } else {
+            rights |= builtInRoleRights(role).value_or(0);
+        }
     }
-  }
-  return rights;
+    return rights;
 }
 
-SignInOutcome Authenticator::signIn(const Request& request, const std::string& peer) const {
-  if (const std::string* token = request.find("userToken")) return withToken(*token, peer);
-  if (const std::string* sso = request.find("ssoAuthData")) return withSingleSignOn(*sso);
-  const std::string* user = request.find("userID");
-  const std::string* password = request.find("userPassword");
-  if (!user || !password) return {std::nullopt, "no credentials were given"};
-  return withPassword(*user, *password);
+SignInOutcome Authenticator::signIn(const Request& request, const std::string& peer) const
+{
+    if (const std::string* token = request.find("userToken"))
+        return withToken(*token, peer);
+    if (const std::string* sso = request.find("ssoAuthData"))
+        return withSingleSignOn(*sso);
+    const std::string* user = request.find("userID");
+    const std::string* password = request.find("userPassword");
+    if (!user || !password)
+        return {std::nullopt, "no credentials were given"};
+    return withPassword(*user, *password);
 }
 
-Principal Authenticator::principalFor(const UserConfig& user) const {
-  return Principal{user.name, user.roles, rightsOfRoles(config_, user.roles), false, {}};
+Principal Authenticator::principalFor(const UserConfig& user) const
+{
+    return Principal{user.name, user.roles, rightsOfRoles(config_, user.roles), false, {}};
 }
 
-SignInOutcome Authenticator::withPassword(const std::string& name,
-                                          const std::string& password) const {
-  const UserConfig* user = config_.findUser(name);
-  // Unknown user and wrong password read the same, so the reply does not confirm account names.
-  if (!user || !constantTimeEquals(user->password, password))
-    return {std::nullopt, "invalid user name or password"};
-  return {principalFor(*user), {}};
+SignInOutcome Authenticator::withPassword(const std::string& name, const std::string& password) const
+{
+    const UserConfig* user = config_.findUser(name);
+    // Unknown user and wrong password read the same, so the reply does not confirm account names.
+    if (!user || !constantTimeEquals(user->password, password))
+        return {std::nullopt, "invalid user name or password"};
+    return {principalFor(*user), {}};
 }
 
-SignInOutcome Authenticator::withToken(const std::string& token,
-                                       const std::string& peer) const {
-  if (token.empty() || !tokens_) return {std::nullopt, "invalid user token"};
-  std::optional<UserToken> found = tokens_->findByToken(token);
-  if (!found) return {std::nullopt, "invalid user token"};
-  if (found->expired(nowSeconds())) return {std::nullopt, "user token has expired"};
-  if (!found->clientAddress.empty() && !clientAddressMatches(found->clientAddress, peer))
-    return {std::nullopt, "user token is not valid from this address"};
-  const UserConfig* user = config_.findUser(found->account);
-  if (!user) return {std::nullopt, "user token belongs to an unknown account"};
-  tokens_->touch(found->account);
-  return {principalFor(*user), {}};
+SignInOutcome Authenticator::withToken(const std::string& token, const std::string& peer) const
+{
+    if (token.empty() || !tokens_)
+        return {std::nullopt, "invalid user token"};
+    std::optional<UserToken> found = tokens_->findByToken(token);
+    if (!found)
+        return {std::nullopt, "invalid user token"};
+    if (found->expired(nowSeconds()))
+        return {std::nullopt, "user token has expired"};
+    if (!found->clientAddress.empty() && !clientAddressMatches(found->clientAddress, peer))
+        return {std::nullopt, "user token is not valid from this address"};
+    const UserConfig* user = config_.findUser(found->account);
+    if (!user)
+        return {std::nullopt, "user token belongs to an unknown account"};
+    tokens_->touch(found->account);
+    return {principalFor(*user), {}};
 }
 
-SignInOutcome Authenticator::withSingleSignOn(const std::string& data) const {
-  if (config_.ssoSecret.empty()) return {std::nullopt, "single sign-on is not enabled"};
-  std::size_t colon = data.find(':');
-  if (colon == std::string::npos) return {std::nullopt, "malformed single sign-on data"};
-  const UserConfig* user = config_.findUser(data.substr(0, colon));
-  if (!user || !constantTimeEquals(data.substr(colon + 1), config_.ssoSecret))
-    return {std::nullopt, "single sign-on data was not accepted"};
-  Principal principal = principalFor(*user);
-  principal.singleSignOn = true;
-  principal.ssoAuthData = randomHex(16);
-  return {std::move(principal), {}};
+SignInOutcome Authenticator::withSingleSignOn(const std::string& data) const
+{
+    if (config_.ssoSecret.empty())
+        return {std::nullopt, "single sign-on is not enabled"};
+    std::size_t colon = data.find(':');
+    if (colon == std::string::npos)
+        return {std::nullopt, "malformed single sign-on data"};
+    const UserConfig* user = config_.findUser(data.substr(0, colon));
+    if (!user || !constantTimeEquals(data.substr(colon + 1), config_.ssoSecret))
+        return {std::nullopt, "single sign-on data was not accepted"};
+    Principal principal = principalFor(*user);
+    principal.singleSignOn = true;
+    principal.ssoAuthData = randomHex(16);
+    return {std::move(principal), {}};
 }
 
 }  // namespace zelserverd

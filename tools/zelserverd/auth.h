@@ -17,15 +17,15 @@ namespace zelserverd {
 class TokenStore;
 
 enum Right : std::uint32_t {
-  kRightJobs = 1u << 0,
-  kRightRepositoryRead = 1u << 1,
-  kRightRepositoryWrite = 1u << 2,
-  kRightRepositoryAdmin = 1u << 3,
-  kRightTokens = 1u << 4,       // the user's own token
-  kRightTokensAdmin = 1u << 5,  // anyone's token
-  kRightSharedRead = 1u << 6,
-  kRightSharedWrite = 1u << 7,
-  kRightAll = (1u << 8) - 1,
+    kRightJobs = 1u << 0,
+    kRightRepositoryRead = 1u << 1,
+    kRightRepositoryWrite = 1u << 2,
+    kRightRepositoryAdmin = 1u << 3,
+    kRightTokens = 1u << 4,       // the user's own token
+    kRightTokensAdmin = 1u << 5,  // anyone's token
+    kRightSharedRead = 1u << 6,
+    kRightSharedWrite = 1u << 7,
+    kRightAll = (1u << 8) - 1,
 };
 
 std::optional<std::uint32_t> rightFromName(std::string_view name);
@@ -33,31 +33,31 @@ std::optional<std::uint32_t> builtInRoleRights(std::string_view role);
 std::uint32_t rightsOfRoles(const Config& config, const std::vector<std::string>& roles);
 
 struct Principal {
-  std::string user;
-  std::vector<std::string> roles;
-  std::uint32_t rights = 0;
-  bool singleSignOn = false;
-  std::string ssoAuthData;
+    std::string user;
+    std::vector<std::string> roles;
+    std::uint32_t rights = 0;
+    bool singleSignOn = false;
+    std::string ssoAuthData;
 };
 
 struct SignInOutcome {
-  std::optional<Principal> principal;
-  std::string error;  // without the "Authentication Error: " prefix
+    std::optional<Principal> principal;
+    std::string error;  // without the "Authentication Error: " prefix
 };
 
 class Authenticator {
- public:
-  Authenticator(const Config& config, TokenStore* tokens) : config_(config), tokens_(tokens) {}
-  SignInOutcome signIn(const Request& request, const std::string& peerAddress) const;
+public:
+    Authenticator(const Config& config, TokenStore* tokens) : config_(config), tokens_(tokens) {}
+    SignInOutcome signIn(const Request& request, const std::string& peerAddress) const;
 
- private:
-  SignInOutcome withPassword(const std::string& user, const std::string& password) const;
-  SignInOutcome withToken(const std::string& token, const std::string& peerAddress) const;
-  SignInOutcome withSingleSignOn(const std::string& data) const;
-  Principal principalFor(const UserConfig& user) const;
+private:
+    SignInOutcome withPassword(const std::string& user, const std::string& password) const;
+    SignInOutcome withToken(const std::string& token, const std::string& peerAddress) const;
+    SignInOutcome withSingleSignOn(const std::string& data) const;
+    Principal principalFor(const UserConfig& user) const;
 
-  const Config& config_;
-  TokenStore* tokens_;
+    const Config& config_;
+    TokenStore* tokens_;
 };
 
 }  // namespace zelserverd

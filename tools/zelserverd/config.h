@@ -16,39 +16,39 @@ constexpr std::string_view kDefaultJobService = "zeljob";
 constexpr std::string_view kDefaultSharedResource = "DEFAULT";
 
 struct UserConfig {
-  std::string name;
-  std::string password;
-  std::vector<std::string> roles;
+    std::string name;
+    std::string password;
+    std::vector<std::string> roles;
 };
 
 struct SharedResourceConfig {
-  std::string name;
-  std::string path;  // absolute after loading
-  std::string displayName;
-  std::string description;
+    std::string name;
+    std::string path;  // absolute after loading
+    std::string displayName;
+    std::string description;
 };
 
 struct JobServiceConfig {
-  std::string name;
-  std::string description;
+    std::string name;
+    std::string description;
 };
 
 struct Config {
-  std::string listenHost = "127.0.0.1";
-  std::uint16_t listenPort = kDefaultPort;
-  unsigned workers = 2;
-  std::uint32_t maxRequestBytes = kDefaultMaxRequestBytes;
-  std::uint64_t maxFileBytes = UINT32_MAX;
-  unsigned jobTimeoutSeconds = 0;  // 0: no limit
-  std::string ssoSecret;           // empty: single sign-on refused
-  std::map<std::string, std::vector<std::string>> roleRights;  // roles the file defines
-  std::vector<UserConfig> users;
-  std::vector<SharedResourceConfig> sharedResources;
-  std::vector<JobServiceConfig> jobServices;
+    std::string listenHost = "127.0.0.1";
+    std::uint16_t listenPort = kDefaultPort;
+    unsigned workers = 2;
+    std::uint32_t maxRequestBytes = kDefaultMaxRequestBytes;
+    std::uint64_t maxFileBytes = UINT32_MAX;
+    unsigned jobTimeoutSeconds = 0;                              // 0: no limit
+    std::string ssoSecret;                                       // empty: single sign-on refused
+    std::map<std::string, std::vector<std::string>> roleRights;  // roles the file defines
+    std::vector<UserConfig> users;
+    std::vector<SharedResourceConfig> sharedResources;
+    std::vector<JobServiceConfig> jobServices;
 
-  const UserConfig* findUser(std::string_view name) const;
-  const SharedResourceConfig* findSharedResource(std::string_view name) const;
-  const JobServiceConfig* findJobService(std::string_view name) const;
+    const UserConfig* findUser(std::string_view name) const;
+    const SharedResourceConfig* findSharedResource(std::string_view name) const;
+    const JobServiceConfig* findJobService(std::string_view name) const;
 };
 
 // Parses the text of a configuration file. Relative shared resource paths are taken from

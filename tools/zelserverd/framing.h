@@ -25,12 +25,12 @@ std::uint32_t decodeLength(const unsigned char prefix[4]);
 // One parsed command: the keyword and its named values in wire order. A name may occur more than
 // once (the result-port exchange sends "requesterResultPort" twice); lookups take the first.
 struct Request {
-  std::string keyword;
-  std::vector<std::pair<std::string, std::string>> values;
+    std::string keyword;
+    std::vector<std::pair<std::string, std::string>> values;
 
-  const std::string* find(std::string_view name) const;
-  std::string get(std::string_view name, std::string_view fallback = {}) const;
-  std::vector<std::string> all(std::string_view name) const;
+    const std::string* find(std::string_view name) const;
+    std::string get(std::string_view name, std::string_view fallback = {}) const;
+    std::vector<std::string> all(std::string_view name) const;
 };
 
 // Parses "APIVERSION=1" NUL keyword {NUL name "=" value}. Returns an explanation on failure.
@@ -42,20 +42,20 @@ bool isAck(std::string_view payload);
 
 std::string fileHeaderPayload(std::uint64_t length, std::uint32_t crc);
 struct FileHeader {
-  std::uint64_t length = 0;
-  std::uint32_t crc = 0;
+    std::uint64_t length = 0;
+    std::uint32_t crc = 0;
 };
 // Strict: "fileLength=" decimal NUL "fileCRC=" decimal, the length within 32 bits.
 std::optional<FileHeader> parseFileHeader(std::string_view payload);
 
 // CRC-32 of IEEE 802.3 (reflected 0xEDB88320, initial and final complement), fed in pieces.
 class Crc32 {
- public:
-  void update(const void* data, std::size_t size);
-  std::uint32_t value() const { return ~state_; }
+public:
+    void update(const void* data, std::size_t size);
+    std::uint32_t value() const { return ~state_; }
 
- private:
-  std::uint32_t state_ = 0xFFFFFFFFu;
+private:
+    std::uint32_t state_ = 0xFFFFFFFFu;
 };
 
 }  // namespace zelserverd

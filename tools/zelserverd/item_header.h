@@ -15,49 +15,49 @@ namespace zelserverd {
 constexpr std::size_t kMaxHeaderBytes = 65536;
 
 struct HeaderParameter {
-  std::string name;  // a shell identifier: it becomes an environment variable of the job
-  std::string type = "TEXT";
-  std::string defaultValue;
-  std::string description;
-  std::string optionsType;
-  std::string options;  // choices separated by "%"
+    std::string name;  // a shell identifier: it becomes an environment variable of the job
+    std::string type = "TEXT";
+    std::string defaultValue;
+    std::string description;
+    std::string optionsType;
+    std::string options;  // choices separated by "%"
 };
 
 struct HeaderAttribute {
-  std::string name;
-  std::string type;
-  std::uint32_t width = 0;
-  std::uint32_t decimals = 0;
+    std::string name;
+    std::string type;
+    std::uint32_t width = 0;
+    std::uint32_t decimals = 0;
 };
 
 struct HeaderFeatureType {
-  std::string name;
-  std::string description;
-  std::vector<HeaderAttribute> attributes;
+    std::string name;
+    std::string description;
+    std::vector<HeaderAttribute> attributes;
 };
 
 struct HeaderDataset {
-  bool source = true;
-  std::string format;
-  std::string name;
-  std::string location;
-  std::vector<HeaderFeatureType> featureTypes;
+    bool source = true;
+    std::string format;
+    std::string name;
+    std::string location;
+    std::vector<HeaderFeatureType> featureTypes;
 };
 
 struct ItemHeader {
-  std::string title;
-  std::string description;
-  std::string category;
-  std::string usage;
-  std::string history;
-  std::string requirements;
-  std::string requirementsKeyword;
-  std::string legalTerms;
-  bool enabled = true;
-  std::vector<HeaderParameter> parameters;
-  std::vector<HeaderDataset> datasets;
+    std::string title;
+    std::string description;
+    std::string category;
+    std::string usage;
+    std::string history;
+    std::string requirements;
+    std::string requirementsKeyword;
+    std::string legalTerms;
+    bool enabled = true;
+    std::vector<HeaderParameter> parameters;
+    std::vector<HeaderDataset> datasets;
 
-  const HeaderParameter* findParameter(std::string_view name) const;
+    const HeaderParameter* findParameter(std::string_view name) const;
 };
 
 // Parses the header at the start of `text`. Strict (workspaces): any malformed line is an

@@ -9,22 +9,22 @@ namespace zelserverd {
 
 // Owns one file descriptor; closes it when destroyed.
 class UniqueFd {
- public:
-  UniqueFd() = default;
-  explicit UniqueFd(int fd) : fd_(fd) {}
-  UniqueFd(UniqueFd&& other) noexcept : fd_(other.release()) {}
-  UniqueFd& operator=(UniqueFd&& other) noexcept;
-  UniqueFd(const UniqueFd&) = delete;
-  UniqueFd& operator=(const UniqueFd&) = delete;
-  ~UniqueFd() { reset(); }
+public:
+    UniqueFd() = default;
+    explicit UniqueFd(int fd) : fd_(fd) {}
+    UniqueFd(UniqueFd&& other) noexcept : fd_(other.release()) {}
+    UniqueFd& operator=(UniqueFd&& other) noexcept;
+    UniqueFd(const UniqueFd&) = delete;
+    UniqueFd& operator=(const UniqueFd&) = delete;
+    ~UniqueFd() { reset(); }
 
-  int get() const { return fd_; }
-  bool valid() const { return fd_ >= 0; }
-  int release();
-  void reset(int fd = -1);
+    int get() const { return fd_; }
+    bool valid() const { return fd_ >= 0; }
+    int release();
+    void reset(int fd = -1);
 
- private:
-  int fd_ = -1;
+private:
+    int fd_ = -1;
 };
 
 // Binds and listens on host:port (port 0 picks a free one). On failure `error` says why.
@@ -45,20 +45,20 @@ enum class FrameStatus { Ok, Closed, TooLarge };
 // a prefix sent apart from its payload meets Nagle's algorithm and the peer's delayed
 // acknowledgement, which costs tens of milliseconds per exchange on loopback.
 class FrameIo {
- public:
-  FrameIo(int fd, std::uint32_t maxFrame) : fd_(fd), maxFrame_(maxFrame) {}
-  FrameStatus readFrame(std::string& payload);
-  // Length of the last frame refused as too large.
-  std::uint32_t refusedLength() const { return refusedLength_; }
-  bool writeFrame(std::string_view payload);
-  bool writeRaw(const void* data, std::size_t size) { return sendAll(fd_, data, size); }
-  bool readRaw(void* data, std::size_t size) { return recvExact(fd_, data, size); }
-  int fd() const { return fd_; }
+public:
+    FrameIo(int fd, std::uint32_t maxFrame) : fd_(fd), maxFrame_(maxFrame) {}
+    FrameStatus readFrame(std::string& payload);
+    // Length of the last frame refused as too large.
+    std::uint32_t refusedLength() const { return refusedLength_; }
+    bool writeFrame(std::string_view payload);
+    bool writeRaw(const void* data, std::size_t size) { return sendAll(fd_, data, size); }
+    bool readRaw(void* data, std::size_t size) { return recvExact(fd_, data, size); }
+    int fd() const { return fd_; }
 
- private:
-  int fd_;
-  std::uint32_t maxFrame_;
-  std::uint32_t refusedLength_ = 0;
+private:
+    int fd_;
+    std::uint32_t maxFrame_;
+    std::uint32_t refusedLength_ = 0;
 };
 
 }  // namespace zelserverd

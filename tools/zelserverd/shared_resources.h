@@ -12,24 +12,24 @@
 namespace zelserverd {
 
 struct AreaPath {
-  std::string full;      // file system path inside the area (links in it are not resolved)
-  std::string relative;  // the normalised client path, "" for the area itself
+    std::string full;      // file system path inside the area (links in it are not resolved)
+    std::string relative;  // the normalised client path, "" for the area itself
 };
 
 class SharedArea {
- public:
-  // Resolves the area directory; `error` is set when it cannot be.
-  SharedArea(const SharedResourceConfig& config, std::string& error);
+public:
+    // Resolves the area directory; `error` is set when it cannot be.
+    SharedArea(const SharedResourceConfig& config, std::string& error);
 
-  const SharedResourceConfig& config() const { return config_; }
-  // Checks and maps a client path. Empty on success, else why the path is refused.
-  std::string resolve(std::string_view clientPath, AreaPath& out) const;
+    const SharedResourceConfig& config() const { return config_; }
+    // Checks and maps a client path. Empty on success, else why the path is refused.
+    std::string resolve(std::string_view clientPath, AreaPath& out) const;
 
- private:
-  bool inside(const std::string& realPath) const;
+private:
+    bool inside(const std::string& realPath) const;
 
-  SharedResourceConfig config_;
-  std::string root_;  // canonical
+    SharedResourceConfig config_;
+    std::string root_;  // canonical
 };
 
 // The path named by a "PATH" document: "abspath", or "dirpath" and "name" when it is empty.

@@ -14,25 +14,25 @@ namespace zelserverd {
 
 // A temporary file that is deleted unless commit() renamed it into place.
 class TempFile {
- public:
-  TempFile() = default;
-  TempFile(TempFile&& other) noexcept;
-  TempFile& operator=(TempFile&& other) noexcept;
-  TempFile(const TempFile&) = delete;
-  TempFile& operator=(const TempFile&) = delete;
-  ~TempFile();
+public:
+    TempFile() = default;
+    TempFile(TempFile&& other) noexcept;
+    TempFile& operator=(TempFile&& other) noexcept;
+    TempFile(const TempFile&) = delete;
+    TempFile& operator=(const TempFile&) = delete;
+    ~TempFile();
 
-  // Creates a uniquely named file in `dir`. Empty on success, else the reason.
-  std::string create(const std::string& dir);
-  int fd() const { return fd_.get(); }
-  const std::string& path() const { return path_; }
-  // Flushes to disk and renames onto `destination`, replacing what is there.
-  std::string commit(const std::string& destination);
-  void discard();
+    // Creates a uniquely named file in `dir`. Empty on success, else the reason.
+    std::string create(const std::string& dir);
+    int fd() const { return fd_.get(); }
+    const std::string& path() const { return path_; }
+    // Flushes to disk and renames onto `destination`, replacing what is there.
+    std::string commit(const std::string& destination);
+    void discard();
 
- private:
-  UniqueFd fd_;
-  std::string path_;
+private:
+    UniqueFd fd_;
+    std::string path_;
 };
 
 // Names of temporary files start with this, so listings can leave them out.
@@ -41,17 +41,16 @@ constexpr std::string_view kTempPrefix = ".zelserverd-";
 enum class TransferOutcome { Ok, Refused, Lost };
 
 struct UploadResult {
-  TransferOutcome outcome = TransferOutcome::Lost;
-  std::string message;  // why it was refused
-  TempFile file;
-  std::uint64_t length = 0;
+    TransferOutcome outcome = TransferOutcome::Lost;
+    std::string message;  // why it was refused
+    TempFile file;
+    std::uint64_t length = 0;
 };
 
 // Runs the server's half of an upload into a temporary file in `dir`. Refused: the reply (an
 // ERROR with `message`) is still owed to the client. Lost: the connection is out of step or
 // gone and must be closed.
-UploadResult receiveUpload(FrameIo& io, const std::string& dir, bool checkCrc,
-                           std::uint64_t maxBytes);
+UploadResult receiveUpload(FrameIo& io, const std::string& dir, bool checkCrc, std::uint64_t maxBytes);
 
 // Runs the server's half of a download of the open file `fd` (read from its start). Refused
 // means nothing was sent yet; Lost means the connection must be closed.

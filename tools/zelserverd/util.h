@@ -15,8 +15,7 @@ bool iequals(std::string_view a, std::string_view b);
 std::vector<std::string> split(std::string_view text, char delimiter);
 
 // Strict unsigned decimal: digits only, no sign, no blanks, no overflow past `max`.
-std::optional<std::uint64_t> parseDecimal(std::string_view text,
-                                          std::uint64_t max = UINT64_MAX);
+std::optional<std::uint64_t> parseDecimal(std::string_view text, std::uint64_t max = UINT64_MAX);
 // Signed decimal as clients write job identifiers ("%ld" of a 32-bit value, so -1 for 4294967295).
 std::optional<std::int64_t> parseSigned(std::string_view text);
 

@@ -20,11 +20,12 @@ pugi::xml_node findElement(pugi::xml_node node, std::string_view name);
 
 // A reply document: the root element named after the command, holding what `fill` adds.
 template <typename Fill>
-std::string replyDocument(std::string_view root, Fill&& fill) {
-  pugi::xml_document doc;
-  pugi::xml_node element = doc.append_child(std::string(root).c_str());
-  fill(element);
-  return serializeXml(doc);
+std::string replyDocument(std::string_view root, Fill&& fill)
+{
+    pugi::xml_document doc;
+    pugi::xml_node element = doc.append_child(std::string(root).c_str());
+    fill(element);
+    return serializeXml(doc);
 }
 
 // Appends the "IDENTITY" (or "SSO_IDENTITY") element that describes a signed-in principal.

@@ -17,16 +17,17 @@ namespace {
 // the shared library when loaded as one, the program when linked statically.
 void moduleAnchor() {}
 
-std::string selfExecutablePath() {
+std::string selfExecutablePath()
+{
     std::vector<char> buffer(4096);
     const ssize_t length = ::readlink("/proc/self/exe", buffer.data(), buffer.size() - 1);
-    return length > 0 ? std::string(buffer.data(), static_cast<std::size_t>(length))
-                      : std::string();
+    return length > 0 ? std::string(buffer.data(), static_cast<std::size_t>(length)) : std::string();
 }
 
 }  // namespace
 
-std::optional<std::string> getEnvironmentVariable(const char* name) {
+std::optional<std::string> getEnvironmentVariable(const char* name)
+{
     const char* value = std::getenv(name);
     if (value == nullptr) {
         return std::nullopt;
@@ -34,13 +35,15 @@ std::optional<std::string> getEnvironmentVariable(const char* name) {
     return std::string(value);
 }
 
-bool setEnvironmentVariable(const char* name, const std::string& value) {
+bool setEnvironmentVariable(const char* name, const std::string& value)
+{
     return ::setenv(name, value.c_str(), 1) == 0;
 }
 
 void putRuntimeEnvironmentEntry(char* entry) { ::putenv(entry); }
 
-std::string libraryModulePath() {
+std::string libraryModulePath()
+{
     Dl_info info{};
     if (::dladdr(reinterpret_cast<void*>(&moduleAnchor), &info) == 0 || info.dli_fname == nullptr ||
         info.dli_fname[0] == '\0') {
@@ -66,7 +69,8 @@ std::string libraryModulePath() {
 
 std::string frameworkModulePath() { return libraryModulePath(); }
 
-bool findFirstFile(const std::string& pattern) {
+bool findFirstFile(const std::string& pattern)
+{
     if (!pattern.empty() && pattern.back() == '*') {
         const std::string folder = pattern.substr(0, pattern.size() - 1);
         DIR* directory = ::opendir(folder.empty() ? "." : folder.c_str());
@@ -80,7 +84,8 @@ bool findFirstFile(const std::string& pattern) {
     return ::stat(pattern.c_str(), &info) == 0;
 }
 
-NewFile createNewFile(const std::string& path) {
+NewFile createNewFile(const std::string& path)
+{
     const int fd = ::open(path.c_str(), O_WRONLY | O_CREAT | O_EXCL | O_CLOEXEC, 0666);
     if (fd < 0) {
         return errno == EEXIST ? NewFile::Exists : NewFile::Failed;
@@ -88,8 +93,6 @@ NewFile createNewFile(const std::string& path) {
     return ::close(fd) == 0 ? NewFile::Created : NewFile::Failed;
 }
 
-std::string readMachineRegistryString(const char* /*keyPath*/, const char* /*valueName*/) {
-    return std::string();
-}
+std::string readMachineRegistryString(const char* /*keyPath*/, const char* /*valueName*/) { return std::string(); }
 
 }  // namespace zel::platform

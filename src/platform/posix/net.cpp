@@ -15,7 +15,8 @@ namespace zel::platform {
 
 namespace {
 
-sockaddr_in ipv4Endpoint(Ipv4Address address, std::uint16_t port) {
+sockaddr_in ipv4Endpoint(Ipv4Address address, std::uint16_t port)
+{
     sockaddr_in endpoint{};
     endpoint.sin_family = AF_INET;
     endpoint.sin_port = htons(port);
@@ -33,11 +34,10 @@ void socketLibraryStartup() noexcept {}
 
 void socketLibraryCleanup() noexcept {}
 
-SocketHandle createStreamSocket() noexcept {
-    return ::socket(AF_INET, SOCK_STREAM, 0);
-}
+SocketHandle createStreamSocket() noexcept { return ::socket(AF_INET, SOCK_STREAM, 0); }
 
-bool connectIPv4(SocketHandle socket, Ipv4Address address, std::uint16_t port) noexcept {
+bool connectIPv4(SocketHandle socket, Ipv4Address address, std::uint16_t port) noexcept
+{
     const sockaddr_in endpoint = ipv4Endpoint(address, port);
     int result;
     do {
@@ -46,12 +46,14 @@ bool connectIPv4(SocketHandle socket, Ipv4Address address, std::uint16_t port) n
     return result == 0;
 }
 
-bool bindAnyIPv4(SocketHandle socket, std::uint16_t port) noexcept {
+bool bindAnyIPv4(SocketHandle socket, std::uint16_t port) noexcept
+{
     const sockaddr_in endpoint = ipv4Endpoint(htonl(INADDR_ANY), port);
     return ::bind(socket, reinterpret_cast<const sockaddr*>(&endpoint), sizeof endpoint) == 0;
 }
 
-bool boundPort(SocketHandle socket, std::uint16_t& port) noexcept {
+bool boundPort(SocketHandle socket, std::uint16_t& port) noexcept
+{
     sockaddr_in endpoint{};
     socklen_t length = sizeof endpoint;
     if (::getsockname(socket, reinterpret_cast<sockaddr*>(&endpoint), &length) != 0) {
@@ -61,11 +63,10 @@ bool boundPort(SocketHandle socket, std::uint16_t& port) noexcept {
     return true;
 }
 
-bool listenOn(SocketHandle socket, int backlog) noexcept {
-    return ::listen(socket, backlog) == 0;
-}
+bool listenOn(SocketHandle socket, int backlog) noexcept { return ::listen(socket, backlog) == 0; }
 
-SocketHandle acceptIPv4(SocketHandle socket, Ipv4Address& peer) noexcept {
+SocketHandle acceptIPv4(SocketHandle socket, Ipv4Address& peer) noexcept
+{
     sockaddr_in endpoint{};
     socklen_t length = sizeof endpoint;
     SocketHandle accepted;
@@ -78,7 +79,8 @@ SocketHandle acceptIPv4(SocketHandle socket, Ipv4Address& peer) noexcept {
     return accepted;
 }
 
-long sendSome(SocketHandle socket, const void* data, std::size_t count) noexcept {
+long sendSome(SocketHandle socket, const void* data, std::size_t count) noexcept
+{
     ssize_t sent;
     do {
         sent = ::send(socket, data, count, MSG_NOSIGNAL);
@@ -86,7 +88,8 @@ long sendSome(SocketHandle socket, const void* data, std::size_t count) noexcept
     return static_cast<long>(sent);
 }
 
-long receiveSome(SocketHandle socket, void* data, std::size_t count) noexcept {
+long receiveSome(SocketHandle socket, void* data, std::size_t count) noexcept
+{
     ssize_t received;
     do {
         received = ::recv(socket, data, count, 0);
@@ -94,21 +97,22 @@ long receiveSome(SocketHandle socket, void* data, std::size_t count) noexcept {
     return static_cast<long>(received);
 }
 
-void shutdownBoth(SocketHandle socket) noexcept {
-    ::shutdown(socket, SHUT_RDWR);
-}
+void shutdownBoth(SocketHandle socket) noexcept { ::shutdown(socket, SHUT_RDWR); }
 
-void closeSocket(SocketHandle socket) noexcept {
+void closeSocket(SocketHandle socket) noexcept
+{
     // Retrying close after EINTR could close a descriptor that another thread has just been given.
     ::close(socket);
 }
 
-bool setReuseAddress(SocketHandle socket) noexcept {
+bool setReuseAddress(SocketHandle socket) noexcept
+{
     const std::int32_t enabled = 1;
     return ::setsockopt(socket, SOL_SOCKET, SO_REUSEADDR, &enabled, sizeof enabled) == 0;
 }
 
-bool setNonBlocking(SocketHandle socket, bool enabled) noexcept {
+bool setNonBlocking(SocketHandle socket, bool enabled) noexcept
+{
     const int flags = ::fcntl(socket, F_GETFL);
     if (flags < 0) {
         return false;
@@ -117,7 +121,8 @@ bool setNonBlocking(SocketHandle socket, bool enabled) noexcept {
     return ::fcntl(socket, F_SETFL, wanted) == 0;
 }
 
-SocketError lastSocketError() noexcept {
+SocketError lastSocketError() noexcept
+{
     const int error = errno;
     if (error == ETIMEDOUT) {
         return SocketError::TimedOut;
@@ -128,7 +133,8 @@ SocketError lastSocketError() noexcept {
     return SocketError::Other;
 }
 
-std::vector<Ipv4Address> resolveIPv4(const char* name) {
+std::vector<Ipv4Address> resolveIPv4(const char* name)
+{
     std::vector<Ipv4Address> addresses;
     if (name == nullptr) {
         return addresses;
@@ -142,8 +148,7 @@ std::vector<Ipv4Address> resolveIPv4(const char* name) {
     }
     const std::unique_ptr<addrinfo, AddrInfoDeleter> owner(found);
     for (const addrinfo* entry = found; entry != nullptr; entry = entry->ai_next) {
-        if (entry->ai_family == AF_INET && entry->ai_addr != nullptr &&
-            entry->ai_addrlen >= sizeof(sockaddr_in)) {
+        if (entry->ai_family == AF_INET && entry->ai_addr != nullptr && entry->ai_addrlen >= sizeof(sockaddr_in)) {
             sockaddr_in endpoint{};
             std::memcpy(&endpoint, entry->ai_addr, sizeof endpoint);
             addresses.push_back(endpoint.sin_addr.s_addr);
@@ -152,7 +157,8 @@ std::vector<Ipv4Address> resolveIPv4(const char* name) {
     return addresses;
 }
 
-std::string localHostName(std::size_t capacity) {
+std::string localHostName(std::size_t capacity)
+{
     if (capacity == 0) {
         return {};
     }
@@ -169,7 +175,8 @@ std::string localHostName(std::size_t capacity) {
     return name;
 }
 
-std::string dottedAddress(Ipv4Address address) {
+std::string dottedAddress(Ipv4Address address)
+{
     in_addr raw{};
     raw.s_addr = address;
     char text[INET_ADDRSTRLEN] = {};

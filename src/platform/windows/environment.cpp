@@ -18,7 +18,8 @@ namespace {
 // family never place the libraries deeper than that.
 constexpr DWORD kModuleNameBufferSize = 1024;
 
-std::string moduleFileName(HMODULE module) {
+std::string moduleFileName(HMODULE module)
+{
     if (module == nullptr) {
         return std::string();
     }
@@ -30,9 +31,7 @@ std::string moduleFileName(HMODULE module) {
     return std::string(buffer, length);
 }
 
-std::string moduleFileName(const char* moduleName) {
-    return moduleFileName(::GetModuleHandleA(moduleName));
-}
+std::string moduleFileName(const char* moduleName) { return moduleFileName(::GetModuleHandleA(moduleName)); }
 
 // Any function of the library itself: the module that contains it is the one the library's code
 // was loaded with.
@@ -40,11 +39,11 @@ void moduleAnchor() {}
 
 // With the library linked into a program there is no module of the library's name; its code then
 // lives in the program, whose folder is the home, as on POSIX.
-std::string moduleHoldingThisCode() {
+std::string moduleHoldingThisCode()
+{
     HMODULE module = nullptr;
-    if (!::GetModuleHandleExA(
-            GET_MODULE_HANDLE_EX_FLAG_FROM_ADDRESS | GET_MODULE_HANDLE_EX_FLAG_UNCHANGED_REFCOUNT,
-            reinterpret_cast<LPCSTR>(&moduleAnchor), &module)) {
+    if (!::GetModuleHandleExA(GET_MODULE_HANDLE_EX_FLAG_FROM_ADDRESS | GET_MODULE_HANDLE_EX_FLAG_UNCHANGED_REFCOUNT,
+                              reinterpret_cast<LPCSTR>(&moduleAnchor), &module)) {
         return std::string();
     }
     return moduleFileName(module);
@@ -52,12 +51,12 @@ std::string moduleHoldingThisCode() {
 
 }  // namespace
 
-std::optional<std::string> getEnvironmentVariable(const char* name) {
+std::optional<std::string> getEnvironmentVariable(const char* name)
+{
     std::vector<char> buffer(2048);
     for (;;) {
         ::SetLastError(ERROR_SUCCESS);
-        const DWORD length =
-            ::GetEnvironmentVariableA(name, buffer.data(), static_cast<DWORD>(buffer.size()));
+        const DWORD length = ::GetEnvironmentVariableA(name, buffer.data(), static_cast<DWORD>(buffer.size()));
         if (length == 0) {
             // Zero is both "not defined" and "defined but empty"; only the error code tells them
             // apart.
@@ -74,20 +73,23 @@ std::optional<std::string> getEnvironmentVariable(const char* name) {
     }
 }
 
-bool setEnvironmentVariable(const char* name, const std::string& value) {
+bool setEnvironmentVariable(const char* name, const std::string& value)
+{
     return ::SetEnvironmentVariableA(name, value.c_str()) != FALSE;
 }
 
 void putRuntimeEnvironmentEntry(char* entry) { ::_putenv(entry); }
 
-std::string libraryModulePath() {
+std::string libraryModulePath()
+{
     const std::string byName = moduleFileName(kLibraryModuleName);
     return byName.empty() ? moduleHoldingThisCode() : byName;
 }
 
 std::string frameworkModulePath() { return moduleFileName(kFrameworkModuleName); }
 
-bool findFirstFile(const std::string& pattern) {
+bool findFirstFile(const std::string& pattern)
+{
     WIN32_FIND_DATAA data{};
     HANDLE found = ::FindFirstFileA(pattern.c_str(), &data);
     if (found == INVALID_HANDLE_VALUE) {
@@ -97,18 +99,18 @@ bool findFirstFile(const std::string& pattern) {
     return true;
 }
 
-NewFile createNewFile(const std::string& path) {
-    HANDLE file = ::CreateFileA(path.c_str(), GENERIC_WRITE, 0, nullptr, CREATE_NEW,
-                                FILE_ATTRIBUTE_NORMAL, nullptr);
+NewFile createNewFile(const std::string& path)
+{
+    HANDLE file = ::CreateFileA(path.c_str(), GENERIC_WRITE, 0, nullptr, CREATE_NEW, FILE_ATTRIBUTE_NORMAL, nullptr);
     if (file == INVALID_HANDLE_VALUE) {
         const DWORD error = ::GetLastError();
-        return error == ERROR_FILE_EXISTS || error == ERROR_ALREADY_EXISTS ? NewFile::Exists
-                                                                           : NewFile::Failed;
+        return error == ERROR_FILE_EXISTS || error == ERROR_ALREADY_EXISTS ? NewFile::Exists : NewFile::Failed;
     }
     return ::CloseHandle(file) ? NewFile::Created : NewFile::Failed;
 }
 
-std::string readMachineRegistryString(const char* keyPath, const char* valueName) {
+std::string readMachineRegistryString(const char* keyPath, const char* valueName)
+{
     HKEY key = nullptr;
     if (::RegOpenKeyExA(HKEY_LOCAL_MACHINE, keyPath, 0, KEY_QUERY_VALUE, &key) != ERROR_SUCCESS) {
         return std::string();
@@ -119,8 +121,8 @@ std::string readMachineRegistryString(const char* keyPath, const char* valueName
     if (::RegQueryValueExA(key, valueName, nullptr, &type, nullptr, &size) == ERROR_SUCCESS &&
         (type == REG_SZ || type == REG_EXPAND_SZ) && size > 0) {
         std::vector<char> buffer(size + 1, '\0');
-        if (::RegQueryValueExA(key, valueName, nullptr, &type,
-                               reinterpret_cast<BYTE*>(buffer.data()), &size) == ERROR_SUCCESS) {
+        if (::RegQueryValueExA(key, valueName, nullptr, &type, reinterpret_cast<BYTE*>(buffer.data()), &size) ==
+            ERROR_SUCCESS) {
             // The stored text may or may not carry its terminating NUL.
             buffer[size] = '\0';
             result = buffer.data();

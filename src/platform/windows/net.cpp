@@ -19,7 +19,8 @@ static_assert(sizeof(SocketHandle) == sizeof(SOCKET), "SocketHandle must hold a 
 
 namespace {
 
-sockaddr_in ipv4Endpoint(Ipv4Address address, std::uint16_t port) {
+sockaddr_in ipv4Endpoint(Ipv4Address address, std::uint16_t port)
+{
     sockaddr_in endpoint{};
     endpoint.sin_family = AF_INET;
     endpoint.sin_port = htons(port);
@@ -28,102 +29,102 @@ sockaddr_in ipv4Endpoint(Ipv4Address address, std::uint16_t port) {
 }
 
 // Winsock takes int lengths; a larger request is cut down and then shows as a short count.
-int clampLength(std::size_t count) {
+int clampLength(std::size_t count)
+{
     return count > static_cast<std::size_t>(INT_MAX) ? INT_MAX : static_cast<int>(count);
 }
 
 }  // namespace
 
-void socketLibraryStartup() noexcept {
+void socketLibraryStartup() noexcept
+{
     WSADATA data;
     ::WSAStartup(0x0101, &data);
 }
 
-void socketLibraryCleanup() noexcept {
-    ::WSACleanup();
-}
+void socketLibraryCleanup() noexcept { ::WSACleanup(); }
 
-SocketHandle createStreamSocket() noexcept {
-    return static_cast<SocketHandle>(::socket(AF_INET, SOCK_STREAM, 0));
-}
+SocketHandle createStreamSocket() noexcept { return static_cast<SocketHandle>(::socket(AF_INET, SOCK_STREAM, 0)); }
 
-bool connectIPv4(SocketHandle socket, Ipv4Address address, std::uint16_t port) noexcept {
+bool connectIPv4(SocketHandle socket, Ipv4Address address, std::uint16_t port) noexcept
+{
     const sockaddr_in endpoint = ipv4Endpoint(address, port);
     return ::connect(static_cast<SOCKET>(socket), reinterpret_cast<const sockaddr*>(&endpoint),
                      static_cast<int>(sizeof endpoint)) == 0;
 }
 
-bool bindAnyIPv4(SocketHandle socket, std::uint16_t port) noexcept {
+bool bindAnyIPv4(SocketHandle socket, std::uint16_t port) noexcept
+{
     const sockaddr_in endpoint = ipv4Endpoint(htonl(INADDR_ANY), port);
     return ::bind(static_cast<SOCKET>(socket), reinterpret_cast<const sockaddr*>(&endpoint),
                   static_cast<int>(sizeof endpoint)) == 0;
 }
 
-bool boundPort(SocketHandle socket, std::uint16_t& port) noexcept {
+bool boundPort(SocketHandle socket, std::uint16_t& port) noexcept
+{
     sockaddr_in endpoint{};
     int length = static_cast<int>(sizeof endpoint);
-    if (::getsockname(static_cast<SOCKET>(socket), reinterpret_cast<sockaddr*>(&endpoint), &length) !=
-        0) {
+    if (::getsockname(static_cast<SOCKET>(socket), reinterpret_cast<sockaddr*>(&endpoint), &length) != 0) {
         return false;
     }
     port = ntohs(endpoint.sin_port);
     return true;
 }
 
-bool listenOn(SocketHandle socket, int backlog) noexcept {
-    return ::listen(static_cast<SOCKET>(socket), backlog) == 0;
-}
+bool listenOn(SocketHandle socket, int backlog) noexcept { return ::listen(static_cast<SOCKET>(socket), backlog) == 0; }
 
-SocketHandle acceptIPv4(SocketHandle socket, Ipv4Address& peer) noexcept {
+SocketHandle acceptIPv4(SocketHandle socket, Ipv4Address& peer) noexcept
+{
     sockaddr_in endpoint{};
     int length = static_cast<int>(sizeof endpoint);
-    const SOCKET accepted =
-        ::accept(static_cast<SOCKET>(socket), reinterpret_cast<sockaddr*>(&endpoint), &length);
+    const SOCKET accepted = ::accept(static_cast<SOCKET>(socket), reinterpret_cast<sockaddr*>(&endpoint), &length);
     if (accepted != INVALID_SOCKET) {
         peer = endpoint.sin_addr.s_addr;
     }
     return static_cast<SocketHandle>(accepted);
 }
 
-long sendSome(SocketHandle socket, const void* data, std::size_t count) noexcept {
+long sendSome(SocketHandle socket, const void* data, std::size_t count) noexcept
+{
     return ::send(static_cast<SOCKET>(socket), static_cast<const char*>(data), clampLength(count), 0);
 }
 
-long receiveSome(SocketHandle socket, void* data, std::size_t count) noexcept {
+long receiveSome(SocketHandle socket, void* data, std::size_t count) noexcept
+{
     return ::recv(static_cast<SOCKET>(socket), static_cast<char*>(data), clampLength(count), 0);
 }
 
-void shutdownBoth(SocketHandle socket) noexcept {
-    ::shutdown(static_cast<SOCKET>(socket), SD_BOTH);
-}
+void shutdownBoth(SocketHandle socket) noexcept { ::shutdown(static_cast<SOCKET>(socket), SD_BOTH); }
 
-void closeSocket(SocketHandle socket) noexcept {
-    ::closesocket(static_cast<SOCKET>(socket));
-}
+void closeSocket(SocketHandle socket) noexcept { ::closesocket(static_cast<SOCKET>(socket)); }
 
-bool setReuseAddress(SocketHandle socket) noexcept {
+bool setReuseAddress(SocketHandle socket) noexcept
+{
     const std::int32_t enabled = 1;
-    return ::setsockopt(static_cast<SOCKET>(socket), SOL_SOCKET, SO_REUSEADDR,
-                        reinterpret_cast<const char*>(&enabled), static_cast<int>(sizeof enabled)) == 0;
+    return ::setsockopt(static_cast<SOCKET>(socket), SOL_SOCKET, SO_REUSEADDR, reinterpret_cast<const char*>(&enabled),
+                        static_cast<int>(sizeof enabled)) == 0;
 }
 
-bool setNonBlocking(SocketHandle socket, bool enabled) noexcept {
+bool setNonBlocking(SocketHandle socket, bool enabled) noexcept
+{
     u_long mode = enabled ? 1 : 0;
     return ::ioctlsocket(static_cast<SOCKET>(socket), FIONBIO, &mode) == 0;
 }
 
-SocketError lastSocketError() noexcept {
+SocketError lastSocketError() noexcept
+{
     switch (::WSAGetLastError()) {
-        case WSAETIMEDOUT:
-            return SocketError::TimedOut;
-        case WSAEWOULDBLOCK:
-            return SocketError::WouldBlock;
-        default:
-            return SocketError::Other;
+    case WSAETIMEDOUT:
+        return SocketError::TimedOut;
+    case WSAEWOULDBLOCK:
+        return SocketError::WouldBlock;
+    default:
+        return SocketError::Other;
     }
 }
 
-std::vector<Ipv4Address> resolveIPv4(const char* name) {
+std::vector<Ipv4Address> resolveIPv4(const char* name)
+{
     std::vector<Ipv4Address> addresses;
     if (name == nullptr) {
         return addresses;
@@ -144,7 +145,8 @@ std::vector<Ipv4Address> resolveIPv4(const char* name) {
     return addresses;
 }
 
-std::string localHostName(std::size_t capacity) {
+std::string localHostName(std::size_t capacity)
+{
     if (capacity == 0) {
         return {};
     }
@@ -160,7 +162,8 @@ std::string localHostName(std::size_t capacity) {
     return name;
 }
 
-std::string dottedAddress(Ipv4Address address) {
+std::string dottedAddress(Ipv4Address address)
+{
     in_addr raw{};
     raw.s_addr = address;
     // inet_ntoa's buffer belongs to Winsock and is overwritten by the next call on this thread.

@@ -13,65 +13,73 @@
 
 namespace zeltest {
 
-std::string makeTempDir() {
-  std::string pattern =
-      (std::filesystem::temp_directory_path() / "zelserverd-test-XXXXXX").string();
-  if (!::mkdtemp(pattern.data())) return {};
-  return pattern;
+std::string makeTempDir()
+{
+    std::string pattern = (std::filesystem::temp_directory_path() / "zelserverd-test-XXXXXX").string();
+    if (!::mkdtemp(pattern.data()))
+        return {};
+    return pattern;
 }
 
-void removeTree(const std::string& path) {
-  std::error_code ec;
-  std::filesystem::remove_all(path, ec);
+void removeTree(const std::string& path)
+{
+    std::error_code ec;
+    std::filesystem::remove_all(path, ec);
 }
 
-std::string readFile(const std::string& path) {
-  std::ifstream in(path, std::ios::binary);
-  std::stringstream text;
-  text << in.rdbuf();
-  return text.str();
+std::string readFile(const std::string& path)
+{
+    std::ifstream in(path, std::ios::binary);
+    std::stringstream text;
+    text << in.rdbuf();
+    return text.str();
 }
 
-void writeFile(const std::string& path, const std::string& content) {
-  std::ofstream out(path, std::ios::binary | std::ios::trunc);
-  out << content;
+void writeFile(const std::string& path, const std::string& content)
+{
+    std::ofstream out(path, std::ios::binary | std::ios::trunc);
+    out << content;
 }
 
-std::vector<std::string> entriesOf(const std::string& dir) {
-  std::vector<std::string> names;
-  for (const auto& entry : std::filesystem::directory_iterator(dir))
-    names.push_back(entry.path().filename().string());
-  std::sort(names.begin(), names.end());
-  return names;
+std::vector<std::string> entriesOf(const std::string& dir)
+{
+    std::vector<std::string> names;
+    for (const auto& entry : std::filesystem::directory_iterator(dir))
+        names.push_back(entry.path().filename().string());
+    std::sort(names.begin(), names.end());
+    return names;
 }
 
-bool eventually(const std::function<bool()>& condition) {
-  auto deadline = std::chrono::steady_clock::now() + std::chrono::seconds(10);
-  while (!condition()) {
-    if (std::chrono::steady_clock::now() > deadline) return false;
-    std::this_thread::sleep_for(std::chrono::milliseconds(20));
-  }
-  return true;
+bool eventually(const std::function<bool()>& condition)
+{
+    auto deadline = std::chrono::steady_clock::now() + std::chrono::seconds(10);
+    while (!condition()) {
+        if (std::chrono::steady_clock::now() > deadline)
+            return false;
+        std::this_thread::sleep_for(std::chrono::milliseconds(20));
+    }
+    return true;
 }
 
-std::string document(const std::string& elements) {
-  return "<?xml version=\"1.0\"?>" + elements;
+std::string document(const std::string& elements) { return "<?xml version=\"1.0\"?>" + elements; }
+
+std::string withoutTimes(const std::string& text)
+{
+    static const std::regex stamp("[0-9]{4}-[0-9]{2}-[0-9]{2}T[0-9]{2}:[0-9]{2}:[0-9]{2}Z");
+    return std::regex_replace(text, stamp, "TIME");
 }
 
-std::string withoutTimes(const std::string& text) {
-  static const std::regex stamp("[0-9]{4}-[0-9]{2}-[0-9]{2}T[0-9]{2}:[0-9]{2}:[0-9]{2}Z");
-  return std::regex_replace(text, stamp, "TIME");
-}
-
-void ServerFixture::SetUp() {
-  root_ = makeTempDir();
-  ASSERT_FALSE(root_.empty());
-  dataDir_ = root_ + "/data";
-  areaDir_ = root_ + "/area";
-  configPath_ = root_ + "/zelserverd.conf";
-  std::filesystem::create_directories(areaDir_);
-  writeFile(configPath_, std::string("[server]\nworkers = 2\nmax_request_bytes = 65536\n"
-                                     "sso_secret = ") + kSsoSecret + R"(
+void ServerFixture::SetUp()
+{
+    root_ = makeTempDir();
+    ASSERT_FALSE(root_.empty());
+    dataDir_ = root_ + "/data";
+    areaDir_ = root_ + "/area";
+    configPath_ = root_ + "/zelserverd.conf";
+    std::filesystem::create_directories(areaDir_);
+    writeFile(configPath_, std::string("[server]\nworkers = 2\nmax_request_bytes = 65536\n"
+                                       "sso_secret = ") +
+                               kSsoSecret + R"(
 [role auditor]
 rights = sharedresources.read
 [user admin]
@@ -92,137 +100,150 @@ display_name = Test area
 description = Files of the test
 [jobservice zeljob]
 )");
-  startServer();
+    startServer();
 }
 
-void ServerFixture::TearDown() {
-  stopServer();
-  removeTree(root_);
+void ServerFixture::TearDown()
+{
+    stopServer();
+    removeTree(root_);
 }
 
-void ServerFixture::startServer() {
-  stopServer();
-  zelserverd::ServerOptions options;
-  options.dataDir = dataDir_;
-  options.configFile = configPath_;
-  options.listen = "127.0.0.1:0";
-  options.quiet = true;
-  std::string error;
-  server_ = zelserverd::Server::create(options, error);
-  ASSERT_TRUE(server_) << error;
-  server_->start();
+void ServerFixture::startServer()
+{
+    stopServer();
+    zelserverd::ServerOptions options;
+    options.dataDir = dataDir_;
+    options.configFile = configPath_;
+    options.listen = "127.0.0.1:0";
+    options.quiet = true;
+    std::string error;
+    server_ = zelserverd::Server::create(options, error);
+    ASSERT_TRUE(server_) << error;
+    server_->start();
 }
 
-void ServerFixture::stopServer() {
-  if (server_) server_->stop();
-  server_.reset();
+void ServerFixture::stopServer()
+{
+    if (server_)
+        server_->stop();
+    server_.reset();
 }
 
-std::unique_ptr<TestClient> ServerFixture::connectAs(const std::string& user) {
-  auto client = std::make_unique<TestClient>();
-  EXPECT_TRUE(client->connect(port()));
-  WireReply reply = client->signIn(user, user + "pw");
-  EXPECT_TRUE(reply.ok()) << reply.body;
-  return client;
+std::unique_ptr<TestClient> ServerFixture::connectAs(const std::string& user)
+{
+    auto client = std::make_unique<TestClient>();
+    EXPECT_TRUE(client->connect(port()));
+    WireReply reply = client->signIn(user, user + "pw");
+    EXPECT_TRUE(reply.ok()) << reply.body;
+    return client;
 }
 
-std::string ServerFixture::userOf(TestClient& client) {
-  return client.command("SERVER_SESSION_GET_PROP", {{"sessionPropName", "USER_NAME"}}).body;
+std::string ServerFixture::userOf(TestClient& client)
+{
+    return client.command("SERVER_SESSION_GET_PROP", {{"sessionPropName", "USER_NAME"}}).body;
 }
 
-pugi::xml_node ServerFixture::parse(const WireReply& reply) {
-  EXPECT_TRUE(reply.ok()) << reply.body;
-  EXPECT_TRUE(doc_.load_string(reply.body.c_str())) << reply.body;
-  return doc_.document_element();
+pugi::xml_node ServerFixture::parse(const WireReply& reply)
+{
+    EXPECT_TRUE(reply.ok()) << reply.body;
+    EXPECT_TRUE(doc_.load_string(reply.body.c_str())) << reply.body;
+    return doc_.document_element();
 }
 
-std::map<std::string, std::string> parseResult(const std::string& text) {
-  std::map<std::string, std::string> entries;
-  std::size_t start = 0;
-  while (start <= text.size()) {
-    std::size_t end = text.find('\0', start);
-    if (end == std::string::npos) end = text.size();
-    std::string entry = text.substr(start, end - start);
-    std::size_t eq = entry.find('=');
-    if (eq != std::string::npos) entries[entry.substr(0, eq)] = entry.substr(eq + 1);
-    start = end + 1;
-  }
-  return entries;
+std::map<std::string, std::string> parseResult(const std::string& text)
+{
+    std::map<std::string, std::string> entries;
+    std::size_t start = 0;
+    while (start <= text.size()) {
+        std::size_t end = text.find('\0', start);
+        if (end == std::string::npos)
+            end = text.size();
+        std::string entry = text.substr(start, end - start);
+        std::size_t eq = entry.find('=');
+        if (eq != std::string::npos)
+            entries[entry.substr(0, eq)] = entry.substr(eq + 1);
+        start = end + 1;
+    }
+    return entries;
 }
 
-std::string requestText(const std::string& workspace, const Values& parameters) {
-  std::string stem = workspace.substr(0, workspace.size() - 4);
-  std::string xml = "<?xml version=\"1.0\" encoding=\"UTF-8\" standalone=\"no\" ?>"
-                    "<TRANSFORMATION_REQUEST>";
-  for (const auto& [name, value] : parameters)
-    xml += "<PUBLISHED_PARAMETER name=\"" + name + "\">" + value + "</PUBLISHED_PARAMETER>";
-  xml += "</TRANSFORMATION_REQUEST>";
-  return "REPO/" + stem + "/" + workspace + " -XML_PARAMETER " + xml;
+std::string requestText(const std::string& workspace, const Values& parameters)
+{
+    std::string stem = workspace.substr(0, workspace.size() - 4);
+    std::string xml = "<?xml version=\"1.0\" encoding=\"UTF-8\" standalone=\"no\" ?>"
+                      "<TRANSFORMATION_REQUEST>";
+    for (const auto& [name, value] : parameters)
+        xml += "<PUBLISHED_PARAMETER name=\"" + name + "\">" + value + "</PUBLISHED_PARAMETER>";
+    xml += "</TRANSFORMATION_REQUEST>";
+    return "REPO/" + stem + "/" + workspace + " -XML_PARAMETER " + xml;
 }
 
-void RepositoryFixture::SetUp() {
-  ServerFixture::SetUp();
-  admin_ = connectAs("admin");
-  WireReply added = admin_->command(
-      "REP_ADD_REPOSITORY",
-      {{"repositoryObject", "<REP_ADD_REPOSITORY><REPOSITORY name=\"REPO\" "
-                            "description=\"Test repository\"/></REP_ADD_REPOSITORY>"}});
-  ASSERT_TRUE(added.ok()) << added.body;
+void RepositoryFixture::SetUp()
+{
+    ServerFixture::SetUp();
+    admin_ = connectAs("admin");
+    WireReply added = admin_->command("REP_ADD_REPOSITORY",
+                                      {{"repositoryObject", "<REP_ADD_REPOSITORY><REPOSITORY name=\"REPO\" "
+                                                            "description=\"Test repository\"/></REP_ADD_REPOSITORY>"}});
+    ASSERT_TRUE(added.ok()) << added.body;
 }
 
-void RepositoryFixture::TearDown() {
-  admin_.reset();
-  ServerFixture::TearDown();
+void RepositoryFixture::TearDown()
+{
+    admin_.reset();
+    ServerFixture::TearDown();
 }
 
-void RepositoryFixture::restart() {
-  admin_.reset();
-  startServer();
-  admin_ = connectAs("admin");
+void RepositoryFixture::restart()
+{
+    admin_.reset();
+    startServer();
+    admin_ = connectAs("admin");
 }
 
-WireReply RepositoryFixture::addItem(const std::string& name, const std::string& content,
-                                     const std::string& keyword) {
-  return admin_->upload(keyword,
-                        {{"repositoryName", "REPO"},
-                         {"itemName", name},
-                         {"itemFileCRCCheckingEnabled", "true"}},
-                        content);
+WireReply RepositoryFixture::addItem(const std::string& name, const std::string& content, const std::string& keyword)
+{
+    return admin_->upload(
+        keyword, {{"repositoryName", "REPO"}, {"itemName", name}, {"itemFileCRCCheckingEnabled", "true"}}, content);
 }
 
-WireReply RepositoryFixture::addResource(const std::string& item, const std::string& name,
-                                         const std::string& content, const std::string& keyword) {
-  return admin_->upload(keyword,
-                        {{"repositoryName", "REPO"},
-                         {"itemName", item},
-                         {"resourceName", name},
-                         {"resourceFileCRCCheckingEnabled", "false"}},
-                        content);
+WireReply RepositoryFixture::addResource(const std::string& item, const std::string& name, const std::string& content,
+                                         const std::string& keyword)
+{
+    return admin_->upload(keyword,
+                          {{"repositoryName", "REPO"},
+                           {"itemName", item},
+                           {"resourceName", name},
+                           {"resourceFileCRCCheckingEnabled", "false"}},
+                          content);
 }
 
-long RepositoryFixture::submit(const std::string& workspace, const Values& parameters,
-                               const Values& extra) {
-  Values values = {{"keyword", "zeljob"}, {"request", requestText(workspace, parameters)}};
-  values.insert(values.end(), extra.begin(), extra.end());
-  lastReply_ = admin_->command("JOB_REQUEST", values);
-  return lastReply_.ok() ? std::stol(lastReply_.body) : 0;
+long RepositoryFixture::submit(const std::string& workspace, const Values& parameters, const Values& extra)
+{
+    Values values = {{"keyword", "zeljob"}, {"request", requestText(workspace, parameters)}};
+    values.insert(values.end(), extra.begin(), extra.end());
+    lastReply_ = admin_->command("JOB_REQUEST", values);
+    return lastReply_.ok() ? std::stol(lastReply_.body) : 0;
 }
 
-std::map<std::string, std::string> RepositoryFixture::result(long id) {
-  return parseResult(
-      admin_->command("GET_JOB_RESULT_STRING", {{"jobID", std::to_string(id)}}).body);
+std::map<std::string, std::string> RepositoryFixture::result(long id)
+{
+    return parseResult(admin_->command("GET_JOB_RESULT_STRING", {{"jobID", std::to_string(id)}}).body);
 }
 
-std::map<std::string, std::string> RepositoryFixture::waitForEnd(long id) {
-  auto deadline = std::chrono::steady_clock::now() + std::chrono::seconds(20);
-  std::map<std::string, std::string> last;
-  while (std::chrono::steady_clock::now() < deadline) {
-    last = result(id);
-    const std::string& status = last["jobStatus"];
-    if (status != "QUEUED" && status != "DELAYED" && status != "IN_PROCESS") return last;
-    std::this_thread::sleep_for(std::chrono::milliseconds(20));
-  }
-  return last;
+std::map<std::string, std::string> RepositoryFixture::waitForEnd(long id)
+{
+    auto deadline = std::chrono::steady_clock::now() + std::chrono::seconds(20);
+    std::map<std::string, std::string> last;
+    while (std::chrono::steady_clock::now() < deadline) {
+        last = result(id);
+        const std::string& status = last["jobStatus"];
+        if (status != "QUEUED" && status != "DELAYED" && status != "IN_PROCESS")
+            return last;
+        std::this_thread::sleep_for(std::chrono::milliseconds(20));
+    }
+    return last;
 }
 
 }  // namespace zeltest

@@ -35,28 +35,28 @@ std::string document(const std::string& elements);
 std::string withoutTimes(const std::string& text);
 
 class ServerFixture : public ::testing::Test {
- protected:
-  void SetUp() override;
-  void TearDown() override;
+protected:
+    void SetUp() override;
+    void TearDown() override;
 
-  // Starts (or restarts, on the same data directory) the server.
-  void startServer();
-  void stopServer();
-  std::uint16_t port() const { return server_->port(); }
-  zelserverd::ServerState& state() { return server_->state(); }
-  // A connection already signed in as `user` (password: user + "pw").
-  std::unique_ptr<TestClient> connectAs(const std::string& user);
-  // The user the server has `client` signed in as: proof that the connection is in step.
-  static std::string userOf(TestClient& client);
-  // The root element of a successful reply document; valid until the next call.
-  pugi::xml_node parse(const WireReply& reply);
+    // Starts (or restarts, on the same data directory) the server.
+    void startServer();
+    void stopServer();
+    std::uint16_t port() const { return server_->port(); }
+    zelserverd::ServerState& state() { return server_->state(); }
+    // A connection already signed in as `user` (password: user + "pw").
+    std::unique_ptr<TestClient> connectAs(const std::string& user);
+    // The user the server has `client` signed in as: proof that the connection is in step.
+    static std::string userOf(TestClient& client);
+    // The root element of a successful reply document; valid until the next call.
+    pugi::xml_node parse(const WireReply& reply);
 
-  std::string root_;     // everything of this test lives below
-  std::string dataDir_;
-  std::string areaDir_;  // the shared resource "AREA"
-  std::string configPath_;
-  std::unique_ptr<zelserverd::Server> server_;
-  pugi::xml_document doc_;
+    std::string root_;  // everything of this test lives below
+    std::string dataDir_;
+    std::string areaDir_;  // the shared resource "AREA"
+    std::string configPath_;
+    std::unique_ptr<zelserverd::Server> server_;
+    pugi::xml_document doc_;
 };
 
 // A result text split into its name=value entries.
@@ -67,28 +67,25 @@ std::string requestText(const std::string& workspace, const Values& parameters =
 // A server with one repository "REPO", an administrator's connection, and helpers for items and
 // jobs.
 class RepositoryFixture : public ServerFixture {
- protected:
-  void SetUp() override;
-  void TearDown() override;
-  // Restarts the server and signs the administrator in again.
-  void restart();
+protected:
+    void SetUp() override;
+    void TearDown() override;
+    // Restarts the server and signs the administrator in again.
+    void restart();
 
-  WireReply addItem(const std::string& name, const std::string& content,
-                    const std::string& keyword = "REP_ADD_ITEM");
-  WireReply addResource(const std::string& item, const std::string& name,
-                        const std::string& content,
-                        const std::string& keyword = "REP_ADD_ITEMRESOURCE");
-  // Submits a job; its id, or 0 (the reply is kept in lastReply_).
-  long submit(const std::string& workspace, const Values& parameters = {},
-              const Values& extra = {});
-  // Polls until the job has ended (or 20 seconds pass); the last result seen.
-  std::map<std::string, std::string> waitForEnd(long id);
-  std::map<std::string, std::string> result(long id);
-  // Number of files in the content directory.
-  std::size_t storedFiles() { return entriesOf(dataDir_ + "/store").size(); }
+    WireReply addItem(const std::string& name, const std::string& content, const std::string& keyword = "REP_ADD_ITEM");
+    WireReply addResource(const std::string& item, const std::string& name, const std::string& content,
+                          const std::string& keyword = "REP_ADD_ITEMRESOURCE");
+    // Submits a job; its id, or 0 (the reply is kept in lastReply_).
+    long submit(const std::string& workspace, const Values& parameters = {}, const Values& extra = {});
+    // Polls until the job has ended (or 20 seconds pass); the last result seen.
+    std::map<std::string, std::string> waitForEnd(long id);
+    std::map<std::string, std::string> result(long id);
+    // Number of files in the content directory.
+    std::size_t storedFiles() { return entriesOf(dataDir_ + "/store").size(); }
 
-  std::unique_ptr<TestClient> admin_;
-  WireReply lastReply_;
+    std::unique_ptr<TestClient> admin_;
+    WireReply lastReply_;
 };
 
 }  // namespace zeltest

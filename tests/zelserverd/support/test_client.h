@@ -13,9 +13,9 @@ namespace zeltest {
 using Values = std::vector<std::pair<std::string, std::string>>;
 
 struct WireReply {
-  std::string status;  // "SUCCESS", "ERROR", or "" when no reply came
-  std::string body;
-  bool ok() const { return status == "SUCCESS"; }
+    std::string status;  // "SUCCESS", "ERROR", or "" when no reply came
+    std::string body;
+    bool ok() const { return status == "SUCCESS"; }
 };
 
 std::string requestPayload(const std::string& keyword, const Values& values);
@@ -26,40 +26,40 @@ std::uint32_t crc32(const std::string& data);
 std::string pathDocument(const std::string& path);
 
 struct Download {
-  WireReply reply;        // the final reply, or the frame that replaced the file header
-  bool gotFile = false;
-  std::string content;
+    WireReply reply;  // the final reply, or the frame that replaced the file header
+    bool gotFile = false;
+    std::string content;
 };
 
 class TestClient {
- public:
-  TestClient() = default;
-  TestClient(const TestClient&) = delete;
-  TestClient& operator=(const TestClient&) = delete;
-  ~TestClient();
+public:
+    TestClient() = default;
+    TestClient(const TestClient&) = delete;
+    TestClient& operator=(const TestClient&) = delete;
+    ~TestClient();
 
-  bool connect(std::uint16_t port);
-  void close();
-  bool sendRaw(const std::string& bytes);
-  bool sendFrame(const std::string& payload) { return sendRaw(frame(payload)); }
-  std::optional<std::string> readFrame(int timeoutMs = 5000);
-  // True when the server closed the connection (end of stream within the time-out).
-  bool closedByPeer(int timeoutMs = 5000);
+    bool connect(std::uint16_t port);
+    void close();
+    bool sendRaw(const std::string& bytes);
+    bool sendFrame(const std::string& payload) { return sendRaw(frame(payload)); }
+    std::optional<std::string> readFrame(int timeoutMs = 5000);
+    // True when the server closed the connection (end of stream within the time-out).
+    bool closedByPeer(int timeoutMs = 5000);
 
-  WireReply command(const std::string& keyword, const Values& values = {});
-  WireReply signIn(const std::string& user, const std::string& password);
-  // The whole upload sequence; stops where the server answers with something else than an
-  // acknowledgement and returns that. `announcedCrc` overrides the true CRC.
-  WireReply upload(const std::string& keyword, const Values& values, const std::string& content,
-                   std::optional<std::uint32_t> announcedCrc = std::nullopt);
-  Download download(const std::string& keyword, const Values& values);
+    WireReply command(const std::string& keyword, const Values& values = {});
+    WireReply signIn(const std::string& user, const std::string& password);
+    // The whole upload sequence; stops where the server answers with something else than an
+    // acknowledgement and returns that. `announcedCrc` overrides the true CRC.
+    WireReply upload(const std::string& keyword, const Values& values, const std::string& content,
+                     std::optional<std::uint32_t> announcedCrc = std::nullopt);
+    Download download(const std::string& keyword, const Values& values);
 
- private:
-  WireReply readReply();
-  bool waitReadable(int timeoutMs);
-  bool recvExact(char* data, std::size_t size, int timeoutMs);
+private:
+    WireReply readReply();
+    bool waitReadable(int timeoutMs);
+    bool recvExact(char* data, std::size_t size, int timeoutMs);
 
-  int fd_ = -1;
+    int fd_ = -1;
 };
 
 }  // namespace zeltest
