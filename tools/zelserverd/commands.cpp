@@ -46,7 +46,10 @@ Reply dispatch(CommandContext& context)
             return Reply::authorization("user '" + context.principal().user + "' may not run " +
                                         std::string(entry->keyword));
     }
-    return entry->handler(context);
+    Target target;
+    if (auto failure = resolveTarget(context, entry->needs, target))
+        return *failure;
+    return entry->handler(context, target);
 }
 
 }  // namespace zelserverd

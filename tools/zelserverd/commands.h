@@ -10,6 +10,8 @@
 #include "auth.h"
 #include "framing.h"
 #include "net.h"
+#include "repository_store.h"
+#include "shared_resources.h"
 
 namespace zelserverd {
 
@@ -53,11 +55,55 @@ struct CommandContext {
     std::optional<std::string> required(std::string_view name, Reply& failure) const;
 };
 
-using Handler = Reply (*)(CommandContext&);
+// How a command names a service, repository, item or shared resource: not at all, by a name it
+// answers for itself when unknown ("false", or a document without the element), or as something
+// that must exist.
+enum class Named { No, Name, Known };
+
+enum class Filter { All, Enabled, Disabled };
+
+// What a command names. The dispatcher reads and checks it in the order of the members before the
+// handler runs; the first missing value or unknown name is the reply.
+struct Needs {
+    Named service = Named::No;                // "serviceName"
+    Named repository = Named::No;             // "repositoryName"
+    bool filter = false;                      // "enableFilter", absent meaning all
+    Named item = Named::No;                   // `itemValue`, in the repository
+    std::string_view itemValue = "itemName";  // "workspaceName" and others for the typed forms
+    bool resource = false;                    // "resourceName"
+    Named area = Named::No;                   // "srName"
+    bool path = false;                        // "srPath", a "PATH" document confined to the area
+    bool source = false;                      // "srSrcPath"
+    bool destination = false;                 // "srDestPath"
+    bool job = false;                         // "jobID"
+    bool account = false;                     // "userAccountName", one the user may manage
+};
+
+// What the names resolved to. A record named by its name alone holds only that name.
+struct Target {
+    ServiceRecord service;
+    RepositoryRecord repository;
+    Filter filter = Filter::All;
+    ItemRecord item;
+    std::string resourceName;
+    std::string areaName;
+    const SharedArea* area = nullptr;  // set when the area is Known
+    AreaPath path;
+    AreaPath source;
+    AreaPath destination;
+    std::int64_t job = 0;
+    std::string account;
+};
+
+// Fills `target` with what `needs` names; the failure reply, or nothing.
+std::optional<Reply> resolveTarget(CommandContext& context, const Needs& needs, Target& target);
+
+using Handler = Reply (*)(CommandContext&, const Target&);
 
 struct CommandSpec {
     std::string_view keyword;
     std::uint32_t right;  // 0: any signed-in user
+    Needs needs;
     Handler handler;
     bool needsSignIn = true;
 };

@@ -14,22 +14,7 @@ namespace zelserverd {
 
 namespace {
 
-// The job a command names: the failure reply, or nothing with `id` set. Clients write job ids
-// as signed 32-bit decimals, so 4294967295 arrives as -1.
-std::optional<Reply> resolveJob(CommandContext& context, std::int64_t& id)
-{
-    Reply failure;
-    auto text = context.required("jobID", failure);
-    if (!text)
-        return failure;
-    auto value = parseSigned(*text);
-    if (!value || *value < INT32_MIN || *value > static_cast<std::int64_t>(UINT32_MAX))
-        return Reply::error("bad job id '" + *text + "'");
-    id = static_cast<std::int64_t>(static_cast<std::uint32_t>(*value));
-    return std::nullopt;
-}
-
-Reply jobRequest(CommandContext& context)
+Reply jobRequest(CommandContext& context, const Target&)
 {
     Reply failure;
     JobSubmission submission;
@@ -69,38 +54,30 @@ Reply jobRequest(CommandContext& context)
     return Reply::ok(std::to_string(id));
 }
 
-Reply abortJob(CommandContext& context)
+Reply abortJob(CommandContext& context, const Target& t)
 {
-    std::int64_t id = 0;
-    if (auto failure = resolveJob(context, id))
-        return *failure;
+    std::int64_t id = t.job;
     std::string error = context.server.jobs->abort(id, context.principal().user);
     return error.empty() ? Reply::ok() : Reply::error(error);
 }
 
-Reply jobResult(CommandContext& context)
+Reply jobResult(CommandContext& context, const Target& t)
 {
-    std::int64_t id = 0;
-    if (auto failure = resolveJob(context, id))
-        return *failure;
+    std::int64_t id = t.job;
     std::optional<std::string> text = context.server.jobs->resultText(id);
     return Reply::ok(text ? *text : "null");
 }
 
-Reply logExists(CommandContext& context)
+Reply logExists(CommandContext& context, const Target& t)
 {
-    std::int64_t id = 0;
-    if (auto failure = resolveJob(context, id))
-        return *failure;
+    std::int64_t id = t.job;
     struct stat info {};
     return Reply::boolean(::stat(context.server.jobs->logPath(id).c_str(), &info) == 0);
 }
 
-Reply logInfo(CommandContext& context)
+Reply logInfo(CommandContext& context, const Target& t)
 {
-    std::int64_t id = 0;
-    if (auto failure = resolveJob(context, id))
-        return *failure;
+    std::int64_t id = t.job;
     struct stat info {};
     if (::stat(context.server.jobs->logPath(id).c_str(), &info) != 0)
         return Reply::error("job " + std::to_string(id) + " has no log");
@@ -110,11 +87,9 @@ Reply logInfo(CommandContext& context)
     }));
 }
 
-Reply logFile(CommandContext& context)
+Reply logFile(CommandContext& context, const Target& t)
 {
-    std::int64_t id = 0;
-    if (auto failure = resolveJob(context, id))
-        return *failure;
+    std::int64_t id = t.job;
     // The log of a running job keeps growing; the transfer sends what is there when it starts.
     UniqueFd fd(::open(context.server.jobs->logPath(id).c_str(), O_RDONLY | O_CLOEXEC));
     if (!fd.valid())
@@ -132,10 +107,11 @@ Reply logFile(CommandContext& context)
 
 std::vector<CommandSpec> jobCommands()
 {
+    constexpr Needs job{.job = true};
     return {
-        {"JOB_REQUEST", kRightJobs, jobRequest},          {"ABORT_JOB_REQUEST", kRightJobs, abortJob},
-        {"GET_JOB_RESULT_STRING", kRightJobs, jobResult}, {"LOG_FILEEXISTS", kRightJobs, logExists},
-        {"LOG_GET_FILEINFO", kRightJobs, logInfo},        {"LOG_GET_FILE", kRightJobs, logFile},
+        {"JOB_REQUEST", kRightJobs, {}, jobRequest},           {"ABORT_JOB_REQUEST", kRightJobs, job, abortJob},
+        {"GET_JOB_RESULT_STRING", kRightJobs, job, jobResult}, {"LOG_FILEEXISTS", kRightJobs, job, logExists},
+        {"LOG_GET_FILEINFO", kRightJobs, job, logInfo},        {"LOG_GET_FILE", kRightJobs, job, logFile},
     };
 }
 

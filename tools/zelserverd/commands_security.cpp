@@ -9,25 +9,6 @@ namespace zelserverd {
 
 namespace {
 
-// The account a command names ("userAccountName"), once the signed-in user may touch it: the
-// failure reply, or nothing with `account` set.
-std::optional<Reply> resolveAccount(CommandContext& context, std::string& account)
-{
-    Reply failure;
-    auto name = context.required("userAccountName", failure);
-    if (!name)
-        return failure;
-    const Principal& principal = context.principal();
-    bool own = *name == principal.user;
-    std::uint32_t needed = own ? (kRightTokens | kRightTokensAdmin) : kRightTokensAdmin;
-    if ((principal.rights & needed) == 0)
-        return Reply::authorization("user '" + principal.user + "' may not manage the user token of '" + *name + "'");
-    if (!context.server.config.findUser(*name))
-        return Reply::error("unknown user account '" + *name + "'");
-    account = *name;
-    return std::nullopt;
-}
-
 // Reads the "USERTOKEN" element of "userTokenObject" into `token`. The dates are the server's
 // to set.
 std::optional<Reply> readToken(CommandContext& context, UserToken& token)
@@ -52,19 +33,15 @@ std::optional<Reply> readToken(CommandContext& context, UserToken& token)
     return std::nullopt;
 }
 
-Reply tokenExists(CommandContext& context)
+Reply tokenExists(CommandContext& context, const Target& t)
 {
-    std::string account;
-    if (auto failure = resolveAccount(context, account))
-        return *failure;
+    const std::string& account = t.account;
     return Reply::boolean(context.server.tokens.get(account).has_value());
 }
 
-Reply getToken(CommandContext& context)
+Reply getToken(CommandContext& context, const Target& t)
 {
-    std::string account;
-    if (auto failure = resolveAccount(context, account))
-        return *failure;
+    const std::string& account = t.account;
     std::optional<UserToken> token = context.server.tokens.get(account);
     return Reply::ok(replyDocument("SEC_GET_USERTOKEN", [&](pugi::xml_node root) {
         if (!token)
@@ -79,11 +56,8 @@ Reply getToken(CommandContext& context)
     }));
 }
 
-Reply writeToken(CommandContext& context, bool add)
+Reply writeToken(CommandContext& context, const std::string& account, bool add)
 {
-    std::string account;
-    if (auto failure = resolveAccount(context, account))
-        return *failure;
     UserToken token;
     token.account = account;
     if (auto failure = readToken(context, token))
@@ -92,22 +66,18 @@ Reply writeToken(CommandContext& context, bool add)
     return error.empty() ? Reply::ok() : Reply::error(error);
 }
 
-Reply addToken(CommandContext& context) { return writeToken(context, true); }
-Reply updateToken(CommandContext& context) { return writeToken(context, false); }
+Reply addToken(CommandContext& context, const Target& t) { return writeToken(context, t.account, true); }
+Reply updateToken(CommandContext& context, const Target& t) { return writeToken(context, t.account, false); }
 
-Reply removeToken(CommandContext& context)
+Reply removeToken(CommandContext& context, const Target& t)
 {
-    std::string account;
-    if (auto failure = resolveAccount(context, account))
-        return *failure;
+    const std::string& account = t.account;
     return Reply::boolean(context.server.tokens.remove(account));
 }
 
-Reply tokenExpired(CommandContext& context)
+Reply tokenExpired(CommandContext& context, const Target& t)
 {
-    std::string account;
-    if (auto failure = resolveAccount(context, account))
-        return *failure;
+    const std::string& account = t.account;
     std::optional<UserToken> token = context.server.tokens.get(account);
     if (!token)
         return Reply::error("account '" + account + "' has no user token");
@@ -118,10 +88,11 @@ Reply tokenExpired(CommandContext& context)
 
 std::vector<CommandSpec> securityCommands()
 {
+    constexpr Needs account{.account = true};
     return {
-        {"SEC_USERTOKEN_EXISTS", 0, tokenExists}, {"SEC_GET_USERTOKEN", 0, getToken},
-        {"SEC_ADD_USERTOKEN", 0, addToken},       {"SEC_UPDATE_USERTOKEN", 0, updateToken},
-        {"SEC_REMOVE_USERTOKEN", 0, removeToken}, {"SEC_USERTOKEN_EXPIRED", 0, tokenExpired},
+        {"SEC_USERTOKEN_EXISTS", 0, account, tokenExists}, {"SEC_GET_USERTOKEN", 0, account, getToken},
+        {"SEC_ADD_USERTOKEN", 0, account, addToken},       {"SEC_UPDATE_USERTOKEN", 0, account, updateToken},
+        {"SEC_REMOVE_USERTOKEN", 0, account, removeToken}, {"SEC_USERTOKEN_EXPIRED", 0, account, tokenExpired},
     };
 }
 

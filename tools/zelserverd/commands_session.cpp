@@ -16,7 +16,7 @@ std::string joined(const std::vector<std::string>& items)
     return text;
 }
 
-Reply sessionInit(CommandContext& context)
+Reply sessionInit(CommandContext& context, const Target&)
 {
     SignInOutcome outcome = context.server.auth.signIn(context.request, context.session.peer);
     if (!outcome.principal) {
@@ -32,7 +32,7 @@ Reply sessionInit(CommandContext& context)
     }));
 }
 
-Reply sessionProperty(CommandContext& context)
+Reply sessionProperty(CommandContext& context, const Target&)
 {
     Reply failure;
     auto name = context.required("sessionPropName", failure);
@@ -75,8 +75,8 @@ Reply sessionProperty(CommandContext& context)
 std::vector<CommandSpec> sessionCommands()
 {
     return {
-        {"SERVER_SESSION_INIT", 0, sessionInit, false},
-        {"SERVER_SESSION_GET_PROP", 0, sessionProperty},
+        {"SERVER_SESSION_INIT", 0, {}, sessionInit, false},
+        {"SERVER_SESSION_GET_PROP", 0, {}, sessionProperty},
     };
 }
 

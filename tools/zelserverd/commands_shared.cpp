@@ -61,59 +61,6 @@ void appendFileInfo(pugi::xml_node parent, const std::string& relative, const st
     path.append_attribute("abspath") = relative.c_str();
 }
 
-// Reads the "PATH" document under `valueName` and confines it to the area.
-std::optional<Reply> resolvePath(CommandContext& context, const SharedArea& area, std::string_view valueName,
-                                 AreaPath& out)
-{
-    const std::string* value = context.request.find(valueName);
-    if (!value)
-        return Reply::error("missing value \"" + std::string(valueName) + "\"");
-    std::string clientPath;
-    std::string error = pathFromDocument(*value, clientPath);
-    if (error.empty())
-        error = area.resolve(clientPath, out);
-    if (!error.empty())
-        return Reply::error(error);
-    return std::nullopt;
-}
-
-// What a shared-resource command names: always its area ("srName"), and the paths in it that
-// it works on, checked in this order.
-struct Wants {
-    bool path = false;         // "srPath"
-    bool source = false;       // "srSrcPath"
-    bool destination = false;  // "srDestPath"
-};
-
-struct Target {
-    const SharedArea* area = nullptr;
-    AreaPath path;
-    AreaPath source;
-    AreaPath destination;
-};
-
-// The one way a handler learns what its request names: the failure reply, or nothing with
-// `target` filled.
-std::optional<Reply> resolve(CommandContext& context, const Wants& wants, Target& target)
-{
-    Reply failure;
-    auto name = context.required("srName", failure);
-    if (!name)
-        return failure;
-    target.area = context.server.findArea(*name);
-    if (!target.area)
-        return Reply::error("unknown shared resource '" + *name + "'");
-    const SharedArea& area = *target.area;
-    std::optional<Reply> refused;
-    if (wants.path)
-        refused = resolvePath(context, area, "srPath", target.path);
-    if (!refused && wants.source)
-        refused = resolvePath(context, area, "srSrcPath", target.source);
-    if (!refused && wants.destination)
-        refused = resolvePath(context, area, "srDestPath", target.destination);
-    return refused;
-}
-
 bool statPath(const AreaPath& path, struct stat& info) { return ::stat(path.full.c_str(), &info) == 0; }
 
 // The directory that will hold `path`; it must exist already.
@@ -130,7 +77,7 @@ std::optional<Reply> existingParent(const SharedArea& area, const AreaPath& path
     return std::nullopt;
 }
 
-Reply listResources(CommandContext& context)
+Reply listResources(CommandContext& context, const Target&)
 {
     return Reply::ok(replyDocument("SR_GET_SHAREDRESOURCES", [&](pugi::xml_node root) {
         for (const auto& area : context.server.areas)
@@ -138,13 +85,9 @@ Reply listResources(CommandContext& context)
     }));
 }
 
-Reply getResource(CommandContext& context)
+Reply getResource(CommandContext& context, const Target& t)
 {
-    Reply failure;
-    auto name = context.required("srName", failure);
-    if (!name)
-        return failure;
-    const SharedArea* area = context.server.findArea(*name);
+    const SharedArea* area = context.server.findArea(t.areaName);
     // An unknown name is answered with a document without the element: the client reads it as
     // "not found" rather than as a failure.
     return Reply::ok(replyDocument("SR_GET_SHAREDRESOURCE", [&](pugi::xml_node root) {
@@ -153,20 +96,14 @@ Reply getResource(CommandContext& context)
     }));
 }
 
-Reply exists(CommandContext& context)
+Reply exists(CommandContext& context, const Target& t)
 {
-    Target t;
-    if (auto failure = resolve(context, {.path = true}, t))
-        return *failure;
     struct stat info {};
     return Reply::boolean(statPath(t.path, info));
 }
 
-Reply getInfo(CommandContext& context)
+Reply getInfo(CommandContext& context, const Target& t)
 {
-    Target t;
-    if (auto failure = resolve(context, {.path = true}, t))
-        return *failure;
     struct stat info {};
     if (!statPath(t.path, info))
         return Reply::error("'" + t.path.relative + "' does not exist");
@@ -174,11 +111,8 @@ Reply getInfo(CommandContext& context)
         replyDocument("SR_GET", [&](pugi::xml_node root) { appendFileInfo(root, t.path.relative, info); }));
 }
 
-Reply list(CommandContext& context)
+Reply list(CommandContext& context, const Target& t)
 {
-    Target t;
-    if (auto failure = resolve(context, {.path = true}, t))
-        return *failure;
     const AreaPath& path = t.path;
     struct stat info {};
     if (!statPath(path, info))
@@ -207,11 +141,8 @@ Reply list(CommandContext& context)
     }));
 }
 
-Reply makeDirectory(CommandContext& context)
+Reply makeDirectory(CommandContext& context, const Target& t)
 {
-    Target t;
-    if (auto failure = resolve(context, {.path = true}, t))
-        return *failure;
     std::error_code ec;
     fs::create_directories(t.path.full, ec);
     if (ec || !fs::is_directory(t.path.full))
@@ -220,11 +151,8 @@ Reply makeDirectory(CommandContext& context)
     return Reply::ok();
 }
 
-Reply removePath(CommandContext& context)
+Reply removePath(CommandContext& context, const Target& t)
 {
-    Target t;
-    if (auto failure = resolve(context, {.path = true}, t))
-        return *failure;
     if (t.path.relative.empty())
         return Reply::error("the shared resource itself cannot be deleted");
     std::error_code ec;
@@ -253,11 +181,8 @@ Reply copyFile(const std::string& from, const std::string& to, const std::string
     return error.empty() ? Reply::ok() : Reply::error(error);
 }
 
-Reply copyOrMove(CommandContext& context, bool move)
+Reply copyOrMove(const Target& t, bool move)
 {
-    Target t;
-    if (auto failure = resolve(context, {.source = true, .destination = true}, t))
-        return *failure;
     const AreaPath& source = t.source;
     const AreaPath& destination = t.destination;
     struct stat info {};
@@ -287,14 +212,11 @@ Reply copyOrMove(CommandContext& context, bool move)
     return Reply::ok();
 }
 
-Reply copy(CommandContext& context) { return copyOrMove(context, false); }
-Reply move(CommandContext& context) { return copyOrMove(context, true); }
+Reply copy(CommandContext&, const Target& t) { return copyOrMove(t, false); }
+Reply move(CommandContext&, const Target& t) { return copyOrMove(t, true); }
 
-Reply upload(CommandContext& context)
+Reply upload(CommandContext& context, const Target& t)
 {
-    Target t;
-    if (auto failure = resolve(context, {.destination = true}, t))
-        return *failure;
     std::string parent;
     if (auto failure = existingParent(*t.area, t.destination, parent))
         return *failure;
@@ -311,11 +233,8 @@ Reply upload(CommandContext& context)
     return error.empty() ? Reply::ok() : Reply::error(error);
 }
 
-Reply download(CommandContext& context)
+Reply download(CommandContext& context, const Target& t)
 {
-    Target t;
-    if (auto failure = resolve(context, {.source = true}, t))
-        return *failure;
     UniqueFd fd(::open(t.source.full.c_str(), O_RDONLY | O_CLOEXEC));
     if (!fd.valid())
         return Reply::error("cannot open '" + t.source.relative + "'");
@@ -332,18 +251,21 @@ Reply download(CommandContext& context)
 
 std::vector<CommandSpec> sharedResourceCommands()
 {
+    constexpr std::uint32_t read = kRightSharedRead;
+    constexpr std::uint32_t write = kRightSharedWrite;
+    constexpr Needs path{.area = Named::Known, .path = true};
     return {
-        {"SR_GET_SHAREDRESOURCES", kRightSharedRead, listResources},
-        {"SR_GET_SHAREDRESOURCE", kRightSharedRead, getResource},
-        {"SR_EXISTS", kRightSharedRead, exists},
-        {"SR_GET", kRightSharedRead, getInfo},
-        {"SR_LIST", kRightSharedRead, list},
-        {"SR_DOWNLOAD", kRightSharedRead, download},
-        {"SR_MAKE", kRightSharedWrite, makeDirectory},
-        {"SR_DELETE", kRightSharedWrite, removePath},
-        {"SR_COPY", kRightSharedWrite, copy},
-        {"SR_MOVE", kRightSharedWrite, move},
-        {"SR_UPLOAD", kRightSharedWrite, upload},
+        {"SR_GET_SHAREDRESOURCES", read, {}, listResources},
+        {"SR_GET_SHAREDRESOURCE", read, {.area = Named::Name}, getResource},
+        {"SR_EXISTS", read, path, exists},
+        {"SR_GET", read, path, getInfo},
+        {"SR_LIST", read, path, list},
+        {"SR_DOWNLOAD", read, {.area = Named::Known, .source = true}, download},
+        {"SR_MAKE", write, path, makeDirectory},
+        {"SR_DELETE", write, path, removePath},
+        {"SR_COPY", write, {.area = Named::Known, .source = true, .destination = true}, copy},
+        {"SR_MOVE", write, {.area = Named::Known, .source = true, .destination = true}, move},
+        {"SR_UPLOAD", write, {.area = Named::Known, .destination = true}, upload},
     };
 }
 
