@@ -14,7 +14,7 @@
 #include "api/message_numbers.h"
 #include "api/status.h"
 #include "transport/LocalFile.h"
-#include "transport/command.h"
+#include "transport/checked_command.h"
 #include "transport/xml_text_util.h"
 
 namespace zel {
@@ -40,22 +40,25 @@ std::string trimSpaces(const std::string& text)
 
 bool unusable(const std::string& trimmed) { return trimmed.empty() || trimmed.find('\0') != std::string::npos; }
 
-// Checks keyword and request text before anything is sent. `keywordParameter` is the name the
-// failure reports for the keyword: the submit and transact paths have always named it differently.
-IZELServerStatus* checkJobInput(const IZELServerString& keyword, const IZELServerString& requestText,
-                                const char* keywordParameter, JobInput& input)
+// Keyword and request text, trimmed, with the checks they must pass before anything is sent.
+// `keywordParameter` is the name the failure reports for the keyword: the submit path reports it as
+// "subsectionName", the transact path as "keyword".
+struct CheckedJobInput : JobInput {
+    Check keywordCheck;
+    Check requestCheck;
+};
+
+CheckedJobInput checkJobInput(const IZELServerString& keyword, const IZELServerString& requestText,
+                              const char* keywordParameter)
 {
     const std::string keywordGiven = toStdString(keyword);
     const std::string requestGiven = toStdString(requestText);
+    CheckedJobInput input;
     input.keyword = trimSpaces(keywordGiven);
     input.request = trimSpaces(requestGiven);
-    if (unusable(input.keyword)) {
-        return makeStatus(msg::kInvalidArgument, std::vector<std::string>{keywordParameter, keywordGiven});
-    }
-    if (unusable(input.request)) {
-        return makeStatus(msg::kInvalidArgument, std::vector<std::string>{"request", requestGiven});
-    }
-    return nullptr;
+    input.keywordCheck = {!unusable(input.keyword), msg::kInvalidArgument, {keywordParameter, keywordGiven}};
+    input.requestCheck = {!unusable(input.request), msg::kInvalidArgument, {"request", requestGiven}};
+    return input;
 }
 
 // The server reads job IDs as signed 32-bit numbers, so the top half of the range goes out negative.
@@ -116,23 +119,23 @@ IZELServerStatus* ZELServerBaseTransformationManager::transact(const IZELServerS
                                                                const IZELServerStringArray& notifications,
                                                                IZELServerString& resultText)
 {
-    JobInput input;
-    if (IZELServerStatus* invalid = checkJobInput(keyword, requestText, "keyword", input)) {
-        return invalid;
-    }
-    Command command(*channel_, kJobRequest);
-    command.add("keyword", input.keyword).add("request", input.request);
+    const CheckedJobInput input = checkJobInput(keyword, requestText, "keyword");
     // The lists are only handed over: the result-port exchange writes them itself, behind the
     // result port and host it adds.
-    if (command.ready()) {
-        command.request().appendDirectives(directives);
-        command.request().appendNotifications(notifications);
-    }
-    IZELServerStatus* status = command.send(kResultPortRequest);
-    // Also after a failure: whatever the server answered is the caller's only clue.
-    const std::string body = command.body();
-    resultText.set(body.data(), static_cast<unsigned>(body.size()));
-    return status;
+    return CheckedCommand(channel_, kJobRequest)
+        .check(input.keywordCheck)
+        .check(input.requestCheck)
+        .add("keyword", input.keyword)
+        .add("request", input.request)
+        .appendDirectives(directives)
+        .appendNotifications(notifications)
+        .run([&resultText](Command& command) {
+            IZELServerStatus* status = command.send(kResultPortRequest);
+            // Also after a failure: whatever the server answered is the caller's only clue.
+            const std::string body = command.body();
+            resultText.set(body.data(), static_cast<unsigned>(body.size()));
+            return status;
+        });
 }
 
 // ---- Manager: forwarding --------------------------------------------------------------------------
@@ -173,26 +176,29 @@ IZELServerStatus* ZELServerTransformationManager::submit(const IZELServerString&
                                                          const IZELServerStringArray& directives,
                                                          const IZELServerStringArray* notifications, unsigned& jobId)
 {
-    JobInput input;
-    if (IZELServerStatus* invalid = checkJobInput(keyword, requestText, "subsectionName", input)) {
-        return invalid;
-    }
+    const CheckedJobInput input = checkJobInput(keyword, requestText, "subsectionName");
     // Unlike the transact path, the keyword goes out as the caller gave it; only the check trims it.
-    Command command(*channel(), kJobRequest);
-    command.add("keyword", keyword).add("request", input.request).addList("directives", directives);
+    CheckedCommand command(channel(), kJobRequest);
+    command.check(input.keywordCheck)
+        .check(input.requestCheck)
+        .add("keyword", keyword)
+        .add("request", input.request)
+        .addList("directives", directives);
     if (notifications != nullptr) {
         for (unsigned i = 1; i < notifications->entries(); i += 2) {
             command.add("notificationMsg", elementBytes(*notifications, i - 1) + ":" + elementBytes(*notifications, i));
         }
     }
-    if (IZELServerStatus* status = command.send(kPlainRequestAlias)) {
-        return status;
-    }
-    // A reply without a number leaves the caller's value; a number followed by other text is taken.
-    std::uint32_t id = jobId;
-    storeUInt32(command.body(), id);
-    jobId = id;
-    return nullptr;
+    return command.run([&jobId](Command& exchange) -> IZELServerStatus* {
+        if (IZELServerStatus* status = exchange.send(kPlainRequestAlias)) {
+            return status;
+        }
+        // A reply without a number leaves the caller's value; a number followed by other text is taken.
+        std::uint32_t id = jobId;
+        storeUInt32(exchange.body(), id);
+        jobId = id;
+        return nullptr;
+    });
 }
 
 IZELServerStatus* ZELServerTransformationManager::scheduleJob(const IZELServerTransformationRequest& request,
@@ -224,29 +230,32 @@ IZELServerStatus* ZELServerTransformationManager::scheduleJobString(const IZELSe
 
 IZELServerStatus* ZELServerTransformationManager::abortJob(unsigned jobId)
 {
-    Command command(*channel(), "ABORT_JOB_REQUEST");
-    command.add("jobID", jobIdText(jobId));
-    return command.send();
+    return CheckedCommand(channel(), "ABORT_JOB_REQUEST").add("jobID", jobIdText(jobId)).send();
 }
 
+// `found` is left as the caller had it when the command fails: a caller that polls for a result
+// keeps its own answer until the server gives one.
 IZELServerStatus* ZELServerTransformationManager::getJobResultString(unsigned jobId, unsigned& found,
                                                                      IZELServerString& resultText)
 {
-    Command command(*channel(), "GET_JOB_RESULT_STRING");
-    command.add("jobID", jobIdText(jobId));
-    if (IZELServerStatus* status = command.send()) {
-        return status;
-    }
-    // The server answers "null" for a job it has no result for; any other text, also an empty one,
-    // is the result.
-    const std::string body = command.body();
-    if (body == "null") {
-        found = 0;
-        return nullptr;
-    }
-    found = 1;
-    resultText.set(body.data(), static_cast<unsigned>(body.size()));
-    return nullptr;
+    return CheckedCommand(channel(), "GET_JOB_RESULT_STRING")
+        .add("jobID", jobIdText(jobId))
+        .run(
+            found,
+            [&](Command& command) -> IZELServerStatus* {
+                if (IZELServerStatus* status = command.send()) {
+                    return status;
+                }
+                // The server answers "null" for a job it has no result for; any other text, also an
+                // empty one, is the result.
+                const std::string body = command.body();
+                found = body == "null" ? 0 : 1;
+                if (found == 1) {
+                    resultText.set(body.data(), static_cast<unsigned>(body.size()));
+                }
+                return nullptr;
+            },
+            OnFailure::kKeep);
 }
 
 IZELServerStatus* ZELServerTransformationManager::getJobResult(unsigned jobId, unsigned& found,
@@ -264,29 +273,16 @@ IZELServerStatus* ZELServerTransformationManager::getJobResult(unsigned jobId, u
 
 IZELServerStatus* ZELServerTransformationManager::logFileExists(unsigned jobId, unsigned& exists)
 {
-    Command command(*channel(), "LOG_FILEEXISTS");
-    command.add("jobID", jobIdText(jobId));
-    if (IZELServerStatus* status = command.send()) {
-        return status;
-    }
-    // A reply that is no boolean leaves the flag as it was; the exchange itself succeeded.
-    command.response().readBoolean(exists);
-    return nullptr;
+    return CheckedCommand(channel(), "LOG_FILEEXISTS").add("jobID", jobIdText(jobId)).askFlag(exists);
 }
 
+// A reply the reader cannot use is no failure of the operation: `found` stays 0.
 IZELServerStatus* ZELServerTransformationManager::getLogFileInfo(unsigned jobId, IZELServerLogFileInfo& info,
                                                                  unsigned& found)
 {
-    found = 0;
-    Command command(*channel(), "LOG_GET_FILEINFO");
-    command.add("jobID", jobIdText(jobId));
-    if (IZELServerStatus* status = command.send()) {
-        return status;
-    }
-    if (command.response().readLogFileInfo(info) == 0) {
-        found = 1;
-    }
-    return nullptr;
+    return CheckedCommand(channel(), "LOG_GET_FILEINFO")
+        .add("jobID", jobIdText(jobId))
+        .askObject(found, [&info](const IZELServerResponse& response) { return response.readLogFileInfo(info); });
 }
 
 IZELServerStatus* ZELServerTransformationManager::getLogFile(unsigned jobId, const IZELServerString& localPath,
@@ -295,26 +291,25 @@ IZELServerStatus* ZELServerTransformationManager::getLogFile(unsigned jobId, con
     const std::string path = toStdString(localPath);
     // Opened before anything is sent, so that a path that cannot be written costs no exchange.
     LocalFile check(path, LocalFile::Mode::Write);
-    if (!check.isOpen()) {
-        return makeStatus(msg::kLocalFileWrite, path);
-    }
-    Command command(*channel(), "LOG_GET_FILE");
     // The client never asks the server to check the log's checksum.
-    command.add("jobID", jobIdText(jobId)).add("logFileCRCCheckingEnabled", "false");
-    if (IZELServerStatus* status = command.transfer(path, kDownload)) {
-        return status;
-    }
-    unsigned answer = 0;
-    if (command.response().readBoolean(answer) != 0) {
-        return nullptr;
-    }
-    success = answer;
-    if (answer == 0) {
-        // Closed first: some systems refuse to delete a file that is still open.
-        check.close();
-        std::remove(path.c_str());
-    }
-    return nullptr;
+    return CheckedCommand(channel(), "LOG_GET_FILE")
+        .check(check.isOpen(), msg::kLocalFileWrite, {path})
+        .add("jobID", jobIdText(jobId))
+        .add("logFileCRCCheckingEnabled", "false")
+        .run(success, [&](Command& command) -> IZELServerStatus* {
+            unsigned answer = 2;  // neither truth value: the reply did not say
+            if (IZELServerStatus* status = command.receive(path, answer, nullptr)) {
+                return status;
+            }
+            success = answer == 1 ? 1 : 0;
+            if (answer == 0) {
+                // Only a log the server says it has not got is deleted; closed first, because
+                // some systems refuse to delete a file that is still open.
+                check.close();
+                std::remove(path.c_str());
+            }
+            return nullptr;
+        });
 }
 
 }  // namespace zel

@@ -90,27 +90,15 @@ IZELServerStatus* downloadItem(Command& command, const std::string& itemName, co
         const std::string pattern = std::string(TemporaryFile::kPrefix) + "XXXXXX" + TemporaryFile::kSuffix;
         return makeStatus(msg::kLocalFileWrite, (fs::path(directory) / pattern).string());
     }
-    if (IZELServerStatus* status = command.transfer(file->path(), kDownload, progress)) {
+    if (IZELServerStatus* status = command.receive(file->path(), received, progress)) {
         return status;
     }
-    command.response().readBoolean(received);
     if (receivedSize(file->path()) < 1) {
         return makeStatus(msg::kEmptyDownload, itemName);
     }
     if (!moveOnto(*file, destination)) {
         return makeStatus(msg::kLocalFileWrite, destination);
     }
-    return nullptr;
-}
-
-// A resource is received straight into its destination: no temporary file and no size check.
-IZELServerStatus* downloadResource(Command& command, const std::string& destination, unsigned& received,
-                                   IZELServerProgressListener* progress)
-{
-    if (IZELServerStatus* status = command.transfer(destination, kDownload, progress)) {
-        return status;
-    }
-    command.response().readBoolean(received);
     return nullptr;
 }
 
@@ -144,23 +132,26 @@ CheckedCommand ZELServerRepository::on(const char* keyword) const
 
 IZELServerStatus* ZELServerRepository::itemExists(const IZELServerString& itemName, unsigned& exists)
 {
-    return on("REP_ITEMEXISTS").require(itemName).allowedName(itemName).add("itemName", itemName).askFlag(exists);
+    return on("REP_ITEMEXISTS")
+        .require(itemName)
+        .check(allowedName(itemName))
+        .add("itemName", itemName)
+        .askFlag(exists);
 }
 
 IZELServerStatus* ZELServerRepository::getItem(const IZELServerString& itemName,
                                                const IZELServerString& destinationPath, unsigned& received,
                                                IZELServerProgressListener* listener)
 {
-    received = 0;
     const std::string item = toStdString(itemName);
     const std::string destination = toStdString(destinationPath);
     return on("REP_GET_ITEM")
         .require(itemName)
         .require(destinationPath)
-        .allowedName(itemName)
+        .check(allowedName(itemName))
         .add("itemName", item)
         .add("itemFileCRCCheckingEnabled", kNoCrcCheck)
-        .run([&](Command& command) { return downloadItem(command, item, destination, received, listener); });
+        .run(received, [&](Command& command) { return downloadItem(command, item, destination, received, listener); });
 }
 
 IZELServerStatus* ZELServerRepository::getItem(const IZELServerString& itemName,
@@ -175,7 +166,7 @@ IZELServerStatus* ZELServerRepository::addItem(const IZELServerString& itemName,
     return on("REP_ADD_ITEM")
         .require(itemName)
         .require(sourcePath)
-        .allowedName(itemName)
+        .check(allowedName(itemName))
         .add("itemName", itemName)
         .add("itemFileCRCCheckingEnabled", kNoCrcCheck)
         .upload(sourcePath, listener);
@@ -206,7 +197,11 @@ IZELServerStatus* ZELServerRepository::updateItem(const IZELServerString& itemNa
 
 IZELServerStatus* ZELServerRepository::removeItem(const IZELServerString& itemName, unsigned& removed)
 {
-    return on("REP_REMOVE_ITEM").require(itemName).allowedName(itemName).add("itemName", itemName).askFlag(removed);
+    return on("REP_REMOVE_ITEM")
+        .require(itemName)
+        .check(allowedName(itemName))
+        .add("itemName", itemName)
+        .askFlag(removed);
 }
 
 // ---- Item resources ---------------------------------------------------------------------------------
@@ -217,8 +212,8 @@ IZELServerStatus* ZELServerRepository::itemResourceExists(const IZELServerString
     return on("REP_ITEMRESOURCEEXISTS")
         .require(itemName)
         .require(resourceName)
-        .allowedName(itemName)
-        .allowedName(resourceName)
+        .check(allowedName(itemName))
+        .check(allowedName(resourceName))
         .add("itemName", itemName)
         .add("resourceName", resourceName)
         .askFlag(exists);
@@ -229,18 +224,18 @@ IZELServerStatus* ZELServerRepository::getItemResource(const IZELServerString& i
                                                        const IZELServerString& destinationPath, unsigned& received,
                                                        IZELServerProgressListener* listener)
 {
-    received = 0;
+    // A resource is received straight into its destination: no temporary file and no size check.
     const std::string destination = toStdString(destinationPath);
     return on("REP_GET_ITEMRESOURCE")
         .require(itemName)
         .require(resourceName)
         .require(destinationPath)
-        .allowedName(itemName)
-        .allowedName(resourceName)
+        .check(allowedName(itemName))
+        .check(allowedName(resourceName))
         .add("itemName", itemName)
         .add("resourceName", resourceName)
         .add("resourceFileCRCCheckingEnabled", kNoCrcCheck)
-        .run([&](Command& command) { return downloadResource(command, destination, received, listener); });
+        .download(destination, received, listener);
 }
 
 IZELServerStatus* ZELServerRepository::getItemResource(const IZELServerString& itemName,
@@ -271,9 +266,9 @@ IZELServerStatus* ZELServerRepository::addItemResource(const IZELServerString& i
         .require(itemName)
         .require(resourceName)
         .require(sourcePath)
-        .allowedName(itemName)
-        .allowedName(resourceName)
-        .distinct(resourceName, itemName)
+        .check(allowedName(itemName))
+        .check(allowedName(resourceName))
+        .check(distinct(resourceName, itemName))
         .add("itemName", itemName)
         .add("resourceName", resourceName)
         .add("resourceFileCRCCheckingEnabled", kNoCrcCheck)
@@ -296,9 +291,9 @@ IZELServerStatus* ZELServerRepository::updateItemResource(const IZELServerString
         .require(itemName)
         .require(resourceName)
         .require(sourcePath)
-        .allowedName(itemName)
-        .allowedName(resourceName)
-        .distinct(resourceName, itemName)
+        .check(allowedName(itemName))
+        .check(allowedName(resourceName))
+        .check(distinct(resourceName, itemName))
         .add("itemName", itemName)
         .add("resourceName", resourceName)
         .add("resourceFileCRCCheckingEnabled", kNoCrcCheck)
@@ -318,8 +313,8 @@ IZELServerStatus* ZELServerRepository::removeItemResource(const IZELServerString
     return on("REP_REMOVE_ITEMRESOURCE")
         .require(itemName)
         .require(resourceName)
-        .allowedName(itemName)
-        .allowedName(resourceName)
+        .check(allowedName(itemName))
+        .check(allowedName(resourceName))
         .add("itemName", itemName)
         .add("resourceName", resourceName)
         .askFlag(removed);

@@ -7,7 +7,7 @@
 #include <zelserverapi/IZELServerRepository.h>
 
 #include "api/heap.h"
-#include "repository/checked_command.h"
+#include "repository/repository_checks.h"
 #include "transport/IZELServerChannel.h"
 #include "transport/xml_element.h"
 

@@ -6,7 +6,7 @@
 #include "api/status.h"
 #include "repository/ZELServerPropertyAccessor.h"
 #include "repository/ZELServerRepository.h"
-#include "repository/checked_command.h"
+#include "repository/repository_checks.h"
 #include "transport/xml_navigation.h"
 #include "transport/xml_reader.h"
 
@@ -110,7 +110,7 @@ IZELServerStatus* ZELServerRepositoryManager::getRepository(const IZELServerStri
 {
     return CheckedCommand(channel_, "REP_GET_REPOSITORY")
         .require(repositoryName)
-        .allowedName(repositoryName)
+        .check(allowedName(repositoryName))
         .add("repositoryName", repositoryName)
         .askObject(found, [&](const IZELServerResponse& response) { return response.readRepository(repository); });
 }
@@ -126,7 +126,7 @@ IZELServerStatus* ZELServerRepositoryManager::addRepository(const IZELServerStri
     repository.getDescription(text);
     return CheckedCommand(channel_, "REP_ADD_REPOSITORY")
         .require(repositoryName)
-        .allowedName(repositoryName)
+        .check(allowedName(repositoryName))
         .addRepository("repositoryObject", name, text)
         .send();
 }
@@ -136,7 +136,7 @@ IZELServerStatus* ZELServerRepositoryManager::removeRepository(const IZELServerS
 {
     return CheckedCommand(channel_, "REP_REMOVE_REPOSITORY")
         .require(repositoryName)
-        .allowedName(repositoryName)
+        .check(allowedName(repositoryName))
         .add("repositoryName", repositoryName)
         .askFlag(removed);
 }

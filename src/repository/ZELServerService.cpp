@@ -5,7 +5,7 @@
 #include "api/ZELServerString.h"
 #include "api/message_numbers.h"
 #include "repository/attribute_binding.h"
-#include "repository/checked_command.h"
+#include "repository/repository_checks.h"
 #include "repository/reply_readers.h"
 #include "repository/text_out.h"
 #include "transport/xml_navigation.h"

@@ -4,7 +4,7 @@
 #include <vector>
 
 #include "repository/attribute_binding.h"
-#include "repository/checked_command.h"
+#include "repository/repository_checks.h"
 #include "repository/text_out.h"
 #include "transport/xml_navigation.h"
 

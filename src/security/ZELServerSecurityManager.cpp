@@ -1,10 +1,8 @@
 #include "security/ZELServerSecurityManager.h"
 
 #include "api/ZELServerString.h"
-#include "api/message_numbers.h"
-#include "api/status.h"
 #include "security/ZELServerUserToken.h"
-#include "transport/command.h"
+#include "transport/checked_command.h"
 
 namespace zel {
 namespace {
@@ -12,41 +10,31 @@ namespace {
 constexpr const char* kAccountName = "userAccountName";
 constexpr const char* kTokenObject = "userTokenObject";
 
+// The security manager's flags are truth values, the command path's are unsigned. Every flag of
+// this manager keeps the caller's value when the command fails or its reply does not say: a caller
+// asking about a token learns nothing from a failed question, and its own value tells it so.
+template <typename Ask>
+IZELServerStatus* askTruth(bool& flag, Ask ask)
+{
+    unsigned answer = flag ? 1 : 0;
+    IZELServerStatus* status = ask(answer);
+    flag = answer != 0;
+    return status;
+}
+
 }  // namespace
+
+CheckedCommand ZELServerSecurityManager::on(const char* keyword, const IZELServerString& accountName) const
+{
+    CheckedCommand command(channel_, keyword);
+    command.add(kAccountName, accountName);
+    return command;
+}
 
 IZELServerStatus* ZELServerSecurityManager::askFlag(const char* keyword, const IZELServerString& accountName,
                                                     bool& flag)
 {
-    if (channel_ == nullptr) {
-        return makeStatus(msg::kNotConnected);
-    }
-    Command command(*channel_, keyword);
-    command.add(kAccountName, accountName);
-    if (IZELServerStatus* status = command.send()) {
-        return status;
-    }
-    // The reader leaves its flag alone when the body is no boolean, so a reply the library cannot
-    // read keeps the caller's value, as a failed exchange does.
-    unsigned answer = flag ? 1 : 0;
-    command.response().readBoolean(answer);
-    flag = answer != 0;
-    return nullptr;
-}
-
-IZELServerStatus* ZELServerSecurityManager::sendToken(const char* keyword, const IZELServerString& accountName,
-                                                      const IZELServerUserToken& token)
-{
-    if (channel_ == nullptr) {
-        return makeStatus(msg::kNotConnected);
-    }
-    Command command(*channel_, keyword);
-    command.add(kAccountName, accountName);
-    if (command.ready()) {
-        // A token that cannot be written goes out without it; the server then refuses the command
-        // and says why, which tells the caller more than a local XML failure would.
-        command.request().addUserTokenPayload(kTokenObject, token);
-    }
-    return command.send();
+    return askTruth(flag, [&](unsigned& answer) { return on(keyword, accountName).askFlag(answer, OnFailure::kKeep); });
 }
 
 IZELServerStatus* ZELServerSecurityManager::userTokenExists(const IZELServerString& accountName, bool& exists)
@@ -75,30 +63,26 @@ void ZELServerSecurityManager::destroyUserToken(IZELServerUserToken** token)
 IZELServerStatus* ZELServerSecurityManager::getUserToken(const IZELServerString& accountName,
                                                          IZELServerUserToken& token, bool& found)
 {
-    if (channel_ == nullptr) {
-        return makeStatus(msg::kNotConnected);
-    }
-    Command command(*channel_, "SEC_GET_USERTOKEN");
-    command.add(kAccountName, accountName);
-    if (IZELServerStatus* status = command.send()) {
-        return status;
-    }
     // An account without a token is answered with a document that holds none: that is an answer,
     // not a failure, whatever the reader says about it.
-    found = command.response().readUserToken(token) == 0;
-    return nullptr;
+    return askTruth(found, [&](unsigned& answer) {
+        return on("SEC_GET_USERTOKEN", accountName)
+            .askObject(
+                answer, [&token](const IZELServerResponse& response) { return response.readUserToken(token); },
+                OnFailure::kKeep);
+    });
 }
 
 IZELServerStatus* ZELServerSecurityManager::addUserToken(const IZELServerString& accountName,
                                                          const IZELServerUserToken& token)
 {
-    return sendToken("SEC_ADD_USERTOKEN", accountName, token);
+    return on("SEC_ADD_USERTOKEN", accountName).addUserToken(kTokenObject, token).send();
 }
 
 IZELServerStatus* ZELServerSecurityManager::updateUserToken(const IZELServerString& accountName,
                                                             const IZELServerUserToken& token)
 {
-    return sendToken("SEC_UPDATE_USERTOKEN", accountName, token);
+    return on("SEC_UPDATE_USERTOKEN", accountName).addUserToken(kTokenObject, token).send();
 }
 
 IZELServerStatus* ZELServerSecurityManager::removeUserToken(const IZELServerString& accountName, bool& removed)

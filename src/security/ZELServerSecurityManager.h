@@ -8,6 +8,7 @@
 
 #include "api/heap.h"
 #include "transport/IZELServerChannel.h"
+#include "transport/checked_command.h"
 
 namespace zel {
 
@@ -31,11 +32,10 @@ public:
     IZELServerStatus* userTokenExpired(const IZELServerString& accountName, bool& expired) override;
 
 private:
+    // A command of this manager: `keyword` with "userAccountName" as its first value.
+    CheckedCommand on(const char* keyword, const IZELServerString& accountName) const;
     // The commands whose answer is the body "true" or "false".
     IZELServerStatus* askFlag(const char* keyword, const IZELServerString& accountName, bool& flag);
-    // The commands that send a token and read nothing back.
-    IZELServerStatus* sendToken(const char* keyword, const IZELServerString& accountName,
-                                const IZELServerUserToken& token);
 
     IZELServerChannel* channel_;
 };

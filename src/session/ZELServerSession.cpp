@@ -7,7 +7,7 @@
 #include "api/message_numbers.h"
 #include "api/status.h"
 #include "session/ZELServerConnectionInfo.h"
-#include "transport/command.h"
+#include "transport/checked_command.h"
 #include "transport/ZELServerTCPIPChannel.h"
 #include "jobs/jobs_factories.h"
 #include "repository/repository_factories.h"
@@ -122,14 +122,7 @@ void ZELServerSession::destroyStringArray(IZELServerStringArray** array) { destr
 
 IZELServerStatus* ZELServerSession::getSessionProperty(const IZELServerString& name, IZELServerString& value)
 {
-    Command command(*channel_, "SERVER_SESSION_GET_PROP");
-    command.add("sessionPropName", name);
-    IZELServerStatus* status = command.send();
-    if (status == nullptr) {
-        const std::string body = command.body();
-        value.set(body.data(), static_cast<unsigned>(body.size()));
-    }
-    return status;
+    return CheckedCommand(channel_.get(), "SERVER_SESSION_GET_PROP").add("sessionPropName", name).askText(value);
 }
 
 IZELServerIdentity* ZELServerSession::getIdentity() { return channel_ ? channel_->getIdentity() : nullptr; }

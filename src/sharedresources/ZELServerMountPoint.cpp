@@ -14,7 +14,7 @@
 #include "sharedresources/ZELServerPath.h"
 #include "sharedresources/temporary_file.h"
 #include "transport/LocalFile.h"
-#include "transport/command.h"
+#include "transport/checked_command.h"
 #include "transport/xml_element.h"
 #include "transport/xml_navigation.h"
 #include "transport/xml_node_list.h"
@@ -34,10 +34,6 @@ void copyOut(const std::string& text, IZELServerString& out)
     out.set(text.data(), static_cast<unsigned>(text.size()));
 }
 
-IZELServerStatus* notConnected() { return makeStatus(msg::kNotConnected); }
-
-IZELServerStatus* readingStatus(int code) { return code == 0 ? nullptr : makeStatus(static_cast<unsigned>(code)); }
-
 // The stream opening is not enough: on POSIX a directory opens for reading and fails only at the
 // first read, which would be after the command had gone out.
 bool canBeRead(const std::string& path)
@@ -55,137 +51,73 @@ void ZELServerMountPoint::getDisplayName(IZELServerString& out) const { copyOut(
 
 void ZELServerMountPoint::getDescription(IZELServerString& out) const { copyOut(description_, out); }
 
-IZELServerStatus* ZELServerMountPoint::addValues(Command& command, std::initializer_list<PathValue> paths) const
+CheckedCommand ZELServerMountPoint::on(const char* keyword) const
 {
+    CheckedCommand command(channel_, keyword);
     command.add(kResourceName, name_);
-    if (!command.ready()) {
-        return nullptr;  // send() reports it
-    }
-    for (const auto& [valueName, path] : paths) {
-        // A path that cannot be written as a document (a NUL in it) would reach the server as a
-        // command without its path; refusing it here keeps the connection out of it.
-        if (const int code = command.request().addPathPayload(valueName, *path); code != 0) {
-            return makeStatus(static_cast<unsigned>(code), std::string(valueName));
-        }
-    }
-    return nullptr;
-}
-
-IZELServerStatus* ZELServerMountPoint::statusCommand(const char* keyword, std::initializer_list<PathValue> paths)
-{
-    if (channel_ == nullptr) {
-        return notConnected();
-    }
-    Command command(*channel_, keyword);
-    if (IZELServerStatus* status = addValues(command, paths)) {
-        return status;
-    }
-    return command.send();
-}
-
-IZELServerStatus* ZELServerMountPoint::flagCommand(const char* keyword, const IZELServerPath& path, unsigned& flag)
-{
-    flag = 0;
-    if (channel_ == nullptr) {
-        return notConnected();
-    }
-    Command command(*channel_, keyword);
-    if (IZELServerStatus* status = addValues(command, {{kPathValue, &path}})) {
-        return status;
-    }
-    if (IZELServerStatus* status = command.send()) {
-        return status;
-    }
-    // A body that is no boolean leaves the flag at 0, the answer that promises nothing.
-    command.response().readBoolean(flag);
-    return nullptr;
+    return command;
 }
 
 IZELServerStatus* ZELServerMountPoint::exists(const IZELServerPath& path, unsigned& present)
 {
-    return flagCommand("SR_EXISTS", path, present);
+    return on("SR_EXISTS").addPath(kPathValue, path).askFlag(present);
 }
 
 IZELServerStatus* ZELServerMountPoint::download(const IZELServerPath& source, const IZELServerString& localTarget,
                                                 unsigned& received, IZELServerProgressListener* listener)
 {
-    received = 0;
-    if (channel_ == nullptr) {
-        return notConnected();
-    }
     const std::string target = toStdString(localTarget);
-    const std::string directory = TemporaryFile::directoryFor(target);
-    // Made before anything is sent: a target in a folder that cannot be written fails here, with
-    // the connection untouched.
-    std::optional<TemporaryFile> temporary = TemporaryFile::createIn(directory);
-    if (!temporary) {
-        return makeStatus(msg::kLocalFileWrite, target.empty() ? directory : target);
-    }
-    Command command(*channel_, "SR_DOWNLOAD");
-    if (IZELServerStatus* status = addValues(command, {{kSourcePath, &source}})) {
-        return status;
-    }
-    command.add(kCrcChecking, "true");
-    if (IZELServerStatus* status = command.transfer(temporary->path(), kDownload, listener)) {
-        return status;  // the temporary file goes with `temporary`; the target was never touched
-    }
-    // A server that sent no file is answered "false" by the channel; the (empty) temporary file still
-    // takes the target's place, as a completed exchange always does here.
-    command.response().readBoolean(received);
-    if (target.empty()) {
-        temporary->keep();
-        return nullptr;
-    }
-    if (!temporary->moveTo(target)) {
-        return makeStatus(msg::kLocalFileWrite, target);
-    }
-    return nullptr;
+    return on("SR_DOWNLOAD")
+        .addPath(kSourcePath, source)
+        .add(kCrcChecking, "true")
+        .run(received, [&](Command& command) -> IZELServerStatus* {
+            const std::string directory = TemporaryFile::directoryFor(target);
+            // Made before the command goes out: a target in a folder that cannot be written fails
+            // here, with the connection untouched.
+            std::optional<TemporaryFile> temporary = TemporaryFile::createIn(directory);
+            if (!temporary) {
+                return makeStatus(msg::kLocalFileWrite, target.empty() ? directory : target);
+            }
+            if (IZELServerStatus* status = command.receive(temporary->path(), received, listener)) {
+                return status;  // the temporary file goes with `temporary`; the target was never touched
+            }
+            // A server that sent no file is answered "false" by the channel; the (empty) temporary
+            // file still takes the target's place, as a completed exchange always does here.
+            if (target.empty()) {
+                temporary->keep();
+                return nullptr;
+            }
+            return temporary->moveTo(target) ? nullptr : makeStatus(msg::kLocalFileWrite, target);
+        });
 }
 
 IZELServerStatus* ZELServerMountPoint::upload(const IZELServerString& localSource, const IZELServerPath& destination,
                                               IZELServerProgressListener* listener)
 {
     const std::string source = toStdString(localSource);
-    if (!canBeRead(source)) {
-        return makeStatus(msg::kInvalidArgument, std::vector<std::string>{"src", source});
-    }
-    if (channel_ == nullptr) {
-        return notConnected();
-    }
-    Command command(*channel_, "SR_UPLOAD");
-    if (IZELServerStatus* status = addValues(command, {{kDestinationPath, &destination}})) {
-        return status;
-    }
-    command.add(kCrcChecking, "true");
-    return command.transfer(source, kUpload, listener);
+    return on("SR_UPLOAD")
+        .check(canBeRead(source), msg::kInvalidArgument, {"src", source})
+        .addPath(kDestinationPath, destination)
+        .add(kCrcChecking, "true")
+        .upload(localSource, listener);
 }
 
 IZELServerStatus* ZELServerMountPoint::copy(const IZELServerPath& source, const IZELServerPath& destination)
 {
-    return statusCommand("SR_COPY", {{kSourcePath, &source}, {kDestinationPath, &destination}});
+    return on("SR_COPY").addPath(kSourcePath, source).addPath(kDestinationPath, destination).send();
 }
 
 IZELServerStatus* ZELServerMountPoint::move(const IZELServerPath& source, const IZELServerPath& destination)
 {
-    return statusCommand("SR_MOVE", {{kSourcePath, &source}, {kDestinationPath, &destination}});
+    return on("SR_MOVE").addPath(kSourcePath, source).addPath(kDestinationPath, destination).send();
 }
 
 IZELServerStatus* ZELServerMountPoint::getFileInfo(const IZELServerPath& path, unsigned flags, IZELServerFileInfo& info)
 {
-    if (flags != 0) {
-        return makeStatus(msg::kInvalidArgument, std::vector<std::string>{"flags", decimalText(flags)});
-    }
-    if (channel_ == nullptr) {
-        return notConnected();
-    }
-    Command command(*channel_, "SR_GET");
-    if (IZELServerStatus* status = addValues(command, {{kPathValue, &path}})) {
-        return status;
-    }
-    if (IZELServerStatus* status = command.send()) {
-        return status;
-    }
-    return readingStatus(command.response().readFileInfo(info));
+    return on("SR_GET")
+        .check(flags == 0, msg::kInvalidArgument, {"flags", decimalText(flags)})
+        .addPath(kPathValue, path)
+        .askParsed([&info](const IZELServerResponse& response) { return response.readFileInfo(info); });
 }
 
 IZELServerStatus* ZELServerMountPoint::getFileInfo(const IZELServerPath& path, IZELServerFileInfo& info)
@@ -196,17 +128,9 @@ IZELServerStatus* ZELServerMountPoint::getFileInfo(const IZELServerPath& path, I
 IZELServerStatus* ZELServerMountPoint::listOnce(const IZELServerPath& path,
                                                 IZELServerVector<IZELServerFileInfo>& entries)
 {
-    if (channel_ == nullptr) {
-        return notConnected();
-    }
-    Command command(*channel_, "SR_LIST");
-    if (IZELServerStatus* status = addValues(command, {{kPathValue, &path}})) {
-        return status;
-    }
-    if (IZELServerStatus* status = command.send()) {
-        return status;
-    }
-    return readingStatus(command.response().readFileInfos(entries));
+    return on("SR_LIST").addPath(kPathValue, path).askParsed([&entries](const IZELServerResponse& response) {
+        return response.readFileInfos(entries);
+    });
 }
 
 IZELServerStatus* ZELServerMountPoint::list(const IZELServerPath& path, unsigned depth,
@@ -246,12 +170,12 @@ IZELServerStatus* ZELServerMountPoint::list(const IZELServerPath& path, IZELServ
 
 IZELServerStatus* ZELServerMountPoint::makeDirectory(const IZELServerPath& path)
 {
-    return statusCommand("SR_MAKE", {{kPathValue, &path}});
+    return on("SR_MAKE").addPath(kPathValue, path).send();
 }
 
 IZELServerStatus* ZELServerMountPoint::remove(const IZELServerPath& path, unsigned& removed)
 {
-    return flagCommand("SR_DELETE", path, removed);
+    return on("SR_DELETE").addPath(kPathValue, path).askFlag(removed);
 }
 
 IZELServerPath* ZELServerMountPoint::createPath(const IZELServerString& absolutePath)

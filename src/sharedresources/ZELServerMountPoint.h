@@ -2,18 +2,16 @@
 // One shared resource (mount point) and the "SR_" file commands inside it, over the channel it was
 // made or read with.
 
-#include <initializer_list>
 #include <string>
-#include <utility>
 
 #include <zelserverapi/IZELServerMountPoint.h>
 
 #include "api/heap.h"
 #include "transport/IZELServerChannel.h"
+#include "transport/checked_command.h"
 
 namespace zel {
 
-class Command;
 class XmlElement;
 
 class ZELServerMountPoint final : public IZELServerMountPoint, public HeapObject {
@@ -58,15 +56,8 @@ public:
     void readFrom(const XmlElement& element);
 
 private:
-    using PathValue = std::pair<const char*, const IZELServerPath*>;
-
-    // "srName" and then each path as a "PATH" document, in the order given. Null, or the status of a
-    // path that cannot be written (then nothing may be sent).
-    IZELServerStatus* addValues(Command& command, std::initializer_list<PathValue> paths) const;
-    // A command whose only answer is its status.
-    IZELServerStatus* statusCommand(const char* keyword, std::initializer_list<PathValue> paths);
-    // A command whose answer is the body "true" or "false", read into `flag`.
-    IZELServerStatus* flagCommand(const char* keyword, const IZELServerPath& path, unsigned& flag);
+    // A command inside this mount point: `keyword` with "srName" as its first value.
+    CheckedCommand on(const char* keyword) const;
     // One "SR_LIST" reply read into `entries` (which the reader clears first).
     IZELServerStatus* listOnce(const IZELServerPath& path, IZELServerVector<IZELServerFileInfo>& entries);
 

@@ -76,6 +76,16 @@ IZELServerStatus* Command::transfer(const std::string& localPath, unsigned direc
     return channel_.transferFile(*request_, *response_, localPath, direction, progress);
 }
 
+IZELServerStatus* Command::receive(const std::string& localPath, unsigned& received,
+                                   IZELServerProgressListener* progress)
+{
+    if (IZELServerStatus* status = transfer(localPath, kDownload, progress)) {
+        return status;
+    }
+    response_->readBoolean(received);
+    return nullptr;
+}
+
 std::string Command::body() const
 {
     std::string text;

@@ -55,6 +55,11 @@ public:
     IZELServerStatus* transfer(const std::string& localPath, unsigned direction,
                                IZELServerProgressListener* progress = nullptr);
 
+    // transfer() into `localPath` (direction kDownload), then the reply's truth value into
+    // `received`; a reply that is none leaves `received` as it was.
+    IZELServerStatus* receive(const std::string& localPath, unsigned& received,
+                              IZELServerProgressListener* progress = nullptr);
+
     // The reply body as the exchange left it; empty before an exchange or without a response.
     std::string body() const;
     // The reply itself, for its readers. Only valid when ready().

@@ -376,7 +376,7 @@ TEST_F(TransformationManagerWire, LogFileExistsReadsTheBodyAsBoolean)
     const struct {
         const char* body;
         unsigned exists;
-    } cases[] = {{"true", 1}, {"false", 0}, {"True", kUntouched}, {"true ", kUntouched}, {"1", kUntouched}};
+    } cases[] = {{"true", 1}, {"false", 0}, {"True", 0}, {"true ", 0}, {"1", 0}};
     for (const auto& c : cases) {
         server.exchange(command("LOG_FILEEXISTS", {{"jobID", "-2"}}), reply("SUCCESS", c.body));
     }
@@ -483,7 +483,7 @@ TEST_F(LogDownload, UnwritablePathFailsBeforeAnythingIsSent)
         ASSERT_NE(status, nullptr);
         EXPECT_EQ(status->getMessageNumber(), msg::kLocalFileWrite);
         EXPECT_EQ(status->getMessage(), "The local file \"" + target + "\" cannot be written.");
-        EXPECT_EQ(success, kUntouched);
+        EXPECT_EQ(success, 0u);
     }
     EXPECT_TRUE(server.verify());
     EXPECT_EQ(server.frames().size(), 1u);  // the sign-in only
@@ -501,7 +501,7 @@ TEST_F(LogDownload, BrokenTransferKeepsThePartlyWrittenFile)
     StatusPtr status(manager.getLogFile(3, str(path), success));
     ASSERT_NE(status, nullptr);
     EXPECT_EQ(status->getMessageNumber(), msg::kReceiveFailed);
-    EXPECT_EQ(success, kUntouched);
+    EXPECT_EQ(success, 0u);
     EXPECT_TRUE(fs::exists(path));
     EXPECT_TRUE(server.verify());
 }

@@ -1,0 +1,51 @@
+#include "repository/repository_checks.h"
+
+#include "api/ZELServerString.h"
+#include "api/message_numbers.h"
+
+namespace zel {
+
+bool isAllowedName(const IZELServerString& name)
+{
+    return toStdString(name).find_first_of(kForbiddenNameCharacters) == std::string::npos;
+}
+
+Check allowedName(const IZELServerString& name)
+{
+    return {isAllowedName(name), msg::kForbiddenCharacter, {kForbiddenNameCharacters}};
+}
+
+Check distinct(const IZELServerString& resourceName, const IZELServerString& itemName)
+{
+    return {toStdString(resourceName) != toStdString(itemName), msg::kResourceNamedAsItem, {}};
+}
+
+std::string enableFilterFor(const ZELServerStringDict& directives)
+{
+    const std::string* filter = directives.find("ENABLE_FILTER");
+    if (filter == nullptr) {
+        return {};
+    }
+    if (*filter == "ALL") {
+        return "All";
+    }
+    if (*filter == "ENABLED") {
+        return "Enabled";
+    }
+    if (*filter == "DISABLED") {
+        return "Disabled";
+    }
+    return {};
+}
+
+ZELServerStringArray enableFilterList(const ZELServerStringDict* directives)
+{
+    ZELServerStringArray pairs({"enableFilter"});
+    const std::string filter = directives == nullptr ? "All" : enableFilterFor(*directives);
+    if (!filter.empty()) {
+        pairs.append(filter);
+    }
+    return pairs;
+}
+
+}  // namespace zel
