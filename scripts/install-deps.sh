@@ -11,6 +11,7 @@ packages=(
   libgtest-dev libgmock-dev libbenchmark-dev
   libpugixml-dev libsqlite3-dev
   libcli11-dev nlohmann-json3-dev
+  clang-16 libclang-rt-16-dev
 )
 if [ "${1:-}" = windows ]; then
   packages+=(
