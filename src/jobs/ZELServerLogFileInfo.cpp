@@ -3,10 +3,19 @@
 #include <string>
 
 #include "api/conversions.h"
+#include "transport/attribute_binding.h"
 #include "transport/object_reader.h"
 #include "transport/xml_navigation.h"
 
 namespace zel {
+namespace {
+
+constexpr AttributeBinding<LogFileInfoFields> kLogFileInfoAttributes[] = {
+    // Not checked: a number followed by other text has been stored by then and is kept.
+    {"size", +[](const std::string& text, LogFileInfoFields& fields) { storeUInt32(text, fields.size); }},
+};
+
+}  // namespace
 
 bool ZELServerLogFileInfo::readFromXml(const XmlElement& documentElement)
 {
@@ -15,10 +24,7 @@ bool ZELServerLogFileInfo::readFromXml(const XmlElement& documentElement)
     if (description == nullptr) {
         return true;
     }
-    std::string size;
-    getAttribute(description, "size", size);
-    // Not checked: a number followed by other text has been stored by then and is kept.
-    storeUInt32(size, size_);
+    readAttributes(*description, fields_, kLogFileInfoAttributes);
     return true;
 }
 

@@ -13,6 +13,10 @@ namespace zel {
 
 class XmlElement;
 
+struct LogFileInfoFields {
+    std::uint32_t size;
+};
+
 class ZELServerLogFileInfo final : public IZELServerLogFileInfo, public HeapObject {
 public:
     // The size until a description is read: all bits set.
@@ -23,14 +27,14 @@ public:
     ZELServerLogFileInfo(const ZELServerLogFileInfo&) = delete;
     ZELServerLogFileInfo& operator=(const ZELServerLogFileInfo&) = delete;
 
-    unsigned getSize() const override { return size_; }
+    unsigned getSize() const override { return fields_.size; }
 
     // Reads the "LOGFILEINFO" child of a reply's document element into the size. Always true: a
     // document without that child, or whose "size" does not convert, is still a readable reply.
     bool readFromXml(const XmlElement& documentElement);
 
 private:
-    std::uint32_t size_ = kUnknownSize;
+    LogFileInfoFields fields_{kUnknownSize};
 };
 
 // The reader behind IZELServerResponse::readLogFileInfo: parses `body` and fills `info`. 0; the

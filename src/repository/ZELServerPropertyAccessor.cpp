@@ -7,7 +7,7 @@
 #include "api/ZELServerVector.h"
 #include "api/message_numbers.h"
 #include "api/text_encoding.h"
-#include "repository/attribute_binding.h"
+#include "transport/attribute_binding.h"
 #include "repository/text_out.h"
 #include "transport/xml_document.h"
 #include "transport/xml_navigation.h"

@@ -8,7 +8,7 @@
 #include "api/ZELServerStringArray.h"
 #include "api/message_numbers.h"
 #include "api/status.h"
-#include "repository/attribute_binding.h"
+#include "transport/attribute_binding.h"
 #include "repository/reply_readers.h"
 #include "repository/text_out.h"
 #include "sharedresources/temporary_file.h"

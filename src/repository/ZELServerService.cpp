@@ -4,7 +4,7 @@
 
 #include "api/ZELServerString.h"
 #include "api/message_numbers.h"
-#include "repository/attribute_binding.h"
+#include "transport/attribute_binding.h"
 #include "repository/repository_checks.h"
 #include "repository/reply_readers.h"
 #include "repository/text_out.h"

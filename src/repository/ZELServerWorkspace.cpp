@@ -3,7 +3,7 @@
 #include <memory>
 #include <vector>
 
-#include "repository/attribute_binding.h"
+#include "transport/attribute_binding.h"
 #include "repository/repository_checks.h"
 #include "repository/text_out.h"
 #include "transport/xml_navigation.h"

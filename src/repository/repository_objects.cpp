@@ -2,7 +2,7 @@
 
 #include <zelserverapi/IZELServerStringArray.h>
 
-#include "repository/attribute_binding.h"
+#include "transport/attribute_binding.h"
 #include "repository/text_out.h"
 
 namespace zel {

@@ -3,6 +3,8 @@
 #include "api/ZELServerString.h"
 #include "api/conversions.h"
 #include "api/message_numbers.h"
+#include "repository/text_out.h"
+#include "transport/attribute_binding.h"
 #include "transport/xml_document.h"
 #include "transport/xml_element.h"
 #include "transport/xml_navigation.h"
@@ -22,6 +24,16 @@ unsigned stateOf(const std::string& text)
     return kSingleSignOnOther;
 }
 
+constexpr AttributeBinding<IdentityFields> kIdentityAttributes[] = {
+    {"id", &IdentityFields::id},
+    {"is_authenticated", &IdentityFields::authenticated},
+};
+
+constexpr AttributeBinding<SingleSignOnFields> kSingleSignOnAttributes[] = {
+    {"state", +[](const std::string& text, SingleSignOnFields& fields) { fields.state = stateOf(text); }},
+    {"auth_data", &SingleSignOnFields::authData},
+};
+
 // Appends `child`, a new element of `document` named `name`, to `parent`; null when that fails.
 XmlElement* appendElement(XmlDocument& document, XmlElement& parent, const char* name)
 {
@@ -31,7 +43,7 @@ XmlElement* appendElement(XmlDocument& document, XmlElement& parent, const char*
 
 }  // namespace
 
-void ZELServerIdentity::getId(IZELServerString& out) const { out.set(id_.data(), static_cast<unsigned>(id_.size())); }
+void ZELServerIdentity::getId(IZELServerString& out) const { copyText(fields_.id, out); }
 
 void ZELServerIdentity::getRoles(IZELServerStringArray& out) const
 {
@@ -51,10 +63,7 @@ void ZELServerIdentity::readFromXml(const xercesc_3_2::DOMElement& element)
 
 void ZELServerIdentity::readElement(const XmlElement& element)
 {
-    getAttribute(&element, "id", id_);
-    std::string flag;
-    getAttribute(&element, "is_authenticated", flag);
-    authenticated_ = toBooleanOrFalse(flag);
+    readAttributes(element, fields_, kIdentityAttributes);
     std::string role;
     for (const XmlElement* roles : childElements(&element, "ROLES")) {
         for (const XmlElement* entry : childElements(roles, "ROLE")) {
@@ -67,17 +76,14 @@ void ZELServerIdentity::readElement(const XmlElement& element)
 
 void ZELServerSingleSignOnIdentity::takeAuthData(IZELServerString& out)
 {
-    out.set(authData_.data(), static_cast<unsigned>(authData_.size()));
-    authData_.clear();
+    copyText(signOn_.authData, out);
+    signOn_.authData.clear();
 }
 
 void ZELServerSingleSignOnIdentity::readElement(const XmlElement& element)
 {
     ZELServerIdentity::readElement(element);
-    std::string state;
-    getAttribute(&element, "state", state);
-    state_ = stateOf(state);
-    getAttribute(&element, "auth_data", authData_);
+    readAttributes(element, signOn_, kSingleSignOnAttributes);
 }
 
 unsigned IdentityXml::writeXml(XmlDocument& document) const

@@ -16,6 +16,16 @@ namespace zel {
 
 class XmlElement;
 
+struct IdentityFields {
+    std::string id;
+    bool authenticated = false;
+};
+
+struct SingleSignOnFields {
+    unsigned state;
+    std::string authData;
+};
+
 // Single sign-on states.
 inline constexpr unsigned kSingleSignOnSucceeded = 0;
 inline constexpr unsigned kSingleSignOnInProgress = 1;
@@ -32,7 +42,7 @@ public:
 
     void getId(IZELServerString& out) const override;
     void getRoles(IZELServerStringArray& out) const override;
-    bool isAuthenticated() const override { return authenticated_; }
+    bool isAuthenticated() const override { return fields_.authenticated; }
     // Replaces the id and the flag; appends the roles to those already held (reading twice doubles
     // them). Element and attribute names are matched as the server writes them: "ROLES" and
     // "ROLE" ignoring case, attributes exactly. The XML library must be up, as it is while the
@@ -44,9 +54,8 @@ protected:
     virtual void readElement(const XmlElement& element);
 
 private:
-    std::string id_;
+    IdentityFields fields_;
     ZELServerStringArray roles_;
-    bool authenticated_ = false;
 };
 
 // The identity of a single sign-on reply ("SSO_IDENTITY"): the identity's fields plus "state"
@@ -56,15 +65,14 @@ public:
     ZELServerSingleSignOnIdentity() = default;
     ~ZELServerSingleSignOnIdentity() override = default;
 
-    unsigned getState() const override { return state_; }
+    unsigned getState() const override { return signOn_.state; }
     void takeAuthData(IZELServerString& out) override;
 
 protected:
     void readElement(const XmlElement& element) override;
 
 private:
-    unsigned state_ = kSingleSignOnOther;
-    std::string authData_;
+    SingleSignOnFields signOn_{kSingleSignOnOther, {}};
 };
 
 // Writes an identity below a document's root element as the server expects it on every request:

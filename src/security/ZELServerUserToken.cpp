@@ -2,41 +2,41 @@
 
 #include <utility>
 
-#include "api/conversions.h"
+#include "repository/text_out.h"
+#include "transport/attribute_binding.h"
 #include "transport/object_reader.h"
 #include "transport/xml_element.h"
-#include "transport/xml_navigation.h"
 
 namespace zel {
 namespace {
 
-void copyOut(const std::string& text, IZELServerString& out)
-{
-    out.set(text.data(), static_cast<unsigned>(text.size()));
-}
+// A timeout the server wrote in some other form ("3600.5", "abc") is no reason to lose the token
+// itself: it reads as 0 and the reading still succeeds.
+constexpr AttributeBinding<UserTokenFields> kUserTokenAttributes[] = {
+    {"token", &UserTokenFields::token},
+    {"clientaddress", &UserTokenFields::clientAddress},
+    {"expirationtimeout", &UserTokenFields::expirationTimeout},
+    {"firsttokendate", &UserTokenFields::firstTokenDate},
+    {"lasttokendate", &UserTokenFields::lastTokenDate},
+    {"expirationdate", &UserTokenFields::expirationDate},
+};
 
 }  // namespace
 
 ZELServerUserToken::ZELServerUserToken(std::string token, std::string clientAddress, long long expirationTimeout)
-    : token_(std::move(token)), clientAddress_(std::move(clientAddress)), expirationTimeout_(expirationTimeout)
-{}
+{
+    fields_.token = std::move(token);
+    fields_.clientAddress = std::move(clientAddress);
+    fields_.expirationTimeout = expirationTimeout;
+}
 
-void ZELServerUserToken::getToken(IZELServerString& out) const { copyOut(token_, out); }
+void ZELServerUserToken::getToken(IZELServerString& out) const { copyText(fields_.token, out); }
 
-void ZELServerUserToken::getClientAddress(IZELServerString& out) const { copyOut(clientAddress_, out); }
+void ZELServerUserToken::getClientAddress(IZELServerString& out) const { copyText(fields_.clientAddress, out); }
 
 bool ZELServerUserToken::readFrom(const XmlElement& element)
 {
-    getAttribute(&element, "token", token_);
-    getAttribute(&element, "clientaddress", clientAddress_);
-    std::string timeout;
-    getAttribute(&element, "expirationtimeout", timeout);
-    // A timeout the server wrote in some other form ("3600.5", "abc") is no reason to lose the
-    // token itself: the reading still succeeds and the timeout is 0.
-    expirationTimeout_ = toInt64(timeout).value_or(0);
-    getAttribute(&element, "firsttokendate", firstTokenDate_);
-    getAttribute(&element, "lasttokendate", lastTokenDate_);
-    getAttribute(&element, "expirationdate", expirationDate_);
+    readAttributes(element, fields_, kUserTokenAttributes);
     return true;
 }
 

@@ -2,6 +2,7 @@
 // The user token record ("USERTOKEN"). The three dates are the server's text: read from a reply and
 // sent back unchanged, never interpreted, and reachable only by the request's payload writer.
 
+#include <cstdint>
 #include <string>
 #include <string_view>
 
@@ -15,6 +16,15 @@ namespace zel {
 
 class XmlElement;
 
+struct UserTokenFields {
+    std::string token;
+    std::string clientAddress;
+    std::int64_t expirationTimeout = 0;
+    std::string firstTokenDate;
+    std::string lastTokenDate;
+    std::string expirationDate;
+};
+
 class ZELServerUserToken final : public IZELServerUserToken, public UserTokenPayloadFields, public HeapObject {
 public:
     // Empty texts and timeout 0.
@@ -27,11 +37,11 @@ public:
 
     void getToken(IZELServerString& out) const override;
     void getClientAddress(IZELServerString& out) const override;
-    long long getExpirationTimeout() const override { return expirationTimeout_; }
+    long long getExpirationTimeout() const override { return fields_.expirationTimeout; }
 
-    std::string firstTokenDate() const override { return firstTokenDate_; }
-    std::string lastTokenDate() const override { return lastTokenDate_; }
-    std::string expirationDate() const override { return expirationDate_; }
+    std::string firstTokenDate() const override { return fields_.firstTokenDate; }
+    std::string lastTokenDate() const override { return fields_.lastTokenDate; }
+    std::string expirationDate() const override { return fields_.expirationDate; }
 
     // Replaces every field from a "USERTOKEN" element: an absent attribute reads as the empty text,
     // and an "expirationtimeout" that is not a whole number (or does not fit) reads as 0. Never
@@ -39,12 +49,7 @@ public:
     bool readFrom(const XmlElement& element);
 
 private:
-    std::string token_;
-    std::string clientAddress_;
-    long long expirationTimeout_ = 0;
-    std::string firstTokenDate_;
-    std::string lastTokenDate_;
-    std::string expirationDate_;
+    UserTokenFields fields_;
 };
 
 // The response's token reader over a reply body (object_reader.h): fills `token` from the first

@@ -1,27 +1,26 @@
 #include "sharedresources/ZELServerFileInfo.h"
 
-#include "api/conversions.h"
-#include "transport/xml_element.h"
+#include "repository/text_out.h"
+#include "transport/attribute_binding.h"
 #include "transport/xml_navigation.h"
 
 namespace zel {
+namespace {
 
-void ZELServerFileInfo::getDate(IZELServerString& out) const
-{
-    out.set(date_.data(), static_cast<unsigned>(date_.size()));
-}
+constexpr AttributeBinding<FileInfoFields> kFileInfoAttributes[] = {
+    // Case matters: the server writes "DIR" for directories, and anything else is a file.
+    {"filetype", +[](const std::string& text, FileInfoFields& fields) { fields.directory = text == "DIR"; }},
+    {"size", &FileInfoFields::size},
+    {"date", &FileInfoFields::date},
+};
+
+}  // namespace
+
+void ZELServerFileInfo::getDate(IZELServerString& out) const { copyText(fields_.date, out); }
 
 bool ZELServerFileInfo::readFrom(const XmlElement& element)
 {
-    std::string text;
-    getAttribute(&element, "filetype", text);
-    // Case matters: the server writes "DIR" for directories, and anything else is a file.
-    directory_ = text == "DIR";
-    getAttribute(&element, "size", text);
-    // The any-base reader is the one that refuses a minus sign instead of wrapping it round to a
-    // size of four gigabytes.
-    size_ = toUInt32AnyBase(text).value_or(0);
-    getAttribute(&element, "date", date_);
+    readAttributes(element, fields_, kFileInfoAttributes);
     const XmlElement* pathElement = findChild(&element, "PATH");
     path_.readFrom(pathElement != nullptr ? *pathElement : element);
     return true;

@@ -1,6 +1,7 @@
 #pragma once
 // The description of one file or directory in a shared resource ("FILEINFO").
 
+#include <cstdint>
 #include <string>
 
 #include <zelserverapi/IZELServerFileInfo.h>
@@ -12,6 +13,12 @@ namespace zel {
 
 class XmlElement;
 
+struct FileInfoFields {
+    bool directory = false;
+    std::uint32_t size = 0;
+    std::string date;
+};
+
 class ZELServerFileInfo final : public IZELServerFileInfo, public HeapObject {
 public:
     // An empty path, not a directory, size 0, no date.
@@ -21,8 +28,8 @@ public:
     ZELServerFileInfo& operator=(const ZELServerFileInfo&) = delete;
 
     const IZELServerPath& getPath() const override { return path_; }
-    bool isDirectory() const override { return directory_; }
-    unsigned getSize() const override { return size_; }
+    bool isDirectory() const override { return fields_.directory; }
+    unsigned getSize() const override { return fields_.size; }
     void getDate(IZELServerString& out) const override;
 
     // Replaces every field from a "FILEINFO" element: "filetype" (a directory exactly when it is
@@ -34,9 +41,7 @@ public:
 
 private:
     ZELServerPath path_;
-    bool directory_ = false;
-    unsigned size_ = 0;
-    std::string date_;
+    FileInfoFields fields_;
 };
 
 }  // namespace zel

@@ -13,7 +13,9 @@
 #include "sharedresources/ZELServerFileInfo.h"
 #include "sharedresources/ZELServerPath.h"
 #include "sharedresources/temporary_file.h"
+#include "repository/text_out.h"
 #include "transport/LocalFile.h"
+#include "transport/attribute_binding.h"
 #include "transport/checked_command.h"
 #include "transport/xml_element.h"
 #include "transport/xml_navigation.h"
@@ -29,10 +31,11 @@ constexpr const char* kDestinationPath = "srDestPath";
 // Both transfers ask the server to check the file against the CRC in its header.
 constexpr const char* kCrcChecking = "itemFileCRCCheckingEnabled";
 
-void copyOut(const std::string& text, IZELServerString& out)
-{
-    out.set(text.data(), static_cast<unsigned>(text.size()));
-}
+constexpr AttributeBinding<MountPointFields> kMountPointAttributes[] = {
+    {"name", &MountPointFields::name},
+    {"displayname", &MountPointFields::displayName},
+    {"description", &MountPointFields::description},
+};
 
 // The stream opening is not enough: on POSIX a directory opens for reading and fails only at the
 // first read, which would be after the command had gone out.
@@ -45,16 +48,16 @@ bool canBeRead(const std::string& path)
 
 }  // namespace
 
-void ZELServerMountPoint::getName(IZELServerString& out) const { copyOut(name_, out); }
+void ZELServerMountPoint::getName(IZELServerString& out) const { copyText(fields_.name, out); }
 
-void ZELServerMountPoint::getDisplayName(IZELServerString& out) const { copyOut(displayName_, out); }
+void ZELServerMountPoint::getDisplayName(IZELServerString& out) const { copyText(fields_.displayName, out); }
 
-void ZELServerMountPoint::getDescription(IZELServerString& out) const { copyOut(description_, out); }
+void ZELServerMountPoint::getDescription(IZELServerString& out) const { copyText(fields_.description, out); }
 
 CheckedCommand ZELServerMountPoint::on(const char* keyword) const
 {
     CheckedCommand command(channel_, keyword);
-    command.add(kResourceName, name_);
+    command.add(kResourceName, fields_.name);
     return command;
 }
 
@@ -201,9 +204,7 @@ void ZELServerMountPoint::readFromXML(const xercesc_3_2::DOMElement& element)
 
 void ZELServerMountPoint::readFrom(const XmlElement& element)
 {
-    getAttribute(&element, "name", name_);
-    getAttribute(&element, "displayname", displayName_);
-    getAttribute(&element, "description", description_);
+    readAttributes(element, fields_, kMountPointAttributes);
 }
 
 }  // namespace zel

@@ -14,6 +14,12 @@ namespace zel {
 
 class XmlElement;
 
+struct MountPointFields {
+    std::string name;
+    std::string displayName;
+    std::string description;
+};
+
 class ZELServerMountPoint final : public IZELServerMountPoint, public HeapObject {
 public:
     // `channel` is borrowed and must outlive every command; a mount point without a channel answers
@@ -62,9 +68,7 @@ private:
     IZELServerStatus* listOnce(const IZELServerPath& path, IZELServerVector<IZELServerFileInfo>& entries);
 
     IZELServerChannel* channel_;
-    std::string name_;
-    std::string displayName_;
-    std::string description_;
+    MountPointFields fields_;
 };
 
 }  // namespace zel

@@ -1,15 +1,16 @@
 #include "sharedresources/ZELServerPath.h"
 
-#include "transport/xml_element.h"
-#include "transport/xml_navigation.h"
+#include "repository/text_out.h"
+#include "transport/attribute_binding.h"
 
 namespace zel {
 namespace {
 
-void copyOut(const std::string& text, IZELServerString& out)
-{
-    out.set(text.data(), static_cast<unsigned>(text.size()));
-}
+constexpr AttributeBinding<PathFields> kPathAttributes[] = {
+    {"name", &PathFields::name},
+    {"dirpath", &PathFields::directoryPath},
+    {"abspath", &PathFields::absolutePath},
+};
 
 }  // namespace
 
@@ -26,9 +27,9 @@ ZELServerPath* ZELServerPath::fromParts(std::string_view directoryPath, std::str
 {
     auto* path = new ZELServerPath();
     if (path != nullptr) {
-        path->name_ = name;
-        path->directoryPath_ = directoryPath;
-        path->absolutePath_ = joinPath(directoryPath, name);
+        path->fields_.name = name;
+        path->fields_.directoryPath = directoryPath;
+        path->fields_.absolutePath = joinPath(directoryPath, name);
     }
     return path;
 }
@@ -48,17 +49,12 @@ std::string ZELServerPath::joinPath(std::string_view directoryPath, std::string_
     return joined;
 }
 
-void ZELServerPath::getName(IZELServerString& out) const { copyOut(name_, out); }
+void ZELServerPath::getName(IZELServerString& out) const { copyText(fields_.name, out); }
 
-void ZELServerPath::getDirectoryPath(IZELServerString& out) const { copyOut(directoryPath_, out); }
+void ZELServerPath::getDirectoryPath(IZELServerString& out) const { copyText(fields_.directoryPath, out); }
 
-void ZELServerPath::getAbsolutePath(IZELServerString& out) const { copyOut(absolutePath_, out); }
+void ZELServerPath::getAbsolutePath(IZELServerString& out) const { copyText(fields_.absolutePath, out); }
 
-void ZELServerPath::readFrom(const XmlElement& element)
-{
-    getAttribute(&element, "name", name_);
-    getAttribute(&element, "dirpath", directoryPath_);
-    getAttribute(&element, "abspath", absolutePath_);
-}
+void ZELServerPath::readFrom(const XmlElement& element) { readAttributes(element, fields_, kPathAttributes); }
 
 }  // namespace zel

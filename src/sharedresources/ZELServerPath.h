@@ -13,6 +13,12 @@ namespace zel {
 
 class XmlElement;
 
+struct PathFields {
+    std::string name;
+    std::string directoryPath;
+    std::string absolutePath;
+};
+
 class ZELServerPath final : public IZELServerPath, public HeapObject {
 public:
     // All three texts empty.
@@ -41,9 +47,7 @@ public:
     void readFrom(const XmlElement& element);
 
 private:
-    std::string name_;
-    std::string directoryPath_;
-    std::string absolutePath_;
+    PathFields fields_;
 };
 
 }  // namespace zel

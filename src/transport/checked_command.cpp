@@ -219,8 +219,7 @@ IZELServerStatus* CheckedCommand::upload(const IZELServerString& path, IZELServe
 IZELServerStatus* CheckedCommand::download(const std::string& localPath, unsigned& received,
                                            IZELServerProgressListener* progress)
 {
-    return run(received,
-               [&](Command& command) { return command.receive(localPath, received, progress); });
+    return run(received, [&](Command& command) { return command.receive(localPath, received, progress); });
 }
 
 }  // namespace zel

@@ -109,8 +109,7 @@ public:
     IZELServerStatus* upload(const IZELServerString& path, IZELServerProgressListener* progress);
     // Receives the command's file into `localPath` (see Command::receive); `received` is the reply's
     // truth value.
-    IZELServerStatus* download(const std::string& localPath, unsigned& received,
-                               IZELServerProgressListener* progress);
+    IZELServerStatus* download(const std::string& localPath, unsigned& received, IZELServerProgressListener* progress);
     // The checks, then `exchange` on the ready command (for exchanges that need more than one step).
     IZELServerStatus* run(const Exchange& exchange);
     // As run, for an exchange that answers through `flag`, which the policy governs.

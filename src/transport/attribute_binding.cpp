@@ -1,4 +1,4 @@
-#include "repository/attribute_binding.h"
+#include "transport/attribute_binding.h"
 
 #include <limits>
 
@@ -20,6 +20,8 @@ void storeAttributeText(const std::string& text, std::int32_t& field)
 }
 
 void storeAttributeText(const std::string& text, std::int64_t& field) { field = toInt64(text).value_or(0); }
+
+void storeAttributeText(const std::string& text, std::uint32_t& field) { field = toUInt32AnyBase(text).value_or(0); }
 
 std::string attributeText(const XmlElement& element, const char* attribute)
 {
