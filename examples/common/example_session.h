@@ -10,30 +10,21 @@
 #include <string>
 #include <thread>
 
-#include <zelserverapi/interfaces.h>
-#include <zelserverapi/zelserverapi.h>
+#include <zelserverapi/ZELServerOwned.h>
 
 namespace example {
 
 class Session {
 public:
-    Session() { ZEL_createServerSession(&session_); }
-    ~Session()
-    {
-        if (session_ != nullptr)
-            session_->destroyConnectionInfo(&info_);
-        ZEL_destroyServerSession(&session_);
-    }
-    Session(const Session&) = delete;
-    Session& operator=(const Session&) = delete;
+    Session() : session_(zelServerCreateSession()) {}
 
     IZELServerSession& operator*() { return *session_; }
-    IZELServerSession* operator->() { return session_; }
+    IZELServerSession* operator->() { return session_.get(); }
 
     // Connects to HOST:PORT and signs in; prints the reason and returns false when that fails.
     bool signIn(const char* host, const char* port, const char* user, const char* password)
     {
-        if (session_ == nullptr) {
+        if (!session_) {
             std::fprintf(stderr, "error: out of memory\n");
             return false;
         }
@@ -42,44 +33,38 @@ public:
             std::fprintf(stderr, "error: bad port '%s'\n", port);
             return false;
         }
-        String hostText(*this, host), userText(*this, user), passwordText(*this, password);
-        info_ =
-            session_->createConnectionInfo(*hostText, static_cast<unsigned short>(number), *userText, *passwordText);
+        info_ = own(session_->createConnectionInfo(*text(host), static_cast<unsigned short>(number), *text(user),
+                                                   *text(password)));
         return succeeded(session_->init(*info_, nullptr));
     }
 
     // Reports a failed call as "error NUMBER: TEXT" and releases its status; true for success.
     bool succeeded(IZELServerStatus* status)
     {
-        if (status == nullptr)
-            return true;
-        std::fprintf(stderr, "error %u: %s\n", status->getMessageNumber(), status->getMessage());
-        session_->destroyStatus(&status);
-        return false;
+        const ZELServerOwned<IZELServerStatus> owned = own(status);
+        if (owned)
+            std::fprintf(stderr, "error %u: %s\n", owned->getMessageNumber(), owned->getMessage());
+        return !owned;
     }
 
-    // A library string that goes back to the library when it leaves scope.
-    class String {
-    public:
-        explicit String(Session& owner, const std::string& value = "") : owner_(owner.session_)
-        {
-            text_ = owner_->createString();
-            text_->set(value.data(), static_cast<unsigned>(value.size()));
-        }
-        ~String() { owner_->destroyString(&text_); }
-        String(const String&) = delete;
-        String& operator=(const String&) = delete;
-        IZELServerString& operator*() { return *text_; }
-        const char* c_str() const { return text_->c_str(); }
+    // Hands what the session made back to it when the owner leaves scope.
+    template <typename T>
+    ZELServerOwned<T> own(T* object)
+    {
+        return zelServerOwn(*session_, object);
+    }
 
-    private:
-        IZELServerSession* owner_;
-        IZELServerString* text_ = nullptr;
-    };
+    // A library string holding `value`.
+    ZELServerOwned<IZELServerString> text(const std::string& value = "")
+    {
+        ZELServerOwned<IZELServerString> string = own(session_->createString());
+        string->set(value.data(), static_cast<unsigned>(value.size()));
+        return string;
+    }
 
 private:
-    IZELServerSession* session_ = nullptr;
-    IZELServerConnectionInfo* info_ = nullptr;
+    ZELServerOwned<IZELServerSession> session_;
+    ZELServerOwned<IZELServerConnectionInfo> info_;
 };
 
 enum class Submission { Submitted, Refused, BadParameter };
@@ -89,10 +74,9 @@ enum class Submission { Submitted, Refused, BadParameter };
 inline Submission submitJob(Session& session, const char* repository, const char* workspace, char** parameters,
                             int count, unsigned& jobId)
 {
-    Session::String keyword(session, "zeljob"), repositoryText(session, repository), workspaceText(session, workspace);
-    IZELServerTransformationRequest* request =
-        session->createTransformationRequest(*keyword, *repositoryText, *workspaceText);
-    if (request == nullptr)
+    const auto request = session.own(session->createTransformationRequest(
+        *session.text("zeljob"), *session.text(repository), *session.text(workspace)));
+    if (!request)
         return Submission::Refused;
     Submission outcome = Submission::Submitted;
     for (int i = 0; i < count && outcome == Submission::Submitted; ++i) {
@@ -102,14 +86,12 @@ inline Submission submitJob(Session& session, const char* repository, const char
             outcome = Submission::BadParameter;
             break;
         }
-        Session::String name(session, std::string(parameters[i], static_cast<std::size_t>(equals - parameters[i]))),
-            value(session, equals + 1);
-        request->setPublishedParameter(*name, *value);
+        const std::string name(parameters[i], static_cast<std::size_t>(equals - parameters[i]));
+        request->setPublishedParameter(*session.text(name), *session.text(equals + 1));
     }
     if (outcome == Submission::Submitted &&
         !session.succeeded(session->getTransformationManager()->submitJob(*request, jobId)))
         outcome = Submission::Refused;
-    session->destroyTransformationRequest(&request);
     if (outcome == Submission::Submitted)
         std::printf("submitted job %u\n", jobId);
     return outcome;
@@ -138,22 +120,32 @@ inline bool waitForJob(Session& session, unsigned jobId, IZELServerTransformatio
     return false;
 }
 
-// Waits for the job to end and prints how it ended ("job N succeeded: NUMBER TEXT"); true when it
-// succeeded.
-inline bool awaitSuccess(Session& session, unsigned jobId)
+// Exit statuses for how a job ended, the same as zelctl's: 0 when it succeeded, 3 when it failed, 4
+// when it was aborted (or deleted) before it ended; 1 is left for a failed call.
+constexpr int kJobFailed = 3;
+constexpr int kJobAborted = 4;
+
+// Waits for the job to end, prints how it ended ("job N succeeded: NUMBER TEXT") and returns the exit
+// status for it.
+inline int awaitJob(Session& session, unsigned jobId)
 {
-    IZELServerTransformationResult* result = session->createTransformationResult();
-    bool succeeded = result != nullptr && waitForJob(session, jobId, *result);
-    if (succeeded) {
-        Session::String message(session);
-        unsigned number = 0;
-        result->getStatusNumber(number);
-        result->getStatusMessage(*message);
-        succeeded = result->isSuccess() != 0;
-        std::printf("job %u %s: %u %s\n", jobId, succeeded ? "succeeded" : "failed", number, message.c_str());
-    }
-    session->destroyTransformationResult(&result);
-    return succeeded;
+    constexpr unsigned kDeleted = 5, kAborted = 6;
+    const auto result = session.own(session->createTransformationResult());
+    if (!result || !waitForJob(session, jobId, *result))
+        return 1;
+    const auto message = session.text();
+    unsigned number = 0, status = 0;
+    result->getStatusNumber(number);
+    result->getStatusMessage(*message);
+    result->getJobStatus(status);
+    const bool aborted = status == kAborted || status == kDeleted;
+    const bool succeeded = !aborted && result->isSuccess() != 0;
+    std::printf("job %u %s: %u %s\n", jobId,
+                succeeded ? "succeeded"
+                : aborted ? "was aborted"
+                          : "failed",
+                number, message->c_str());
+    return succeeded ? 0 : aborted ? kJobAborted : kJobFailed;
 }
 
 }  // namespace example

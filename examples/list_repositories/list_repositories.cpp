@@ -16,25 +16,23 @@ int main(int argc, char** argv)
     if (!session.signIn(argv[1], argv[2], argv[3], argv[4]))
         return 1;
 
-    example::Session::String name(session, "SERVER_NAME"), server(session);
-    if (!session.succeeded(session->getSessionProperty(*name, *server)))
+    const auto server = session.text();
+    if (!session.succeeded(session->getSessionProperty(*session.text("SERVER_NAME"), *server)))
         return 1;
-    example::Session::String user(session);
+    const auto user = session.text();
     if (const IZELServerIdentity* identity = session->getIdentity())
         identity->getId(*user);
-    std::printf("signed in to %s as %s\n", server.c_str(), user.c_str());
+    std::printf("signed in to %s as %s\n", server->c_str(), user->c_str());
 
-    IZELServerVector<IZELServerRepository>* repositories = session->createRepositoryVector();
-    const bool listed = session.succeeded(session->getRepositoryManager()->getRepositories(nullptr, *repositories));
-    if (listed) {
-        std::printf("%u repositories\n", repositories->entries());
-        example::Session::String repositoryName(session), description(session);
-        for (unsigned i = 0; i < repositories->entries(); ++i) {
-            repositories->element(i)->getName(*repositoryName);
-            repositories->element(i)->getDescription(*description);
-            std::printf("  %s  %s\n", repositoryName.c_str(), description.c_str());
-        }
+    const auto repositories = session.own(session->createRepositoryVector());
+    if (!repositories || !session.succeeded(session->getRepositoryManager()->getRepositories(nullptr, *repositories)))
+        return 1;
+    std::printf("%u repositories\n", repositories->entries());
+    const auto repositoryName = session.text(), description = session.text();
+    for (unsigned i = 0; i < repositories->entries(); ++i) {
+        repositories->element(i)->getName(*repositoryName);
+        repositories->element(i)->getDescription(*description);
+        std::printf("  %s  %s\n", repositoryName->c_str(), description->c_str());
     }
-    session->destroyRepositoryVector(&repositories);
-    return listed ? 0 : 1;
+    return 0;
 }

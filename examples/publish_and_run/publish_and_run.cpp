@@ -24,7 +24,7 @@ std::string fileNameOf(const std::string& path)
 bool openRepository(example::Session& session, const char* name, IZELServerRepository& repository)
 {
     IZELServerRepositoryManager* repositories = session->getRepositoryManager();
-    example::Session::String nameText(session, name), description(session, "Made by publish_and_run");
+    const auto nameText = session.text(name), description = session.text("Made by publish_and_run");
     unsigned found = 0;
     if (!session.succeeded(repositories->getRepository(*nameText, repository, found)))
         return false;
@@ -42,7 +42,7 @@ bool openRepository(example::Session& session, const char* name, IZELServerRepos
 bool publish(example::Session& session, IZELServerRepository& repository, const std::string& itemName,
              const char* localFile)
 {
-    example::Session::String item(session, itemName), source(session, localFile);
+    const auto item = session.text(itemName), source = session.text(localFile);
     unsigned exists = 0;
     if (!session.succeeded(repository.itemExists(*item, exists)))
         return false;
@@ -55,7 +55,7 @@ bool publish(example::Session& session, IZELServerRepository& repository, const 
 
 bool downloadLog(example::Session& session, unsigned jobId, const char* logFile)
 {
-    example::Session::String target(session, logFile);
+    const auto target = session.text(logFile);
     unsigned success = 0;
     if (!session.succeeded(session->getTransformationManager()->getLogFile(jobId, *target, success)))
         return false;
@@ -81,17 +81,16 @@ int main(int argc, char** argv)
         return 1;
 
     const std::string itemName = fileNameOf(argv[6]);
-    IZELServerRepository* repository = session->createRepository();
+    const auto repository = session.own(session->createRepository());
     unsigned jobId = 0;
-    const bool ready = repository != nullptr && openRepository(session, argv[5], *repository) &&
+    const bool ready = repository && openRepository(session, argv[5], *repository) &&
                        publish(session, *repository, itemName, argv[6]) &&
                        example::submitJob(session, argv[5], itemName.c_str(), argv + 8, argc - 8, jobId) ==
                            example::Submission::Submitted;
-    session->destroyRepository(&repository);
     if (!ready)
         return 1;
     // The log tells why a job failed, so it is fetched either way.
-    const bool succeeded = example::awaitSuccess(session, jobId);
+    const int ended = example::awaitJob(session, jobId);
     const bool logged = downloadLog(session, jobId, argv[7]);
-    return succeeded && logged ? 0 : 1;
+    return logged ? ended : 1;
 }

@@ -1,5 +1,6 @@
 // Submits a workspace of a repository as a job with published parameters, waits for it to end and
-// prints its result.
+// prints its result. Exits with 0 when the job succeeded, 3 when it failed, 4 when it was aborted, 1
+// when a call failed and 2 for a bad command line, as zelctl does.
 //
 //   run_job HOST PORT USER PASSWORD REPOSITORY WORKSPACE [NAME=VALUE]...
 //
@@ -28,6 +29,5 @@ int main(int argc, char** argv)
     case example::Submission::Submitted:
         break;
     }
-    const bool success = example::awaitSuccess(session, jobId);
-    return success ? 0 : 1;
+    return example::awaitJob(session, jobId);
 }

@@ -6,6 +6,7 @@
 // REMOTE_PATH is rooted at the resource ("/in/data.csv"); its folder is created when missing.
 
 #include <cstdio>
+#include <memory>
 #include <string>
 
 #include "../common/example_session.h"
@@ -53,37 +54,37 @@ int main(int argc, char** argv)
     if (!session.signIn(argv[1], argv[2], argv[3], argv[4]))
         return 1;
 
-    IZELServerMountPoint* resource = session->createMountPoint();
-    example::Session::String name(session, argv[5]);
+    const auto resource = session.own(session->createMountPoint());
+    const auto info = session.own(session->createFileInfo());
+    if (!resource || !info)
+        return 1;
     unsigned found = 0;
-    bool done = session.succeeded(session->getMountPointManager()->getSharedResource(*name, *resource, found));
-    if (done && !found) {
+    if (!session.succeeded(
+            session->getMountPointManager()->getSharedResource(*session.text(argv[5]), *resource, found)))
+        return 1;
+    if (!found) {
         std::fprintf(stderr, "error: the server has no shared resource '%s'\n", argv[5]);
-        done = false;
+        return 1;
     }
-    example::Session::String local(session, argv[6]), remote(session, argv[7]), folderText(session, folderOf(argv[7]));
-    IZELServerPath* folder = resource->createPath(*folderText);
-    IZELServerPath* target = resource->createPath(*remote);
+    // Paths belong to the mount point that made them and go back to it.
+    const auto release = [&](IZELServerPath* path) { resource->releaseObject(path); };
+    const std::unique_ptr<IZELServerPath, decltype(release)> folder(
+        resource->createPath(*session.text(folderOf(argv[7]))), release);
+    const std::unique_ptr<IZELServerPath, decltype(release)> target(resource->createPath(*session.text(argv[7])),
+                                                                    release);
     unsigned present = 0;
-    if (done)
-        done = session.succeeded(resource->exists(*folder, present));
+    bool done = session.succeeded(resource->exists(*folder, present));
     if (done && !present)
         done = session.succeeded(resource->makeDirectory(*folder));
     PercentListener listener;
     if (done)
-        done = session.succeeded(resource->upload(*local, *target, &listener));
-
-    IZELServerFileInfo* info = session->createFileInfo();
+        done = session.succeeded(resource->upload(*session.text(argv[6]), *target, &listener));
     if (done)
         done = session.succeeded(resource->getFileInfo(*target, *info));
     if (done) {
-        example::Session::String date(session);
+        const auto date = session.text();
         info->getDate(*date);
-        std::printf("%s:%s holds %u bytes (%s)\n", argv[5], argv[7], info->getSize(), date.c_str());
+        std::printf("%s:%s holds %u bytes (%s)\n", argv[5], argv[7], info->getSize(), date->c_str());
     }
-    session->destroyFileInfo(&info);
-    resource->releaseObject(folder);
-    resource->releaseObject(target);
-    session->destroyMountPoint(&resource);
     return done ? 0 : 1;
 }

@@ -51,9 +51,17 @@ using ResponseOwner = std::unique_ptr<IZELServerResponse>;
 
 IZELServerStatus* channelError(std::string_view text) { return makeStatus(msg::kServerError, std::string(text)); }
 
-IZELServerStatus* sendFailed(std::int32_t code) { return makeStatus(msg::kSendFailed, decimalText(code)); }
+// Socket failures carry the socket code as their secondary code too, so a client can tell a time-out
+// or a refused connection from other failures without reading the text.
+IZELServerStatus* sendFailed(std::int32_t code)
+{
+    return makeStatusWithCode(static_cast<unsigned>(code), msg::kSendFailed, decimalText(code));
+}
 
-IZELServerStatus* receiveFailed(std::int32_t code) { return makeStatus(msg::kReceiveFailed, decimalText(code)); }
+IZELServerStatus* receiveFailed(std::int32_t code)
+{
+    return makeStatusWithCode(static_cast<unsigned>(code), msg::kReceiveFailed, decimalText(code));
+}
 
 IZELServerStatus* serverErrorStatus(std::string_view body)
 {
@@ -258,8 +266,11 @@ IZELServerStatus* ZELServerTCPIPChannel::connect()
         socket_.reset(new (std::nothrow) TcpSocket(host_.c_str(), port_));
     }
     // A failed socket stays in place; the next open probes it, finds it unusable and replaces it.
-    if (!socket_ || socket_->errorCode != 0) {
+    if (!socket_) {
         return makeStatus(msg::kConnectFailed);
+    }
+    if (socket_->errorCode != 0) {
+        return makeStatusWithCode(static_cast<unsigned>(socket_->errorCode), msg::kConnectFailed);
     }
     return nullptr;
 }

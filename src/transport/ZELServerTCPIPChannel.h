@@ -2,10 +2,11 @@
 // The session's one TCP connection to the server (see IZELServerChannel for the operations).
 //
 // Statuses returned, each a new object the caller owns:
-//   393601 cannot connect (the failed socket is kept; the next open replaces it)
+//   393601 cannot connect, with getCode() the socket code (the failed socket is kept; the next open
+//          replaces it)
 //   393602 a reply without a NUL or with an empty body (parameter: the reply)
 //   393604 a reply whose status word is neither "SUCCESS" nor "ERROR" (parameter: the reply)
-//   393607 / 393608 send / receive failed (parameter: the socket code in decimal)
+//   393607 / 393608 send / receive failed (parameter and getCode(): the socket code)
 //   393617 a "requesterResultPort" directive that is no port number
 //   393618 the result port could not be opened, or the server did not connect back
 //   393622 close without a connection

@@ -11,8 +11,7 @@
 
 #include <sys/wait.h>
 
-#include <zelserverapi/interfaces.h>
-#include <zelserverapi/zelserverapi.h>
+#include <zelserverapi/ZELServerOwned.h>
 
 #include "support/local_server.h"
 
@@ -69,35 +68,26 @@ protected:
     {
         const std::string file = server->directory() + "/greet.zlw";
         std::ofstream(file) << kWorkspace;
-        IZELServerSession* session = nullptr;
-        ZEL_createServerSession(&session);
+        const auto session = zelServerCreateSession();
         ASSERT_NE(session, nullptr);
         auto text = [&](const std::string& value) {
-            IZELServerString* s = session->createString();
+            auto s = zelServerOwn(*session, session->createString());
             s->set(value.data(), static_cast<unsigned>(value.size()));
             return s;
         };
-        IZELServerString* strings[] = {text("127.0.0.1"), text("ann"),       text("pw-ann"), text("demo"),
-                                       text(""),          text("greet.zlw"), text(file)};
-        IZELServerConnectionInfo* info =
-            session->createConnectionInfo(*strings[0], server->port(), *strings[1], *strings[2]);
-        IZELServerStatus* status = session->init(*info, nullptr);
-        IZELServerRepository* repository = session->createRepository();
+        const auto info = zelServerOwn(
+            *session, session->createConnectionInfo(*text("127.0.0.1"), server->port(), *text("ann"), *text("pw-ann")));
+        const auto repository = zelServerOwn(*session, session->createRepository());
         unsigned found = 0;
-        if (status == nullptr)
-            status = session->getRepositoryManager()->addRepository(*strings[3], *strings[4]);
-        if (status == nullptr)
-            status = session->getRepositoryManager()->getRepository(*strings[3], *repository, found);
-        if (status == nullptr)
-            status = repository->addItem(*strings[5], *strings[6]);
+        auto status = zelServerOwn(*session, session->init(*info, nullptr));
+        if (!status)
+            status.reset(session->getRepositoryManager()->addRepository(*text("demo"), *text("")));
+        if (!status)
+            status.reset(session->getRepositoryManager()->getRepository(*text("demo"), *repository, found));
+        if (!status)
+            status.reset(repository->addItem(*text("greet.zlw"), *text(file)));
         EXPECT_EQ(status, nullptr) << status->getMessage();
         EXPECT_EQ(found, 1u);
-        session->destroyStatus(&status);
-        session->destroyRepository(&repository);
-        session->destroyConnectionInfo(&info);
-        for (IZELServerString* s : strings)
-            session->destroyString(&s);
-        ZEL_destroyServerSession(&session);
     }
 
     std::unique_ptr<zeltest::LocalServer> server;
@@ -138,7 +128,7 @@ TEST_F(Examples, RunJobPassesParametersAndReportsTheOutcome)
     };
     const Case cases[] = {
         {" WHO=World", 0, "succeeded: 0 Translation was successful"},
-        {" CODE=3", 1, "failed: 3"},
+        {" CODE=3", 3, "failed: 3"},
     };
     for (const Case& c : cases) {
         const Outcome outcome = run(ZEL_EXAMPLE_RUN_JOB + signIn("ann", "pw-ann") + " demo greet.zlw" + c.parameters);
@@ -180,7 +170,7 @@ TEST_F(Examples, PublishAndRunAddsThenReplacesTheItemAndFetchesEachLog)
 
     // A failing job still has its log fetched, and the same file replaces the item.
     const Outcome second = run(command + " WHO=Again CODE=3");
-    EXPECT_EQ(second.status, 1) << second.output;
+    EXPECT_EQ(second.status, 3) << second.output;
     EXPECT_EQ(second.output.rfind("updated item greet.zlw\nsubmitted job ", 0), 0u) << second.output;
     EXPECT_NE(second.output.find("failed: 3"), std::string::npos) << second.output;
     EXPECT_NE(contentOf(log).find("Hello Again"), std::string::npos) << contentOf(log);

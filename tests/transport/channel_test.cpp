@@ -274,6 +274,7 @@ TEST_F(ChannelTest, ConnectFailureKeepsTheFailedSocketUntilTheNextOpen)
     const StatusPtr failed(channel->open(*passwordInfo("ann", "pw1", closed.port()), nullptr));
     ASSERT_NE(failed, nullptr);
     EXPECT_EQ(failed->getMessageNumber(), msg::kConnectFailed);
+    EXPECT_EQ(failed->getCode(), static_cast<unsigned>(SOCK_CONNECT_FAILED));
     EXPECT_EQ(channel->getIdentity(), nullptr);
 
     // The failed socket is replaced by the next open.
@@ -364,6 +365,7 @@ TEST_F(ChannelTest, SendAndReceiveFailuresCarryTheSocketCode)
     ASSERT_NE(received, nullptr);
     EXPECT_EQ(received->getMessageNumber(), msg::kReceiveFailed);
     EXPECT_NE(std::string(received->getMessage()).find("392008"), std::string::npos) << describe(received.get());
+    EXPECT_EQ(received->getCode(), static_cast<unsigned>(SOCK_RECEIVE_FAILED));
     EXPECT_TRUE(server.verify());
 
     ASSERT_EQ(StatusPtr(channel->close()), nullptr);
@@ -371,6 +373,7 @@ TEST_F(ChannelTest, SendAndReceiveFailuresCarryTheSocketCode)
     ASSERT_NE(sent, nullptr);
     EXPECT_EQ(sent->getMessageNumber(), msg::kSendFailed);
     EXPECT_NE(std::string(sent->getMessage()).find("392009"), std::string::npos) << describe(sent.get());
+    EXPECT_EQ(sent->getCode(), static_cast<unsigned>(SOCK_SEND_FAILED));
 }
 
 // ---- Plain commands and replies ---------------------------------------------------------------------

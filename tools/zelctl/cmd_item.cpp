@@ -11,12 +11,11 @@ namespace {
 
 // Adds one row per item of one kind. Workspaces, custom formats, custom transformers and
 // templates share their getters, so one template reads all four.
-template <typename Item, typename Create, typename Destroy, typename View>
-Outcome collect(Context& context, const char* kind, Create create, Destroy destroy, View view,
+template <typename Item, typename View>
+Outcome collect(Context& context, const char* kind, ZELServerOwned<IZELServerVector<Item>> items, View view,
                 nlohmann::ordered_json& rows)
 {
-    IZELServerVector<Item>* items = create();
-    if (items == nullptr)
+    if (!items)
         return complaint("out of memory for the list");
     Outcome failure = context.connection.check(view(*items));
     for (unsigned i = 0; !failure && i < items->entries(); ++i) {
@@ -26,7 +25,6 @@ Outcome collect(Context& context, const char* kind, Create create, Destroy destr
                         {"title", context.connection.read([&](IZELServerString& out) { item.getTitle(out); })},
                         {"size", static_cast<long long>(item.getFileSize())}});
     }
-    destroy(items);
     return failure;
 }
 
@@ -35,27 +33,24 @@ Outcome list(Context& context, const std::string& name)
     OpenRepository repository(context.connection);
     if (Outcome failure = repository.open(name))
         return failure;
-    IZELServerSession& session = context.connection.session();
+    Connection& c = context.connection;
+    IZELServerSession& session = c.session();
     IZELServerRepository& r = repository.get();
     nlohmann::ordered_json rows = nlohmann::ordered_json::array();
-    Outcome failure = collect<IZELServerWorkspace>(
-        context, "workspace", [&] { return session.createWorkspaceVector(); },
-        [&](auto* v) { session.destroyWorkspaceVector(&v); }, [&](auto& v) { return r.getWorkspacesView(nullptr, v); },
-        rows);
+    Outcome failure = collect(
+        context, "workspace", c.own(session.createWorkspaceVector()),
+        [&](auto& v) { return r.getWorkspacesView(nullptr, v); }, rows);
     if (!failure)
-        failure = collect<IZELServerCustomFormat>(
-            context, "custom format", [&] { return session.createCustomFormatVector(); },
-            [&](auto* v) { session.destroyCustomFormatVector(&v); },
+        failure = collect(
+            context, "custom format", c.own(session.createCustomFormatVector()),
             [&](auto& v) { return r.getCustomFormatsView(nullptr, v); }, rows);
     if (!failure)
-        failure = collect<IZELServerCustomTransformer>(
-            context, "custom transformer", [&] { return session.createCustomTransformerVector(); },
-            [&](auto* v) { session.destroyCustomTransformerVector(&v); },
+        failure = collect(
+            context, "custom transformer", c.own(session.createCustomTransformerVector()),
             [&](auto& v) { return r.getCustomTransformersView(nullptr, v); }, rows);
     if (!failure)
-        failure = collect<IZELServerTemplate>(
-            context, "template", [&] { return session.createTemplateVector(); },
-            [&](auto* v) { session.destroyTemplateVector(&v); },
+        failure = collect(
+            context, "template", c.own(session.createTemplateVector()),
             [&](auto& v) { return r.getTemplatesView(nullptr, v); }, rows);
     if (!failure)
         context.output.print(rows);
@@ -132,9 +127,8 @@ Outcome resources(Context& context, const std::string& name, const std::string& 
     OpenRepository repository(context.connection);
     if (Outcome failure = repository.open(name))
         return failure;
-    IZELServerSession& session = context.connection.session();
-    IZELServerVector<IZELServerResource>* list = session.createResourceVector();
-    if (list == nullptr)
+    const auto list = context.connection.own(context.connection.session().createResourceVector());
+    if (!list)
         return complaint("out of memory for the list");
     Outcome failure =
         context.connection.check(repository.get().getItemResourcesView(context.connection.text(item), nullptr, *list));
@@ -146,7 +140,6 @@ Outcome resources(Context& context, const std::string& name, const std::string& 
              {"description", context.connection.read([&](IZELServerString& out) { resource.getDescription(out); })},
              {"size", resource.getFileSize()}});
     }
-    session.destroyResourceVector(&list);
     if (!failure)
         context.output.print(rows);
     return failure;

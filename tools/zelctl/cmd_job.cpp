@@ -46,67 +46,35 @@ void addRequestOptions(CLI::App* command, RequestArguments& arguments)
     command->add_option("--notify", arguments.notifications, "Notification TOPIC=MESSAGE");
 }
 
-// The request object, released when the holder goes.
-class Request {
-public:
-    explicit Request(Connection& connection) : connection_(connection) {}
-    ~Request()
-    {
-        if (request_ != nullptr)
-            connection_.session().destroyTransformationRequest(&request_);
-    }
-    Request(const Request&) = delete;
-    Request& operator=(const Request&) = delete;
-
-    Outcome build(const RequestArguments& arguments)
-    {
-        request_ = connection_.session().createTransformationRequest(connection_.text(arguments.service),
-                                                                     connection_.text(arguments.repository),
-                                                                     connection_.text(arguments.workspace));
-        if (request_ == nullptr)
-            return complaint("out of memory for the job request");
-        using Setter = void (IZELServerTransformationRequest::*)(const IZELServerString&, const IZELServerString&);
-        const std::pair<const std::vector<std::string>*, Setter> lists[] = {
-            {&arguments.parameters, &IZELServerTransformationRequest::setPublishedParameter},
-            {&arguments.directives, &IZELServerTransformationRequest::setDirective},
-            {&arguments.notifications, &IZELServerTransformationRequest::setNotification},
-        };
-        for (const auto& [list, setter] : lists) {
-            for (const std::string& entry : *list) {
-                const auto pair = splitPair(entry);
-                if (!pair)
-                    return complaint("expected NAME=VALUE, got '" + entry + "'");
-                (request_->*setter)(connection_.text(pair->first), connection_.text(pair->second));
-            }
+// Builds the request from the command line; null with a complaint when an entry is no NAME=VALUE.
+Outcome buildRequest(Connection& connection, const RequestArguments& arguments,
+                     ZELServerOwned<IZELServerTransformationRequest>& request)
+{
+    request = connection.own(connection.session().createTransformationRequest(connection.text(arguments.service),
+                                                                              connection.text(arguments.repository),
+                                                                              connection.text(arguments.workspace)));
+    if (!request)
+        return complaint("out of memory for the job request");
+    using Setter = void (IZELServerTransformationRequest::*)(const IZELServerString&, const IZELServerString&);
+    const std::pair<const std::vector<std::string>*, Setter> lists[] = {
+        {&arguments.parameters, &IZELServerTransformationRequest::setPublishedParameter},
+        {&arguments.directives, &IZELServerTransformationRequest::setDirective},
+        {&arguments.notifications, &IZELServerTransformationRequest::setNotification},
+    };
+    for (const auto& [list, setter] : lists) {
+        for (const std::string& entry : *list) {
+            const auto pair = splitPair(entry);
+            if (!pair)
+                return complaint("expected NAME=VALUE, got '" + entry + "'");
+            (request.get()->*setter)(connection.text(pair->first), connection.text(pair->second));
         }
-        return std::nullopt;
     }
+    return std::nullopt;
+}
 
-    IZELServerTransformationRequest& get() { return *request_; }
+using Result = ZELServerOwned<IZELServerTransformationResult>;
 
-private:
-    Connection& connection_;
-    IZELServerTransformationRequest* request_ = nullptr;
-};
-
-class Result {
-public:
-    explicit Result(IZELServerSession& session) : session_(session), result_(session.createTransformationResult()) {}
-    ~Result()
-    {
-        if (result_ != nullptr)
-            session_.destroyTransformationResult(&result_);
-    }
-    Result(const Result&) = delete;
-    Result& operator=(const Result&) = delete;
-
-    explicit operator bool() const { return result_ != nullptr; }
-    IZELServerTransformationResult& get() { return *result_; }
-
-private:
-    IZELServerSession& session_;
-    IZELServerTransformationResult* result_;
-};
+Result newResult(Connection& connection) { return connection.own(connection.session().createTransformationResult()); }
 
 nlohmann::ordered_json describe(Connection& connection, const IZELServerTransformationResult& result)
 {
@@ -130,13 +98,12 @@ nlohmann::ordered_json describe(Connection& connection, const IZELServerTransfor
 
 Outcome submit(Context& context, const RequestArguments& arguments, const unsigned* delay)
 {
-    Request request(context.connection);
-    if (Outcome failure = request.build(arguments))
+    ZELServerOwned<IZELServerTransformationRequest> request;
+    if (Outcome failure = buildRequest(context.connection, arguments, request))
         return failure;
     IZELServerTransformationManager* jobs = context.connection.session().getTransformationManager();
     unsigned id = 0;
-    IZELServerStatus* status =
-        delay ? jobs->scheduleJob(request.get(), *delay, id) : jobs->submitJob(request.get(), id);
+    IZELServerStatus* status = delay ? jobs->scheduleJob(*request, *delay, id) : jobs->submitJob(*request, id);
     if (Outcome failure = context.connection.check(status))
         return failure;
     if (context.output.json())
@@ -148,32 +115,32 @@ Outcome submit(Context& context, const RequestArguments& arguments, const unsign
 
 Outcome runJob(Context& context, const RequestArguments& arguments)
 {
-    Request request(context.connection);
-    if (Outcome failure = request.build(arguments))
+    ZELServerOwned<IZELServerTransformationRequest> request;
+    if (Outcome failure = buildRequest(context.connection, arguments, request))
         return failure;
-    Result result(context.connection.session());
+    const Result result = newResult(context.connection);
     if (!result)
         return complaint("out of memory for the job result");
     IZELServerTransformationManager* jobs = context.connection.session().getTransformationManager();
-    if (Outcome failure = context.connection.check(jobs->transactJob(request.get(), result.get())))
+    if (Outcome failure = context.connection.check(jobs->transactJob(*request, *result)))
         return failure;
-    context.output.print(describe(context.connection, result.get()));
+    context.output.print(describe(context.connection, *result));
     return std::nullopt;
 }
 
 // Fetches the job's result; a job the server does not know is a failure.
-Outcome fetch(Context& context, unsigned id, Result& result, unsigned& code)
+Outcome fetch(Context& context, unsigned id, const Result& result, unsigned& code)
 {
     if (!result)
         return complaint("out of memory for the job result");
     unsigned found = 0;
     IZELServerTransformationManager* jobs = context.connection.session().getTransformationManager();
-    if (Outcome failure = context.connection.check(jobs->getJobResult(id, found, result.get())))
+    if (Outcome failure = context.connection.check(jobs->getJobResult(id, found, *result)))
         return failure;
     if (!found)
         return complaint("no job " + std::to_string(id));
     code = 0;
-    result.get().getJobStatus(code);
+    result->getJobStatus(code);
     return std::nullopt;
 }
 
@@ -181,7 +148,7 @@ Outcome wait(Context& context, unsigned id)
 {
     const bool spin = !context.output.quiet() && stderrIsTerminal();
     const char spinner[] = {'|', '/', '-', '\\'};
-    Result result(context.connection.session());
+    const Result result = newResult(context.connection);
     unsigned code = 0;
     for (unsigned turn = 0;; ++turn) {
         if (Outcome failure = fetch(context, id, result, code))
@@ -196,7 +163,7 @@ Outcome wait(Context& context, unsigned id)
     }
     if (spin)
         std::fputs("\r\033[K", stderr);
-    context.output.print(describe(context.connection, result.get()));
+    context.output.print(describe(context.connection, *result));
     return std::nullopt;
 }
 
@@ -267,11 +234,11 @@ void addJobCommands(CLI::App& app, Action& chosen)
     auto* resultCommand = job->add_subcommand("result", "Show a job's result so far");
     resultCommand->add_option("ID", *id, "Job ID")->required();
     on(resultCommand, chosen, [id](Context& c) -> Outcome {
-        Result result(c.connection.session());
+        const Result result = newResult(c.connection);
         unsigned code = 0;
         if (Outcome failure = fetch(c, *id, result, code))
             return failure;
-        c.output.print(describe(c.connection, result.get()));
+        c.output.print(describe(c.connection, *result));
         return std::nullopt;
     });
 

@@ -4,18 +4,10 @@
 
 namespace zelctl {
 
-OpenRepository::OpenRepository(Connection& connection) : connection_(connection) {}
-
-OpenRepository::~OpenRepository()
-{
-    if (repository_ != nullptr)
-        connection_.session().destroyRepository(&repository_);
-}
-
 Outcome OpenRepository::open(const std::string& name)
 {
-    repository_ = connection_.session().createRepository();
-    if (repository_ == nullptr)
+    repository_ = connection_.own(connection_.session().createRepository());
+    if (!repository_)
         return complaint("out of memory for the repository");
     unsigned found = 0;
     if (Outcome failure = connection_.check(
@@ -37,14 +29,13 @@ nlohmann::ordered_json describe(Connection& connection, const IZELServerReposito
 Outcome list(Context& context)
 {
     IZELServerSession& session = context.connection.session();
-    IZELServerVector<IZELServerRepository>* repositories = session.createRepositoryVector();
-    if (repositories == nullptr)
+    const auto repositories = context.connection.own(session.createRepositoryVector());
+    if (!repositories)
         return complaint("out of memory for the list");
     Outcome failure = context.connection.check(session.getRepositoryManager()->getRepositories(nullptr, *repositories));
     nlohmann::ordered_json rows = nlohmann::ordered_json::array();
     for (unsigned i = 0; !failure && i < repositories->entries(); ++i)
         rows.push_back(describe(context.connection, *repositories->element(i)));
-    session.destroyRepositoryVector(&repositories);
     if (!failure)
         context.output.print(rows);
     return failure;

@@ -18,35 +18,22 @@ struct Arguments {
     std::string item;
 };
 
-class Service {
-public:
-    explicit Service(IZELServerSession& session) : session_(session), service_(session.createService()) {}
-    ~Service()
-    {
-        if (service_ != nullptr)
-            session_.destroyService(&service_);
-    }
-    Service(const Service&) = delete;
-    Service& operator=(const Service&) = delete;
+using Service = ZELServerOwned<IZELServerService>;
 
-    Outcome fetch(Connection& connection, const std::string& name)
-    {
-        if (service_ == nullptr)
-            return complaint("out of memory for the service");
-        unsigned found = 0;
-        if (Outcome failure =
-                connection.check(session_.getRepositoryManager()->getService(connection.text(name), *service_, found)))
-            return failure;
-        if (!found)
-            return complaint("no service '" + name + "'");
-        return std::nullopt;
-    }
-    IZELServerService& get() { return *service_; }
-
-private:
-    IZELServerSession& session_;
-    IZELServerService* service_;
-};
+// Looks the service up; a name the server does not know is a failure.
+Outcome fetch(Connection& connection, const std::string& name, Service& service)
+{
+    service = connection.own(connection.session().createService());
+    if (!service)
+        return complaint("out of memory for the service");
+    unsigned found = 0;
+    if (Outcome failure = connection.check(
+            connection.session().getRepositoryManager()->getService(connection.text(name), *service, found)))
+        return failure;
+    if (!found)
+        return complaint("no service '" + name + "'");
+    return std::nullopt;
+}
 
 nlohmann::ordered_json describe(Connection& connection, const IZELServerService& service)
 {
@@ -64,8 +51,8 @@ nlohmann::ordered_json describe(Connection& connection, const IZELServerService&
 Outcome list(Context& context, const std::string& filter)
 {
     IZELServerSession& session = context.connection.session();
-    IZELServerVector<IZELServerService>* services = session.createServiceVector();
-    if (services == nullptr)
+    const auto services = context.connection.own(session.createServiceVector());
+    if (!services)
         return complaint("out of memory for the list");
     ZELServerStringDict directives;
     directives.insert("ENABLE_FILTER", filter == "enabled" ? "ENABLED" : filter == "disabled" ? "DISABLED" : "ALL");
@@ -73,7 +60,6 @@ Outcome list(Context& context, const std::string& filter)
     nlohmann::ordered_json rows = nlohmann::ordered_json::array();
     for (unsigned i = 0; !failure && i < services->entries(); ++i)
         rows.push_back(describe(context.connection, *services->element(i)));
-    session.destroyServiceVector(&services);
     if (!failure)
         context.output.print(rows);
     return failure;
@@ -81,15 +67,14 @@ Outcome list(Context& context, const std::string& filter)
 
 Outcome show(Context& context, const std::string& name)
 {
-    Service service(context.connection.session());
-    if (Outcome failure = service.fetch(context.connection, name))
+    Service service;
+    if (Outcome failure = fetch(context.connection, name, service))
         return failure;
-    IZELServerSession& session = context.connection.session();
-    IZELServerVector<IZELServerItem>* items = session.createItemVector();
-    if (items == nullptr)
+    const auto items = context.connection.own(context.connection.session().createItemVector());
+    if (!items)
         return complaint("out of memory for the list");
-    Outcome failure = context.connection.check(service.get().getRegisteredItems(nullptr, *items));
-    nlohmann::ordered_json json = describe(context.connection, service.get());
+    Outcome failure = context.connection.check(service->getRegisteredItems(nullptr, *items));
+    nlohmann::ordered_json json = describe(context.connection, *service);
     nlohmann::ordered_json registered = nlohmann::ordered_json::array();
     for (unsigned i = 0; !failure && i < items->entries(); ++i) {
         const IZELServerItem& item = *items->element(i);
@@ -97,7 +82,6 @@ Outcome show(Context& context, const std::string& name)
             {{"repository", context.connection.read([&](IZELServerString& out) { item.getRepositoryName(out); })},
              {"item", context.connection.read([&](IZELServerString& out) { item.getName(out); })}});
     }
-    session.destroyItemVector(&items);
     if (failure)
         return failure;
     json["registered"] = registered;
@@ -123,14 +107,13 @@ void apply(Connection& connection, const Arguments& a, IZELServerService& servic
 Outcome create(Context& context, const Arguments& a)
 {
     Connection& c = context.connection;
-    IZELServerService* service =
-        c.session().createService(c.text(a.name), c.text(a.displayName.value_or(a.name)),
-                                  c.text(a.description.value_or("")), c.text(a.urlPattern.value_or("")));
-    if (service == nullptr)
+    const Service service =
+        c.own(c.session().createService(c.text(a.name), c.text(a.displayName.value_or(a.name)),
+                                        c.text(a.description.value_or("")), c.text(a.urlPattern.value_or(""))));
+    if (!service)
         return complaint("out of memory for the service");
     apply(c, a, *service);
     Outcome failure = c.check(c.session().getRepositoryManager()->addService(*service));
-    c.session().destroyService(&service);
     if (!failure)
         context.output.confirm({{"service", a.name}, {"created", true}});
     return failure;
@@ -138,12 +121,12 @@ Outcome create(Context& context, const Arguments& a)
 
 Outcome update(Context& context, const Arguments& a)
 {
-    Service service(context.connection.session());
-    if (Outcome failure = service.fetch(context.connection, a.name))
+    Service service;
+    if (Outcome failure = fetch(context.connection, a.name, service))
         return failure;
-    apply(context.connection, a, service.get());
+    apply(context.connection, a, *service);
     if (Outcome failure =
-            context.connection.check(context.connection.session().getRepositoryManager()->updateService(service.get())))
+            context.connection.check(context.connection.session().getRepositoryManager()->updateService(*service)))
         return failure;
     context.output.confirm({{"service", a.name}, {"updated", true}});
     return std::nullopt;
@@ -163,13 +146,13 @@ Outcome remove(Context& context, const std::string& name)
 
 Outcome registration(Context& context, const Arguments& a, bool add)
 {
-    Service service(context.connection.session());
-    if (Outcome failure = service.fetch(context.connection, a.name))
+    Service service;
+    if (Outcome failure = fetch(context.connection, a.name, service))
         return failure;
     Connection& c = context.connection;
     unsigned deregistered = 0;
-    IZELServerStatus* status = add ? service.get().registerItem(c.text(a.repository), c.text(a.item))
-                                   : service.get().deregisterItem(c.text(a.repository), c.text(a.item), deregistered);
+    IZELServerStatus* status = add ? service->registerItem(c.text(a.repository), c.text(a.item))
+                                   : service->deregisterItem(c.text(a.repository), c.text(a.item), deregistered);
     if (Outcome failure = c.check(status))
         return failure;
     if (!add && !deregistered)

@@ -12,12 +12,13 @@ Outcome whoami(Context& context)
     IZELServerIdentity* identity = session.getIdentity();
     if (identity == nullptr)
         return complaint("the session has no identity");
-    IZELServerStringArray* roles = session.createStringArray();
+    const auto roles = context.connection.own(session.createStringArray());
+    if (!roles)
+        return complaint("out of memory for the roles");
     identity->getRoles(*roles);
     nlohmann::ordered_json list = nlohmann::ordered_json::array();
     for (unsigned i = 0; i < roles->entries(); ++i)
         list.push_back(roles->element(i));
-    session.destroyStringArray(&roles);
     context.output.print({{"id", context.connection.read([&](IZELServerString& out) { identity->getId(out); })},
                           {"authenticated", identity->isAuthenticated()},
                           {"roles", list}});

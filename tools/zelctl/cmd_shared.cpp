@@ -19,20 +19,21 @@ struct Arguments {
 // A shared resource looked up by name, with the paths made on it released before it goes.
 class Area {
 public:
-    explicit Area(Connection& connection) : connection_(connection), area_(connection.session().createMountPoint()) {}
+    explicit Area(Connection& connection)
+        : connection_(connection), area_(connection.own(connection.session().createMountPoint()))
+    {}
+    // Paths belong to the mount point that made them, not to the session.
     ~Area()
     {
         for (IZELServerPath* path : paths_)
             area_->releaseObject(path);
-        if (area_ != nullptr)
-            connection_.session().destroyMountPoint(&area_);
     }
     Area(const Area&) = delete;
     Area& operator=(const Area&) = delete;
 
     Outcome open(const std::string& name)
     {
-        if (area_ == nullptr)
+        if (!area_)
             return complaint("out of memory for the shared resource");
         unsigned found = 0;
         if (Outcome failure = connection_.check(
@@ -53,7 +54,7 @@ public:
 
 private:
     Connection& connection_;
-    IZELServerMountPoint* area_;
+    ZELServerOwned<IZELServerMountPoint> area_;
     std::vector<IZELServerPath*> paths_;
 };
 
@@ -69,8 +70,8 @@ nlohmann::ordered_json describe(Connection& connection, const IZELServerFileInfo
 Outcome resources(Context& context)
 {
     IZELServerSession& session = context.connection.session();
-    IZELServerVector<IZELServerMountPoint>* areas = session.createMountPointVector();
-    if (areas == nullptr)
+    const auto areas = context.connection.own(session.createMountPointVector());
+    if (!areas)
         return complaint("out of memory for the list");
     Outcome failure = context.connection.check(session.getMountPointManager()->getSharedResources(*areas));
     nlohmann::ordered_json rows = nlohmann::ordered_json::array();
@@ -81,7 +82,6 @@ Outcome resources(Context& context)
              {"display name", context.connection.read([&](IZELServerString& out) { area.getDisplayName(out); })},
              {"description", context.connection.read([&](IZELServerString& out) { area.getDescription(out); })}});
     }
-    session.destroyMountPointVector(&areas);
     if (!failure)
         context.output.print(rows);
     return failure;
@@ -92,15 +92,13 @@ Outcome list(Context& context, const Arguments& a)
     Area area(context.connection);
     if (Outcome failure = area.open(a.resource))
         return failure;
-    IZELServerSession& session = context.connection.session();
-    IZELServerVector<IZELServerFileInfo>* entries = session.createFileInfoVector();
-    if (entries == nullptr)
+    const auto entries = context.connection.own(context.connection.session().createFileInfoVector());
+    if (!entries)
         return complaint("out of memory for the list");
     Outcome failure = context.connection.check(area.get().list(area.path(a.path), *entries));
     nlohmann::ordered_json rows = nlohmann::ordered_json::array();
     for (unsigned i = 0; !failure && i < entries->entries(); ++i)
         rows.push_back(describe(context.connection, *entries->element(i)));
-    session.destroyFileInfoVector(&entries);
     if (!failure)
         context.output.print(rows);
     return failure;
@@ -111,14 +109,12 @@ Outcome stat(Context& context, const Arguments& a)
     Area area(context.connection);
     if (Outcome failure = area.open(a.resource))
         return failure;
-    IZELServerSession& session = context.connection.session();
-    IZELServerFileInfo* info = session.createFileInfo();
-    if (info == nullptr)
+    const auto info = context.connection.own(context.connection.session().createFileInfo());
+    if (!info)
         return complaint("out of memory for the file information");
     Outcome failure = context.connection.check(area.get().getFileInfo(area.path(a.path), *info));
     if (!failure)
         context.output.print(describe(context.connection, *info));
-    session.destroyFileInfo(&info);
     return failure;
 }
 

@@ -13,37 +13,20 @@ struct Arguments {
     long long timeout = 0;
 };
 
-class Token {
-public:
-    explicit Token(IZELServerSecurityManager& manager, IZELServerUserToken* token) : manager_(manager), token_(token) {}
-    ~Token()
-    {
-        if (token_ != nullptr)
-            manager_.destroyUserToken(&token_);
-    }
-    Token(const Token&) = delete;
-    Token& operator=(const Token&) = delete;
-    IZELServerUserToken* get() { return token_; }
-
-private:
-    IZELServerSecurityManager& manager_;
-    IZELServerUserToken* token_;
-};
-
 IZELServerSecurityManager* security(Context& context) { return context.connection.session().getSecurityManager(); }
 
 Outcome show(Context& context, const std::string& account)
 {
     Connection& c = context.connection;
-    Token token(*security(context), security(context)->createUserToken());
-    if (token.get() == nullptr)
+    const auto token = c.own(security(context)->createUserToken());
+    if (!token)
         return complaint("out of memory for the token");
     bool found = false;
-    if (Outcome failure = c.check(security(context)->getUserToken(c.text(account), *token.get(), found)))
+    if (Outcome failure = c.check(security(context)->getUserToken(c.text(account), *token, found)))
         return failure;
     if (!found)
         return complaint("no token for '" + account + "'");
-    const IZELServerUserToken& t = *token.get();
+    const IZELServerUserToken& t = *token;
     context.output.print({{"account", account},
                           {"token", c.read([&](IZELServerString& out) { t.getToken(out); })},
                           {"client address", c.read([&](IZELServerString& out) { t.getClientAddress(out); })},
@@ -59,11 +42,11 @@ Outcome set(Context& context, const Arguments& a)
     bool exists = false;
     if (Outcome failure = c.check(manager.userTokenExists(c.text(a.account), exists)))
         return failure;
-    Token token(manager, manager.createUserToken(c.text(a.token), c.text(a.clientAddress), a.timeout));
-    if (token.get() == nullptr)
+    const auto token = c.own(manager.createUserToken(c.text(a.token), c.text(a.clientAddress), a.timeout));
+    if (!token)
         return complaint("out of memory for the token");
-    IZELServerStatus* status = exists ? manager.updateUserToken(c.text(a.account), *token.get())
-                                      : manager.addUserToken(c.text(a.account), *token.get());
+    IZELServerStatus* status =
+        exists ? manager.updateUserToken(c.text(a.account), *token) : manager.addUserToken(c.text(a.account), *token);
     if (Outcome failure = c.check(status))
         return failure;
     context.output.confirm({{"account", a.account}, {exists ? "updated" : "added", true}});

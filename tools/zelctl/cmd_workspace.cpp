@@ -21,9 +21,8 @@ Outcome list(Context& context, const std::string& name, const std::string& filte
     OpenRepository repository(context.connection);
     if (Outcome failure = repository.open(name))
         return failure;
-    IZELServerSession& session = context.connection.session();
-    IZELServerVector<IZELServerWorkspaceSummary>* summaries = session.createWorkspaceSummaryVector();
-    if (summaries == nullptr)
+    const auto summaries = context.connection.own(context.connection.session().createWorkspaceSummaryVector());
+    if (!summaries)
         return complaint("out of memory for the list");
     ZELServerStringDict directives;
     directives.insert("ENABLE_FILTER", filterDirective(filter));
@@ -39,7 +38,6 @@ Outcome list(Context& context, const std::string& name, const std::string& filte
                         {"enabled", s.isEnabled()},
                         {"description", read(&IZELServerWorkspaceSummary::getDescription)}});
     }
-    session.destroyWorkspaceSummaryVector(&summaries);
     if (!failure)
         context.output.print(rows);
     return failure;
@@ -53,13 +51,12 @@ nlohmann::ordered_json parameters(Connection& connection, IZELServerVector<IZELS
         auto read = [&](void (IZELServerParameter::*getter)(IZELServerString&) const) {
             return connection.read([&](IZELServerString& out) { (p.*getter)(out); });
         };
-        IZELServerStringArray* options = connection.session().createStringArray();
+        const auto options = connection.own(connection.session().createStringArray());
         nlohmann::ordered_json choices = nlohmann::ordered_json::array();
-        if (options != nullptr) {
+        if (options) {
             p.getOptions(*options);
             for (unsigned j = 0; j < options->entries(); ++j)
                 choices.push_back(options->element(j));
-            connection.session().destroyStringArray(&options);
         }
         rows.push_back({{"name", read(&IZELServerParameter::getName)},
                         {"type", read(&IZELServerParameter::getType)},
@@ -99,8 +96,8 @@ Outcome show(Context& context, const std::string& name, const std::string& works
     if (Outcome failure = repository.open(name))
         return failure;
     Connection& c = context.connection;
-    IZELServerWorkspace* workspace = c.session().createWorkspace();
-    if (workspace == nullptr)
+    const auto workspace = c.own(c.session().createWorkspace());
+    if (!workspace)
         return complaint("out of memory for the workspace");
     unsigned found = 0;
     Outcome failure = c.check(repository.get().getWorkspaceView(c.text(workspaceName), *workspace, found));
@@ -119,7 +116,6 @@ Outcome show(Context& context, const std::string& name, const std::string& works
                               {"source feature types", featureTypes(c, w.getSourceFeatureTypes())},
                               {"destination feature types", featureTypes(c, w.getDestinationFeatureTypes())}});
     }
-    c.session().destroyWorkspace(&workspace);
     return failure;
 }
 

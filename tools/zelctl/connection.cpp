@@ -2,64 +2,53 @@
 
 namespace zelctl {
 
-Connection::Connection(const GlobalOptions& options) : options_(options) { ZEL_createServerSession(&session_); }
+Connection::Connection(const GlobalOptions& options) : options_(options), session_(zelServerCreateSession()) {}
 
+// The server is told that we leave before the session goes.
 Connection::~Connection()
 {
-    strings_.clear();
-    if (session_ != nullptr) {
-        if (info_ != nullptr) {
-            IZELServerStatus* status = session_->disconnect();
-            session_->destroyStatus(&status);
-            session_->destroyConnectionInfo(&info_);
-        }
-        ZEL_destroyServerSession(&session_);
-    }
+    if (info_)
+        own(session_->disconnect());
 }
 
 IZELServerString& Connection::text(const std::string& value)
 {
-    strings_.emplace_back(session_->createString(), StringReleaser{session_});
+    strings_.push_back(own(session_->createString()));
     strings_.back()->set(value.data(), static_cast<unsigned>(value.size()));
     return *strings_.back();
 }
 
 Outcome Connection::check(IZELServerStatus* status)
 {
-    if (status == nullptr)
+    const ZELServerOwned<IZELServerStatus> owned = own(status);
+    if (!owned)
         return std::nullopt;
-    Failure failure{status->getMessageNumber(), status->getMessage() ? status->getMessage() : ""};
-    session_->destroyStatus(&status);
-    return failure;
+    return Failure{owned->getMessageNumber(), owned->getMessage() ? owned->getMessage() : ""};
 }
 
 Outcome Connection::open()
 {
-    if (session_ == nullptr)
+    if (!session_)
         return Failure{0, "the client library could not create a session"};
     if (!options_.token.empty()) {
-        IZELServerStringArray* properties = session_->createStringArray();
+        const ZELServerOwned<IZELServerStringArray> properties = own(session_->createStringArray());
         properties->append("USER_TOKEN");
         properties->append(options_.token.c_str());
-        info_ = session_->createConnectionInfo(text(options_.host), options_.port, *properties);
-        session_->destroyStringArray(&properties);
+        info_ = own(session_->createConnectionInfo(text(options_.host), options_.port, *properties));
     } else {
-        info_ = session_->createConnectionInfo(text(options_.host), options_.port, text(options_.user),
-                                               text(options_.password));
+        info_ = own(session_->createConnectionInfo(text(options_.host), options_.port, text(options_.user),
+                                                   text(options_.password)));
     }
-    if (info_ == nullptr)
+    if (!info_)
         return Failure{0, "the client library could not create the connection information"};
     // The client ID travels with the handshake, whichever way the user signs in.
-    IZELServerStringArray* handshake = nullptr;
+    ZELServerOwned<IZELServerStringArray> handshake;
     if (!options_.clientId.empty()) {
-        handshake = session_->createStringArray();
+        handshake = own(session_->createStringArray());
         handshake->append("CLIENT_ID");
         handshake->append(options_.clientId.c_str());
     }
-    Outcome outcome = check(session_->init(*info_, handshake));
-    if (handshake != nullptr)
-        session_->destroyStringArray(&handshake);
-    return outcome;
+    return check(session_->init(*info_, handshake.get()));
 }
 
 std::optional<std::pair<std::string, std::string>> splitPair(const std::string& text)

@@ -2,8 +2,7 @@
 // The one place where zelctl meets a session: it creates the session, signs in, owns every string
 // it hands out and turns a status into a failure value that main prints as the error line.
 
-#include <zelserverapi/interfaces.h>
-#include <zelserverapi/zelserverapi.h>
+#include <zelserverapi/ZELServerOwned.h>
 
 #include <memory>
 #include <optional>
@@ -41,6 +40,13 @@ public:
     Outcome open();
 
     IZELServerSession& session() { return *session_; }
+
+    // Owns an object the session made (null stays null).
+    template <typename T>
+    ZELServerOwned<T> own(T* object)
+    {
+        return zelServerOwn(*session_, object);
+    }
     const GlobalOptions& options() const { return options_; }
 
     // A string owned by the connection, released before the session goes.
@@ -59,15 +65,11 @@ public:
     }
 
 private:
-    struct StringReleaser {
-        IZELServerSession* owner;
-        void operator()(IZELServerString* s) const { owner->destroyString(&s); }
-    };
-
     GlobalOptions options_;
-    IZELServerSession* session_ = nullptr;
-    IZELServerConnectionInfo* info_ = nullptr;
-    std::vector<std::unique_ptr<IZELServerString, StringReleaser>> strings_;
+    // Declared in the order they are made: the strings go first, the session last.
+    ZELServerOwned<IZELServerSession> session_;
+    ZELServerOwned<IZELServerConnectionInfo> info_;
+    std::vector<ZELServerOwned<IZELServerString>> strings_;
 };
 
 // The parts of NAME=VALUE; nullopt when there is no "=" or the name is empty.

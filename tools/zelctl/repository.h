@@ -7,10 +7,7 @@ namespace zelctl {
 
 class OpenRepository {
 public:
-    explicit OpenRepository(Connection& connection);
-    ~OpenRepository();
-    OpenRepository(const OpenRepository&) = delete;
-    OpenRepository& operator=(const OpenRepository&) = delete;
+    explicit OpenRepository(Connection& connection) : connection_(connection) {}
 
     // Looks the repository up; a name the server does not know is a failure.
     Outcome open(const std::string& name);
@@ -18,7 +15,7 @@ public:
 
 private:
     Connection& connection_;
-    IZELServerRepository* repository_ = nullptr;
+    ZELServerOwned<IZELServerRepository> repository_;
 };
 
 }  // namespace zelctl
