@@ -7,7 +7,7 @@ set -euo pipefail
 
 packages=(
   g++ cmake ninja-build pkg-config binutils clang-format-16
-  libxerces-c-dev
+  libxerces-c-dev zlib1g-dev
   libgtest-dev libgmock-dev libbenchmark-dev
   libpugixml-dev libsqlite3-dev
   libcli11-dev nlohmann-json3-dev
@@ -16,7 +16,7 @@ packages=(
 if [ "${1:-}" = windows ]; then
   packages+=(
     g++-mingw-w64-x86-64-posix gcc-mingw-w64-x86-64-posix binutils-mingw-w64-x86-64
-    mingw-w64-x86-64-dev wine wine64 googletest dpkg-dev
+    mingw-w64-x86-64-dev libz-mingw-w64-dev wine wine64 googletest dpkg-dev
   )
 fi
 

@@ -26,6 +26,8 @@ set(CMAKE_FIND_ROOT_PATH_MODE_PACKAGE ONLY)
 # The static Xerces brings its own package configuration, which knows its link dependencies.
 set(CMAKE_FIND_PACKAGE_PREFER_CONFIG ON)
 set(XercesC_DIR ${ZEL_WINDOWS_DEPS}/xerces/cmake)
+# Debian's zlib for MinGW-w64 (libz-mingw-w64-dev): the static archive, so the DLL needs no zlib1.dll.
+set(ZLIB_USE_STATIC_LIBS ON)
 
 # The C and C++ runtimes and winpthread are linked in, so the DLL and the programs need nothing
 # beside them.

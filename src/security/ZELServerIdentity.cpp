@@ -41,6 +41,24 @@ XmlElement* appendElement(XmlDocument& document, XmlElement& parent, const char*
     return child != nullptr && parent.appendChild(child) ? child : nullptr;
 }
 
+std::optional<std::string> writeDocument(const IZELServerIdentity& identity, const std::string& rootName)
+{
+    XmlDocument document;
+    if (IZELServerStatus* failure = document.startXml()) {
+        delete failure;
+        return std::nullopt;
+    }
+    if (document.createDocument("", rootName) == nullptr || IdentityXml(identity).writeXml(document) != 0) {
+        return std::nullopt;
+    }
+    std::string text;
+    if (IZELServerStatus* failure = document.serialize(text)) {
+        delete failure;
+        return std::nullopt;
+    }
+    return text;
+}
+
 }  // namespace
 
 void ZELServerIdentity::getId(IZELServerString& out) const { copyText(fields_.id, out); }
@@ -63,6 +81,7 @@ void ZELServerIdentity::readFromXml(const xercesc_3_2::DOMElement& element)
 
 void ZELServerIdentity::readElement(const XmlElement& element)
 {
+    documents_.clear();
     readAttributes(element, fields_, kIdentityAttributes);
     std::string role;
     for (const XmlElement* roles : childElements(&element, "ROLES")) {
@@ -72,6 +91,15 @@ void ZELServerIdentity::readElement(const XmlElement& element)
             }
         }
     }
+}
+
+const std::string* ZELServerIdentity::documentFor(const std::string& rootName) const
+{
+    auto found = documents_.find(rootName);
+    if (found == documents_.end()) {
+        found = documents_.emplace(rootName, writeDocument(*this, rootName)).first;
+    }
+    return found->second ? &*found->second : nullptr;
 }
 
 void ZELServerSingleSignOnIdentity::takeAuthData(IZELServerString& out)

@@ -2,6 +2,8 @@
 // The signed-in identity the server reports at sign-in, its single sign-on kind, and the writer
 // that attaches an identity to every request.
 
+#include <map>
+#include <optional>
 #include <string>
 
 #include <zelserverapi/IZELServerIdentity.h>
@@ -49,6 +51,12 @@ public:
     // element's document exists.
     void readFromXml(const xercesc_3_2::DOMElement& element) override;
 
+    // The identity as every request carries it: a document whose root element is named `rootName`
+    // holding the identity's element (see IdentityXml). Written once per root name and kept until
+    // the identity is read again, since it changes only at sign-in. Null when it cannot be written
+    // (the root name is no XML name, the XML library is not available).
+    const std::string* documentFor(const std::string& rootName) const;
+
 protected:
     // Reads the element's fields; the single sign-on kind reads its own after these.
     virtual void readElement(const XmlElement& element);
@@ -56,6 +64,8 @@ protected:
 private:
     IdentityFields fields_;
     ZELServerStringArray roles_;
+    // Written documents by root name; a failed one is remembered as such.
+    mutable std::map<std::string, std::optional<std::string>, std::less<>> documents_;
 };
 
 // The identity of a single sign-on reply ("SSO_IDENTITY"): the identity's fields plus "state"

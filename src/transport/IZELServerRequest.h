@@ -5,6 +5,7 @@
 // separates the named values on the wire.
 
 #include <string>
+#include <string_view>
 
 #include <zelserverapi/IZELServerString.h>
 #include <zelserverapi/IZELServerStringArray.h>
@@ -29,6 +30,8 @@ class IZELServerRequest {
 public:
     // The request text as it goes on the wire: keyword, then NUL name "=" value per named value.
     virtual int getText(std::string& out) const = 0;
+    // The same text without a copy, valid until the request is changed or destroyed.
+    virtual std::string_view textView() const = 0;
     virtual int addValue(const std::string& name, const IZELServerString& value) = 0;
     virtual int addValue(const std::string& name, const std::string& value) = 0;
     virtual int addValue(const IZELServerString& name, const IZELServerString& value) = 0;

@@ -344,7 +344,8 @@ IZELServerRequest* ZELServerTCPIPChannel::createRequest(const std::string& keywo
 
 IZELServerRequest* ZELServerTCPIPChannel::createRequest(const std::string& keyword)
 {
-    return new ZELServerTCPIPRequest(keyword, identity_.get(), clientId_);
+    // The channel's identity is always the library's own (plain or single sign-on).
+    return new ZELServerTCPIPRequest(keyword, dynamic_cast<const ZELServerIdentity*>(identity_.get()), clientId_);
 }
 
 IZELServerResponse* ZELServerTCPIPChannel::createResponse() { return new ZELServerResponse(this); }
@@ -402,10 +403,12 @@ IZELServerStatus* ZELServerTCPIPChannel::exchange(IZELServerRequest& request, IZ
     if (download != nullptr && !download->isOpen()) {
         return makeStatus(msg::kLocalFileWrite, download->path());
     }
-    std::string text;
-    request.getText(text);
+    // The text goes into the frame with one copy; only text that is not UTF-8 is converted first.
+    std::string_view text = request.textView();
+    std::string converted;
     if (!isValidUtf8(text)) {
-        text = latin1ToUtf8(text);
+        converted = latin1ToUtf8(text);
+        text = converted;
     }
     Transfer transfer;
     transfer.upload = upload;
@@ -432,7 +435,7 @@ IZELServerStatus* ZELServerTCPIPChannel::exchange(IZELServerRequest& request, IZ
     return classifyReply(reply, response);
 }
 
-IZELServerStatus* ZELServerTCPIPChannel::sendAndReceive(const std::string& requestText, Transfer& transfer,
+IZELServerStatus* ZELServerTCPIPChannel::sendAndReceive(std::string_view requestText, Transfer& transfer,
                                                         std::string& reply)
 {
     if (!socket_) {

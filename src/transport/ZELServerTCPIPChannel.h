@@ -19,6 +19,7 @@
 
 #include <memory>
 #include <string>
+#include <string_view>
 
 #include "api/heap.h"
 #include "transport/IZELServerChannel.h"
@@ -60,7 +61,7 @@ private:
     IZELServerStatus* connect();
     IZELServerStatus* signIn(const IZELServerConnectionInfo& info);
     IZELServerStatus* resultPortExchange(IZELServerRequest& request, IZELServerResponse& response);
-    IZELServerStatus* sendAndReceive(const std::string& requestText, Transfer& transfer, std::string& reply);
+    IZELServerStatus* sendAndReceive(std::string_view requestText, Transfer& transfer, std::string& reply);
     IZELServerStatus* uploadFile(Transfer& transfer);
     IZELServerStatus* downloadFile(Transfer& transfer, bool& noFile);
 

@@ -103,22 +103,30 @@ private:
 
 }  // namespace
 
-ZELServerTCPIPRequest::ZELServerTCPIPRequest(const std::string& keyword, const IZELServerIdentity* identity,
+ZELServerTCPIPRequest::ZELServerTCPIPRequest(const std::string& keyword, const ZELServerIdentity* identity,
                                              const std::string& clientId)
-    : text_(keyword), rootElementName_(keyword), xmlSupport_(new XmlDocument())
+    : text_(keyword), rootElementName_(keyword)
 {
-    if (xmlSupport_ != nullptr) {
-        if (IZELServerStatus* failure = xmlSupport_->startXml()) {
-            delete failure;
-            xmlSupport_.reset();
-        }
-    }
-    if (identity != nullptr) {
-        // A request goes out without the identity rather than not at all; the server then answers
-        // for an anonymous caller.
-        addXmlValue("identityObject", IdentityXml(*identity), rootElementName_);
+    // A request goes out without the identity rather than not at all; the server then answers for
+    // an anonymous caller.
+    if (const std::string* document = identity != nullptr ? identity->documentFor(keyword) : nullptr) {
+        appendValue("identityObject", *document);
     }
     appendValue("clientID", clientId);
+}
+
+XmlDocument* ZELServerTCPIPRequest::xmlSupport()
+{
+    if (xmlSupport_ == nullptr && !xmlSupportFailed_) {
+        xmlSupport_.reset(new XmlDocument());
+        IZELServerStatus* failure = xmlSupport_ != nullptr ? xmlSupport_->startXml() : nullptr;
+        if (xmlSupport_ == nullptr || failure != nullptr) {
+            delete failure;
+            xmlSupport_.reset();
+            xmlSupportFailed_ = true;
+        }
+    }
+    return xmlSupport_.get();
 }
 
 void ZELServerTCPIPRequest::appendValue(std::string_view name, std::string_view value)
@@ -237,18 +245,19 @@ int ZELServerTCPIPRequest::addPathPayload(const std::string& name, const IZELSer
 
 int ZELServerTCPIPRequest::addXmlValue(const std::string& name, const XmlWritable& object, const std::string& rootName)
 {
-    if (xmlSupport_ == nullptr) {
+    XmlDocument* document = xmlSupport();
+    if (document == nullptr) {
         return static_cast<int>(msg::kXmlFailure);
     }
-    const DocumentScope scope(*xmlSupport_);
-    if (xmlSupport_->createDocument("", rootName) == nullptr) {
+    const DocumentScope scope(*document);
+    if (document->createDocument("", rootName) == nullptr) {
         return static_cast<int>(msg::kXmlFailure);
     }
-    if (const unsigned code = object.writeXml(*xmlSupport_); code != 0) {
+    if (const unsigned code = object.writeXml(*document); code != 0) {
         return static_cast<int>(code);
     }
     std::string text;
-    if (IZELServerStatus* failure = xmlSupport_->serialize(text)) {
+    if (IZELServerStatus* failure = document->serialize(text)) {
         const unsigned code = failure->getMessageNumber();
         delete failure;
         return static_cast<int>(code);

@@ -7,8 +7,6 @@
 #include <string>
 #include <string_view>
 
-#include <zelserverapi/IZELServerIdentity.h>
-
 #include "api/ZELServerStringArray.h"
 #include "api/heap.h"
 #include "transport/IZELServerRequest.h"
@@ -16,19 +14,23 @@
 
 namespace zel {
 
+class ZELServerIdentity;
+
 class ZELServerTCPIPRequest final : public IZELServerRequest, public HeapObject {
 public:
     // The text starts as `keyword`; when `identity` is given (it is only read here, not kept) the
-    // value "identityObject" follows: a document whose root element is named after the keyword and
-    // holds the identity's "IDENTITY" element. Then "clientID" = `clientId`, written also when empty.
-    // Without XML support (the XML library did not start, or memory ran out) the identity is left
-    // out and every XML operation returns 393620.
-    ZELServerTCPIPRequest(const std::string& keyword, const IZELServerIdentity* identity, const std::string& clientId);
+    // value "identityObject" follows: the identity's document rooted at the keyword, which the
+    // identity writes once per keyword (ZELServerIdentity::documentFor) and which is left out when it
+    // cannot be written. Then "clientID" = `clientId`, written also when empty. The XML support of
+    // the payload operations is made only by the first of them; when it cannot be (the XML library
+    // did not start, or memory ran out) they return 393620.
+    ZELServerTCPIPRequest(const std::string& keyword, const ZELServerIdentity* identity, const std::string& clientId);
     ~ZELServerTCPIPRequest() override = default;
     ZELServerTCPIPRequest(const ZELServerTCPIPRequest&) = delete;
     ZELServerTCPIPRequest& operator=(const ZELServerTCPIPRequest&) = delete;
 
     int getText(std::string& out) const override;
+    std::string_view textView() const override { return text_; }
     int addValue(const std::string& name, const IZELServerString& value) override;
     int addValue(const std::string& name, const std::string& value) override;
     int addValue(const IZELServerString& name, const IZELServerString& value) override;
@@ -54,12 +56,15 @@ public:
 
 private:
     void appendValue(std::string_view name, std::string_view value);
+    // The XML support, made on first use; null when it cannot be.
+    XmlDocument* xmlSupport();
 
     std::string text_;
     std::string rootElementName_;
     ZELServerStringArray directiveList_;
     ZELServerStringArray notificationList_;
     std::unique_ptr<XmlDocument> xmlSupport_;
+    bool xmlSupportFailed_ = false;
 };
 
 }  // namespace zel

@@ -1,44 +1,26 @@
 #include "transport/crc32.h"
 
-#include <array>
+#include <algorithm>
+#include <limits>
+
+#include <zlib.h>
 
 namespace zel {
-namespace {
 
-using Table = std::array<std::uint32_t, 256>;
-
-// One entry per byte value: the remainder of that byte shifted through the reflected polynomial.
-Table makeTable() noexcept
-{
-    Table table{};
-    for (std::uint32_t byte = 0; byte < table.size(); ++byte) {
-        std::uint32_t remainder = byte;
-        for (int bit = 0; bit < 8; ++bit) {
-            remainder = (remainder & 1u) != 0 ? (remainder >> 1) ^ 0xEDB88320u : remainder >> 1;
-        }
-        table[byte] = remainder;
-    }
-    return table;
-}
-
-// Built once, on first use, by whichever thread gets there first.
-const Table& table() noexcept
-{
-    static const Table instance = makeTable();
-    return instance;
-}
-
-}  // namespace
-
+// zlib's CRC-32 is the same checksum, computed several bytes at a time: the checksum pass of an upload
+// runs at memory speed instead of limiting the transfer. Its state is the finished value, so the
+// running state here is kept complemented as before.
 void Crc32::update(const void* data, std::size_t count) noexcept
 {
-    const Table& entries = table();
-    const auto* bytes = static_cast<const unsigned char*>(data);
-    std::uint32_t state = state_;
-    for (std::size_t i = 0; i < count; ++i) {
-        state = entries[(state ^ bytes[i]) & 0xFFu] ^ (state >> 8);
+    const auto* bytes = static_cast<const Bytef*>(data);
+    uLong crc = ~state_;
+    while (count > 0) {
+        const auto piece = static_cast<uInt>(std::min<std::size_t>(count, std::numeric_limits<uInt>::max()));
+        crc = crc32(crc, bytes, piece);
+        bytes += piece;
+        count -= piece;
     }
-    state_ = state;
+    state_ = ~static_cast<std::uint32_t>(crc);
 }
 
 }  // namespace zel

@@ -2,15 +2,20 @@
 // XmlReader: parses one reply body held in memory into a DOM document and hands out its document
 // element. The reading helpers of xml_navigation.h take it from there.
 //
-// The parser is hardened because replies come from the network: it loads no external DTD, resolves
-// no external entity (any attempt fails the parse), and stops entity expansion after a small limit
-// (ordinary character and predefined entity references are not counted). It has no validator and no
-// grammar pool.
+// The parser is hardened because replies come from the network, so that a reply of N bytes costs
+// time and memory linear in N. Before the parser sees a text, one linear pass refuses it when it holds
+// a document type declaration (the protocol never sends one, and it is what entity bombs and external
+// entities need), an element with more than kMaxAttributes attributes (the parser's duplicate check is
+// quadratic in them), or elements nested more than kMaxDepth deep. The text is read as UTF-8
+// whatever it declares, so that pass sees the markup exactly as the parser does. The parser itself
+// loads no external DTD, resolves no external entity (any attempt fails the parse) and has no
+// validator and no grammar pool.
 //
 // A reader parses one document. It holds a reference to the XML library (xml_platform.h) from its
 // first parse until it is destroyed; destroying it releases the document, the parser and then the
 // reference.
 
+#include <cstddef>
 #include <memory>
 #include <string_view>
 
@@ -32,6 +37,10 @@ class XmlReader : public HeapObject {
 public:
     // Entity references (other than the predefined ones) one document may expand.
     static constexpr XMLSize_t kEntityExpansionLimit = 100;
+    // Far above anything the server writes (an item, the widest element, has 16 attributes; the
+    // deepest reply, a workspace definition, nests about 10 levels).
+    static constexpr std::size_t kMaxAttributes = 64;
+    static constexpr std::size_t kMaxDepth = 64;
 
     XmlReader() = default;
     ~XmlReader();
@@ -39,9 +48,9 @@ public:
     XmlReader& operator=(const XmlReader&) = delete;
 
     // Parses `text` (read in place; it need only live during the call). Null on success, after
-    // which rootOf() is the document element. Status 393620 when the XML library cannot start, or
-    // with the parser's message when the text is not a well-formed document (an empty text
-    // included), asks for an external entity or exceeds the expansion limit. Once a reader has
+    // which rootOf() is the document element. Status 393620 when the XML library cannot start, when
+    // the text breaks one of the limits above, or with the parser's message when the text is not a
+    // well-formed UTF-8 document (an empty text included). Once a reader has
     // parsed (successfully or not) it is busy, and later calls return null without parsing.
     [[nodiscard]] IZELServerStatus* parse(std::string_view text);
 

@@ -92,14 +92,14 @@ protected:
     void TearDown() override { heap::failNextAllocations(0); }
 };
 
-TEST_F(RequestWithoutXml, LeavesTheIdentityOutAndRefusesEveryDocument)
+TEST_F(RequestWithoutXml, RefusesEveryDocumentAndKeepsPlainValues)
 {
-    ZELServerIdentity identity;
-    signIn(identity);
-    // The XML support is the request's first allocation from the library heap.
+    ZELServerTCPIPRequest request("REP_ADD_REPOSITORY", nullptr, "c");
+    // The XML support is made by the first payload, as the request's first allocation from the
+    // library heap; once it failed, later payloads do not try again.
     heap::failNextAllocations(1);
-    ZELServerTCPIPRequest request("REP_ADD_REPOSITORY", &identity, "c");
-    EXPECT_EQ(textOf(request), "REP_ADD_REPOSITORY\0clientID=c"s);
+    EXPECT_EQ(request.addRepositoryPayload("repositoryObject", ZELServerString("r"), ZELServerString("d")),
+              static_cast<int>(msg::kXmlFailure));
     EXPECT_EQ(request.addRepositoryPayload("repositoryObject", ZELServerString("r"), ZELServerString("d")),
               static_cast<int>(msg::kXmlFailure));
     EXPECT_EQ(textOf(request), "REP_ADD_REPOSITORY\0clientID=c"s);

@@ -1,0 +1,41 @@
+#pragma once
+// Timing, medians, the process's memory and the machine's state, and the result table.
+
+#include <chrono>
+#include <functional>
+#include <string>
+#include <vector>
+
+namespace bench {
+
+// Seconds `work` takes, on the monotonic clock.
+double secondsOf(const std::function<void()>& work);
+
+double median(std::vector<double> values);
+
+// Runs `library` and `raw` alternately (A, B, A, B, ...) `rounds` times each; the samples are the
+// seconds of each run.
+struct Samples {
+    std::vector<double> library, raw;
+};
+Samples interleave(unsigned rounds, const std::function<void()>& library, const std::function<void()>& raw);
+
+// Resident set size and its peak since the last resetPeakResident(), in bytes (Linux /proc).
+long residentBytes();
+long peakResidentBytes();
+void resetPeakResident();
+
+// "nproc 2, kernel 6.1.0-18-amd64" and the load averages "0.52 0.61 0.70".
+std::string machineText();
+std::string loadText();
+
+// One row of the result table; `met` is "yes", "NO", or empty for a figure without a goal.
+struct Row {
+    std::string figure, library, raw, ratio, goal, met;
+};
+inline std::string metText(bool met) { return met ? "yes" : "NO"; }
+void printTable(const std::vector<Row>& rows, const std::string& loadBefore, const std::string& loadAfter);
+
+std::string fixed(double value, int decimals);
+
+}  // namespace bench

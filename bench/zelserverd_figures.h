@@ -1,0 +1,22 @@
+#pragma once
+// Figures of the local server zelserverd, measured through the library: the submit-to-result time
+// of a job that does nothing, and cheap-command throughput with several sessions at once.
+
+#include <string>
+#include <vector>
+
+#include "measure.h"
+
+namespace bench {
+
+struct ServerFigureOptions {
+    std::string zelserverd;  // the program
+    std::string workDir;     // scratch space for its data directory
+    unsigned jobs = 30;      // no-op jobs timed
+    double seconds = 2;      // length of each throughput run
+};
+
+// Starts zelserverd, measures, stops it; appends the rows. Throws std::runtime_error on failure.
+void measureZelserverd(const ServerFigureOptions& options, std::vector<Row>& rows);
+
+}  // namespace bench

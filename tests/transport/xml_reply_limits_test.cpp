@@ -1,0 +1,75 @@
+// Hostile reply documents: what the protocol never sends is refused before the parser works on it,
+// and the limits hold exactly at their values.
+
+#include <memory>
+#include <string>
+
+#include <gtest/gtest.h>
+
+#include "api/message_numbers.h"
+#include "transport/xml_reader.h"
+
+namespace zel {
+namespace {
+
+std::string repeat(const std::string& piece, std::size_t times)
+{
+    std::string out;
+    for (std::size_t i = 0; i < times; ++i) {
+        out += piece;
+    }
+    return out;
+}
+
+std::string withAttributes(std::size_t count)
+{
+    std::string element = "<r";
+    for (std::size_t i = 0; i < count; ++i) {
+        element += " a" + std::to_string(i) + "='v'";
+    }
+    return element + "/>";
+}
+
+std::string nested(std::size_t depth) { return repeat("<e>", depth) + repeat("</e>", depth); }
+
+TEST(XmlReplyLimits, RefusesWhatNoRealReplyHolds)
+{
+    constexpr std::size_t kAttributes = 64;
+    constexpr std::size_t kDepth = 64;
+    const std::string bigEntity =
+        "<!DOCTYPE r [<!ENTITY b \"" + std::string(1 << 16, 'x') + "\">]><r>" + repeat("&b;", 99) + "</r>";
+    const struct {
+        const char* name;
+        std::string body;
+        bool parses;
+    } cases[] = {
+        {"internal entity", "<!DOCTYPE r [<!ENTITY co \"Acme\">]><r>&co;</r>", false},
+        {"one entity used 99 times", bigEntity, false},
+        {"external subset", "<?xml version=\"1.0\"?><!DOCTYPE r SYSTEM \"r.dtd\"><r/>", false},
+        {"bare declaration", "<!DOCTYPE r><r/>", false},
+        {"attributes over the limit", withAttributes(kAttributes + 1), false},
+        {"attributes at the limit", withAttributes(kAttributes), true},
+        {"nesting over the limit", nested(kDepth + 1), false},
+        {"nesting at the limit", nested(kDepth), true},
+        {"siblings do not nest", "<r>" + repeat("<e></e><f/>", kDepth) + "</r>", true},
+        // Markup characters inside values, comments, sections and instructions are no markup.
+        {"quoted and hidden markup",
+         "<r a='" + repeat("=", kAttributes) + "' b=\"'>=\"><!-- <!DOCTYPE x> " + repeat("=", kAttributes) +
+             " --><![CDATA[<!DOCTYPE y>" + repeat("<e>", kDepth) + "]]><?pi " + repeat("a=1 ", kAttributes) + "?></r>",
+         true},
+        // Read as UTF-8 whatever it says, so that no other encoding can hide markup from the count.
+        {"UTF-16 text", std::string("\xFF\xFE<\0r\0/\0>\0", 10), false},
+    };
+    for (const auto& c : cases) {
+        XmlReader reader;
+        const std::unique_ptr<IZELServerStatus> failure(reader.parse(c.body));
+        EXPECT_EQ(failure == nullptr, c.parses) << c.name << ": " << (failure ? failure->getMessage() : "parsed");
+        if (failure != nullptr) {
+            EXPECT_EQ(failure->getMessageNumber(), msg::kXmlFailure) << c.name;
+            EXPECT_EQ(reader.rootOf(), nullptr) << c.name;
+        }
+    }
+}
+
+}  // namespace
+}  // namespace zel
