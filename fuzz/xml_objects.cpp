@@ -14,6 +14,7 @@
 #include "security/ZELServerUserToken.h"
 #include "sharedresources/sharedresources_factories.h"
 #include "transport/ZELServerResponse.h"
+#include "transport/xml_platform.h"
 
 namespace {
 
@@ -67,6 +68,10 @@ void (*const kReaders[])(Response) = {
 
 extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size)
 {
+    // A session keeps the XML library started for its whole life; so does this process.
+    static XmlPlatformRef xml;
+    if (!xml.held())
+        delete xml.acquire();
     if (size == 0)
         return 0;
     ZELServerResponse response(nullptr);

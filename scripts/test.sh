@@ -1,15 +1,16 @@
 #!/usr/bin/env bash
 # Installs what is missing, then builds and runs the whole suite in three builds: a normal one, one
 # under AddressSanitizer and UndefinedBehaviorSanitizer, and zelserverapi.dll for 64-bit Windows
-# with its suite under Wine. After the normal build's suite the README's demo tour runs too, so
-# that it is checked on every run.
+# with its suite under Wine; and the suites that run sessions and connections in parallel under
+# ThreadSanitizer (preset tsan, which builds only those). After the normal build's suite the
+# README's demo tour runs too, so that it is checked on every run.
 #
-#   test.sh [PRESET...]     default, asan, windows (all three when none is named)
+#   test.sh [PRESET...]     default, asan, tsan, windows (all four when none is named)
 set -euo pipefail
 cd "$(dirname "$0")/.."
 
 presets=("$@")
-[ ${#presets[@]} -gt 0 ] || presets=(default asan windows)
+[ ${#presets[@]} -gt 0 ] || presets=(default asan tsan windows)
 
 if [[ " ${presets[*]} " == *" windows "* ]]; then
   bash scripts/install-deps.sh windows

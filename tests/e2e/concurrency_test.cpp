@@ -1,5 +1,6 @@
-// Sixteen sessions on sixteen threads at once, each with its own items, files and job; afterwards
-// every one of them finds all of its own work intact.
+// Sixteen sessions on sixteen threads at once, each with its own items, files and job, and refused
+// operations whose status texts come from the one message catalogue in between; afterwards every one
+// of them finds all of its own work intact. The thread sanitizer build runs it too.
 
 #include <atomic>
 
@@ -41,8 +42,20 @@ std::string work(std::uint16_t port, const std::string& dir, int n)
     writeFile(dir + "/" + tag + ".dat", content);
     IZELServerPath* folder = area->createPath(client.text("/" + tag));
     IZELServerPath* file = area->createPath(client.text("/" + tag), client.text("data.bin"));
+    // Every status starts the catalogue when no other status holds it and tears it down with the
+    // last one, so these texts race the other threads' statuses.
+    int refusals = 0;
+    auto refusedUpload = [&] {
+        const std::string missing = dir + "/" + tag + ".missing" + std::to_string(++refusals);
+        const unsigned number = client.take(area->upload(client.text(missing), *file, nullptr));
+        check(number != 0 && client.lastMessage() == "The argument \"src\" has an invalid value: \"" + missing + "\".",
+              "refused upload " + std::to_string(refusals));
+    };
+    refusedUpload();
     check(client.take(area->makeDirectory(*folder)) == 0, "makeDirectory");
+    refusedUpload();
     check(client.take(area->upload(client.text(dir + "/" + tag + ".dat"), *file, nullptr)) == 0, "upload");
+    refusedUpload();
 
     IZELServerTransformationRequest* request =
         session.createTransformationRequest(client.text("zeljob"), client.text("crowd"), item);
@@ -56,6 +69,7 @@ std::string work(std::uint16_t port, const std::string& dir, int n)
         check(client.flag([&](unsigned& f) { return jobs->getLogFile(id, client.text(log), f); }) == 1, "getLogFile");
         check(readAll(log).find("mark " + tag + "\n") != std::string::npos, "log holds the mark");
     }
+    refusedUpload();
 
     check(client.flag([&](unsigned& f) { return repository->getItem(item, client.text(itemFile + ".back"), f); }) == 1,
           "getItem");
