@@ -5,6 +5,9 @@
 #include <cstdlib>
 #include <filesystem>
 #include <fstream>
+#include <iterator>
+
+#include <gtest/gtest.h>
 
 #include <fcntl.h>
 #include <poll.h>
@@ -19,6 +22,7 @@ namespace zeltest {
 namespace {
 
 constexpr int kStartTimeoutMs = 10000;
+constexpr int kStopTimeoutMs = 10000;
 
 // Reads one line from `fd` within the time-out; empty when none came.
 std::string readLine(int fd, int timeoutMs)
@@ -35,6 +39,16 @@ std::string readLine(int fd, int timeoutMs)
             return line;
         line += c;
     }
+}
+
+// Whatever a sanitizer reports ends up on standard error, which is the server's log here.
+bool holdsSanitizerReport(const std::string& log)
+{
+    for (const char* marker : {"ERROR: AddressSanitizer", "ERROR: LeakSanitizer",
+                               "runtime error:", "WARNING: ThreadSanitizer", "ERROR: ThreadSanitizer"})
+        if (log.find(marker) != std::string::npos)
+            return true;
+    return false;
 }
 
 }  // namespace
@@ -99,11 +113,25 @@ int LocalServer::stop()
     if (pid_ <= 0)
         return -1;
     ::kill(pid_, SIGTERM);
+    // The server stops within a few seconds whatever its clients do; one that does not is a fault.
     int status = 0;
-    while (::waitpid(pid_, &status, 0) < 0 && errno == EINTR) {
+    bool ended = false;
+    for (int waited = 0; waited < kStopTimeoutMs && !ended; waited += 20) {
+        ended = ::waitpid(pid_, &status, WNOHANG) == pid_;
+        if (!ended)
+            ::usleep(20000);
+    }
+    if (!ended) {
+        ::kill(pid_, SIGKILL);
+        ::waitpid(pid_, &status, 0);
     }
     pid_ = -1;
-    return WIFEXITED(status) ? WEXITSTATUS(status) : -1;
+    const int code = ended && WIFEXITED(status) ? WEXITSTATUS(status) : -1;
+    std::ifstream in(directory_ + "/server.log");
+    const std::string log((std::istreambuf_iterator<char>(in)), std::istreambuf_iterator<char>());
+    if (code != 0 || holdsSanitizerReport(log))
+        ADD_FAILURE() << "zelserverd did not stop cleanly (exit status " << code << "); its log:\n" << log;
+    return code;
 }
 
 LocalServer::~LocalServer()

@@ -1,7 +1,8 @@
 #pragma once
 // Runs the local development server (zelserverd) for end-to-end tests: a fresh data directory, a
 // configuration written by the test, a free loopback port. The server is stopped with SIGTERM and
-// waited for when the object goes away.
+// waited for when the object goes away, and checked: a clean exit and a log without a sanitizer
+// report.
 
 #include <cstdint>
 #include <string>
@@ -29,7 +30,9 @@ public:
     std::uint16_t port() const { return port_; }
     const std::string& directory() const { return directory_; }
 
-    // Stops the server (SIGTERM) and waits for it; returns its exit status, or -1.
+    // Stops the server (SIGTERM) and waits for it; returns its exit status, or -1. A server that
+    // does not exit with 0 within ten seconds, or whose log holds a sanitizer report, fails the
+    // running test.
     int stop();
 
 private:

@@ -2,6 +2,7 @@
 
 #include <filesystem>
 #include <fstream>
+#include <optional>
 #include <sstream>
 
 #include "auth.h"
@@ -147,13 +148,6 @@ private:
                 return "bad listen address";
             return {};
         }
-        if (key == "workers") {
-            auto n = parseDecimal(value, 64);
-            if (!n || *n == 0)
-                return "workers must be 1 to 64";
-            out_.workers = static_cast<unsigned>(*n);
-            return {};
-        }
         if (key == "max_request_bytes") {
             auto n = parseDecimal(value, UINT32_MAX);
             if (!n || *n < 1024)
@@ -168,11 +162,11 @@ private:
             out_.maxFileBytes = *n;
             return {};
         }
-        if (key == "job_timeout_seconds") {
-            auto n = parseDecimal(value, 86400 * 7);
-            if (!n)
-                return "job_timeout_seconds must be a number of seconds";
-            out_.jobTimeoutSeconds = static_cast<unsigned>(*n);
+        if (auto limit = countSetting(key)) {
+            auto n = parseDecimal(value, limit->max);
+            if (!n || *n < limit->min)
+                return key + " must be " + std::to_string(limit->min) + " to " + std::to_string(limit->max);
+            *limit->target = static_cast<unsigned>(*n);
             return {};
         }
         if (key == "sso_secret") {
@@ -180,6 +174,26 @@ private:
             return {};
         }
         return "unknown server key '" + key + "'";
+    }
+
+    struct CountSetting {
+        unsigned* target;
+        std::uint64_t min;
+        std::uint64_t max;
+    };
+    std::optional<CountSetting> countSetting(const std::string& key)
+    {
+        if (key == "workers")
+            return CountSetting{&out_.workers, 1, 64};
+        if (key == "job_timeout_seconds")
+            return CountSetting{&out_.jobTimeoutSeconds, 0, 86400 * 7};
+        if (key == "max_connections")
+            return CountSetting{&out_.maxConnections, 1, 10000};
+        if (key == "idle_timeout_seconds")
+            return CountSetting{&out_.idleTimeoutSeconds, 0, 86400};
+        if (key == "io_timeout_seconds")
+            return CountSetting{&out_.ioTimeoutSeconds, 1, 3600};
+        return std::nullopt;
     }
 
     static std::string setUser(UserConfig& user, const std::string& key, const std::string& value)

@@ -40,6 +40,9 @@ struct Config {
     std::uint32_t maxRequestBytes = kDefaultMaxRequestBytes;
     std::uint64_t maxFileBytes = UINT32_MAX;
     unsigned jobTimeoutSeconds = 0;                              // 0: no limit
+    unsigned maxConnections = 64;                                // further clients are turned away
+    unsigned idleTimeoutSeconds = 300;                           // between commands; 0: no limit
+    unsigned ioTimeoutSeconds = 30;                              // a stalled frame, transfer or send
     std::string ssoSecret;                                       // empty: single sign-on refused
     std::map<std::string, std::vector<std::string>> roleRights;  // roles the file defines
     std::vector<UserConfig> users;

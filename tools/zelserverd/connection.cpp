@@ -21,7 +21,10 @@ std::string userOf(const Session& session) { return session.principal ? session.
 
 void serveConnection(ServerState& state, int fd)
 {
-    FrameIo io(fd, state.config.maxRequestBytes);
+    const Config& config = state.config;
+    Patience patience{config.idleTimeoutSeconds ? static_cast<int>(config.idleTimeoutSeconds) * 1000 : -1,
+                      static_cast<int>(config.ioTimeoutSeconds) * 1000};
+    FrameIo io(fd, config.maxRequestBytes, patience);
     Session session;
     session.peer = peerAddress(fd);
     std::string payload;

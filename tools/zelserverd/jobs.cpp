@@ -3,10 +3,13 @@
 #include <fcntl.h>
 #include <signal.h>
 #include <spawn.h>
+#include <poll.h>
 #include <sys/stat.h>
+#include <sys/syscall.h>
 #include <sys/wait.h>
 #include <unistd.h>
 
+#include <algorithm>
 #include <cerrno>
 #include <cstring>
 #include <filesystem>
@@ -26,7 +29,7 @@ namespace {
 
 constexpr std::string_view kXmlMarker = " -XML_PARAMETER ";
 constexpr int kDeliveryTimeoutMs = 5000;
-constexpr auto kWaitStep = std::chrono::milliseconds(20);
+constexpr int kWaitStepMs = 20;
 
 std::string persistColumns()
 {
@@ -407,6 +410,36 @@ pid_t JobManager::spawn(Job& job, std::string& error)
     return pid;
 }
 
+// Blocks until the process has ended, killing its group when the job time-out passes first; true
+// when it did. The process is left a zombie (WNOWAIT), so its process group id stays taken and
+// the group can still be killed without hitting a stranger that reused the number.
+bool JobManager::waitForExit(pid_t pid)
+{
+    // A pidfd becomes readable when the process ends: no polling interval stands between a job's
+    // end and its result. Kernels without pidfd_open fall back to looking every kWaitStep.
+    UniqueFd exitFd(static_cast<int>(::syscall(SYS_pidfd_open, pid, 0)));
+    auto deadline = Clock::now() + std::chrono::seconds(config_.jobTimeoutSeconds);
+    bool timedOut = false;
+    for (;;) {
+        siginfo_t info{};
+        int rc = ::waitid(P_PID, static_cast<id_t>(pid), &info, WEXITED | WNOHANG | WNOWAIT);
+        if ((rc == 0 && info.si_pid == pid) || (rc != 0 && errno != EINTR))
+            return timedOut;
+        bool limited = config_.jobTimeoutSeconds && !timedOut;
+        if (limited && Clock::now() >= deadline) {
+            timedOut = true;
+            ::kill(-pid, SIGKILL);
+            continue;
+        }
+        auto left = std::chrono::duration_cast<std::chrono::milliseconds>(deadline - Clock::now()).count() + 1;
+        int waitMs = limited ? static_cast<int>(std::min<long long>(left, INT32_MAX)) : -1;
+        if (!exitFd.valid())
+            waitMs = waitMs < 0 ? kWaitStepMs : std::min(waitMs, kWaitStepMs);
+        pollfd p{exitFd.get(), POLLIN, 0};
+        ::poll(&p, 1, waitMs);
+    }
+}
+
 void JobManager::run(Job& job)
 {
     std::int64_t id = job.record.id;
@@ -435,23 +468,7 @@ void JobManager::run(Job& job)
         if (!job.abortedBy.empty() || stopping_)
             ::kill(-pid, SIGKILL);
     }
-    auto deadline = Clock::now() + std::chrono::seconds(config_.jobTimeoutSeconds);
-    bool timedOut = false;
-    for (;;) {
-        // WNOWAIT leaves the process a zombie, so its process group id stays taken and the
-        // group can be killed below without hitting a stranger that reused the number.
-        siginfo_t info{};
-        int rc = ::waitid(P_PID, static_cast<id_t>(pid), &info, WEXITED | WNOHANG | WNOWAIT);
-        if (rc == 0 && info.si_pid == pid)
-            break;
-        if (rc != 0 && errno != EINTR)
-            break;
-        if (config_.jobTimeoutSeconds && !timedOut && Clock::now() >= deadline) {
-            timedOut = true;
-            ::kill(-pid, SIGKILL);
-        }
-        std::this_thread::sleep_for(kWaitStep);
-    }
+    bool timedOut = waitForExit(pid);
     int status = 0;
     std::string abortedBy;
     bool stopped;
@@ -523,7 +540,7 @@ void JobManager::deliver(const Job& job, const std::string& text)
     auto port = static_cast<std::uint16_t>(std::stoul(job.record.requesterPort));
     UniqueFd fd = connectTo(job.record.requesterHost, port, kDeliveryTimeoutMs, error);
     std::string frame = encodeFrame(text);
-    if (fd.valid() && sendAll(fd.get(), frame.data(), frame.size())) {
+    if (fd.valid() && sendAll(fd.get(), frame.data(), frame.size(), kDeliveryTimeoutMs)) {
         logLine(id, "result sent to " + job.record.requesterHost + ":" + job.record.requesterPort);
         return;
     }

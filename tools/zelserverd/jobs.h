@@ -87,6 +87,7 @@ private:
     std::shared_ptr<Job> nextDue(std::chrono::steady_clock::time_point now);
     void run(Job& job);
     pid_t spawn(Job& job, std::string& error);
+    bool waitForExit(pid_t pid);
     void finish(const std::shared_ptr<Job>& job, std::string_view status, std::int64_t number,
                 const std::string& message);
     void deliver(const Job& job, const std::string& text);

@@ -8,6 +8,7 @@
 #include <sys/socket.h>
 #include <unistd.h>
 
+#include <algorithm>
 #include <cerrno>
 #include <cstring>
 
@@ -168,16 +169,35 @@ bool splitHostPort(std::string_view text, std::string& host, std::uint16_t& port
     return true;
 }
 
-bool sendAll(int fd, const void* data, std::size_t size)
+namespace {
+
+// Waits until `fd` is ready for `events` or `stallMs` passes; false on time-out or error.
+bool waitFor(int fd, short events, int stallMs)
+{
+    for (;;) {
+        pollfd p{fd, events, 0};
+        int rc = ::poll(&p, 1, stallMs);
+        if (rc < 0 && errno == EINTR)
+            continue;
+        return rc == 1;
+    }
+}
+
+constexpr std::size_t kFrameGrowth = 65536;
+
+}  // namespace
+
+// The socket stays blocking for everyone else; these calls never block in the kernel, they wait
+// in poll, where a time-out and a shutdown both reach them.
+bool sendAll(int fd, const void* data, std::size_t size, int stallMs)
 {
     const char* bytes = static_cast<const char*>(data);
     while (size > 0) {
-        ssize_t n = ::send(fd, bytes, size, MSG_NOSIGNAL);
+        ssize_t n = ::send(fd, bytes, size, MSG_NOSIGNAL | MSG_DONTWAIT);
         if (n < 0 && errno == EINTR)
             continue;
         if (n < 0 && (errno == EAGAIN || errno == EWOULDBLOCK)) {
-            pollfd p{fd, POLLOUT, 0};
-            if (::poll(&p, 1, 30000) != 1)
+            if (!waitFor(fd, POLLOUT, stallMs))
                 return false;
             continue;
         }
@@ -189,13 +209,18 @@ bool sendAll(int fd, const void* data, std::size_t size)
     return true;
 }
 
-bool recvExact(int fd, void* data, std::size_t size)
+bool recvExact(int fd, void* data, std::size_t size, int stallMs)
 {
     char* bytes = static_cast<char*>(data);
     while (size > 0) {
-        ssize_t n = ::recv(fd, bytes, size, 0);
+        ssize_t n = ::recv(fd, bytes, size, MSG_DONTWAIT);
         if (n < 0 && errno == EINTR)
             continue;
+        if (n < 0 && (errno == EAGAIN || errno == EWOULDBLOCK)) {
+            if (!waitFor(fd, POLLIN, stallMs))
+                return false;
+            continue;
+        }
         if (n <= 0)
             return false;
         bytes += n;
@@ -207,23 +232,28 @@ bool recvExact(int fd, void* data, std::size_t size)
 FrameStatus FrameIo::readFrame(std::string& payload)
 {
     unsigned char prefix[4];
-    if (!recvExact(fd_, prefix, sizeof prefix))
+    if (!recvExact(fd_, prefix, 1, patience_.idleMs) || !recvExact(fd_, prefix + 1, 3, patience_.stallMs))
         return FrameStatus::Closed;
     std::uint32_t length = decodeLength(prefix);
     if (length > maxFrame_) {
         refusedLength_ = length;
         return FrameStatus::TooLarge;
     }
-    payload.assign(length, '\0');
-    if (length > 0 && !recvExact(fd_, payload.data(), length))
-        return FrameStatus::Closed;
+    payload.clear();
+    while (payload.size() < length) {
+        std::size_t have = payload.size();
+        std::size_t piece = std::min<std::size_t>(length - have, kFrameGrowth);
+        payload.resize(have + piece);
+        if (!recvExact(fd_, payload.data() + have, piece, patience_.stallMs))
+            return FrameStatus::Closed;
+    }
     return FrameStatus::Ok;
 }
 
 bool FrameIo::writeFrame(std::string_view payload)
 {
     std::string frame = encodeFrame(payload);
-    return sendAll(fd_, frame.data(), frame.size());
+    return sendAll(fd_, frame.data(), frame.size(), patience_.stallMs);
 }
 
 }  // namespace zelserverd

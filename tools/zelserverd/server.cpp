@@ -7,10 +7,12 @@
 #include <unistd.h>
 
 #include <cerrno>
+#include <chrono>
 #include <cstring>
 #include <filesystem>
 #include <fstream>
 
+#include "framing.h"
 #include "util.h"
 
 namespace zelserverd {
@@ -135,6 +137,10 @@ void Server::acceptLoop()
         if (fd < 0)
             continue;
         std::lock_guard lock(connectionsMutex_);
+        if (connections_.size() >= state_->config.maxConnections) {
+            turnAway(fd);
+            continue;
+        }
         Connection& connection = connections_.emplace_back();
         connection.fd = fd;
         connection.thread = std::thread([this, &connection] {
@@ -145,6 +151,18 @@ void Server::acceptLoop()
             connection.finished = true;
         });
     }
+}
+
+// One thread per connection is the cost of a client; past the limit a client gets one error frame
+// (into an empty socket buffer, so it never blocks) and the connection is closed.
+void Server::turnAway(int fd)
+{
+    std::string message =
+        "the server has " + std::to_string(state_->config.maxConnections) + " connections, its limit; try again later";
+    std::string frame = encodeFrame(replyPayload(false, message));
+    sendAll(fd, frame.data(), frame.size(), 0);
+    ::close(fd);
+    state_->log.command("-", "-", "CLOSED", 0, message);
 }
 
 void Server::reapFinished()
@@ -176,9 +194,17 @@ void Server::stop()
     listener_.reset();
     std::lock_guard lock(connectionsMutex_);
     // Shutting down only the receiving side wakes a connection waiting for its next command,
-    // while a reply being written still goes out in full.
+    // while a reply being written still goes out in full; a client that does not take it within
+    // the grace period is cut off, so stopping never waits on a client.
     for (Connection& connection : connections_)
         ::shutdown(connection.fd, SHUT_RD);
+    auto deadline = std::chrono::steady_clock::now() + kStopGrace;
+    for (Connection& connection : connections_)
+        while (!connection.finished && std::chrono::steady_clock::now() < deadline)
+            std::this_thread::sleep_for(std::chrono::milliseconds(10));
+    for (Connection& connection : connections_)
+        if (!connection.finished)
+            ::shutdown(connection.fd, SHUT_RDWR);
     for (Connection& connection : connections_) {
         connection.thread.join();
         ::close(connection.fd);

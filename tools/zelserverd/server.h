@@ -2,6 +2,7 @@
 #pragma once
 
 #include <atomic>
+#include <chrono>
 #include <cstdint>
 #include <cstdio>
 #include <list>
@@ -23,6 +24,8 @@ namespace zelserverd {
 
 constexpr std::string_view kServerVersion = "0.1.0";
 constexpr std::string_view kAdminPasswordFile = "admin-password";
+// How long stop() lets connections finish the reply they are writing.
+constexpr std::chrono::seconds kStopGrace{2};
 
 struct ServerOptions {
     std::string dataDir;
@@ -85,6 +88,7 @@ private:
     std::string prepareDefaultConfig();
     void acceptLoop();
     void reapFinished();
+    void turnAway(int fd);
 
     struct Connection {
         int fd;

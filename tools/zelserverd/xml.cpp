@@ -11,6 +11,21 @@ std::string serializeXml(const pugi::xml_document& doc)
     return out.str();
 }
 
+namespace {
+
+// Finds whether a document nests deeper than kMaxXmlDepth; pugixml's traversal keeps its own
+// depth count and does not recurse.
+struct DepthProbe : pugi::xml_tree_walker {
+    bool tooDeep = false;
+    bool for_each(pugi::xml_node& node) override
+    {
+        tooDeep = node.type() == pugi::node_element && depth() >= kMaxXmlDepth;
+        return !tooDeep;
+    }
+};
+
+}  // namespace
+
 std::string parseXml(std::string_view text, pugi::xml_document& doc)
 {
     pugi::xml_parse_result result = doc.load_buffer(text.data(), text.size(), pugi::parse_default, pugi::encoding_utf8);
@@ -18,6 +33,10 @@ std::string parseXml(std::string_view text, pugi::xml_document& doc)
         return std::string("malformed XML: ") + result.description();
     if (!doc.document_element())
         return "XML document has no element";
+    DepthProbe probe;
+    doc.traverse(probe);
+    if (probe.tooDeep)
+        return "XML document is nested deeper than " + std::to_string(kMaxXmlDepth) + " levels";
     return {};
 }
 
@@ -25,12 +44,8 @@ pugi::xml_node findElement(pugi::xml_node node, std::string_view name)
 {
     if (node.type() == pugi::node_element && name == node.name())
         return node;
-    for (pugi::xml_node child = node.first_child(); child; child = child.next_sibling()) {
-        pugi::xml_node found = findElement(child, name);
-        if (found)
-            return found;
-    }
-    return {};
+    // Document order without recursion: whatever the depth, the stack stays flat.
+    return node.find_node([&](pugi::xml_node n) { return n.type() == pugi::node_element && name == n.name(); });
 }
 
 void appendIdentity(pugi::xml_node parent, const Principal& principal)

@@ -1,5 +1,6 @@
 // XML in and out with pugixml. Documents from clients are parsed without DTD processing, so no
-// entity can expand; their size is already bounded by the request frame limit.
+// entity can expand; their size is already bounded by the request frame limit, and their depth by
+// kMaxXmlDepth, so nothing that walks them can run out of stack.
 #pragma once
 
 #include <pugixml.hpp>
@@ -11,9 +12,14 @@
 
 namespace zelserverd {
 
+// The deepest nesting of elements accepted in a client's document; the protocol's own documents
+// are a handful of levels deep.
+constexpr int kMaxXmlDepth = 64;
+
 // Serialised with the declaration and no added whitespace.
 std::string serializeXml(const pugi::xml_document& doc);
-// Parses a value that must be a document; returns an error text or empty.
+// Parses a value that must be a document no deeper than kMaxXmlDepth; returns an error text or
+// empty.
 std::string parseXml(std::string_view text, pugi::xml_document& doc);
 // The first element called `name`: the node itself or any descendant, in document order.
 pugi::xml_node findElement(pugi::xml_node node, std::string_view name);
