@@ -1,7 +1,8 @@
 #!/usr/bin/env bash
-# A short tour of zelserverapi: installs what is missing, builds, starts the local development server
-# zelserverd on a free loopback port with a throw-away data directory, and walks through the library's
-# areas with the command-line client zelctl. Everything it starts or writes is gone when it ends.
+# A short tour of zelserverapi: installs what is missing, builds the two programs it uses, starts the
+# local development server zelserverd on a free loopback port with a throw-away data directory, and
+# walks through the library's areas with the command-line client zelctl, which finds the server and
+# the user in the environment. Everything it starts or writes is gone when it ends.
 set -euo pipefail
 
 root="$(cd "$(dirname "${BASH_SOURCE[0]}")/.." && pwd)"
@@ -9,16 +10,16 @@ bin="$root/build/default/bin"
 
 step() { printf '\n== %s\n' "$*"; }
 show() { printf '$ zelctl'; printf ' %q' "$@"; printf '\n'; zelctl "$@"; }
-zelctl() { "$bin/zelctl" --host 127.0.0.1 --port "$port" --user demo "$@"; }
+zelctl() { "$bin/zelctl" "$@"; }
 
 step "Installing missing packages"
 bash "$root/scripts/install-deps.sh"
 
-step "Building (preset default)"
+step "Building zelserverd and zelctl (preset default)"
 # Presets are read from the working directory.
 cd "$root"
 cmake --preset default > /dev/null
-cmake --build --preset default
+cmake --build --preset default --target zelserverd zelctl
 
 work="$(mktemp -d /tmp/zel-demo-XXXXXX)"
 # shellcheck source=lib/zelserverd.sh
@@ -47,9 +48,11 @@ CONF
 start_zelserverd "$bin/zelserverd" "$work"
 line="$(head -n 1 "$work/stdout")"
 echo "$line (data in $work/data, user demo with a random password)"
+export ZEL_HOST=127.0.0.1 ZEL_PORT="$port" ZEL_USER=demo
 
-step "Who am I?"
-show whoami
+step "Is it up? (ping needs no sign-in), and who am I?"
+show ping
+show whoami --json
 
 step "Creating the repository 'demo' and uploading the example workspaces"
 show repo create demo --description "Example workspaces"
@@ -65,7 +68,7 @@ step "Registering greeting.zlw with a new service"
 show service create greetings --description "Greets people"
 show service register greetings demo greeting.zlw
 
-step "Running a job and waiting for its result (job run)"
+step "Running a job and waiting for its result (job run: the ID comes first, on standard error)"
 show job run zeljob demo greeting.zlw -p NAME=newcomer -p LANGUAGE=norwegian
 
 step "Submitting a job (job submit), then waiting for it"
@@ -87,12 +90,15 @@ show sr get DATA /cities.csv -o "$work/cities-back.csv"
 cmp "$work/cities.csv" "$work/cities-back.csv" && echo "downloaded copy is identical"
 
 step "A user token for the account demo"
-show token set demo "demo-token-$RANDOM$RANDOM" --timeout 3600
+echo '$ zelctl token set demo --expires-after 3600   # the server makes the token'
+token="$(zelctl token set demo --expires-after 3600)"
+echo "$token"
 show token show demo
+show --token "$token" whoami
 
 step "Stopping zelserverd"
 kill -TERM "$server_pid"
 wait "$server_pid" && echo "stopped cleanly"
 server_pid=""
 echo
-echo "Done. Next: the example programs in examples/ (docs/examples.md) and docs/zelserverd.md."
+echo "Done. Next: docs/zelctl.md, the example programs in examples/ (docs/examples.md) and docs/zelserverd.md."

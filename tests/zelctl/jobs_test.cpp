@@ -17,10 +17,12 @@ protected:
 
 TEST_F(Jobs, RunSubmitWaitResultAndLog)
 {
-    const nlohmann::json run = annJson({"job", "run", "zeljob", "demo", "greet.zlw", "-p", "WHO=World"});
-    EXPECT_EQ(run["success"], true);
-    EXPECT_EQ(run["status"], "SUCCESS");
-    EXPECT_GT(run["id"].get<unsigned>(), 0u);
+    const Outcome run = ann({"--json", "job", "run", "zeljob", "demo", "greet.zlw", "-p", "WHO=World"});
+    ASSERT_EQ(run.status, 0) << run.err;
+    EXPECT_EQ(run.json()["success"], true);
+    EXPECT_EQ(run.json()["status"], "SUCCESS");
+    EXPECT_EQ(run.err, "job " + std::to_string(run.json()["job"].get<unsigned>()) + " submitted\n")
+        << "the ID comes first, on standard error";
 
     const Outcome submitted = ann({"job", "submit", "zeljob", "demo", "greet.zlw", "-p", "WHO=World", "-d",
                                    "PRIORITY=50", "--notify", "done=ok"});
@@ -29,7 +31,7 @@ TEST_F(Jobs, RunSubmitWaitResultAndLog)
     ASSERT_FALSE(id.empty());
     const nlohmann::json waited = annJson({"job", "wait", id});
     EXPECT_EQ(waited["status"], "SUCCESS");
-    EXPECT_EQ(std::to_string(waited["id"].get<unsigned>()), id);
+    EXPECT_EQ(std::to_string(waited["job"].get<unsigned>()), id);
     EXPECT_EQ(annJson({"job", "result", id})["status"], "SUCCESS");
     const Outcome log = ann({"job", "log", id});
     EXPECT_EQ(log.status, 0) << log.err;
@@ -41,10 +43,9 @@ TEST_F(Jobs, RunSubmitWaitResultAndLog)
 TEST_F(Jobs, ScheduleAbortAndRefusals)
 {
     const nlohmann::json scheduled = annJson({"job", "schedule", "3600", "zeljob", "demo", "greet.zlw"});
-    const std::string id = std::to_string(scheduled["id"].get<unsigned>());
+    const std::string id = std::to_string(scheduled["job"].get<unsigned>());
     EXPECT_EQ(annJson({"job", "result", id})["status"], "DELAYED");
-    EXPECT_EQ(annJson({"job", "abort", id})["aborted"], true);
-    EXPECT_EQ(annJson({"job", "wait", id})["status"], "ABORTED");
+    EXPECT_EQ(annJson({"job", "abort", id})["done"], "aborted");
 
     const Outcome pair = ann({"job", "submit", "zeljob", "demo", "greet.zlw", "-p", "NOEQUALS"});
     EXPECT_EQ(pair.status, 1);

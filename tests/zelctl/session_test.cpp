@@ -10,27 +10,27 @@ namespace {
 TEST_F(Zelctl, WhoamiAndPropInJsonAndText)
 {
     const nlohmann::json identity = annJson({"whoami"});
-    EXPECT_EQ(identity["id"], "ann");
+    EXPECT_EQ(identity["account"], "ann");
     EXPECT_EQ(identity["authenticated"], true);
     EXPECT_EQ(identity["roles"], nlohmann::json::array({"admin"}));
     const Outcome people = ann({"whoami"});
     EXPECT_EQ(people.status, 0);
-    EXPECT_NE(people.out.find("id: ann\n"), std::string::npos) << people.out;
+    EXPECT_NE(people.out.find("account: ann\n"), std::string::npos) << people.out;
 
     const Outcome prop = ann({"prop", "SERVER_NAME"});
     EXPECT_EQ(prop.status, 0) << prop.err;
     EXPECT_EQ(prop.out, "zelserverd\n") << "the value alone";
-    EXPECT_EQ(annJson({"prop", "USER_NAME"}), (nlohmann::json{{"name", "USER_NAME"}, {"value", "ann"}}));
+    EXPECT_EQ(annJson({"prop", "USER_NAME"}), (nlohmann::json{{"property", "USER_NAME"}, {"value", "ann"}}));
 }
 
 TEST_F(Zelctl, PasswordFromTheEnvironmentAndAClientId)
 {
     Outcome run = raw({"--json", "--user", "bob", "whoami"}, "ZEL_PASSWORD=pw-bob");
     ASSERT_EQ(run.status, 0) << run.err;
-    EXPECT_EQ(run.json()["id"], "bob");
+    EXPECT_EQ(run.json()["account"], "bob");
     run = raw({"--json", "--client-id", "zelctl-test", "--user", "ann", "--password", "pw-ann", "whoami"});
     ASSERT_EQ(run.status, 0) << run.err;
-    EXPECT_EQ(run.json()["id"], "ann");
+    EXPECT_EQ(run.json()["account"], "ann");
 }
 
 // A failure is one line on standard error and status 1: a status from the server keeps its number,

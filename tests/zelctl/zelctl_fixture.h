@@ -62,12 +62,14 @@ protected:
 
     std::string local(const std::string& name) const { return server->directory() + "/" + name; }
 
-    // zelctl with the given arguments, signed in as `user` unless the arguments sign in otherwise;
+    // zelctl with the given arguments, pointed at the server's port unless `toServer` is false;
     // `environment` is put before the command for the child alone.
-    Outcome raw(const std::vector<std::string>& arguments, const std::string& environment = "")
+    Outcome raw(const std::vector<std::string>& arguments, const std::string& environment = "", bool toServer = true)
     {
-        std::string command = "cd " + quoted(server->directory()) + " && " + environment + " " +
-                              quoted(ZEL_TEST_ZELCTL) + " --port " + std::to_string(server->port());
+        std::string command =
+            "cd " + quoted(server->directory()) + " && " + environment + " " + quoted(ZEL_TEST_ZELCTL);
+        if (toServer)
+            command += " --port " + std::to_string(server->port());
         for (const std::string& argument : arguments)
             command += " " + quoted(argument);
         command += " > " + quoted(local("zelctl.out")) + " 2> " + quoted(local("zelctl.err")) + " < /dev/null";

@@ -20,7 +20,7 @@ Outcome collect(Context& context, const char* kind, ZELServerOwned<IZELServerVec
     Outcome failure = context.connection.check(view(*items));
     for (unsigned i = 0; !failure && i < items->entries(); ++i) {
         const Item& item = *items->element(i);
-        rows.push_back({{"name", context.connection.read([&](IZELServerString& out) { item.getName(out); })},
+        rows.push_back({{"item", context.connection.read([&](IZELServerString& out) { item.getName(out); })},
                         {"type", kind},
                         {"title", context.connection.read([&](IZELServerString& out) { item.getTitle(out); })},
                         {"size", static_cast<long long>(item.getFileSize())}});
@@ -57,6 +57,15 @@ Outcome list(Context& context, const std::string& name)
     return failure;
 }
 
+// What a confirmation names: the repository, the item and, for a resource, the resource.
+nlohmann::ordered_json subject(const std::string& repository, const std::string& item, const std::string& resource)
+{
+    nlohmann::ordered_json json = {{"repository", repository}, {"item", item}};
+    if (!resource.empty())
+        json["resource"] = resource;
+    return json;
+}
+
 Outcome get(Context& context, const std::string& name, const std::string& item, const std::string& resource,
             std::string file)
 {
@@ -75,7 +84,9 @@ Outcome get(Context& context, const std::string& name, const std::string& item, 
         return failure;
     if (!received)
         return complaint("nothing received for '" + (resource.empty() ? item : resource) + "'");
-    context.output.confirm({{"item", item}, {"file", file}});
+    nlohmann::ordered_json done = subject(name, item, resource);
+    done["file"] = file;
+    context.output.done("downloaded", done);
     return std::nullopt;
 }
 
@@ -99,7 +110,9 @@ Outcome put(Context& context, const std::string& name, const std::string& item, 
                         : r.addItemResource(c.text(item), c.text(target), c.text(file), &bar);
     if (Outcome failure = c.check(status))
         return failure;
-    context.output.confirm({{"name", target}, {update ? "updated" : "added", true}});
+    nlohmann::ordered_json done = item.empty() ? subject(name, target, "") : subject(name, item, target);
+    done["file"] = file;
+    context.output.done(update ? "updated" : "added", done);
     return std::nullopt;
 }
 
@@ -118,7 +131,7 @@ Outcome remove(Context& context, const std::string& name, const std::string& ite
     const std::string what = resource.empty() ? item : resource;
     if (!removed)
         return complaint("no such item or resource '" + what + "'");
-    context.output.confirm({{"name", what}, {"removed", true}});
+    context.output.done("removed", subject(name, item, resource));
     return std::nullopt;
 }
 
@@ -136,7 +149,7 @@ Outcome resources(Context& context, const std::string& name, const std::string& 
     for (unsigned i = 0; !failure && i < list->entries(); ++i) {
         const IZELServerResource& resource = *list->element(i);
         rows.push_back(
-            {{"name", context.connection.read([&](IZELServerString& out) { resource.getName(out); })},
+            {{"resource", context.connection.read([&](IZELServerString& out) { resource.getName(out); })},
              {"description", context.connection.read([&](IZELServerString& out) { resource.getDescription(out); })},
              {"size", resource.getFileSize()}});
     }
@@ -163,53 +176,53 @@ void addItemCommands(CLI::App& app, Action& chosen)
     auto* item = app.add_subcommand("item", "Items of a repository");
     item->require_subcommand(1);
     auto* listCommand = item->add_subcommand("list", "List the items of a repository");
-    listCommand->add_option("REPOSITORY", a->repository)->required();
+    listCommand->add_option("REPOSITORY", a->repository, "Repository name")->required();
     on(listCommand, chosen, [a](Context& c) { return list(c, a->repository); });
 
     auto* getCommand = item->add_subcommand("get", "Download an item");
-    getCommand->add_option("REPOSITORY", a->repository)->required();
-    getCommand->add_option("ITEM", a->item)->required();
+    getCommand->add_option("REPOSITORY", a->repository, "Repository name")->required();
+    getCommand->add_option("ITEM", a->item, "Item name, e.g. greeting.zlw")->required();
     getCommand->add_option("-o,--output", a->file, "Local file (default: the item's name)");
     on(getCommand, chosen, [a](Context& c) { return get(c, a->repository, a->item, "", a->file); });
 
     auto* putCommand = item->add_subcommand("put", "Upload a file as an item");
-    putCommand->add_option("REPOSITORY", a->repository)->required();
-    putCommand->add_option("FILE", a->file)->required()->check(CLI::ExistingFile);
+    putCommand->add_option("REPOSITORY", a->repository, "Repository name")->required();
+    putCommand->add_option("FILE", a->file, "Local file to upload")->required()->check(CLI::ExistingFile);
     putCommand->add_option("--name", a->name, "Item name (default: the file's name)");
     putCommand->add_flag("--update", a->update, "Replace an existing item");
     on(putCommand, chosen, [a](Context& c) { return put(c, a->repository, "", a->file, a->name, a->update); });
 
     auto* rmCommand = item->add_subcommand("rm", "Remove an item");
-    rmCommand->add_option("REPOSITORY", a->repository)->required();
-    rmCommand->add_option("ITEM", a->item)->required();
+    rmCommand->add_option("REPOSITORY", a->repository, "Repository name")->required();
+    rmCommand->add_option("ITEM", a->item, "Item name, e.g. greeting.zlw")->required();
     on(rmCommand, chosen, [a](Context& c) { return remove(c, a->repository, a->item, ""); });
 
     auto* resource = app.add_subcommand("resource", "Resource files of an item");
     resource->require_subcommand(1);
     auto* rlist = resource->add_subcommand("list", "List the resources of an item");
-    rlist->add_option("REPOSITORY", a->repository)->required();
-    rlist->add_option("ITEM", a->item)->required();
+    rlist->add_option("REPOSITORY", a->repository, "Repository name")->required();
+    rlist->add_option("ITEM", a->item, "Item name, e.g. greeting.zlw")->required();
     on(rlist, chosen, [a](Context& c) { return resources(c, a->repository, a->item); });
 
     auto* rget = resource->add_subcommand("get", "Download a resource");
-    rget->add_option("REPOSITORY", a->repository)->required();
-    rget->add_option("ITEM", a->item)->required();
-    rget->add_option("RESOURCE", a->resource)->required();
+    rget->add_option("REPOSITORY", a->repository, "Repository name")->required();
+    rget->add_option("ITEM", a->item, "Item name, e.g. greeting.zlw")->required();
+    rget->add_option("RESOURCE", a->resource, "Resource name")->required();
     rget->add_option("-o,--output", a->file, "Local file (default: the resource's name)");
     on(rget, chosen, [a](Context& c) { return get(c, a->repository, a->item, a->resource, a->file); });
 
     auto* rput = resource->add_subcommand("put", "Upload a file as a resource of an item");
-    rput->add_option("REPOSITORY", a->repository)->required();
-    rput->add_option("ITEM", a->item)->required();
-    rput->add_option("FILE", a->file)->required()->check(CLI::ExistingFile);
+    rput->add_option("REPOSITORY", a->repository, "Repository name")->required();
+    rput->add_option("ITEM", a->item, "Item name, e.g. greeting.zlw")->required();
+    rput->add_option("FILE", a->file, "Local file to upload")->required()->check(CLI::ExistingFile);
     rput->add_option("--name", a->name, "Resource name (default: the file's name)");
     rput->add_flag("--update", a->update, "Replace an existing resource");
     on(rput, chosen, [a](Context& c) { return put(c, a->repository, a->item, a->file, a->name, a->update); });
 
     auto* rrm = resource->add_subcommand("rm", "Remove a resource");
-    rrm->add_option("REPOSITORY", a->repository)->required();
-    rrm->add_option("ITEM", a->item)->required();
-    rrm->add_option("RESOURCE", a->resource)->required();
+    rrm->add_option("REPOSITORY", a->repository, "Repository name")->required();
+    rrm->add_option("ITEM", a->item, "Item name, e.g. greeting.zlw")->required();
+    rrm->add_option("RESOURCE", a->resource, "Resource name")->required();
     on(rrm, chosen, [a](Context& c) { return remove(c, a->repository, a->item, a->resource); });
 }
 

@@ -5,6 +5,7 @@
 #include <filesystem>
 #include <fstream>
 #include <iostream>
+#include <iterator>
 #include <random>
 #include <thread>
 
@@ -85,46 +86,45 @@ nlohmann::ordered_json describe(Connection& connection, const IZELServerTransfor
     auto text = [&](unsigned (IZELServerTransformationResult::*getter)(IZELServerString&) const) {
         return connection.read([&](IZELServerString& out) { (result.*getter)(out); });
     };
-    nlohmann::ordered_json json = {{"id", id},
-                                   {"status", hasCode ? statusWord(code) : ""},
-                                   {"success", result.isSuccess() != 0},
-                                   {"message", text(&IZELServerTransformationResult::getStatusMessage)},
-                                   {"result", text(&IZELServerTransformationResult::getResult)},
-                                   {"requested", text(&IZELServerTransformationResult::getTimeRequested)},
-                                   {"started", text(&IZELServerTransformationResult::getTimeStarted)},
-                                   {"finished", text(&IZELServerTransformationResult::getTimeFinished)}};
-    return json;
+    return {{"job", id},
+            {"status", hasCode ? statusWord(code) : ""},
+            {"success", result.isSuccess() != 0},
+            {"message", text(&IZELServerTransformationResult::getStatusMessage)},
+            {"result", text(&IZELServerTransformationResult::getResult)},
+            {"requested", text(&IZELServerTransformationResult::getTimeRequested)},
+            {"started", text(&IZELServerTransformationResult::getTimeStarted)},
+            {"finished", text(&IZELServerTransformationResult::getTimeFinished)}};
 }
 
-Outcome submit(Context& context, const RequestArguments& arguments, const unsigned* delay)
+// How an ended job ends zelctl: the job's own failure or abort has an exit status of its own.
+Outcome jobOutcome(unsigned code, bool success)
 {
-    ZELServerOwned<IZELServerTransformationRequest> request;
-    if (Outcome failure = buildRequest(context.connection, arguments, request))
-        return failure;
-    IZELServerTransformationManager* jobs = context.connection.session().getTransformationManager();
-    unsigned id = 0;
-    IZELServerStatus* status = delay ? jobs->scheduleJob(*request, *delay, id) : jobs->submitJob(*request, id);
-    if (Outcome failure = context.connection.check(status))
-        return failure;
-    if (context.output.json())
-        context.output.print({{"id", id}});
-    else
-        context.output.print(std::to_string(id));
+    constexpr unsigned kDeleted = 5, kAborted = 6;
+    if (code == kAborted || code == kDeleted)
+        return Failure{0, "", kExitJobAborted};
+    if (!success)
+        return Failure{0, "", kExitJobFailed};
     return std::nullopt;
 }
 
-Outcome runJob(Context& context, const RequestArguments& arguments)
+Outcome submit(Context& context, const RequestArguments& arguments, const unsigned* delay, unsigned& id)
 {
     ZELServerOwned<IZELServerTransformationRequest> request;
     if (Outcome failure = buildRequest(context.connection, arguments, request))
         return failure;
-    const Result result = newResult(context.connection);
-    if (!result)
-        return complaint("out of memory for the job result");
     IZELServerTransformationManager* jobs = context.connection.session().getTransformationManager();
-    if (Outcome failure = context.connection.check(jobs->transactJob(*request, *result)))
+    return context.connection.check(delay ? jobs->scheduleJob(*request, *delay, id) : jobs->submitJob(*request, id));
+}
+
+Outcome submitAndShow(Context& context, const RequestArguments& arguments, const unsigned* delay)
+{
+    unsigned id = 0;
+    if (Outcome failure = submit(context, arguments, delay, id))
         return failure;
-    context.output.print(describe(context.connection, *result));
+    if (context.output.json())
+        context.output.print({{"job", id}});
+    else
+        context.output.print(std::to_string(id));
     return std::nullopt;
 }
 
@@ -144,10 +144,12 @@ Outcome fetch(Context& context, unsigned id, const Result& result, unsigned& cod
     return std::nullopt;
 }
 
-Outcome wait(Context& context, unsigned id)
+// Asks for the job's result until it has ended, then shows it. `limit` seconds (0: none) bound the wait.
+Outcome wait(Context& context, unsigned id, unsigned limit)
 {
     const bool spin = !context.output.quiet() && stderrIsTerminal();
     const char spinner[] = {'|', '/', '-', '\\'};
+    const auto deadline = std::chrono::steady_clock::now() + std::chrono::seconds(limit);
     const Result result = newResult(context.connection);
     unsigned code = 0;
     for (unsigned turn = 0;; ++turn) {
@@ -155,6 +157,11 @@ Outcome wait(Context& context, unsigned id)
             return failure;
         if (!stillGoing(code))
             break;
+        if (limit != 0 && std::chrono::steady_clock::now() >= deadline)
+            return Failure{0,
+                           "job " + std::to_string(id) + " is still " + statusWord(code) + " after " +
+                               std::to_string(limit) + " seconds",
+                           kExitTimedOut};
         if (spin) {
             std::fprintf(stderr, "\rjob %u %s %c ", id, statusWord(code).c_str(), spinner[turn % 4]);
             std::fflush(stderr);
@@ -164,36 +171,116 @@ Outcome wait(Context& context, unsigned id)
     if (spin)
         std::fputs("\r\033[K", stderr);
     context.output.print(describe(context.connection, *result));
+    return jobOutcome(code, result->isSuccess() != 0);
+}
+
+// Submits and waits. The ID goes to standard error at once, so the job can be aborted from elsewhere
+// while standard output keeps only the result.
+Outcome runJob(Context& context, const RequestArguments& arguments, unsigned limit)
+{
+    unsigned id = 0;
+    if (Outcome failure = submit(context, arguments, nullptr, id))
+        return failure;
+    if (!context.output.quiet())
+        std::cerr << "job " << id << " submitted" << std::endl;
+    return wait(context, id, limit);
+}
+
+// A file of our own in the temporary folder, removed when the holder goes.
+struct ScratchFile {
+    ScratchFile()
+    {
+        std::random_device random;
+        path = std::filesystem::temp_directory_path() / ("zelctl-" + std::to_string(random()) + ".log");
+    }
+    ~ScratchFile()
+    {
+        std::error_code ignored;
+        std::filesystem::remove(path, ignored);
+    }
+    ScratchFile(const ScratchFile&) = delete;
+    ScratchFile& operator=(const ScratchFile&) = delete;
+    std::filesystem::path path;
+};
+
+Outcome download(Context& context, unsigned id, const std::filesystem::path& target)
+{
+    unsigned success = 0;
+    IZELServerTransformationManager* jobs = context.connection.session().getTransformationManager();
+    if (Outcome failure =
+            context.connection.check(jobs->getLogFile(id, context.connection.text(target.string()), success)))
+        return failure;
+    if (!success)
+        return complaint("no log for job " + std::to_string(id));
     return std::nullopt;
 }
 
-// A file name of our own in the temporary folder, for a log that goes to standard output.
-std::filesystem::path scratchFile()
+std::string contentOf(const std::filesystem::path& file)
 {
-    std::random_device random;
-    return std::filesystem::temp_directory_path() / ("zelctl-" + std::to_string(random()) + ".log");
+    std::ifstream in(file, std::ios::binary);
+    return std::string(std::istreambuf_iterator<char>(in), std::istreambuf_iterator<char>());
 }
 
 Outcome log(Context& context, unsigned id, const std::string& file)
 {
-    const std::filesystem::path target = file.empty() ? scratchFile() : std::filesystem::path(file);
-    unsigned success = 0;
-    IZELServerTransformationManager* jobs = context.connection.session().getTransformationManager();
-    Outcome failure = context.connection.check(jobs->getLogFile(id, context.connection.text(target.string()), success));
-    if (!failure && !success)
-        failure = complaint("no log for job " + std::to_string(id));
-    if (file.empty()) {
-        if (!failure) {
-            std::ifstream in(target, std::ios::binary);
-            std::cout << in.rdbuf();
-            std::cout.flush();
-        }
-        std::error_code ignored;
-        std::filesystem::remove(target, ignored);
-    } else if (!failure) {
-        context.output.confirm({{"job", id}, {"log", file}});
+    if (!file.empty()) {
+        if (Outcome failure = download(context, id, file))
+            return failure;
+        context.output.done("downloaded", {{"job", id}, {"file", file}});
+        return std::nullopt;
     }
-    return failure;
+    const ScratchFile scratch;
+    if (Outcome failure = download(context, id, scratch.path))
+        return failure;
+    if (context.output.json()) {
+        context.output.print({{"job", id}, {"log", contentOf(scratch.path)}});
+    } else {
+        std::cout << contentOf(scratch.path);
+        std::cout.flush();
+    }
+    return std::nullopt;
+}
+
+// Prints the log as it grows until the job has ended; ends like `job wait`. The status is asked before
+// the log, so the last log fetched after the job ended is the whole of it.
+Outcome follow(Context& context, unsigned id)
+{
+    if (context.output.json())
+        return Failure{0, "--follow writes the log as text; leave out --json", kExitUsage};
+    const ScratchFile scratch;
+    const Result result = newResult(context.connection);
+    std::size_t shown = 0;
+    for (;;) {
+        unsigned code = 0;
+        if (Outcome failure = fetch(context, id, result, code))
+            return failure;
+        unsigned success = 0;
+        IZELServerTransformationManager* jobs = context.connection.session().getTransformationManager();
+        if (Outcome failure =
+                context.connection.check(jobs->getLogFile(id, context.connection.text(scratch.path.string()), success)))
+            return failure;
+        const std::string text = success ? contentOf(scratch.path) : std::string();
+        if (text.size() > shown) {
+            std::cout << text.substr(shown);
+            std::cout.flush();
+            shown = text.size();
+        }
+        if (!stillGoing(code))
+            return jobOutcome(code, result->isSuccess() != 0);
+        std::this_thread::sleep_for(std::chrono::milliseconds(500));
+    }
+}
+
+struct JobArguments {
+    unsigned id = 0;
+    unsigned limit = 0;
+    std::string file;
+    bool follow = false;
+};
+
+void addIdOption(CLI::App* command, JobArguments& arguments)
+{
+    command->add_option("ID", arguments.id, "Job ID, as job submit printed it")->required();
 }
 
 }  // namespace
@@ -202,16 +289,19 @@ void addJobCommands(CLI::App& app, Action& chosen)
 {
     auto* job = app.add_subcommand("job", "Submit, run and follow jobs");
     job->require_subcommand(1);
+    auto a = std::make_shared<JobArguments>();
+    const char* waitLimit = "Give up after SECONDS (exit status 5); the global --timeout goes before the command";
 
     auto submitArguments = std::make_shared<RequestArguments>();
     auto* submitCommand = job->add_subcommand("submit", "Submit a job; prints its ID");
     addRequestOptions(submitCommand, *submitArguments);
-    on(submitCommand, chosen, [submitArguments](Context& c) { return submit(c, *submitArguments, nullptr); });
+    on(submitCommand, chosen, [submitArguments](Context& c) { return submitAndShow(c, *submitArguments, nullptr); });
 
     auto runArguments = std::make_shared<RequestArguments>();
-    auto* runCommand = job->add_subcommand("run", "Run a job and wait for its result");
+    auto* runCommand = job->add_subcommand("run", "Submit a job and wait for its result; exits with its outcome");
     addRequestOptions(runCommand, *runArguments);
-    on(runCommand, chosen, [runArguments](Context& c) { return runJob(c, *runArguments); });
+    runCommand->add_option("--timeout", a->limit, waitLimit);
+    on(runCommand, chosen, [runArguments, a](Context& c) { return runJob(c, *runArguments, a->limit); });
 
     auto scheduleArguments = std::make_shared<RequestArguments>();
     auto delay = std::make_shared<unsigned>(0);
@@ -219,38 +309,39 @@ void addJobCommands(CLI::App& app, Action& chosen)
     scheduleCommand->add_option("SECONDS", *delay, "Delay in seconds")->required();
     addRequestOptions(scheduleCommand, *scheduleArguments);
     on(scheduleCommand, chosen,
-       [scheduleArguments, delay](Context& c) { return submit(c, *scheduleArguments, delay.get()); });
+       [scheduleArguments, delay](Context& c) { return submitAndShow(c, *scheduleArguments, delay.get()); });
 
-    auto id = std::make_shared<unsigned>(0);
     auto* abortCommand = job->add_subcommand("abort", "Abort a job");
-    abortCommand->add_option("ID", *id, "Job ID")->required();
-    on(abortCommand, chosen, [id](Context& c) -> Outcome {
-        if (Outcome failure = c.connection.check(c.connection.session().getTransformationManager()->abortJob(*id)))
+    addIdOption(abortCommand, *a);
+    on(abortCommand, chosen, [a](Context& c) -> Outcome {
+        if (Outcome failure = c.connection.check(c.connection.session().getTransformationManager()->abortJob(a->id)))
             return failure;
-        c.output.confirm({{"job", *id}, {"aborted", true}});
+        c.output.done("aborted", {{"job", a->id}});
         return std::nullopt;
     });
 
     auto* resultCommand = job->add_subcommand("result", "Show a job's result so far");
-    resultCommand->add_option("ID", *id, "Job ID")->required();
-    on(resultCommand, chosen, [id](Context& c) -> Outcome {
+    addIdOption(resultCommand, *a);
+    on(resultCommand, chosen, [a](Context& c) -> Outcome {
         const Result result = newResult(c.connection);
         unsigned code = 0;
-        if (Outcome failure = fetch(c, *id, result, code))
+        if (Outcome failure = fetch(c, a->id, result, code))
             return failure;
         c.output.print(describe(c.connection, *result));
         return std::nullopt;
     });
 
-    auto* waitCommand = job->add_subcommand("wait", "Wait until a job has finished; shows its result");
-    waitCommand->add_option("ID", *id, "Job ID")->required();
-    on(waitCommand, chosen, [id](Context& c) { return wait(c, *id); });
+    auto* waitCommand = job->add_subcommand("wait", "Wait until a job has ended; exits with its outcome");
+    addIdOption(waitCommand, *a);
+    waitCommand->add_option("--timeout", a->limit, waitLimit);
+    on(waitCommand, chosen, [a](Context& c) { return wait(c, a->id, a->limit); });
 
-    auto logFile = std::make_shared<std::string>();
     auto* logCommand = job->add_subcommand("log", "Fetch a job's log");
-    logCommand->add_option("ID", *id, "Job ID")->required();
-    logCommand->add_option("-o,--output", *logFile, "Write the log to FILE instead of standard output");
-    on(logCommand, chosen, [id, logFile](Context& c) { return log(c, *id, *logFile); });
+    addIdOption(logCommand, *a);
+    auto* output = logCommand->add_option("-o,--output", a->file, "Write the log to FILE instead of standard output");
+    logCommand->add_flag("-f,--follow", a->follow, "Print the log as it grows until the job ends; exits as job wait")
+        ->excludes(output);
+    on(logCommand, chosen, [a](Context& c) { return a->follow ? follow(c, a->id) : log(c, a->id, a->file); });
 }
 
 }  // namespace zelctl

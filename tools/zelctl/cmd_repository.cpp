@@ -22,7 +22,7 @@ namespace {
 
 nlohmann::ordered_json describe(Connection& connection, const IZELServerRepository& repository)
 {
-    return {{"name", connection.read([&](IZELServerString& out) { repository.getName(out); })},
+    return {{"repository", connection.read([&](IZELServerString& out) { repository.getName(out); })},
             {"description", connection.read([&](IZELServerString& out) { repository.getDescription(out); })}};
 }
 
@@ -55,7 +55,7 @@ Outcome create(Context& context, const std::string& name, const std::string& des
     if (Outcome failure = context.connection.check(context.connection.session().getRepositoryManager()->addRepository(
             context.connection.text(name), context.connection.text(description))))
         return failure;
-    context.output.confirm({{"repository", name}, {"created", true}});
+    context.output.done("created", {{"repository", name}});
     return std::nullopt;
 }
 
@@ -68,7 +68,7 @@ Outcome remove(Context& context, const std::string& name)
         return failure;
     if (!removed)
         return complaint("no repository '" + name + "'");
-    context.output.confirm({{"repository", name}, {"removed", true}});
+    context.output.done("deleted", {{"repository", name}});
     return std::nullopt;
 }
 
@@ -83,17 +83,17 @@ void addRepositoryCommands(CLI::App& app, Action& chosen)
     auto name = std::make_shared<std::string>();
     auto description = std::make_shared<std::string>();
     auto* showCommand = repo->add_subcommand("show", "Show a repository");
-    showCommand->add_option("NAME", *name)->required();
+    showCommand->add_option("NAME", *name, "Repository name")->required();
     on(showCommand, chosen, [name](Context& c) { return show(c, *name); });
 
     auto* createCommand = repo->add_subcommand("create", "Create a repository");
-    createCommand->add_option("NAME", *name)->required();
+    createCommand->add_option("NAME", *name, "Repository name")->required();
     createCommand->add_option("--description", *description, "Description");
     on(createCommand, chosen, [name, description](Context& c) { return create(c, *name, *description); });
 
     auto* deleteCommand = repo->add_subcommand("delete", "Delete a repository and its items");
     deleteCommand->alias("rm");
-    deleteCommand->add_option("NAME", *name)->required();
+    deleteCommand->add_option("NAME", *name, "Repository name")->required();
     on(deleteCommand, chosen, [name](Context& c) { return remove(c, *name); });
 }
 

@@ -40,11 +40,11 @@ nlohmann::ordered_json describe(Connection& connection, const IZELServerService&
     auto read = [&](void (IZELServerService::*getter)(IZELServerString&) const) {
         return connection.read([&](IZELServerString& out) { (service.*getter)(out); });
     };
-    return {{"name", read(&IZELServerService::getName)},
-            {"display name", read(&IZELServerService::getDisplayName)},
+    return {{"service", read(&IZELServerService::getName)},
+            {"display_name", read(&IZELServerService::getDisplayName)},
             {"enabled", service.isEnabled() != 0},
-            {"url pattern", read(&IZELServerService::getUrlPattern)},
-            {"workspace registration", service.isWorkspaceRegistrationAllowed() != 0},
+            {"url_pattern", read(&IZELServerService::getUrlPattern)},
+            {"workspace_registration", service.isWorkspaceRegistrationAllowed() != 0},
             {"description", read(&IZELServerService::getDescription)}};
 }
 
@@ -115,7 +115,7 @@ Outcome create(Context& context, const Arguments& a)
     apply(c, a, *service);
     Outcome failure = c.check(c.session().getRepositoryManager()->addService(*service));
     if (!failure)
-        context.output.confirm({{"service", a.name}, {"created", true}});
+        context.output.done("created", {{"service", a.name}});
     return failure;
 }
 
@@ -128,7 +128,7 @@ Outcome update(Context& context, const Arguments& a)
     if (Outcome failure =
             context.connection.check(context.connection.session().getRepositoryManager()->updateService(*service)))
         return failure;
-    context.output.confirm({{"service", a.name}, {"updated", true}});
+    context.output.done("updated", {{"service", a.name}});
     return std::nullopt;
 }
 
@@ -140,7 +140,7 @@ Outcome remove(Context& context, const std::string& name)
         return failure;
     if (!removed)
         return complaint("no service '" + name + "'");
-    context.output.confirm({{"service", name}, {"removed", true}});
+    context.output.done("deleted", {{"service", name}});
     return std::nullopt;
 }
 
@@ -157,16 +157,14 @@ Outcome registration(Context& context, const Arguments& a, bool add)
         return failure;
     if (!add && !deregistered)
         return complaint("'" + a.item + "' is not registered with '" + a.name + "'");
-    context.output.confirm({{"service", a.name},
-                            {"repository", a.repository},
-                            {"item", a.item},
-                            {add ? "registered" : "deregistered", true}});
+    context.output.done(add ? "registered" : "deregistered",
+                        {{"service", a.name}, {"repository", a.repository}, {"item", a.item}});
     return std::nullopt;
 }
 
 void addFieldOptions(CLI::App* command, Arguments& a)
 {
-    command->add_option("NAME", a.name)->required();
+    command->add_option("NAME", a.name, "Service name")->required();
     command->add_option("--display-name", a.displayName, "Display name");
     command->add_option("--description", a.description, "Description");
     command->add_option("--url-pattern", a.urlPattern, "URL pattern");
@@ -188,7 +186,7 @@ void addServiceCommands(CLI::App& app, Action& chosen)
     on(listCommand, chosen, [a](Context& c) { return list(c, a->filter); });
 
     auto* showCommand = service->add_subcommand("show", "Show a service and its registered items");
-    showCommand->add_option("NAME", a->name)->required();
+    showCommand->add_option("NAME", a->name, "Service name")->required();
     on(showCommand, chosen, [a](Context& c) { return show(c, a->name); });
 
     auto* createCommand = service->add_subcommand("create", "Create a service");
@@ -201,15 +199,15 @@ void addServiceCommands(CLI::App& app, Action& chosen)
 
     auto* deleteCommand = service->add_subcommand("delete", "Delete a service");
     deleteCommand->alias("rm");
-    deleteCommand->add_option("NAME", a->name)->required();
+    deleteCommand->add_option("NAME", a->name, "Service name")->required();
     on(deleteCommand, chosen, [a](Context& c) { return remove(c, a->name); });
 
     for (const bool add : {true, false}) {
         auto* command = service->add_subcommand(add ? "register" : "deregister",
                                                 add ? "Register an item with a service" : "Deregister an item");
-        command->add_option("SERVICE", a->name)->required();
-        command->add_option("REPOSITORY", a->repository)->required();
-        command->add_option("ITEM", a->item)->required();
+        command->add_option("SERVICE", a->name, "Service name")->required();
+        command->add_option("REPOSITORY", a->repository, "Repository of the item")->required();
+        command->add_option("ITEM", a->item, "Item name")->required();
         on(command, chosen, [a, add](Context& c) { return registration(c, *a, add); });
     }
 }

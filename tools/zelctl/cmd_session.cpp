@@ -1,4 +1,4 @@
-// whoami and prop: who the server thinks we are, and what it tells about itself.
+// ping, whoami and prop: whether a server is there, who it thinks we are, and what it tells about itself.
 
 #include "commands.h"
 
@@ -19,7 +19,7 @@ Outcome whoami(Context& context)
     nlohmann::ordered_json list = nlohmann::ordered_json::array();
     for (unsigned i = 0; i < roles->entries(); ++i)
         list.push_back(roles->element(i));
-    context.output.print({{"id", context.connection.read([&](IZELServerString& out) { identity->getId(out); })},
+    context.output.print({{"account", context.connection.read([&](IZELServerString& out) { identity->getId(out); })},
                           {"authenticated", identity->isAuthenticated()},
                           {"roles", list}});
     return std::nullopt;
@@ -29,6 +29,13 @@ Outcome whoami(Context& context)
 
 void addSessionCommands(CLI::App& app, Action& chosen)
 {
+    // main reaches the server without signing in for this one command.
+    on(app.add_subcommand("ping", "Tell whether a server answers, without signing in; exits 0 when it does"), chosen,
+       [](Context& context) -> Outcome {
+           const GlobalOptions& options = context.connection.options();
+           context.output.print({{"host", options.host}, {"port", options.port}, {"up", true}});
+           return std::nullopt;
+       });
     on(app.add_subcommand("whoami", "Show the signed-in identity and its roles"), chosen, whoami);
 
     auto* prop = app.add_subcommand("prop", "Show a session property");
@@ -40,7 +47,7 @@ void addSessionCommands(CLI::App& app, Action& chosen)
                 context.connection.session().getSessionProperty(context.connection.text(*name), value)))
             return failure;
         if (context.output.json())
-            context.output.print({{"name", *name}, {"value", value.c_str()}});
+            context.output.print({{"property", *name}, {"value", value.c_str()}});
         else
             context.output.print(std::string(value.c_str()));
         return std::nullopt;

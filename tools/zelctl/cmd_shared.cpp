@@ -1,6 +1,7 @@
 // sr: shared resources, the server's file areas.
 
 #include <filesystem>
+#include <map>
 
 #include "commands.h"
 #include "progress.h"
@@ -78,8 +79,8 @@ Outcome resources(Context& context)
     for (unsigned i = 0; !failure && i < areas->entries(); ++i) {
         const IZELServerMountPoint& area = *areas->element(i);
         rows.push_back(
-            {{"name", context.connection.read([&](IZELServerString& out) { area.getName(out); })},
-             {"display name", context.connection.read([&](IZELServerString& out) { area.getDisplayName(out); })},
+            {{"shared_resource", context.connection.read([&](IZELServerString& out) { area.getName(out); })},
+             {"display_name", context.connection.read([&](IZELServerString& out) { area.getDisplayName(out); })},
              {"description", context.connection.read([&](IZELServerString& out) { area.getDescription(out); })}});
     }
     if (!failure)
@@ -139,10 +140,12 @@ Outcome change(Context& context, const Arguments& a, const std::string& what)
         return failure;
     if (!removed)
         return complaint("no '" + a.path + "' in '" + a.resource + "'");
-    nlohmann::ordered_json json = {{"resource", a.resource}, {"path", a.path}, {"done", what}};
+    nlohmann::ordered_json json = {{"shared_resource", a.resource}, {"path", a.path}};
     if (!a.target.empty())
         json["target"] = a.target;
-    context.output.confirm(json);
+    const std::map<std::string, const char*> verbs = {
+        {"mkdir", "created"}, {"rm", "removed"}, {"cp", "copied"}, {"mv", "moved"}};
+    context.output.done(verbs.at(what), json);
     return std::nullopt;
 }
 
@@ -161,7 +164,7 @@ Outcome download(Context& context, const Arguments& a)
         return failure;
     if (!received)
         return complaint("nothing received for '" + a.path + "'");
-    context.output.confirm({{"resource", a.resource}, {"path", a.path}, {"file", file}});
+    context.output.done("downloaded", {{"shared_resource", a.resource}, {"path", a.path}, {"file", file}});
     return std::nullopt;
 }
 
@@ -174,7 +177,7 @@ Outcome upload(Context& context, const Arguments& a)
     if (Outcome failure =
             context.connection.check(area.get().upload(context.connection.text(a.file), area.path(a.path), &bar)))
         return failure;
-    context.output.confirm({{"resource", a.resource}, {"path", a.path}, {"file", a.file}});
+    context.output.done("uploaded", {{"shared_resource", a.resource}, {"path", a.path}, {"file", a.file}});
     return std::nullopt;
 }
 
@@ -189,41 +192,41 @@ void addSharedResourceCommands(CLI::App& app, Action& chosen)
     on(sr->add_subcommand("list", "List shared resources"), chosen, resources);
 
     auto* ls = sr->add_subcommand("ls", "List a folder");
-    ls->add_option("RESOURCE", a->resource)->required();
+    ls->add_option("RESOURCE", a->resource, "Shared resource name, e.g. DATA")->required();
     ls->add_option("PATH", a->path, "Folder (default: /)");
     on(ls, chosen, [a](Context& c) { return list(c, *a); });
 
     auto* statCommand = sr->add_subcommand("stat", "Show a file or folder");
-    statCommand->add_option("RESOURCE", a->resource)->required();
-    statCommand->add_option("PATH", a->path)->required();
+    statCommand->add_option("RESOURCE", a->resource, "Shared resource name, e.g. DATA")->required();
+    statCommand->add_option("PATH", a->path, "Path in the resource, e.g. /in/data.csv")->required();
     on(statCommand, chosen, [a](Context& c) { return stat(c, *a); });
 
     for (const char* what : {"mkdir", "rm"}) {
         auto* command =
             sr->add_subcommand(what, std::string(what) == "rm" ? "Remove a file or folder" : "Make a folder");
-        command->add_option("RESOURCE", a->resource)->required();
-        command->add_option("PATH", a->path)->required();
+        command->add_option("RESOURCE", a->resource, "Shared resource name, e.g. DATA")->required();
+        command->add_option("PATH", a->path, "Path in the resource, e.g. /in/data.csv")->required();
         on(command, chosen, [a, what](Context& c) { return change(c, *a, what); });
     }
     for (const char* what : {"cp", "mv"}) {
         auto* command = sr->add_subcommand(what, std::string(what) == "cp" ? "Copy within the resource"
                                                                            : "Move within the resource");
-        command->add_option("RESOURCE", a->resource)->required();
-        command->add_option("SOURCE", a->path)->required();
-        command->add_option("TARGET", a->target)->required();
+        command->add_option("RESOURCE", a->resource, "Shared resource name, e.g. DATA")->required();
+        command->add_option("SOURCE", a->path, "Path to copy or move")->required();
+        command->add_option("TARGET", a->target, "Path it goes to")->required();
         on(command, chosen, [a, what](Context& c) { return change(c, *a, what); });
     }
 
     auto* getCommand = sr->add_subcommand("get", "Download a file");
-    getCommand->add_option("RESOURCE", a->resource)->required();
-    getCommand->add_option("PATH", a->path)->required();
+    getCommand->add_option("RESOURCE", a->resource, "Shared resource name, e.g. DATA")->required();
+    getCommand->add_option("PATH", a->path, "Path in the resource, e.g. /in/data.csv")->required();
     getCommand->add_option("-o,--output", a->file, "Local file (default: the file's name)");
     on(getCommand, chosen, [a](Context& c) { return download(c, *a); });
 
     auto* putCommand = sr->add_subcommand("put", "Upload a file");
-    putCommand->add_option("RESOURCE", a->resource)->required();
-    putCommand->add_option("FILE", a->file)->required()->check(CLI::ExistingFile);
-    putCommand->add_option("PATH", a->path)->required();
+    putCommand->add_option("RESOURCE", a->resource, "Shared resource name, e.g. DATA")->required();
+    putCommand->add_option("FILE", a->file, "Local file to upload")->required()->check(CLI::ExistingFile);
+    putCommand->add_option("PATH", a->path, "Path in the resource, e.g. /in/data.csv")->required();
     on(putCommand, chosen, [a](Context& c) { return upload(c, *a); });
 }
 

@@ -33,7 +33,7 @@ Outcome list(Context& context, const std::string& name, const std::string& filte
         auto read = [&](void (IZELServerWorkspaceSummary::*getter)(IZELServerString&) const) {
             return context.connection.read([&](IZELServerString& out) { (s.*getter)(out); });
         };
-        rows.push_back({{"name", read(&IZELServerWorkspaceSummary::getName)},
+        rows.push_back({{"workspace", read(&IZELServerWorkspaceSummary::getName)},
                         {"title", read(&IZELServerWorkspaceSummary::getTitle)},
                         {"enabled", s.isEnabled()},
                         {"description", read(&IZELServerWorkspaceSummary::getDescription)}});
@@ -105,16 +105,16 @@ Outcome show(Context& context, const std::string& name, const std::string& works
         failure = complaint("no workspace '" + workspaceName + "' in '" + name + "'");
     if (!failure) {
         IZELServerWorkspace& w = *workspace;
-        context.output.print({{"name", c.read([&](IZELServerString& out) { w.getName(out); })},
+        context.output.print({{"workspace", c.read([&](IZELServerString& out) { w.getName(out); })},
                               {"title", c.read([&](IZELServerString& out) { w.getTitle(out); })},
                               {"description", c.read([&](IZELServerString& out) { w.getDescription(out); })},
                               {"enabled", w.isEnabled()},
                               {"size", w.getFileSize()},
                               {"parameters", parameters(c, w.getParameters())},
-                              {"source datasets", datasets(c, w.getSourceDatasets())},
-                              {"destination datasets", datasets(c, w.getDestinationDatasets())},
-                              {"source feature types", featureTypes(c, w.getSourceFeatureTypes())},
-                              {"destination feature types", featureTypes(c, w.getDestinationFeatureTypes())}});
+                              {"source_datasets", datasets(c, w.getSourceDatasets())},
+                              {"destination_datasets", datasets(c, w.getDestinationDatasets())},
+                              {"source_feature_types", featureTypes(c, w.getSourceFeatureTypes())},
+                              {"destination_feature_types", featureTypes(c, w.getDestinationFeatureTypes())}});
     }
     return failure;
 }
@@ -130,14 +130,14 @@ void addWorkspaceCommands(CLI::App& app, Action& chosen)
     auto* workspace = app.add_subcommand("workspace", "Workspaces of a repository");
     workspace->require_subcommand(1);
     auto* listCommand = workspace->add_subcommand("list", "List the workspaces of a repository");
-    listCommand->add_option("REPOSITORY", *repository)->required();
+    listCommand->add_option("REPOSITORY", *repository, "Repository name")->required();
     listCommand->add_option("--filter", *filter, "all, enabled or disabled")
         ->check(CLI::IsMember({"all", "enabled", "disabled"}));
     on(listCommand, chosen, [repository, filter](Context& c) { return list(c, *repository, *filter); });
 
     auto* showCommand = workspace->add_subcommand("show", "Show parameters, datasets and feature types");
-    showCommand->add_option("REPOSITORY", *repository)->required();
-    showCommand->add_option("WORKSPACE", *name)->required();
+    showCommand->add_option("REPOSITORY", *repository, "Repository name")->required();
+    showCommand->add_option("WORKSPACE", *name, "Workspace item, e.g. greeting.zlw")->required();
     on(showCommand, chosen, [repository, name](Context& c) { return show(c, *repository, *name); });
 }
 

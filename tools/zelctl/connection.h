@@ -11,10 +11,22 @@
 
 namespace zelctl {
 
-// A failure to report: the status's message number (0 for the client's own complaints) and text.
+// zelctl's exit statuses; docs/zelctl.md lists them.
+enum Exit : int {
+    kExitSuccess = 0,
+    kExitError = 1,
+    kExitUsage = 2,
+    kExitJobFailed = 3,
+    kExitJobAborted = 4,
+    kExitTimedOut = 5,
+};
+
+// A failure to report: the status's message number (0 for the client's own complaints), its text
+// (nothing is printed when it is empty) and the exit status it ends zelctl with.
 struct Failure {
     unsigned number = 0;
     std::string text;
+    int exit = kExitError;
 };
 using Outcome = std::optional<Failure>;
 
@@ -25,6 +37,8 @@ struct GlobalOptions {
     std::string password;
     std::string token;
     std::string clientId;
+    // Seconds for connecting and for each exchange; 0 waits as long as the system lets it.
+    unsigned timeout = 0;
     bool json = false;
     bool quiet = false;
 };
@@ -38,8 +52,11 @@ public:
 
     // Creates the session and signs in with a token when one is given, with user and password otherwise.
     Outcome open();
+    // Connects and runs the handshake without credentials: nothing when a server answered it.
+    Outcome reach();
 
     IZELServerSession& session() { return *session_; }
+    const GlobalOptions& options() const { return options_; }
 
     // Owns an object the session made (null stays null).
     template <typename T>
@@ -47,7 +64,6 @@ public:
     {
         return zelServerOwn(*session_, object);
     }
-    const GlobalOptions& options() const { return options_; }
 
     // A string owned by the connection, released before the session goes.
     IZELServerString& text(const std::string& value = "");
@@ -65,10 +81,15 @@ public:
     }
 
 private:
+    // Connects and runs the handshake, signed in or with empty credentials.
+    Outcome start(bool signIn);
+    Failure describe(const IZELServerStatus& status) const;
+
     GlobalOptions options_;
     // Declared in the order they are made: the strings go first, the session last.
     ZELServerOwned<IZELServerSession> session_;
-    ZELServerOwned<IZELServerConnectionInfo> info_;
+    ZELServerOwned<IZELServerConnectionInfo> made_;
+    std::unique_ptr<IZELServerConnectionInfo> withTimeouts_;
     std::vector<ZELServerOwned<IZELServerString>> strings_;
 };
 

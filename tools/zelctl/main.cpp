@@ -1,6 +1,5 @@
 // zelctl: the command line of the client library.
 
-#include <cstdlib>
 #include <exception>
 #include <iostream>
 
@@ -12,11 +11,37 @@ using namespace zelctl;
 
 int fail(const Failure& failure)
 {
+    if (failure.text.empty())
+        return failure.exit;
     if (failure.number != 0)
         std::cerr << "error " << failure.number << ": " << failure.text << '\n';
     else
         std::cerr << "error: " << failure.text << '\n';
-    return 1;
+    return failure.exit;
+}
+
+// Flags win over the environment; a global flag may stand anywhere on the line, after the command too.
+void addGlobalOptions(CLI::App& app, GlobalOptions& options)
+{
+    app.fallthrough();
+    app.set_version_flag("--version", "zelctl " ZEL_VERSION " (zelserverapi " ZEL_VERSION ")");
+    app.add_option("--host", options.host, "Server host")
+        ->envname("ZEL_HOST")
+        ->capture_default_str()
+        ->multi_option_policy(CLI::MultiOptionPolicy::TakeLast);
+    app.add_option("--port", options.port, "Server port")
+        ->envname("ZEL_PORT")
+        ->capture_default_str()
+        ->multi_option_policy(CLI::MultiOptionPolicy::TakeLast);
+    app.add_option("--user", options.user, "User name")->envname("ZEL_USER");
+    app.add_option("--password", options.password, "Password (better: the environment variable)")
+        ->envname("ZEL_PASSWORD");
+    app.add_option("--token", options.token, "Sign in with this user token instead")->envname("ZEL_TOKEN");
+    app.add_option("--client-id", options.clientId, "Client ID sent with the handshake");
+    app.add_option("--timeout", options.timeout,
+                   "Seconds allowed for connecting and for each exchange (exit status 5 when they run out)");
+    app.add_flag("--json", options.json, "Machine-readable output on standard output");
+    app.add_flag("--quiet", options.quiet, "No progress and no confirmations");
 }
 
 int run(int argc, char** argv)
@@ -25,20 +50,7 @@ int run(int argc, char** argv)
     app.require_subcommand(1);
     app.failure_message(CLI::FailureMessage::help);
     GlobalOptions options;
-    if (const char* password = std::getenv("ZEL_PASSWORD"))
-        options.password = password;
-    app.add_option("--host", options.host, "Server host")
-        ->capture_default_str()
-        ->multi_option_policy(CLI::MultiOptionPolicy::TakeLast);
-    app.add_option("--port", options.port, "Server port")
-        ->capture_default_str()
-        ->multi_option_policy(CLI::MultiOptionPolicy::TakeLast);
-    app.add_option("--user", options.user, "User name");
-    app.add_option("--password", options.password, "Password (better: the environment variable ZEL_PASSWORD)");
-    app.add_option("--token", options.token, "Sign in with this user token");
-    app.add_option("--client-id", options.clientId, "Client ID sent with the handshake");
-    app.add_flag("--json", options.json, "Machine-readable output on standard output");
-    app.add_flag("--quiet", options.quiet, "No progress and no confirmations");
+    addGlobalOptions(app, options);
 
     Action chosen;
     addSessionCommands(app, chosen);
@@ -53,20 +65,20 @@ int run(int argc, char** argv)
     try {
         app.parse(argc, argv);
     } catch (const CLI::ParseError& error) {
-        const int code = app.exit(error);
-        return code == 0 ? 0 : 2;
+        // --help and --version end here too, with status 0.
+        return app.exit(error) == 0 ? kExitSuccess : kExitUsage;
     }
     if (!chosen)
-        return 2;
+        return kExitUsage;
 
     Connection connection(options);
-    if (Outcome failure = connection.open())
+    if (Outcome failure = app.got_subcommand("ping") ? connection.reach() : connection.open())
         return fail(*failure);
     Output output(std::cout, options.json, options.quiet);
     Context context{connection, output};
     if (Outcome failure = chosen(context))
         return fail(*failure);
-    return 0;
+    return kExitSuccess;
 }
 
 }  // namespace
@@ -80,5 +92,5 @@ int main(int argc, char** argv)
     } catch (...) {
         std::cerr << "error: unexpected failure\n";
     }
-    return 1;
+    return kExitError;
 }

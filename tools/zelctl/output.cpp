@@ -35,13 +35,23 @@ void Output::print(const nlohmann::ordered_json& value)
     out_.flush();
 }
 
-void Output::confirm(const nlohmann::ordered_json& value)
+void Output::done(const char* verb, const nlohmann::ordered_json& subject)
 {
-    if (json_ || !quiet_)
-        print(value);
+    if (!json_ && quiet_)
+        return;
+    nlohmann::ordered_json value = {{"done", verb}};
+    value.update(subject);
+    print(value);
 }
 
 namespace {
+
+// A key as people read it: "client address" for client_address.
+std::string label(std::string key)
+{
+    std::replace(key.begin(), key.end(), '_', ' ');
+    return key;
+}
 
 bool isTable(const nlohmann::ordered_json& value)
 {
@@ -60,10 +70,10 @@ void Output::human(const nlohmann::ordered_json& value, const std::string& inden
     } else if (value.is_object()) {
         for (const auto& [key, element] : value.items()) {
             if (isTable(element) || element.is_object()) {
-                out_ << indent << key << ":\n";
+                out_ << indent << label(key) << ":\n";
                 human(element, indent + "  ");
             } else {
-                out_ << indent << key << ": " << plain(element) << '\n';
+                out_ << indent << label(key) << ": " << plain(element) << '\n';
             }
         }
     } else {
@@ -100,7 +110,7 @@ void Output::table(const nlohmann::ordered_json& rows, const std::string& indent
     };
     std::vector<std::string> upper;
     for (const std::string& column : columns) {
-        std::string heading = column;
+        std::string heading = label(column);
         std::transform(heading.begin(), heading.end(), heading.begin(),
                        [](unsigned char c) { return std::toupper(c); });
         upper.push_back(heading);

@@ -1,6 +1,7 @@
 #pragma once
 // Everything zelctl prints on standard output goes through here: the value a command produced,
-// as JSON with --json, as tables and "name: value" lines for people otherwise.
+// as JSON with --json, as tables and "name: value" lines for people otherwise. Keys are snake_case
+// and name one concept each across all commands (docs/zelctl.md lists them).
 
 #include <nlohmann/json.hpp>
 
@@ -15,8 +16,9 @@ public:
 
     // Data a command was asked for: always printed.
     void print(const nlohmann::ordered_json& value);
-    // The confirmation of a change: printed as data with --json, left out with --quiet.
-    void confirm(const nlohmann::ordered_json& value);
+    // The confirmation of a change, one shape for every command: {"done": VERB, what it was done to...}.
+    // Printed as data with --json, left out with --quiet.
+    void done(const char* verb, const nlohmann::ordered_json& subject);
 
     bool json() const { return json_; }
     bool quiet() const { return quiet_; }
