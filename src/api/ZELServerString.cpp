@@ -46,4 +46,9 @@ std::string toStdString(const IZELServerString& text)
     return bytes ? std::string(bytes, text.length()) : std::string();
 }
 
+void copyText(std::string_view text, IZELServerString& out)
+{
+    out.set(text.data(), static_cast<unsigned>(text.size()));
+}
+
 }  // namespace zel

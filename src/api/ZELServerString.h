@@ -42,4 +42,8 @@ private:
 // The bytes of any implementation of the interface, embedded NULs included.
 std::string toStdString(const IZELServerString& text);
 
+// Replaces the content of any implementation of the interface with `text`, embedded NULs included:
+// how every text getter and every text out-value of the library hands its text over.
+void copyText(std::string_view text, IZELServerString& out);
+
 }  // namespace zel

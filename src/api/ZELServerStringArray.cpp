@@ -26,8 +26,7 @@ const char* ZELServerStringArray::element(unsigned index) const
 int ZELServerStringArray::getElement(unsigned index, IZELServerString& out) const
 {
     if (index < elements_.size()) {
-        const std::string& value = elements_[index];
-        out.set(value.data(), static_cast<unsigned>(value.size()));
+        copyText(elements_[index], out);
     }
     return 0;
 }

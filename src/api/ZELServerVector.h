@@ -1,7 +1,8 @@
 #pragma once
-// The owning collection behind every IZELServerVector<I> the library hands out. `I` is the element
-// interface (its destructor must be virtual), `C` the library's concrete element class; the vector
-// owns every pointer it holds and destroys what it still holds when it is destroyed.
+// The collection behind every IZELServerVector<I> the library hands out. `I` is the element
+// interface (its destructor must be virtual), `C` the library's concrete element class. An owning
+// vector destroys what it still holds when it is destroyed; a borrowing one (BorrowedVector) lists
+// objects owned elsewhere and never destroys an element, not even through clearAndDestroy.
 
 #include <type_traits>
 #include <vector>
@@ -23,7 +24,10 @@ I*& vectorNullSlot()
     return slot;
 }
 
-template <class I, class C>
+// Who destroys a vector's elements.
+enum class Elements { kOwned, kBorrowed };
+
+template <class I, class C, Elements kElements = Elements::kOwned>
 class ZELServerVector final : public IZELServerVector<I>, public HeapObject {
     static_assert(std::is_base_of_v<I, C>, "the concrete element class must implement the interface");
     static_assert(std::has_virtual_destructor_v<I>, "elements are destroyed through their interface");
@@ -71,9 +75,13 @@ public:
 
     void clearAndDestroy() override
     {
-        // Counted by entries, not by the pointer: a caller may have stored null through element().
-        while (!items_.empty()) {
-            delete removeLast();
+        if constexpr (kElements == Elements::kBorrowed) {
+            items_.clear();  // the owner's own vector destroys them
+        } else {
+            // Counted by entries, not by the pointer: a caller may have stored null through element().
+            while (!items_.empty()) {
+                delete removeLast();
+            }
         }
     }
 
@@ -83,5 +91,10 @@ public:
 private:
     std::vector<I*> items_;
 };
+
+// A vector of objects that belong to another vector: a workspace's source and destination feature
+// types, which belong to their datasets.
+template <class I>
+using BorrowedVector = ZELServerVector<I, I, Elements::kBorrowed>;
 
 }  // namespace zel

@@ -15,7 +15,6 @@
 #include "api/status.h"
 #include "transport/LocalFile.h"
 #include "transport/checked_command.h"
-#include "transport/xml_text_util.h"
 
 namespace zel {
 namespace {
@@ -62,7 +61,7 @@ CheckedJobInput checkJobInput(const IZELServerString& keyword, const IZELServerS
 }
 
 // The server reads job IDs as signed 32-bit numbers, so the top half of the range goes out negative.
-std::string jobIdText(unsigned jobId) { return formatSigned(static_cast<std::int32_t>(jobId)); }
+std::string jobIdText(unsigned jobId) { return decimalText(static_cast<std::int32_t>(jobId)); }
 
 std::string elementBytes(const IZELServerStringArray& list, unsigned index)
 {
@@ -132,8 +131,7 @@ IZELServerStatus* ZELServerBaseTransformationManager::transact(const IZELServerS
         .run([&resultText](Command& command) {
             IZELServerStatus* status = command.send(kResultPortRequest);
             // Also after a failure: whatever the server answered is the caller's only clue.
-            const std::string body = command.body();
-            resultText.set(body.data(), static_cast<unsigned>(body.size()));
+            copyText(command.body(), resultText);
             return status;
         });
 }
@@ -251,7 +249,7 @@ IZELServerStatus* ZELServerTransformationManager::getJobResultString(unsigned jo
                 const std::string body = command.body();
                 found = body == "null" ? 0 : 1;
                 if (found == 1) {
-                    resultText.set(body.data(), static_cast<unsigned>(body.size()));
+                    copyText(body, resultText);
                 }
                 return nullptr;
             },

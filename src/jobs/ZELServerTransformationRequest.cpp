@@ -15,11 +15,6 @@ namespace {
 // named after it without that extension.
 constexpr std::size_t kExtensionLength = 4;
 
-void write(IZELServerString& out, const std::string& value)
-{
-    out.set(value.data(), static_cast<unsigned>(value.size()));
-}
-
 void setOne(ZELServerStringDict& dict, const IZELServerString& name, const IZELServerString& value)
 {
     dict.insert(toStdString(name), toStdString(value));
@@ -31,7 +26,7 @@ unsigned getOne(const ZELServerStringDict& dict, const IZELServerString& name, I
     if (found == nullptr) {
         return 0;
     }
-    write(value, *found);
+    copyText(*found, value);
     return 1;
 }
 
@@ -88,7 +83,7 @@ void ZELServerTransformationRequest::setKeyword(const IZELServerString& keyword)
     dirty_ = true;
 }
 
-void ZELServerTransformationRequest::getKeyword(IZELServerString& out) const { write(out, keyword_); }
+void ZELServerTransformationRequest::getKeyword(IZELServerString& out) const { copyText(keyword_, out); }
 
 void ZELServerTransformationRequest::setPublishedParameter(const IZELServerString& name, const IZELServerString& value)
 {
@@ -183,7 +178,7 @@ void ZELServerTransformationRequest::getRequestText(IZELServerString& out) const
     if (dirty_ && !compose()) {
         return;
     }
-    write(out, requestText_);
+    copyText(requestText_, out);
 }
 
 bool ZELServerTransformationRequest::compose() const

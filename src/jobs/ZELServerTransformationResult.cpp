@@ -12,11 +12,6 @@ namespace {
 // The well-known properties all come from the text itself, so they carry its prefix.
 std::string fromText(const char* name) { return std::string(1, kResultPropertyPrefix) + name; }
 
-void write(IZELServerString& out, const std::string& value)
-{
-    out.set(value.data(), static_cast<unsigned>(value.size()));
-}
-
 std::string withoutPrefix(const std::string& key)
 {
     const std::size_t start = key.find_first_not_of(kResultPropertyPrefix);
@@ -27,7 +22,7 @@ std::string withoutPrefix(const std::string& key)
 
 // ---- Typed getters of the well-known properties ---------------------------------------------------
 
-void ZELServerTransformationResult::getText(IZELServerString& out) const { write(out, text_); }
+void ZELServerTransformationResult::getText(IZELServerString& out) const { copyText(text_, out); }
 
 unsigned ZELServerTransformationResult::getResult(IZELServerString& out) const
 {
@@ -183,7 +178,7 @@ unsigned ZELServerTransformationResult::getStringProperty(const std::string& nam
     if (!findProperty(name, found)) {
         return 0;
     }
-    write(value, found);
+    copyText(found, value);
     return 1;
 }
 

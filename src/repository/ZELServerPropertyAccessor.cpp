@@ -8,7 +8,6 @@
 #include "api/message_numbers.h"
 #include "api/text_encoding.h"
 #include "transport/attribute_binding.h"
-#include "repository/text_out.h"
 #include "transport/xml_document.h"
 #include "transport/xml_navigation.h"
 

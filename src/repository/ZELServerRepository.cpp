@@ -10,7 +10,6 @@
 #include "api/status.h"
 #include "transport/attribute_binding.h"
 #include "repository/reply_readers.h"
-#include "repository/text_out.h"
 #include "sharedresources/temporary_file.h"
 
 namespace zel {

@@ -7,7 +7,6 @@
 #include "transport/attribute_binding.h"
 #include "repository/repository_checks.h"
 #include "repository/reply_readers.h"
-#include "repository/text_out.h"
 #include "transport/xml_navigation.h"
 
 namespace zel {

@@ -5,7 +5,7 @@
 
 #include "transport/attribute_binding.h"
 #include "repository/repository_checks.h"
-#include "repository/text_out.h"
+#include "api/ZELServerString.h"
 #include "transport/xml_navigation.h"
 
 namespace zel {

@@ -17,7 +17,6 @@
 #include "api/ZELServerVector.h"
 #include "api/heap.h"
 #include "repository/ZELServerPropertyAccessor.h"
-#include "repository/borrowed_vector.h"
 #include "repository/repository_objects.h"
 #include "transport/IZELServerChannel.h"
 #include "transport/xml_element.h"

@@ -3,7 +3,7 @@
 #include <zelserverapi/IZELServerStringArray.h>
 
 #include "transport/attribute_binding.h"
-#include "repository/text_out.h"
+#include "api/ZELServerString.h"
 
 namespace zel {
 namespace {

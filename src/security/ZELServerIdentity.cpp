@@ -3,7 +3,6 @@
 #include "api/ZELServerString.h"
 #include "api/conversions.h"
 #include "api/message_numbers.h"
-#include "repository/text_out.h"
 #include "transport/attribute_binding.h"
 #include "transport/xml_document.h"
 #include "transport/xml_element.h"

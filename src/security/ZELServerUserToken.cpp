@@ -2,7 +2,7 @@
 
 #include <utility>
 
-#include "repository/text_out.h"
+#include "api/ZELServerString.h"
 #include "transport/attribute_binding.h"
 #include "transport/object_reader.h"
 #include "transport/xml_element.h"

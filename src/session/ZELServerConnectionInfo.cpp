@@ -38,8 +38,6 @@ bool readPort(std::string_view text, unsigned short& port)
     return true;
 }
 
-void write(const std::string& text, IZELServerString& out) { out.set(text.data(), static_cast<unsigned>(text.size())); }
-
 }  // namespace
 
 ServerAddress parseServerAddress(std::string_view address)
@@ -102,11 +100,11 @@ void ZELServerConnectionInfo::takeAddress(const IZELServerString& address)
     port_ = parsed.port;
 }
 
-void ZELServerConnectionInfo::getHost(IZELServerString& out) const { write(host_, out); }
-void ZELServerConnectionInfo::getUserName(IZELServerString& out) const { write(userName_, out); }
-void ZELServerConnectionInfo::getPassword(IZELServerString& out) const { write(password_, out); }
-void ZELServerConnectionInfo::getAddress(IZELServerString& out) const { write(address_, out); }
-void ZELServerConnectionInfo::getAuxiliaryText(IZELServerString& out) const { write(auxiliaryText_, out); }
+void ZELServerConnectionInfo::getHost(IZELServerString& out) const { copyText(host_, out); }
+void ZELServerConnectionInfo::getUserName(IZELServerString& out) const { copyText(userName_, out); }
+void ZELServerConnectionInfo::getPassword(IZELServerString& out) const { copyText(password_, out); }
+void ZELServerConnectionInfo::getAddress(IZELServerString& out) const { copyText(address_, out); }
+void ZELServerConnectionInfo::getAuxiliaryText(IZELServerString& out) const { copyText(auxiliaryText_, out); }
 
 bool ZELServerConnectionInfo::getProperty(const IZELServerString& key, IZELServerString& out) const
 {
@@ -116,7 +114,7 @@ bool ZELServerConnectionInfo::getProperty(const IZELServerString& key, IZELServe
     if (value == nullptr) {
         return false;
     }
-    write(*value, out);
+    copyText(*value, out);
     return true;
 }
 

@@ -1,6 +1,6 @@
 #include "sharedresources/ZELServerFileInfo.h"
 
-#include "repository/text_out.h"
+#include "api/ZELServerString.h"
 #include "transport/attribute_binding.h"
 #include "transport/xml_navigation.h"
 

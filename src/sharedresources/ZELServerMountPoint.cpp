@@ -13,7 +13,6 @@
 #include "sharedresources/ZELServerFileInfo.h"
 #include "sharedresources/ZELServerPath.h"
 #include "sharedresources/temporary_file.h"
-#include "repository/text_out.h"
 #include "transport/LocalFile.h"
 #include "transport/attribute_binding.h"
 #include "transport/checked_command.h"

@@ -1,6 +1,6 @@
 #include "sharedresources/ZELServerPath.h"
 
-#include "repository/text_out.h"
+#include "api/ZELServerString.h"
 #include "transport/attribute_binding.h"
 
 namespace zel {

@@ -202,8 +202,7 @@ IZELServerStatus* CheckedCommand::askText(IZELServerString& text)
         if (IZELServerStatus* status = command.send()) {
             return status;
         }
-        const std::string body = command.body();
-        text.set(body.data(), static_cast<unsigned>(body.size()));
+        copyText(command.body(), text);
         return nullptr;
     });
 }

@@ -3,7 +3,7 @@
 #include <vector>
 
 #include "api/conversions.h"
-#include "transport/xml_text_util.h"
+#include "api/text_split.h"
 
 namespace zel::wire {
 

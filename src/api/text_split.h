@@ -1,18 +1,13 @@
 #pragma once
-// Small text helpers of the transport: decimal formatting of 32-bit values and the one-shot
-// splitter that cuts a reply into its status word and body.
+// The one-shot splitter: cuts a text at a set of delimiter characters, the last part taking the
+// rest verbatim. The transport cuts every reply into its status word and body with it.
 
 #include <cstddef>
-#include <cstdint>
 #include <string>
 #include <string_view>
 #include <vector>
 
 namespace zel {
-
-// Decimal text, "-" for negative values.
-std::string formatSigned(std::int32_t value);
-std::string formatUnsigned(std::uint32_t value);
 
 // Appends the parts of `text` to `out` and returns how many it appended. Repeatedly: skip the
 // characters of `delimiters` (any of them; NUL may be one), then take the run up to the next

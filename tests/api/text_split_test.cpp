@@ -1,13 +1,11 @@
-// Reply splitting and number formatting.
+// Reply splitting.
 
-#include <cstdint>
-#include <limits>
 #include <string>
 #include <vector>
 
 #include <gtest/gtest.h>
 
-#include "transport/xml_text_util.h"
+#include "api/text_split.h"
 
 namespace zel {
 namespace {
@@ -60,16 +58,6 @@ TEST(SplitOnce, AppendsToTheList)
     Parts out{"kept"};
     EXPECT_EQ(splitOnce("x y", " ", 0, out), 2u);
     EXPECT_EQ(out, (Parts{"kept", "x", "y"}));
-}
-
-TEST(FormatNumbers, DecimalOf32BitValues)
-{
-    EXPECT_EQ(formatSigned(0), "0");
-    EXPECT_EQ(formatSigned(-1), "-1");
-    EXPECT_EQ(formatSigned(std::numeric_limits<std::int32_t>::min()), "-2147483648");
-    EXPECT_EQ(formatSigned(std::numeric_limits<std::int32_t>::max()), "2147483647");
-    EXPECT_EQ(formatUnsigned(0), "0");
-    EXPECT_EQ(formatUnsigned(std::numeric_limits<std::uint32_t>::max()), "4294967295");
 }
 
 }  // namespace

@@ -1,12 +1,8 @@
-#include "transport/xml_text_util.h"
+#include "api/text_split.h"
 
 #include <algorithm>
 
 namespace zel {
-
-std::string formatSigned(std::int32_t value) { return std::to_string(value); }
-
-std::string formatUnsigned(std::uint32_t value) { return std::to_string(value); }
 
 std::size_t splitOnce(std::string_view text, std::string_view delimiters, std::size_t maxParts,
                       std::vector<std::string>& out)
