@@ -6,7 +6,26 @@
 // kind 1 with status 393639). Authentication kind: 0 user name and password; 1 user token (the
 // properties hold "USER_TOKEN" and not "SSO_AUTH_DATA"); 2 single sign-on (the properties hold
 // "SSO_AUTH_DATA"); 3 other properties. Properties the session reads: "CLIENT_ID",
-// "TRUSTED_HOST_NAMES", "SSO_AUTH_DATA", "USER_TOKEN".
+// "TRUSTED_HOST_NAMES", "SSO_AUTH_DATA", "USER_TOKEN", and the limits below.
+//
+// Limits, read at every IZELServerSession::init (seconds are decimal with at most three decimals;
+// 0 means no limit; a value that does not convert makes init fail with 393617 naming it):
+//   "CONNECT_TIMEOUT"      seconds to wait for the TCP connection (default 30); then 393601
+//   "IO_TIMEOUT"           seconds each single send or receive may wait (default: no limit); then
+//                          393607 or 393608
+//   "RESULT_PORT_TIMEOUT"  seconds a transacted job waits for the server to call back with its
+//                          result (default: no limit); then 393618
+//   "MAX_REPLY_BYTES"      the largest frame accepted from the server, 1 to 4294967295 bytes
+//                          (default 67108864, enough for a list of about 300,000 entries); a larger
+//                          one is refused with 393604 before its content is read
+// A time-out gives the status of the step that waited with getCode() 392012. After a time-out in
+// the middle of an exchange, or a refused frame, the connection is given up: later commands return
+// 393622 until init connects again.
+//
+// The session's createConnectionInfo forms with a user name and password take no properties: a
+// client that signs in that way and wants limits implements this interface itself (for example
+// delegating to the object the session made and adding the properties); init takes any
+// implementation.
 
 #include "IZELServerString.h"
 

@@ -26,7 +26,12 @@
 class IZELServerBaseTransformationManager {
 public:
     // Runs the job and parses the server's result text into `result`; on failure `result` is not
-    // touched. Also fails with 393618 when the server does not deliver the result.
+    // touched. The result comes on a connection the server makes back to a port this client listens
+    // on, and the call waits for it: without the connection property "RESULT_PORT_TIMEOUT" for as
+    // long as the server takes (a server that never calls back blocks the caller); with it, up to
+    // that many seconds, then 393618 with getCode() 392012. 393618 with code 0 when the port cannot
+    // be opened or the call cannot be accepted; the result frame itself is read as any reply
+    // ("IO_TIMEOUT", "MAX_REPLY_BYTES"; 393608 when it breaks off).
     virtual IZELServerStatus* transactJob(const IZELServerTransformationRequest& request,
                                           IZELServerTransformationResult& result) = 0;
     // Runs the job without notifications and writes the result text into `resultText`, on failure too

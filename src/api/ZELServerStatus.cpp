@@ -1,6 +1,5 @@
 #include "api/ZELServerStatus.h"
 
-#include "api/StatusInfo.h"
 #include "api/ZELServerStringArray.h"
 #include "session/home_directories.h"
 #include "session/message_startup.h"
@@ -30,38 +29,26 @@ ZELServerStatus::ZELServerStatus(unsigned code, unsigned number, const std::stri
 // The token's destructor tears the process-wide database down.
 ZELServerStatus::~ZELServerStatus() = default;
 
-void ZELServerStatus::startDatabase()
-{
-    if (databaseStarted_) {
-        return;
-    }
-    databaseStarted_ = true;
-    token_.reset(new MessageDatabaseToken);
-    const std::unique_ptr<StatusInfo> failure(startMessageDatabase(serverLibraryHomeDirectory()));
-    if (failure) {
-        // Dropping the token destroys the database, should another status have left one behind.
-        if (token_) {
-            token_.reset();
-        } else {
-            destroyMessageDatabase();
-        }
-    }
-}
-
 void ZELServerStatus::build(const std::vector<std::string>& parameters)
 {
-    startDatabase();
     message_ = "Could not load resource: " + std::to_string(number_);
-    // Without the library's own catalogue the status keeps the fallback text: looking further (the
-    // fill-in would try the framework home) could give a text from another installation.
+    databaseStarted_ = true;
+    token_.reset(new MessageDatabaseToken);
+    // Without a token nothing would tear the database down again, so it is not started.
     if (!token_) {
         return;
     }
     const ZELServerStringArray parameterList(parameters);
     std::string filled;
-    const std::unique_ptr<StatusInfo> failure(fillInMessage(number_, &parameterList, filled, false));
+    const LibraryMessage result = fillInLibraryMessage(serverLibraryHomeDirectory(), number_, &parameterList, filled);
+    // Without the library's own catalogue the status keeps the fallback text, and dropping the token
+    // destroys a database that another status may have left behind.
+    if (!result.started) {
+        token_.reset();
+        return;
+    }
     // An empty text is no message at all; the number still tells the client what happened.
-    if (!failure && !filled.empty()) {
+    if (result.filled && !filled.empty()) {
         message_ = std::move(filled);
     }
 }

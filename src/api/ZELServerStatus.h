@@ -40,7 +40,6 @@ public:
     bool holdsDatabaseToken() const { return token_ != nullptr; }
 
 private:
-    void startDatabase();
     void build(const std::vector<std::string>& parameters);
 
     std::string message_;

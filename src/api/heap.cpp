@@ -29,11 +29,16 @@ void* allocate(std::size_t bytes) noexcept
     // malloc(0) may legitimately return null, which would read as exhaustion.
     void* block = consumeSimulatedFailure() ? nullptr : std::malloc(bytes == 0 ? 1 : bytes);
     if (block == nullptr) {
-        if (FailureRoutine routine = failureRoutine.load(std::memory_order_acquire)) {
-            routine(kOutOfMemory);
-        }
+        reportExhaustion();
     }
     return block;
+}
+
+void reportExhaustion() noexcept
+{
+    if (FailureRoutine routine = failureRoutine.load(std::memory_order_acquire)) {
+        routine(kOutOfMemory);
+    }
 }
 
 void release(void* block) noexcept { std::free(block); }

@@ -17,6 +17,11 @@ inline constexpr int kOutOfMemory = 12;
 void* allocate(std::size_t bytes) noexcept;
 void release(void* block) noexcept;
 
+// Runs the installed failure routine as for a failed allocation; for memory that ran out outside
+// this heap (a std::bad_alloc caught at the interface). Returns when no routine is installed or the
+// routine returned.
+void reportExhaustion() noexcept;
+
 // Installs a failure routine and returns the previous one (null when none was installed).
 FailureRoutine setFailureRoutine(FailureRoutine routine) noexcept;
 

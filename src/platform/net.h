@@ -1,7 +1,7 @@
 #pragma once
 // Native IPv4 stream sockets behind one small set of functions, so that the transport builds unchanged
 // on Winsock and on BSD sockets. Nothing here sets an option, a time-out or a mode that the caller did
-// not ask for; every call blocks the way the native call does.
+// not ask for; without a time-out every call blocks the way the native call does.
 
 #include <cstddef>
 #include <cstdint>
@@ -33,8 +33,20 @@ void socketLibraryCleanup() noexcept;
 // AF_INET, SOCK_STREAM, protocol 0; kInvalidSocket on failure.
 SocketHandle createStreamSocket() noexcept;
 
-// Blocking connect to address:port (port in host order).
-bool connectIPv4(SocketHandle socket, Ipv4Address address, std::uint16_t port) noexcept;
+enum class WaitOutcome { Ready, TimedOut, Failed };
+
+// Connect to address:port (port in host order). With a time-out (milliseconds, 0 for none) the
+// connect runs non-blocking and is given up after that long; the socket is blocking again afterwards.
+WaitOutcome connectIPv4(SocketHandle socket, Ipv4Address address, std::uint16_t port, std::uint32_t timeoutMs) noexcept;
+
+// Waits until the socket can be read (for a listener: a peer is waiting to be accepted), at most
+// `timeoutMs` milliseconds.
+WaitOutcome waitReadable(SocketHandle socket, std::uint32_t timeoutMs) noexcept;
+
+// Bounds every later send and receive on the socket to `timeoutMs` milliseconds (SO_SNDTIMEO and
+// SO_RCVTIMEO); 0 lets them block without bound. A receive that runs out of time fails with an error
+// that lastSocketError() reports as TimedOut or WouldBlock, depending on the platform.
+bool setIoTimeout(SocketHandle socket, std::uint32_t timeoutMs) noexcept;
 
 // Binds to INADDR_ANY:port (port in host order; 0 lets the system choose).
 bool bindAnyIPv4(SocketHandle socket, std::uint16_t port) noexcept;

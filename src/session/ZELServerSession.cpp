@@ -4,6 +4,7 @@
 
 #include "api/ZELServerString.h"
 #include "api/ZELServerStringArray.h"
+#include "api/exception_guard.h"
 #include "api/message_numbers.h"
 #include "api/status.h"
 #include "session/ZELServerConnectionInfo.h"
@@ -26,6 +27,13 @@ void destroyObject(T** object)
         return;
     delete *object;
     *object = nullptr;
+}
+
+// Every factory operation: null when the object cannot be made, whatever the reason.
+template <class Make>
+auto made(Make make) noexcept
+{
+    return guardValue(static_cast<decltype(make())>(nullptr), make);
 }
 
 }  // namespace
@@ -51,6 +59,12 @@ void ZELServerSession::teardown()
 
 IZELServerStatus* ZELServerSession::init(const IZELServerConnectionInfo& info,
                                          const IZELServerStringArray* handshakeOptions)
+{
+    return guardStatus([&] { return connect(info, handshakeOptions); });
+}
+
+IZELServerStatus* ZELServerSession::connect(const IZELServerConnectionInfo& info,
+                                            const IZELServerStringArray* handshakeOptions)
 {
     teardown();
     connectionKind_ = info.getConnectionKind();
@@ -83,46 +97,57 @@ void ZELServerSession::makeManagers()
 IZELServerConnectionInfo* ZELServerSession::createConnectionInfo(const IZELServerString& address,
                                                                  const IZELServerStringArray& properties)
 {
-    return new ZELServerConnectionInfo(address, properties);
+    return made([&] { return new ZELServerConnectionInfo(address, properties); });
 }
 
 IZELServerConnectionInfo* ZELServerSession::createConnectionInfo(const IZELServerString& address,
                                                                  const IZELServerString& userName,
                                                                  const IZELServerString& password)
 {
-    return new ZELServerConnectionInfo(address, userName, password);
+    return made([&] { return new ZELServerConnectionInfo(address, userName, password); });
 }
 
 IZELServerConnectionInfo* ZELServerSession::createConnectionInfo(const IZELServerString& host, unsigned short port,
                                                                  const IZELServerStringArray& properties)
 {
-    return new ZELServerConnectionInfo(host, port, properties);
+    return made([&] { return new ZELServerConnectionInfo(host, port, properties); });
 }
 
 IZELServerConnectionInfo* ZELServerSession::createConnectionInfo(const IZELServerString& host, unsigned short port,
                                                                  const IZELServerString& userName,
                                                                  const IZELServerString& password)
 {
-    return new ZELServerConnectionInfo(host, port, userName, password);
+    return made([&] { return new ZELServerConnectionInfo(host, port, userName, password); });
 }
 
 void ZELServerSession::destroyConnectionInfo(IZELServerConnectionInfo** info) { destroyObject(info); }
 
-IZELServerStatus* ZELServerSession::disconnect() { return channel_ ? channel_->close() : nullptr; }
+IZELServerStatus* ZELServerSession::disconnect()
+{
+    return guardStatus([&] { return channel_ ? channel_->close() : nullptr; });
+}
 
 IZELServerTransformationManager* ZELServerSession::getTransformationManager() { return transformationManager_.get(); }
 IZELServerRepositoryManager* ZELServerSession::getRepositoryManager() { return repositoryManager_.get(); }
 IZELServerSecurityManager* ZELServerSession::getSecurityManager() { return securityManager_.get(); }
 IZELServerMountPointManager* ZELServerSession::getMountPointManager() { return mountPointManager_.get(); }
 
-IZELServerString* ZELServerSession::createString() { return new ZELServerString(); }
+IZELServerString* ZELServerSession::createString()
+{
+    return made([&] { return new ZELServerString(); });
+}
 void ZELServerSession::destroyString(IZELServerString** string) { destroyObject(string); }
-IZELServerStringArray* ZELServerSession::createStringArray() { return new ZELServerStringArray(); }
+IZELServerStringArray* ZELServerSession::createStringArray()
+{
+    return made([&] { return new ZELServerStringArray(); });
+}
 void ZELServerSession::destroyStringArray(IZELServerStringArray** array) { destroyObject(array); }
 
 IZELServerStatus* ZELServerSession::getSessionProperty(const IZELServerString& name, IZELServerString& value)
 {
-    return CheckedCommand(channel_.get(), "SERVER_SESSION_GET_PROP").add("sessionPropName", name).askText(value);
+    return guardStatus([&] {
+        return CheckedCommand(channel_.get(), "SERVER_SESSION_GET_PROP").add("sessionPropName", name).askText(value);
+    });
 }
 
 IZELServerIdentity* ZELServerSession::getIdentity() { return channel_ ? channel_->getIdentity() : nullptr; }
@@ -136,18 +161,18 @@ IZELServerTransformationRequest* ZELServerSession::createTransformationRequest(c
                                                                                const IZELServerString& repository,
                                                                                const IZELServerWorkspace& workspace)
 {
-    return makeTransformationRequest(keyword, repository, workspace);
+    return made([&] { return makeTransformationRequest(keyword, repository, workspace); });
 }
 IZELServerTransformationRequest* ZELServerSession::createTransformationRequest(const IZELServerString& keyword,
                                                                                const IZELServerString& repository,
                                                                                const IZELServerString& workspace)
 {
-    return makeTransformationRequest(keyword, repository, workspace);
+    return made([&] { return makeTransformationRequest(keyword, repository, workspace); });
 }
 IZELServerTransformationRequest* ZELServerSession::createTransformationRequest(const IZELServerString& keyword,
                                                                                const IZELServerString& workspacePath)
 {
-    return makeTransformationRequest(keyword, workspacePath);
+    return made([&] { return makeTransformationRequest(keyword, workspacePath); });
 }
 void ZELServerSession::destroyTransformationRequest(IZELServerTransformationRequest** request)
 {
@@ -156,117 +181,186 @@ void ZELServerSession::destroyTransformationRequest(IZELServerTransformationRequ
 
 IZELServerTransformationResult* ZELServerSession::createTransformationResult(const IZELServerString& resultText)
 {
-    return makeTransformationResult(resultText);
+    return made([&] { return makeTransformationResult(resultText); });
 }
-IZELServerTransformationResult* ZELServerSession::createTransformationResult() { return makeTransformationResult(); }
+IZELServerTransformationResult* ZELServerSession::createTransformationResult()
+{
+    return made([&] { return makeTransformationResult(); });
+}
 void ZELServerSession::destroyTransformationResult(IZELServerTransformationResult** result) { destroyObject(result); }
 
 IZELServerService* ZELServerSession::createService(const IZELServerString& name, const IZELServerString& displayName,
                                                    const IZELServerString& description,
                                                    const IZELServerString& urlPattern)
 {
-    return makeService(channel_.get(), name, displayName, description, urlPattern);
+    return made([&] { return makeService(channel_.get(), name, displayName, description, urlPattern); });
 }
-IZELServerService* ZELServerSession::createService() { return makeService(channel_.get()); }
+IZELServerService* ZELServerSession::createService()
+{
+    return made([&] { return makeService(channel_.get()); });
+}
 void ZELServerSession::destroyService(IZELServerService** service) { destroyObject(service); }
-IZELServerVector<IZELServerService>* ZELServerSession::createServiceVector() { return makeServiceVector(); }
+IZELServerVector<IZELServerService>* ZELServerSession::createServiceVector()
+{
+    return made([&] { return makeServiceVector(); });
+}
 void ZELServerSession::destroyServiceVector(IZELServerVector<IZELServerService>** vector) { destroyObject(vector); }
 
-IZELServerWorkspace* ZELServerSession::createWorkspace() { return makeWorkspace(channel_.get()); }
+IZELServerWorkspace* ZELServerSession::createWorkspace()
+{
+    return made([&] { return makeWorkspace(channel_.get()); });
+}
 void ZELServerSession::destroyWorkspace(IZELServerWorkspace** workspace) { destroyObject(workspace); }
-IZELServerVector<IZELServerWorkspace>* ZELServerSession::createWorkspaceVector() { return makeWorkspaceVector(); }
+IZELServerVector<IZELServerWorkspace>* ZELServerSession::createWorkspaceVector()
+{
+    return made([&] { return makeWorkspaceVector(); });
+}
 void ZELServerSession::destroyWorkspaceVector(IZELServerVector<IZELServerWorkspace>** vector) { destroyObject(vector); }
 
-IZELServerRepository* ZELServerSession::createRepository() { return makeRepository(channel_.get()); }
+IZELServerRepository* ZELServerSession::createRepository()
+{
+    return made([&] { return makeRepository(channel_.get()); });
+}
 void ZELServerSession::destroyRepository(IZELServerRepository** repository) { destroyObject(repository); }
-IZELServerVector<IZELServerRepository>* ZELServerSession::createRepositoryVector() { return makeRepositoryVector(); }
+IZELServerVector<IZELServerRepository>* ZELServerSession::createRepositoryVector()
+{
+    return made([&] { return makeRepositoryVector(); });
+}
 void ZELServerSession::destroyRepositoryVector(IZELServerVector<IZELServerRepository>** vector)
 {
     destroyObject(vector);
 }
 
-IZELServerWorkspaceSummary* ZELServerSession::createWorkspaceSummary() { return makeWorkspaceSummary(); }
+IZELServerWorkspaceSummary* ZELServerSession::createWorkspaceSummary()
+{
+    return made([&] { return makeWorkspaceSummary(); });
+}
 void ZELServerSession::destroyWorkspaceSummary(IZELServerWorkspaceSummary** summary) { destroyObject(summary); }
 IZELServerVector<IZELServerWorkspaceSummary>* ZELServerSession::createWorkspaceSummaryVector()
 {
-    return makeWorkspaceSummaryVector();
+    return made([&] { return makeWorkspaceSummaryVector(); });
 }
 void ZELServerSession::destroyWorkspaceSummaryVector(IZELServerVector<IZELServerWorkspaceSummary>** vector)
 {
     destroyObject(vector);
 }
 
-IZELServerWorkspaceService* ZELServerSession::createWorkspaceService() { return makeWorkspaceService(channel_.get()); }
+IZELServerWorkspaceService* ZELServerSession::createWorkspaceService()
+{
+    return made([&] { return makeWorkspaceService(channel_.get()); });
+}
 void ZELServerSession::destroyWorkspaceService(IZELServerWorkspaceService** workspaceService)
 {
     destroyObject(workspaceService);
 }
 IZELServerVector<IZELServerWorkspaceService>* ZELServerSession::createWorkspaceServiceVector()
 {
-    return makeWorkspaceServiceVector();
+    return made([&] { return makeWorkspaceServiceVector(); });
 }
 void ZELServerSession::destroyWorkspaceServiceVector(IZELServerVector<IZELServerWorkspaceService>** vector)
 {
     destroyObject(vector);
 }
 
-IZELServerCustomFormat* ZELServerSession::createCustomFormat() { return makeCustomFormat(); }
+IZELServerCustomFormat* ZELServerSession::createCustomFormat()
+{
+    return made([&] { return makeCustomFormat(); });
+}
 void ZELServerSession::destroyCustomFormat(IZELServerCustomFormat** customFormat) { destroyObject(customFormat); }
 IZELServerVector<IZELServerCustomFormat>* ZELServerSession::createCustomFormatVector()
 {
-    return makeCustomFormatVector();
+    return made([&] { return makeCustomFormatVector(); });
 }
 void ZELServerSession::destroyCustomFormatVector(IZELServerVector<IZELServerCustomFormat>** vector)
 {
     destroyObject(vector);
 }
 
-IZELServerCustomTransformer* ZELServerSession::createCustomTransformer() { return makeCustomTransformer(); }
+IZELServerCustomTransformer* ZELServerSession::createCustomTransformer()
+{
+    return made([&] { return makeCustomTransformer(); });
+}
 void ZELServerSession::destroyCustomTransformer(IZELServerCustomTransformer** customTransformer)
 {
     destroyObject(customTransformer);
 }
 IZELServerVector<IZELServerCustomTransformer>* ZELServerSession::createCustomTransformerVector()
 {
-    return makeCustomTransformerVector();
+    return made([&] { return makeCustomTransformerVector(); });
 }
 void ZELServerSession::destroyCustomTransformerVector(IZELServerVector<IZELServerCustomTransformer>** vector)
 {
     destroyObject(vector);
 }
 
-IZELServerResource* ZELServerSession::createResource() { return makeResource(); }
+IZELServerResource* ZELServerSession::createResource()
+{
+    return made([&] { return makeResource(); });
+}
 void ZELServerSession::destroyResource(IZELServerResource** resource) { destroyObject(resource); }
-IZELServerVector<IZELServerResource>* ZELServerSession::createResourceVector() { return makeResourceVector(); }
+IZELServerVector<IZELServerResource>* ZELServerSession::createResourceVector()
+{
+    return made([&] { return makeResourceVector(); });
+}
 void ZELServerSession::destroyResourceVector(IZELServerVector<IZELServerResource>** vector) { destroyObject(vector); }
 
-IZELServerPropertyAccessor* ZELServerSession::createPropertyAccessor() { return makePropertyAccessor(); }
+IZELServerPropertyAccessor* ZELServerSession::createPropertyAccessor()
+{
+    return made([&] { return makePropertyAccessor(); });
+}
 void ZELServerSession::destroyPropertyAccessor(IZELServerPropertyAccessor** accessor) { destroyObject(accessor); }
-IZELServerVector<IZELServerProperty>* ZELServerSession::createPropertyVector() { return makePropertyVector(); }
+IZELServerVector<IZELServerProperty>* ZELServerSession::createPropertyVector()
+{
+    return made([&] { return makePropertyVector(); });
+}
 void ZELServerSession::destroyPropertyVector(IZELServerVector<IZELServerProperty>** vector) { destroyObject(vector); }
 
-IZELServerLogFileInfo* ZELServerSession::createLogFileInfo() { return makeLogFileInfo(); }
+IZELServerLogFileInfo* ZELServerSession::createLogFileInfo()
+{
+    return made([&] { return makeLogFileInfo(); });
+}
 void ZELServerSession::destroyLogFileInfo(IZELServerLogFileInfo** info) { destroyObject(info); }
 
-IZELServerTemplate* ZELServerSession::createTemplate() { return makeTemplate(); }
+IZELServerTemplate* ZELServerSession::createTemplate()
+{
+    return made([&] { return makeTemplate(); });
+}
 void ZELServerSession::destroyTemplate(IZELServerTemplate** templ) { destroyObject(templ); }
-IZELServerVector<IZELServerTemplate>* ZELServerSession::createTemplateVector() { return makeTemplateVector(); }
+IZELServerVector<IZELServerTemplate>* ZELServerSession::createTemplateVector()
+{
+    return made([&] { return makeTemplateVector(); });
+}
 void ZELServerSession::destroyTemplateVector(IZELServerVector<IZELServerTemplate>** vector) { destroyObject(vector); }
 
-IZELServerVector<IZELServerItem>* ZELServerSession::createItemVector() { return makeItemVector(); }
+IZELServerVector<IZELServerItem>* ZELServerSession::createItemVector()
+{
+    return made([&] { return makeItemVector(); });
+}
 void ZELServerSession::destroyItemVector(IZELServerVector<IZELServerItem>** vector) { destroyObject(vector); }
 
-IZELServerMountPoint* ZELServerSession::createMountPoint() { return makeMountPoint(channel_.get()); }
+IZELServerMountPoint* ZELServerSession::createMountPoint()
+{
+    return made([&] { return makeMountPoint(channel_.get()); });
+}
 void ZELServerSession::destroyMountPoint(IZELServerMountPoint** mountPoint) { destroyObject(mountPoint); }
-IZELServerVector<IZELServerMountPoint>* ZELServerSession::createMountPointVector() { return makeMountPointVector(); }
+IZELServerVector<IZELServerMountPoint>* ZELServerSession::createMountPointVector()
+{
+    return made([&] { return makeMountPointVector(); });
+}
 void ZELServerSession::destroyMountPointVector(IZELServerVector<IZELServerMountPoint>** vector)
 {
     destroyObject(vector);
 }
 
-IZELServerFileInfo* ZELServerSession::createFileInfo() { return makeFileInfo(); }
+IZELServerFileInfo* ZELServerSession::createFileInfo()
+{
+    return made([&] { return makeFileInfo(); });
+}
 void ZELServerSession::destroyFileInfo(IZELServerFileInfo** info) { destroyObject(info); }
-IZELServerVector<IZELServerFileInfo>* ZELServerSession::createFileInfoVector() { return makeFileInfoVector(); }
+IZELServerVector<IZELServerFileInfo>* ZELServerSession::createFileInfoVector()
+{
+    return made([&] { return makeFileInfoVector(); });
+}
 void ZELServerSession::destroyFileInfoVector(IZELServerVector<IZELServerFileInfo>** vector) { destroyObject(vector); }
 
 }  // namespace zel

@@ -132,6 +132,7 @@ public:
     void destroyFileInfoVector(IZELServerVector<IZELServerFileInfo>** vector) override;
 
 private:
+    IZELServerStatus* connect(const IZELServerConnectionInfo& info, const IZELServerStringArray* handshakeOptions);
     void teardown();
     void makeManagers();
 

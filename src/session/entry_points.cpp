@@ -3,6 +3,7 @@
 
 #include <zelserverapi/zelserverapi.h>
 
+#include "api/exception_guard.h"
 #include "session/ZELServerSession.h"
 
 extern "C" {
@@ -10,7 +11,8 @@ extern "C" {
 ZEL_API IZELServerSession* ZEL_createServerSession(IZELServerSession** session)
 {
     // The session is allocated through the library heap, whose `new` yields null on exhaustion.
-    IZELServerSession* created = new zel::ZELServerSession();
+    IZELServerSession* created =
+        zel::guardValue<IZELServerSession*>(nullptr, [] { return new zel::ZELServerSession(); });
     if (session != nullptr)
         *session = created;
     return created;

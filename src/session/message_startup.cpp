@@ -70,6 +70,23 @@ bool showMessageNumbers()
     return showNumbers;
 }
 
+LibraryMessage fillInLibraryMessage(const std::string& homeDirectory, unsigned number,
+                                    const IZELServerStringArray* parameters, std::string& output)
+{
+    std::lock_guard<std::mutex> lock(databaseMutex);
+    delete startLocked(homeDirectory);
+    if (database == nullptr) {
+        return {};
+    }
+    const ZELROStringArrayWrapper wrappedParameters(parameters);
+    ZELObsoleteStringImp filled;
+    if (!database->createFilledInMessage(number, &wrappedParameters, &filled, false, showNumbers)) {
+        return {true, false};
+    }
+    output = filled.str();
+    return {true, true};
+}
+
 StatusInfo* fillInMessage(unsigned number, const IZELServerStringArray* parameters, std::string& output,
                           bool callerFlag)
 {

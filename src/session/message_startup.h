@@ -40,6 +40,18 @@ bool showMessageNumbers();
 StatusInfo* fillInMessage(unsigned number, const IZELServerStringArray* parameters, std::string& output,
                           bool callerFlag);
 
+struct LibraryMessage {
+    bool started = false;  // the database exists (it was there, or it was started from the home)
+    bool filled = false;   // `output` holds the message
+};
+
+// What a status object does to get its text, as one step under the database's lock: start the
+// database from the library's `homeDirectory` when it is absent, then fill in message `number`. A
+// teardown on another thread comes before or after, never in between, and the text never comes from
+// the framework home, whose search would also set the environment from whatever thread got there.
+LibraryMessage fillInLibraryMessage(const std::string& homeDirectory, unsigned number,
+                                    const IZELServerStringArray* parameters, std::string& output);
+
 // Held by a status object that started the database: destroying the token destroys the database,
 // so the database never outlives the last status that used it.
 class MessageDatabaseToken : public HeapObject {

@@ -35,10 +35,10 @@ std::unique_ptr<char[]> copyText(const char* text)
 
 }  // namespace
 
-TcpSocket::TcpSocket(const char* host, std::uint16_t remotePort)
+TcpSocket::TcpSocket(const char* host, std::uint16_t remotePort, std::uint32_t connectTimeoutMs)
 {
     countLibraryUser();
-    connectTo(host, remotePort);
+    connectTo(host, remotePort, connectTimeoutMs);
 }
 
 TcpSocket::TcpSocket(std::uint16_t& localPort)
@@ -87,7 +87,7 @@ void TcpSocket::shutdownAndClose(platform::SocketHandle& socket)
     socket = platform::kInvalidSocket;
 }
 
-void TcpSocket::connectTo(const char* name, std::uint16_t remotePort)
+void TcpSocket::connectTo(const char* name, std::uint16_t remotePort, std::uint32_t timeoutMs)
 {
     platform::SocketHandle socket = platform::createStreamSocket();
     if (!isValid(socket)) {
@@ -100,10 +100,11 @@ void TcpSocket::connectTo(const char* name, std::uint16_t remotePort)
         errorCode = SOCK_HOST_UNKNOWN;
         return;
     }
-    // No time-out and no option of any kind: the server's replies may take as long as its jobs do.
-    if (!platform::connectIPv4(socket, addresses.front(), remotePort)) {
+    // No option of any kind unless asked for: the server's replies may take as long as its jobs do.
+    const platform::WaitOutcome connected = platform::connectIPv4(socket, addresses.front(), remotePort, timeoutMs);
+    if (connected != platform::WaitOutcome::Ready) {
         shutdownAndClose(socket);
-        errorCode = SOCK_CONNECT_FAILED;
+        errorCode = connected == platform::WaitOutcome::TimedOut ? SOCK_TIMED_OUT : SOCK_CONNECT_FAILED;
         return;
     }
     mainSocket = socket;
@@ -162,15 +163,7 @@ std::int32_t TcpSocket::receiveExact(void* buffer, std::int32_t count, std::int3
             return SOCK_RECEIVE_FAILED;
         }
         if (got < 0) {
-            switch (platform::lastSocketError()) {
-            case platform::SocketError::TimedOut:
-                return SOCK_TIMED_OUT;
-            case platform::SocketError::WouldBlock:
-                return SOCK_WOULD_BLOCK;
-            case platform::SocketError::Other:
-                return SOCK_RECEIVE_FAILED;
-            }
-            return SOCK_RECEIVE_FAILED;
+            return failureCode(SOCK_RECEIVE_FAILED);
         }
         total += static_cast<std::int32_t>(got);
         if (received != nullptr) {
@@ -182,21 +175,53 @@ std::int32_t TcpSocket::receiveExact(void* buffer, std::int32_t count, std::int3
     }
 }
 
+// With an I/O time-out the socket stays blocking, so "would block" can only mean that the time ran
+// out (BSD sockets say EAGAIN where Winsock says WSAETIMEDOUT).
+std::int32_t TcpSocket::failureCode(std::int32_t plainFailure) const
+{
+    switch (platform::lastSocketError()) {
+    case platform::SocketError::TimedOut:
+        return SOCK_TIMED_OUT;
+    case platform::SocketError::WouldBlock:
+        return ioTimeoutMs != 0 ? SOCK_TIMED_OUT : SOCK_WOULD_BLOCK;
+    case platform::SocketError::Other:
+        break;
+    }
+    return plainFailure;
+}
+
 // Callers hand over whole frames or whole file chunks; a short send is reported rather than resumed,
-// because the far side cannot resynchronise on a partly written frame anyway.
+// because the far side cannot resynchronise on a partly written frame anyway. A blocking send comes
+// back short only when the time-out cut it off.
 std::int32_t TcpSocket::sendBuffer(const void* buffer, std::size_t count)
 {
     const long sent = platform::sendSome(ioSocket(), buffer, count);
-    if (sent < 0 || static_cast<std::size_t>(sent) != count) {
-        return SOCK_SEND_FAILED;
+    if (sent < 0) {
+        const std::int32_t code = failureCode(SOCK_SEND_FAILED);
+        return code == SOCK_WOULD_BLOCK ? SOCK_SEND_FAILED : code;
+    }
+    if (static_cast<std::size_t>(sent) != count) {
+        return ioTimeoutMs != 0 ? SOCK_TIMED_OUT : SOCK_SEND_FAILED;
     }
     return 0;
 }
 
-std::int32_t TcpSocket::acceptPeer()
+bool TcpSocket::setIoTimeout(std::uint32_t timeoutMs)
+{
+    ioTimeoutMs = timeoutMs;
+    return platform::setIoTimeout(ioSocket(), timeoutMs);
+}
+
+std::int32_t TcpSocket::acceptPeer(std::uint32_t timeoutMs)
 {
     if (isValid(acceptedSocket)) {
         shutdownAndClose(acceptedSocket);
+    }
+    if (timeoutMs != 0) {
+        const platform::WaitOutcome waited = platform::waitReadable(mainSocket, timeoutMs);
+        if (waited != platform::WaitOutcome::Ready) {
+            return waited == platform::WaitOutcome::TimedOut ? SOCK_TIMED_OUT : SOCK_ACCEPT_FAILED;
+        }
     }
     platform::Ipv4Address peer = 0;
     const platform::SocketHandle accepted = platform::acceptIPv4(mainSocket, peer);
@@ -204,6 +229,9 @@ std::int32_t TcpSocket::acceptPeer()
         return SOCK_ACCEPT_FAILED;
     }
     acceptedSocket = accepted;
+    if (ioTimeoutMs != 0) {
+        platform::setIoTimeout(acceptedSocket, ioTimeoutMs);
+    }
     if (!peerAddress) {
         peerAddress = std::make_unique<char[]>(kPeerAddressSize);
     }

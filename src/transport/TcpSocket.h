@@ -29,9 +29,10 @@ inline constexpr std::int32_t SOCK_WOULD_BLOCK = -1;
 
 class TcpSocket {
 public:
-    // Client: connects to host:remotePort (a name or a dotted address). `errorCode` is 0 on success,
-    // else SOCK_CREATE_FAILED, SOCK_HOST_UNKNOWN or SOCK_CONNECT_FAILED.
-    TcpSocket(const char* host, std::uint16_t remotePort);
+    // Client: connects to host:remotePort (a name or a dotted address), giving up after
+    // `connectTimeoutMs` milliseconds (0: as long as the system lets it). `errorCode` is 0 on
+    // success, else SOCK_CREATE_FAILED, SOCK_HOST_UNKNOWN, SOCK_CONNECT_FAILED or SOCK_TIMED_OUT.
+    TcpSocket(const char* host, std::uint16_t remotePort, std::uint32_t connectTimeoutMs = 0);
 
     // Listener: binds to any address on `localPort` and listens; with port 0 the system chooses and the
     // chosen port is written back. `errorCode` is 0, or SOCK_CREATE_FAILED / SOCK_BIND_FAILED (not
@@ -52,11 +53,18 @@ public:
     // so a failure leaves the partial count there and the bytes in the buffer.
     std::int32_t receiveExact(void* buffer, std::int32_t count, std::int32_t* received = nullptr);
 
-    // One send of the whole buffer: 0, or SOCK_SEND_FAILED when the system took fewer bytes.
+    // One send of the whole buffer: 0, SOCK_SEND_FAILED when the system took fewer bytes, or
+    // SOCK_TIMED_OUT when the I/O time-out ran out first.
     std::int32_t sendBuffer(const void* buffer, std::size_t count);
 
-    // Accepts the next peer on a listener, closing the previous one first. 0 or SOCK_ACCEPT_FAILED.
-    std::int32_t acceptPeer();
+    // Bounds each later send and receive (on this socket and on peers it accepts) to `timeoutMs`
+    // milliseconds; 0 removes the bound. A receive or send that runs out of time returns
+    // SOCK_TIMED_OUT. False when the system refused the setting.
+    bool setIoTimeout(std::uint32_t timeoutMs);
+
+    // Accepts the next peer on a listener, closing the previous one first, waiting at most
+    // `timeoutMs` milliseconds (0: without bound). 0, SOCK_ACCEPT_FAILED or SOCK_TIMED_OUT.
+    std::int32_t acceptPeer(std::uint32_t timeoutMs = 0);
 
     // Whether the connection still looks usable: reads one byte without waiting. Idle and open, or a
     // byte waiting (which is consumed), counts as usable; closed or failed does not.
@@ -89,7 +97,8 @@ private:
 
     void countLibraryUser();
     void releaseLibraryUser();
-    void connectTo(const char* name, std::uint16_t remotePort);
+    void connectTo(const char* name, std::uint16_t remotePort, std::uint32_t timeoutMs);
+    std::int32_t failureCode(std::int32_t plainFailure) const;
     void startListening(std::uint16_t& localPort);
     platform::SocketHandle ioSocket() const;
     static void shutdownAndClose(platform::SocketHandle& socket);
@@ -97,6 +106,7 @@ private:
     platform::SocketHandle mainSocket = platform::kInvalidSocket;
     platform::SocketHandle acceptedSocket = platform::kInvalidSocket;
     std::uint16_t port = 0;
+    std::uint32_t ioTimeoutMs = 0;
     std::unique_ptr<char[]> hostName;
     std::unique_ptr<char[]> peerAddress;
 };

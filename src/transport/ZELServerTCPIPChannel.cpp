@@ -25,6 +25,7 @@
 #include "transport/TcpSocket.h"
 #include "transport/ZELServerResponse.h"
 #include "transport/ZELServerTCPIPRequest.h"
+#include "transport/frame_reader.h"
 #include "transport/wire_format.h"
 
 namespace zel {
@@ -35,10 +36,6 @@ constexpr std::string_view kInvalidArguments = "Invalid arguments to method.";
 constexpr std::string_view kUnknownRequestType = "Unknown request type";
 constexpr std::string_view kInvalidDirection = "Invalid transfer direction";
 constexpr const char* kResultPortName = "requesterResultPort";
-
-// Reply frames are read in pieces of this size, so that the buffer grows with the bytes that
-// actually arrive: a length prefix that announces gigabytes costs nothing until they come.
-constexpr std::size_t kFramePiece = 1u << 20;
 
 // Room for a host name of up to 295 characters and its terminator.
 constexpr std::size_t kHostNameCapacity = 296;
@@ -63,60 +60,23 @@ IZELServerStatus* receiveFailed(std::int32_t code)
     return makeStatusWithCode(static_cast<unsigned>(code), msg::kReceiveFailed, decimalText(code));
 }
 
+// The steps whose message takes no parameter carry the socket code only as the secondary code.
+IZELServerStatus* socketFailure(unsigned number, std::int32_t code)
+{
+    return makeStatusWithCode(static_cast<unsigned>(code), number);
+}
+
+IZELServerStatus* frameTooLarge(const wire::FrameReader& reader)
+{
+    return makeStatus(msg::kUnexpectedReply, "a frame of " + decimalText(reader.announced()) +
+                                                 " bytes, more than the " + decimalText(reader.limit()) +
+                                                 " bytes that MAX_REPLY_BYTES allows");
+}
+
 IZELServerStatus* serverErrorStatus(std::string_view body)
 {
     const wire::ServerError error = wire::classifyServerError(body);
     return makeStatusWithCode(static_cast<unsigned>(error.kind), msg::kServerError, error.message);
-}
-
-IZELServerStatus* sendBytes(TcpSocket& socket, std::string_view bytes)
-{
-    const std::int32_t code = socket.sendBuffer(bytes.data(), bytes.size());
-    return code == 0 ? nullptr : sendFailed(code);
-}
-
-IZELServerStatus* sendFrame(TcpSocket& socket, std::string_view payload)
-{
-    const std::optional<std::string> frame = wire::encodeFrame(payload);
-    return frame ? sendBytes(socket, *frame) : sendFailed(SOCK_SEND_FAILED);
-}
-
-IZELServerStatus* receiveFrame(TcpSocket& socket, std::string& payload)
-{
-    unsigned char prefix[wire::kLengthPrefixSize];
-    if (const std::int32_t code = socket.receiveExact(prefix, static_cast<std::int32_t>(sizeof prefix))) {
-        return receiveFailed(code);
-    }
-    const std::uint32_t length = wire::decodeLength(prefix);
-    payload.clear();
-    while (payload.size() < length) {
-        const std::size_t offset = payload.size();
-        const std::size_t piece = std::min<std::size_t>(length - offset, kFramePiece);
-        payload.resize(offset + piece);
-        if (const std::int32_t code = socket.receiveExact(payload.data() + offset, static_cast<std::int32_t>(piece))) {
-            return receiveFailed(code);
-        }
-    }
-    return nullptr;
-}
-
-// The acknowledgement the server gives before a file header and before file content.
-IZELServerStatus* receiveAcknowledgement(TcpSocket& socket)
-{
-    std::string payload;
-    if (IZELServerStatus* status = receiveFrame(socket, payload)) {
-        return status;
-    }
-    const wire::AckReading ack = wire::readAcknowledgement(payload);
-    switch (ack.outcome) {
-    case wire::AckOutcome::Ready:
-        return nullptr;
-    case wire::AckOutcome::NotTwoParts:
-        return makeStatus(msg::kReplyWithoutBody, payload);
-    case wire::AckOutcome::Refused:
-        break;
-    }
-    return serverErrorStatus(ack.body);
 }
 
 IZELServerStatus* classifyReply(const std::string& reply, IZELServerResponse& response)
@@ -206,6 +166,83 @@ struct ZELServerTCPIPChannel::Transfer {
 
 ZELServerTCPIPChannel::ZELServerTCPIPChannel() = default;
 
+// ---- Frames on a socket ---------------------------------------------------------------------------
+
+// A time-out or a refused frame leaves the server in the middle of a message; what it sends later
+// would be read as the answer to the next command, so the connection is given up (the next open
+// connects afresh).
+void ZELServerTCPIPChannel::dropIfOutOfStep(TcpSocket& socket, bool outOfStep)
+{
+    if (outOfStep && &socket == socket_.get()) {
+        socket_.reset();
+    }
+}
+
+IZELServerStatus* ZELServerTCPIPChannel::sendBytes(TcpSocket& socket, std::string_view bytes)
+{
+    const std::int32_t code = socket.sendBuffer(bytes.data(), bytes.size());
+    if (code == 0) {
+        return nullptr;
+    }
+    IZELServerStatus* status = sendFailed(code);
+    dropIfOutOfStep(socket, code == SOCK_TIMED_OUT);
+    return status;
+}
+
+IZELServerStatus* ZELServerTCPIPChannel::sendFrame(TcpSocket& socket, std::string_view payload)
+{
+    const std::optional<std::string> frame = wire::encodeFrame(payload);
+    return frame ? sendBytes(socket, *frame) : sendFailed(SOCK_SEND_FAILED);
+}
+
+IZELServerStatus* ZELServerTCPIPChannel::receiveBytes(TcpSocket& socket, char* buffer, std::size_t count)
+{
+    const std::int32_t code = socket.receiveExact(buffer, static_cast<std::int32_t>(count));
+    if (code == 0) {
+        return nullptr;
+    }
+    IZELServerStatus* status = receiveFailed(code);
+    dropIfOutOfStep(socket, code == SOCK_TIMED_OUT);
+    return status;
+}
+
+IZELServerStatus* ZELServerTCPIPChannel::receiveFrame(TcpSocket& socket, std::string& payload)
+{
+    wire::FrameReader reader(limits_.maxReplyBytes);
+    while (const std::size_t wanted = reader.wanted()) {
+        if (IZELServerStatus* status = receiveBytes(socket, reader.space(), wanted)) {
+            return status;
+        }
+        reader.commit(wanted);
+    }
+    if (reader.state() == wire::FrameReader::State::TooLarge) {
+        IZELServerStatus* status = frameTooLarge(reader);
+        dropIfOutOfStep(socket, true);
+        return status;
+    }
+    payload = reader.takePayload();
+    return nullptr;
+}
+
+// The acknowledgement the server gives before a file header and before file content.
+IZELServerStatus* ZELServerTCPIPChannel::receiveAcknowledgement(TcpSocket& socket)
+{
+    std::string payload;
+    if (IZELServerStatus* status = receiveFrame(socket, payload)) {
+        return status;
+    }
+    const wire::AckReading ack = wire::readAcknowledgement(payload);
+    switch (ack.outcome) {
+    case wire::AckOutcome::Ready:
+        return nullptr;
+    case wire::AckOutcome::NotTwoParts:
+        return makeStatus(msg::kReplyWithoutBody, payload);
+    case wire::AckOutcome::Refused:
+        break;
+    }
+    return serverErrorStatus(ack.body);
+}
+
 ZELServerTCPIPChannel::~ZELServerTCPIPChannel()
 {
     socket_.reset();
@@ -217,6 +254,11 @@ ZELServerTCPIPChannel::~ZELServerTCPIPChannel()
 IZELServerStatus* ZELServerTCPIPChannel::open(const IZELServerConnectionInfo& info,
                                               const IZELServerStringArray* options)
 {
+    ConnectionLimits limits;
+    if (IZELServerStatus* status = readConnectionLimits(info, limits)) {
+        return status;
+    }
+    limits_ = limits;
     takeProperties(info);
     if (options != nullptr && options->entries() > 1) {
         takeOptions(*options);
@@ -263,15 +305,16 @@ IZELServerStatus* ZELServerTCPIPChannel::connect()
         socket_.reset();
     }
     if (!socket_) {
-        socket_.reset(new (std::nothrow) TcpSocket(host_.c_str(), port_));
+        socket_.reset(new (std::nothrow) TcpSocket(host_.c_str(), port_, limits_.connectTimeoutMs));
     }
-    // A failed socket stays in place; the next open probes it, finds it unusable and replaces it.
     if (!socket_) {
         return makeStatus(msg::kConnectFailed);
     }
+    // A failed socket stays in place; the next open probes it, finds it unusable and replaces it.
     if (socket_->errorCode != 0) {
-        return makeStatusWithCode(static_cast<unsigned>(socket_->errorCode), msg::kConnectFailed);
+        return socketFailure(msg::kConnectFailed, socket_->errorCode);
     }
+    socket_->setIoTimeout(limits_.ioTimeoutMs);
     return nullptr;
 }
 
@@ -302,21 +345,30 @@ IZELServerStatus* ZELServerTCPIPChannel::signIn(const IZELServerConnectionInfo& 
         break;
     }
     }
+    // The request has taken its copy of the identity (none on the first sign-in). From here on the
+    // channel holds one, empty and unauthenticated until a reply says otherwise, so that callers can
+    // ask it whether they are signed in, also after a refusal.
+    ensureIdentity();
     if (IZELServerStatus* status = sendRequest(*request, *response, kPlainRequest)) {
         return status;
-    }
-    if (!identity_) {
-        identity_.reset(new ZELServerIdentity());
     }
     // The reply may replace the identity by a single sign-on one, or take it away altogether.
     IZELServerIdentity* identity = identity_.release();
     ZELServerStringDict settings;
     const int read = response->readSessionInit(identity, settings);
     identity_.reset(identity);
+    ensureIdentity();
     if (read != 0 || !identity_ || !identity_->isAuthenticated()) {
         return makeStatus(msg::kSignInRefused);
     }
     return nullptr;
+}
+
+void ZELServerTCPIPChannel::ensureIdentity()
+{
+    if (!identity_) {
+        identity_.reset(new ZELServerIdentity());
+    }
 }
 
 IZELServerStatus* ZELServerTCPIPChannel::close()
@@ -403,6 +455,9 @@ IZELServerStatus* ZELServerTCPIPChannel::exchange(IZELServerRequest& request, IZ
     if (download != nullptr && !download->isOpen()) {
         return makeStatus(msg::kLocalFileWrite, download->path());
     }
+    if (!socket_) {
+        return makeStatus(msg::kNotConnected);
+    }
     // The text goes into the frame with one copy; only text that is not UTF-8 is converted first.
     std::string_view text = request.textView();
     std::string converted;
@@ -438,9 +493,6 @@ IZELServerStatus* ZELServerTCPIPChannel::exchange(IZELServerRequest& request, IZ
 IZELServerStatus* ZELServerTCPIPChannel::sendAndReceive(std::string_view requestText, Transfer& transfer,
                                                         std::string& reply)
 {
-    if (!socket_) {
-        return sendFailed(SOCK_SEND_FAILED);
-    }
     const std::optional<std::string> frame = wire::encodeCommandFrame(requestText);
     if (!frame) {
         return sendFailed(SOCK_SEND_FAILED);
@@ -472,7 +524,7 @@ IZELServerStatus* ZELServerTCPIPChannel::sendAndReceive(std::string_view request
             return nullptr;
         }
     }
-    return receiveFrame(*socket_, reply);
+    return socket_ ? receiveFrame(*socket_, reply) : makeStatus(msg::kNotConnected);
 }
 
 IZELServerStatus* ZELServerTCPIPChannel::uploadFile(Transfer& transfer)
@@ -537,8 +589,8 @@ IZELServerStatus* ZELServerTCPIPChannel::downloadFile(Transfer& transfer, bool& 
     for (std::uint32_t received = 0; received < total;) {
         transfer.reportPosition(received);
         const std::size_t piece = std::min<std::size_t>(total - received, wire::kChunkSize);
-        if (const std::int32_t code = socket.receiveExact(transfer.chunk.get(), static_cast<std::int32_t>(piece))) {
-            return receiveFailed(code);
+        if (IZELServerStatus* status = receiveBytes(socket, transfer.chunk.get(), piece)) {
+            return status;
         }
         // After a failed write the content is still read to its end, so the connection stays in
         // step for the reply and for the next command; the failure is reported once it is over.
@@ -592,13 +644,14 @@ IZELServerStatus* ZELServerTCPIPChannel::resultPortExchange(IZELServerRequest& r
     if (IZELServerStatus* status = exchange(request, response, nullptr, nullptr, nullptr)) {
         return status;
     }
-    if (listener->acceptPeer() != 0) {
-        return makeStatus(msg::kResultPortAcceptFailed);
+    if (const std::int32_t code = listener->acceptPeer(limits_.resultPortTimeoutMs)) {
+        return socketFailure(msg::kResultPortAcceptFailed, code);
     }
+    listener->setIoTimeout(limits_.ioTimeoutMs);
     if (!trustedHostNames_.empty()) {
         while (!peerIsTrusted(trustedHostNames_, listener->getPeerAddress())) {
-            if (listener->acceptPeer() != 0) {
-                return makeStatus(msg::kResultPortAcceptFailed);
+            if (const std::int32_t code = listener->acceptPeer(limits_.resultPortTimeoutMs)) {
+                return socketFailure(msg::kResultPortAcceptFailed, code);
             }
         }
     }

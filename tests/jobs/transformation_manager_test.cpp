@@ -560,7 +560,7 @@ TEST_F(TransformationManagerChecks, OnlySpacesAreTrimmed)
     unsigned jobId = kUntouched;
     StatusPtr status(manager.submitJobString(str("\t"), str("r\n"), ZELServerStringArray(), jobId));
     ASSERT_NE(status, nullptr);
-    EXPECT_EQ(status->getMessageNumber(), msg::kSendFailed);
+    EXPECT_EQ(status->getMessageNumber(), msg::kNotConnected);
     EXPECT_EQ(jobId, kUntouched);
 }
 

@@ -6,9 +6,12 @@
 #include <fcntl.h>
 #include <netdb.h>
 #include <netinet/in.h>
+#include <poll.h>
 #include <sys/socket.h>
+#include <sys/time.h>
 #include <unistd.h>
 
+#include <chrono>
 #include <memory>
 
 namespace zel::platform {
@@ -36,14 +39,81 @@ void socketLibraryCleanup() noexcept {}
 
 SocketHandle createStreamSocket() noexcept { return ::socket(AF_INET, SOCK_STREAM, 0); }
 
-bool connectIPv4(SocketHandle socket, Ipv4Address address, std::uint16_t port) noexcept
+namespace {
+
+// poll() with the rest of a time-out, resumed after a signal; 0 waits without bound.
+WaitOutcome pollFor(SocketHandle socket, short events, std::uint32_t timeoutMs) noexcept
+{
+    using Clock = std::chrono::steady_clock;
+    const Clock::time_point deadline = Clock::now() + std::chrono::milliseconds(timeoutMs);
+    for (;;) {
+        int wait = -1;
+        if (timeoutMs != 0) {
+            const auto left = std::chrono::duration_cast<std::chrono::milliseconds>(deadline - Clock::now()).count();
+            wait = left > 0 ? static_cast<int>(left) : 0;
+        }
+        pollfd entry{socket, events, 0};
+        const int ready = ::poll(&entry, 1, wait);
+        if (ready > 0) {
+            return WaitOutcome::Ready;
+        }
+        if (ready == 0) {
+            return WaitOutcome::TimedOut;
+        }
+        if (errno != EINTR) {
+            return WaitOutcome::Failed;
+        }
+    }
+}
+
+WaitOutcome connectWithin(SocketHandle socket, const sockaddr_in& endpoint, std::uint32_t timeoutMs) noexcept
+{
+    if (!setNonBlocking(socket, true)) {
+        return WaitOutcome::Failed;
+    }
+    WaitOutcome outcome = WaitOutcome::Ready;
+    if (::connect(socket, reinterpret_cast<const sockaddr*>(&endpoint), sizeof endpoint) != 0) {
+        outcome = errno == EINPROGRESS ? pollFor(socket, POLLOUT, timeoutMs) : WaitOutcome::Failed;
+        int error = 0;
+        socklen_t length = sizeof error;
+        if (outcome == WaitOutcome::Ready &&
+            (::getsockopt(socket, SOL_SOCKET, SO_ERROR, &error, &length) != 0 || error != 0)) {
+            outcome = WaitOutcome::Failed;
+        }
+    }
+    if (!setNonBlocking(socket, false)) {
+        return WaitOutcome::Failed;
+    }
+    return outcome;
+}
+
+}  // namespace
+
+WaitOutcome connectIPv4(SocketHandle socket, Ipv4Address address, std::uint16_t port, std::uint32_t timeoutMs) noexcept
 {
     const sockaddr_in endpoint = ipv4Endpoint(address, port);
+    if (timeoutMs != 0) {
+        return connectWithin(socket, endpoint, timeoutMs);
+    }
     int result;
     do {
         result = ::connect(socket, reinterpret_cast<const sockaddr*>(&endpoint), sizeof endpoint);
     } while (result != 0 && errno == EINTR);
-    return result == 0;
+    return result == 0 ? WaitOutcome::Ready : WaitOutcome::Failed;
+}
+
+WaitOutcome waitReadable(SocketHandle socket, std::uint32_t timeoutMs) noexcept
+{
+    return pollFor(socket, POLLIN, timeoutMs);
+}
+
+bool setIoTimeout(SocketHandle socket, std::uint32_t timeoutMs) noexcept
+{
+    timeval limit{};
+    limit.tv_sec = static_cast<time_t>(timeoutMs / 1000);
+    limit.tv_usec = static_cast<suseconds_t>((timeoutMs % 1000) * 1000);
+    return ::setsockopt(socket, SOL_SOCKET, SO_RCVTIMEO, &limit, sizeof limit) == 0 &&
+           ::setsockopt(socket, SOL_SOCKET, SO_SNDTIMEO, &limit, sizeof limit) == 0;
 }
 
 bool bindAnyIPv4(SocketHandle socket, std::uint16_t port) noexcept

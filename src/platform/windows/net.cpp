@@ -46,11 +46,86 @@ void socketLibraryCleanup() noexcept { ::WSACleanup(); }
 
 SocketHandle createStreamSocket() noexcept { return static_cast<SocketHandle>(::socket(AF_INET, SOCK_STREAM, 0)); }
 
-bool connectIPv4(SocketHandle socket, Ipv4Address address, std::uint16_t port) noexcept
+namespace {
+
+timeval timevalOf(std::uint32_t timeoutMs)
+{
+    timeval limit{};
+    limit.tv_sec = static_cast<long>(timeoutMs / 1000);
+    limit.tv_usec = static_cast<long>((timeoutMs % 1000) * 1000);
+    return limit;
+}
+
+// A non-blocking connect reports success in the write set and failure in the exception set.
+WaitOutcome connectWithin(SOCKET socket, const sockaddr_in& endpoint, std::uint32_t timeoutMs) noexcept
+{
+    u_long nonBlocking = 1;
+    if (::ioctlsocket(socket, FIONBIO, &nonBlocking) != 0) {
+        return WaitOutcome::Failed;
+    }
+    WaitOutcome outcome = WaitOutcome::Ready;
+    if (::connect(socket, reinterpret_cast<const sockaddr*>(&endpoint), static_cast<int>(sizeof endpoint)) != 0) {
+        if (::WSAGetLastError() != WSAEWOULDBLOCK) {
+            outcome = WaitOutcome::Failed;
+        } else {
+            fd_set writable;
+            fd_set failed;
+            FD_ZERO(&writable);
+            FD_ZERO(&failed);
+            FD_SET(socket, &writable);
+            FD_SET(socket, &failed);
+            timeval limit = timevalOf(timeoutMs);
+            const int ready = ::select(0, nullptr, &writable, &failed, &limit);
+            if (ready == 0) {
+                outcome = WaitOutcome::TimedOut;
+            } else if (ready < 0 || FD_ISSET(socket, &failed) || !FD_ISSET(socket, &writable)) {
+                outcome = WaitOutcome::Failed;
+            }
+        }
+    }
+    u_long blocking = 0;
+    if (::ioctlsocket(socket, FIONBIO, &blocking) != 0) {
+        return WaitOutcome::Failed;
+    }
+    return outcome;
+}
+
+}  // namespace
+
+WaitOutcome connectIPv4(SocketHandle socket, Ipv4Address address, std::uint16_t port, std::uint32_t timeoutMs) noexcept
 {
     const sockaddr_in endpoint = ipv4Endpoint(address, port);
+    if (timeoutMs != 0) {
+        return connectWithin(static_cast<SOCKET>(socket), endpoint, timeoutMs);
+    }
     return ::connect(static_cast<SOCKET>(socket), reinterpret_cast<const sockaddr*>(&endpoint),
-                     static_cast<int>(sizeof endpoint)) == 0;
+                     static_cast<int>(sizeof endpoint)) == 0
+               ? WaitOutcome::Ready
+               : WaitOutcome::Failed;
+}
+
+WaitOutcome waitReadable(SocketHandle socket, std::uint32_t timeoutMs) noexcept
+{
+    fd_set readable;
+    FD_ZERO(&readable);
+    FD_SET(static_cast<SOCKET>(socket), &readable);
+    timeval limit = timevalOf(timeoutMs);
+    const int ready = ::select(0, &readable, nullptr, nullptr, timeoutMs != 0 ? &limit : nullptr);
+    if (ready > 0) {
+        return WaitOutcome::Ready;
+    }
+    return ready == 0 ? WaitOutcome::TimedOut : WaitOutcome::Failed;
+}
+
+// Winsock takes these two options as a DWORD of milliseconds.
+bool setIoTimeout(SocketHandle socket, std::uint32_t timeoutMs) noexcept
+{
+    const DWORD limit = timeoutMs;
+    const char* value = reinterpret_cast<const char*>(&limit);
+    return ::setsockopt(static_cast<SOCKET>(socket), SOL_SOCKET, SO_RCVTIMEO, value, static_cast<int>(sizeof limit)) ==
+               0 &&
+           ::setsockopt(static_cast<SOCKET>(socket), SOL_SOCKET, SO_SNDTIMEO, value, static_cast<int>(sizeof limit)) ==
+               0;
 }
 
 bool bindAnyIPv4(SocketHandle socket, std::uint16_t port) noexcept

@@ -1,0 +1,149 @@
+// The library against a server that lies, stalls or never answers: every case ends in a status, in
+// bounded time and memory, and a connection left in the middle of a message is given up.
+
+#include <chrono>
+#include <cstdint>
+#include <optional>
+#include <string>
+#include <vector>
+
+#include <gtest/gtest.h>
+
+#include "hostile_fixture.h"
+#include "support/sockets.h"
+#include "transport/connection_limits.h"
+
+namespace zeltest {
+namespace {
+
+using namespace std::string_literals;
+
+constexpr unsigned kTimedOut = 392012;
+
+TEST_F(HostileSessionTest, ReplyFramesAreBoundedBeforeTheirContentIsRead)
+{
+    struct Case {
+        const char* name;
+        Properties properties;
+        Bytes served;  // what the server sends in answer to the command
+        unsigned number;
+        const char* inMessage;
+        bool dropped;  // the connection is given up: the next command finds none
+    };
+    const Case cases[] = {
+        {"prefix announcing 4 GiB", {}, "\xFF\xFF\xFF\xF0SUCCESS\0"s + std::string(4096, 'x'), 393604,
+         "4294967280 bytes, more than the 67108864", true},
+        {"one byte over MAX_REPLY_BYTES", {{"MAX_REPLY_BYTES", "100"}}, frame("SUCCESS\0"s + std::string(93, 'x')),
+         393604, "101 bytes, more than the 100", true},
+        {"exactly MAX_REPLY_BYTES", {{"MAX_REPLY_BYTES", "100"}}, frame("SUCCESS\0"s + std::string(92, 'x')), 0, "",
+         false},
+        {"torn inside the prefix", {}, "\0\0"s, 393608, "392008", false},
+        {"torn inside the payload", {}, frame("SUCCESS\0body"s).substr(0, 9), 393608, "392008", false},
+    };
+    for (const Case& c : cases) {
+        SCOPED_TRACE(c.name);
+        FakeServer server;
+        server.exchange(firstHandshake(), signedIn()).expectAnyFrame().sendRaw(c.served);
+        if (c.number == 393608) {
+            server.closeConnection();
+        }
+        signIn(server, c.properties);
+        const Outcome got = sessionProperty();
+        EXPECT_EQ(got.number, c.number) << got.message;
+        EXPECT_NE(got.message.find(c.inMessage), std::string::npos) << got.message;
+        if (c.dropped) {
+            EXPECT_EQ(sessionProperty().number, 393622u);
+        }
+        EXPECT_TRUE(server.verify());
+    }
+}
+
+TEST_F(HostileSessionTest, TimeOutsEndTheStepThatWaitedWithTheSocketCode)
+{
+    struct Case {
+        const char* name;
+        Properties properties;
+        Bytes served;     // sent after the command has been read
+        bool resultPort;  // a transacted job, whose result the server never delivers
+        unsigned number;
+        bool dropped;
+    };
+    const Case cases[] = {
+        {"no answer", {{"IO_TIMEOUT", "0.2"}}, "", false, 393608, true},
+        {"stalled frame", {{"IO_TIMEOUT", "0.2"}}, frame("SUCCESS\0body"s).substr(0, 7), false, 393608, true},
+        {"no result", {{"RESULT_PORT_TIMEOUT", "0.2"}}, frame("SUCCESS\0queued"s), true, 393618, false},
+    };
+    for (const Case& c : cases) {
+        SCOPED_TRACE(c.name);
+        FakeServer server;
+        server.exchange(firstHandshake(), signedIn()).expectAnyFrame().sendRaw(c.served);
+        signIn(server, c.properties);
+        Outcome got;
+        if (c.resultPort) {
+            IZELServerString* text = session->createString();
+            IZELServerStringArray* directives = session->createStringArray();
+            text->assign("job");
+            got = outcome(
+                session->getTransformationManager()->transactJobString(*text, *text, *directives, *text));
+            session->destroyString(&text);
+            session->destroyStringArray(&directives);
+        } else {
+            got = sessionProperty();
+        }
+        EXPECT_EQ(got.number, c.number) << got.message;
+        EXPECT_EQ(got.code, kTimedOut) << got.message;
+        if (c.dropped) {
+            EXPECT_EQ(sessionProperty().number, 393622u);
+        }
+        EXPECT_TRUE(server.verify());
+    }
+}
+
+// A listener whose accept queue is full takes no more connections: the system drops the next one's
+// handshake, as a server too busy to answer does.
+TEST_F(HostileSessionTest, ConnectingGivesUpAfterTheConnectTimeOut)
+{
+    const Socket busy = listenOnLoopback(0);
+    const std::optional<std::uint16_t> port = localPort(busy);
+    ASSERT_TRUE(port);
+    std::vector<Socket> queued;
+    for (int i = 0; i < 4; ++i) {
+        queued.push_back(openTcpSocket());
+        setNonBlocking(queued.back(), true);
+        connectTo(queued.back(), kLoopback, *port);
+    }
+    const auto started = std::chrono::steady_clock::now();
+    const Outcome got = init(*port, {{"CONNECT_TIMEOUT", "0.3"}});
+    EXPECT_EQ(got.number, 393601u) << got.message;
+    EXPECT_EQ(got.code, kTimedOut);
+    EXPECT_LT(std::chrono::steady_clock::now() - started, std::chrono::seconds(20));
+}
+
+TEST_F(HostileSessionTest, LimitPropertiesThatDoNotConvertAreRefusedBeforeConnecting)
+{
+    const Properties cases[] = {
+        {{"CONNECT_TIMEOUT", "-1"}},      {{"IO_TIMEOUT", "abc"}},      {{"IO_TIMEOUT", "1.2345"}},
+        {{"RESULT_PORT_TIMEOUT", "3e1"}}, {{"MAX_REPLY_BYTES", "0"}},   {{"MAX_REPLY_BYTES", "4294967296"}},
+        {{"IO_TIMEOUT", "2000001"}},      {{"CONNECT_TIMEOUT", " 30"}},
+    };
+    for (const Properties& properties : cases) {
+        const Outcome got = init(1, properties);
+        EXPECT_EQ(got.number, 393617u) << properties.begin()->second;
+        EXPECT_NE(got.message.find(properties.begin()->first), std::string::npos) << got.message;
+    }
+}
+
+TEST(ConnectionLimits, SecondsAreReadToTheMillisecond)
+{
+    struct Case {
+        const char* text;
+        std::uint32_t milliseconds;
+    };
+    const Case cases[] = {{"30", 30000}, {"0", 0}, {"0.25", 250}, {"1.5", 1500}, {"0.001", 1}, {"2000000", 2000000000}};
+    for (const Case& c : cases) {
+        EXPECT_EQ(zel::secondsAsMilliseconds(c.text), c.milliseconds) << c.text;
+    }
+}
+
+}  // namespace
+}  // namespace zeltest
