@@ -31,11 +31,23 @@ TEST_F(HostileSessionTest, ReplyFramesAreBoundedBeforeTheirContentIsRead)
         bool dropped;  // the connection is given up: the next command finds none
     };
     const Case cases[] = {
-        {"prefix announcing 4 GiB", {}, "\xFF\xFF\xFF\xF0SUCCESS\0"s + std::string(4096, 'x'), 393604,
-         "4294967280 bytes, more than the 67108864", true},
-        {"one byte over MAX_REPLY_BYTES", {{"MAX_REPLY_BYTES", "100"}}, frame("SUCCESS\0"s + std::string(93, 'x')),
-         393604, "101 bytes, more than the 100", true},
-        {"exactly MAX_REPLY_BYTES", {{"MAX_REPLY_BYTES", "100"}}, frame("SUCCESS\0"s + std::string(92, 'x')), 0, "",
+        {"prefix announcing 4 GiB",
+         {},
+         "\xFF\xFF\xFF\xF0SUCCESS\0"s + std::string(4096, 'x'),
+         393604,
+         "4294967280 bytes, more than the 67108864",
+         true},
+        {"one byte over MAX_REPLY_BYTES",
+         {{"MAX_REPLY_BYTES", "100"}},
+         frame("SUCCESS\0"s + std::string(93, 'x')),
+         393604,
+         "101 bytes, more than the 100",
+         true},
+        {"exactly MAX_REPLY_BYTES",
+         {{"MAX_REPLY_BYTES", "100"}},
+         frame("SUCCESS\0"s + std::string(92, 'x')),
+         0,
+         "",
          false},
         {"torn inside the prefix", {}, "\0\0"s, 393608, "392008", false},
         {"torn inside the payload", {}, frame("SUCCESS\0body"s).substr(0, 9), 393608, "392008", false},
@@ -83,8 +95,7 @@ TEST_F(HostileSessionTest, TimeOutsEndTheStepThatWaitedWithTheSocketCode)
             IZELServerString* text = session->createString();
             IZELServerStringArray* directives = session->createStringArray();
             text->assign("job");
-            got = outcome(
-                session->getTransformationManager()->transactJobString(*text, *text, *directives, *text));
+            got = outcome(session->getTransformationManager()->transactJobString(*text, *text, *directives, *text));
             session->destroyString(&text);
             session->destroyStringArray(&directives);
         } else {
