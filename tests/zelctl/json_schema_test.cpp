@@ -97,7 +97,8 @@ TEST_F(JsonSchema, EveryCommandAnswersWithTheDocumentedKeys)
     run("job log", {"job", "log", job});
     run("job log -o", {"job", "log", job, "-o", local("job.log")});
     run("job run", {"job", "run", "zeljob", "demo", "roads.zlw"});
-    run("job abort", {"job", "abort", jobOf(run("job schedule", {"job", "schedule", "3600", "zeljob", "demo", "roads.zlw"}))});
+    run("job abort",
+        {"job", "abort", jobOf(run("job schedule", {"job", "schedule", "3600", "zeljob", "demo", "roads.zlw"}))});
     run("service create", {"service", "create", "svc", "--workspace-registration", "true"});
     run("service update", {"service", "update", "svc", "--description", "changed"});
     run("service register", {"service", "register", "svc", "demo", "roads.zlw"});

@@ -74,7 +74,9 @@ TEST_F(Scripting, SettingsComeFromTheEnvironmentAndFlagsWin)
     const Case cases[] = {
         {server + " ZEL_USER=ann ZEL_PASSWORD=pw-ann", {"whoami", "--json"}, "ann"},
         {server + " ZEL_TOKEN=token-of-bob", {"--json", "whoami"}, "bob"},
-        {server + " ZEL_USER=bob ZEL_PASSWORD=pw-bob", {"whoami", "--user", "ann", "--json", "--password", "pw-ann"}, "ann"},
+        {server + " ZEL_USER=bob ZEL_PASSWORD=pw-bob",
+         {"whoami", "--user", "ann", "--json", "--password", "pw-ann"},
+         "ann"},
         {"ZEL_PORT=1 ZEL_USER=bob ZEL_PASSWORD=pw-bob", {"--port", port(), "--json", "whoami"}, "bob"},
     };
     for (const Case& c : cases) {
@@ -94,10 +96,12 @@ TEST_F(Scripting, FailuresToConnectOrSignInSayWhy)
         std::string err;
     };
     const Case cases[] = {
-        {{"--port", std::to_string(closed.port()), "--user", "ann", "whoami"}, 1,
+        {{"--port", std::to_string(closed.port()), "--user", "ann", "whoami"},
+         1,
          "error 393601: connection refused by " + refused + "\n"},
         {{"--port", std::to_string(closed.port()), "ping"}, 1, "error 393601: connection refused by " + refused + "\n"},
-        {{"--host", "no-such-host.invalid", "--user", "ann", "whoami"}, 1,
+        {{"--host", "no-such-host.invalid", "--user", "ann", "whoami"},
+         1,
          "error 393601: host not found: no-such-host.invalid\n"},
         {{"--port", port(), "whoami"}, 2, "error: no user given: use --user or ZEL_USER, or --token or ZEL_TOKEN\n"},
     };
@@ -116,7 +120,8 @@ TEST_F(Scripting, PingAndVersionNeedNoSignIn)
     EXPECT_EQ(ping.json(), nlohmann::json::parse(R"({"host":"127.0.0.1","port":)" + port() + R"(,"up":true})"));
     const Outcome version = raw({"--version"}, "", false);
     EXPECT_EQ(version.status, 0);
-    EXPECT_TRUE(std::regex_match(version.out, std::regex("zelctl [0-9.]+ \\(zelserverapi [0-9.]+\\)\n"))) << version.out;
+    EXPECT_TRUE(std::regex_match(version.out, std::regex("zelctl [0-9.]+ \\(zelserverapi [0-9.]+\\)\n")))
+        << version.out;
 }
 
 }  // namespace

@@ -50,8 +50,11 @@ TEST_F(Limits, DocumentsNestedPastTheLimitAreRefusedEverywhere)
     };
     const std::vector<Case> cases = {
         {"SR_EXISTS", {{"srName", "AREA"}, {"srPath", nested(63, path)}}, "false"},
-        {"SR_EXISTS", {{"srName", "AREA"}, {"srPath", nested(64, path)}}, "path value is not a PATH document: " + tooDeep},
-        {"REP_ADD_REPOSITORY", {{"repositoryObject", nested(64, R"(<REPOSITORY name="r"/>)")}},
+        {"SR_EXISTS",
+         {{"srName", "AREA"}, {"srPath", nested(64, path)}},
+         "path value is not a PATH document: " + tooDeep},
+        {"REP_ADD_REPOSITORY",
+         {{"repositoryObject", nested(64, R"(<REPOSITORY name="r"/>)")}},
          "repositoryObject: " + tooDeep},
         {"REP_ADD_SERVICE", {{"serviceObject", nested(64, R"(<SERVICE name="s"/>)")}}, "serviceObject: " + tooDeep},
         {"SEC_ADD_USERTOKEN",
@@ -59,7 +62,8 @@ TEST_F(Limits, DocumentsNestedPastTheLimitAreRefusedEverywhere)
          "\"userTokenObject\" holds no USERTOKEN element: " + tooDeep},
         {"JOB_REQUEST",
          {{"keyword", "zeljob"},
-          {"request", "R/w/w.zlw -XML_PARAMETER <TRANSFORMATION_REQUEST>" + nested(64, "") + "</TRANSFORMATION_REQUEST>"}},
+          {"request",
+           "R/w/w.zlw -XML_PARAMETER <TRANSFORMATION_REQUEST>" + nested(64, "") + "</TRANSFORMATION_REQUEST>"}},
          "request parameters: " + tooDeep},
     };
     auto admin = connectAs("admin");
@@ -105,7 +109,8 @@ TEST_F(Limits, IdleAndStalledConnectionsAreClosed)
         EXPECT_TRUE(client.closedByPeer(10000)) << sent.size() << " bytes sent";
     }
     auto uploader = connectAs("ann");
-    ASSERT_TRUE(uploader->sendFrame(requestPayload("SR_UPLOAD", {{"srName", "AREA"}, {"srDestPath", pathDocument("u")}})));
+    ASSERT_TRUE(
+        uploader->sendFrame(requestPayload("SR_UPLOAD", {{"srName", "AREA"}, {"srDestPath", pathDocument("u")}})));
     ASSERT_EQ(splitReply(uploader->readFrame().value_or("")).body, "ready_to_transfer");
     ASSERT_TRUE(uploader->sendFrame("fileLength=100\0fileCRC=0"s));
     ASSERT_EQ(splitReply(uploader->readFrame().value_or("")).body, "ready_to_transfer");
@@ -141,7 +146,8 @@ TEST_F(Limits, StopDoesNotWaitForAClientThatNeverReads)
     restartWith("io_timeout_seconds = 3600");
     writeFile(areaDir_ + "/big.bin", std::string(32u << 20, 'x'));
     auto client = connectAs("ann");
-    ASSERT_TRUE(client->sendFrame(requestPayload("SR_DOWNLOAD", {{"srName", "AREA"}, {"srSrcPath", pathDocument("big.bin")}})));
+    ASSERT_TRUE(
+        client->sendFrame(requestPayload("SR_DOWNLOAD", {{"srName", "AREA"}, {"srSrcPath", pathDocument("big.bin")}})));
     ASSERT_TRUE(client->readFrame().has_value());
     ASSERT_TRUE(client->sendFrame("SUCCESS\0ready_to_transfer"s));
     auto start = std::chrono::steady_clock::now();
