@@ -6,24 +6,16 @@
 
 namespace zel {
 
-ZELServerStatus::ZELServerStatus(unsigned number) : number_(number) { build({}); }
+ZELServerStatus::ZELServerStatus(unsigned number, const std::vector<std::string>& parameters,
+                                 std::source_location where)
+    : ZELServerStatus(0, number, parameters, where)
+{}
 
-ZELServerStatus::ZELServerStatus(unsigned number, const std::vector<std::string>& parameters) : number_(number)
+ZELServerStatus::ZELServerStatus(unsigned code, unsigned number, const std::vector<std::string>& parameters,
+                                 std::source_location where)
+    : number_(number), code_(code), where_(where)
 {
     build(parameters);
-}
-
-ZELServerStatus::ZELServerStatus(unsigned number, const std::string& parameter) : number_(number)
-{
-    build({parameter});
-}
-
-ZELServerStatus::ZELServerStatus(unsigned code, unsigned number) : number_(number), code_(code) { build({}); }
-
-ZELServerStatus::ZELServerStatus(unsigned code, unsigned number, const std::string& parameter)
-    : number_(number), code_(code)
-{
-    build({parameter});
 }
 
 // The token's destructor tears the process-wide database down.

@@ -11,6 +11,7 @@
 #include <zelserverapi/IZELServerStatus.h>
 
 #include <memory>
+#include <source_location>
 #include <string>
 #include <vector>
 
@@ -22,11 +23,11 @@ class MessageDatabaseToken;
 
 class ZELServerStatus final : public IZELServerStatus, public HeapObject {
 public:
-    explicit ZELServerStatus(unsigned number);
-    ZELServerStatus(unsigned number, const std::vector<std::string>& parameters);
-    ZELServerStatus(unsigned number, const std::string& parameter);
-    ZELServerStatus(unsigned code, unsigned number);
-    ZELServerStatus(unsigned code, unsigned number, const std::string& parameter);
+    // `where` is the place in the library that made the status (see where()).
+    ZELServerStatus(unsigned number, const std::vector<std::string>& parameters,
+                    std::source_location where = std::source_location::current());
+    ZELServerStatus(unsigned code, unsigned number, const std::vector<std::string>& parameters,
+                    std::source_location where = std::source_location::current());
     ~ZELServerStatus() override;
 
     ZELServerStatus(const ZELServerStatus&) = delete;
@@ -35,6 +36,9 @@ public:
     const char* getMessage() const override { return message_.c_str(); }
     unsigned getMessageNumber() const override { return number_; }
     unsigned getCode() const override { return code_; }
+
+    // Where the library made this status: for tests and debugging only, never part of the text.
+    const std::source_location& where() const { return where_; }
 
     // True while this status keeps the process-wide database alive.
     bool holdsDatabaseToken() const { return token_ != nullptr; }
@@ -45,6 +49,7 @@ private:
     std::string message_;
     unsigned number_ = 0;
     unsigned code_ = 0;
+    std::source_location where_;
     bool databaseStarted_ = false;
     std::unique_ptr<MessageDatabaseToken> token_;
 };

@@ -4,23 +4,26 @@
 
 namespace zel {
 
-IZELServerStatus* makeStatus(unsigned number) { return new ZELServerStatus(number); }
+IZELServerStatus* makeStatus(unsigned number, Where where) { return new ZELServerStatus(number, {}, where); }
 
-IZELServerStatus* makeStatus(unsigned number, const std::string& parameter)
+IZELServerStatus* makeStatus(unsigned number, const std::string& parameter, Where where)
 {
-    return new ZELServerStatus(number, parameter);
+    return new ZELServerStatus(number, {parameter}, where);
 }
 
-IZELServerStatus* makeStatus(unsigned number, const std::vector<std::string>& parameters)
+IZELServerStatus* makeStatus(unsigned number, const std::vector<std::string>& parameters, Where where)
 {
-    return new ZELServerStatus(number, parameters);
+    return new ZELServerStatus(number, parameters, where);
 }
 
-IZELServerStatus* makeStatusWithCode(unsigned code, unsigned number) { return new ZELServerStatus(code, number); }
-
-IZELServerStatus* makeStatusWithCode(unsigned code, unsigned number, const std::string& parameter)
+IZELServerStatus* makeStatusWithCode(unsigned code, unsigned number, Where where)
 {
-    return new ZELServerStatus(code, number, parameter);
+    return new ZELServerStatus(code, number, {}, where);
+}
+
+IZELServerStatus* makeStatusWithCode(unsigned code, unsigned number, const std::string& parameter, Where where)
+{
+    return new ZELServerStatus(code, number, {parameter}, where);
 }
 
 }  // namespace zel

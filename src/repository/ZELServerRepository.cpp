@@ -120,9 +120,9 @@ bool ZELServerRepository::readFrom(const XmlElement& element)
     return true;
 }
 
-CheckedCommand ZELServerRepository::on(const char* keyword) const
+CheckedCommand ZELServerRepository::on(const char* keyword, Where where) const
 {
-    CheckedCommand command(channel_, keyword);
+    CheckedCommand command(channel_, keyword, where);
     command.add("repositoryName", fields_.name);
     return command;
 }

@@ -105,7 +105,7 @@ public:
 
 private:
     // A command of this repository: `keyword` with "repositoryName" as its first value.
-    CheckedCommand on(const char* keyword) const;
+    CheckedCommand on(const char* keyword, Where where = Where::current()) const;
 
     IZELServerChannel* channel_;
     RepositoryFields fields_;

@@ -10,14 +10,14 @@ bool isAllowedName(const IZELServerString& name)
     return toStdString(name).find_first_of(kForbiddenNameCharacters) == std::string::npos;
 }
 
-Check allowedName(const IZELServerString& name)
+Check allowedName(const IZELServerString& name, Where where)
 {
-    return {isAllowedName(name), msg::kForbiddenCharacter, {kForbiddenNameCharacters}};
+    return {isAllowedName(name), msg::kForbiddenCharacter, {kForbiddenNameCharacters}, where};
 }
 
-Check distinct(const IZELServerString& resourceName, const IZELServerString& itemName)
+Check distinct(const IZELServerString& resourceName, const IZELServerString& itemName, Where where)
 {
-    return {toStdString(resourceName) != toStdString(itemName), msg::kResourceNamedAsItem, {}};
+    return {toStdString(resourceName) != toStdString(itemName), msg::kResourceNamedAsItem, {}, where};
 }
 
 std::string enableFilterFor(const ZELServerStringDict& directives)

@@ -24,9 +24,9 @@ inline constexpr const char* kForbiddenNameCharacters = "\\/:*?\"<>|&='+%";
 bool isAllowedName(const IZELServerString& name);
 
 // 393626 (parameter: the forbidden characters) when the name holds one of them.
-Check allowedName(const IZELServerString& name);
+Check allowedName(const IZELServerString& name, Where where = Where::current());
 // 393627 when a resource has exactly the name of its item.
-Check distinct(const IZELServerString& resourceName, const IZELServerString& itemName);
+Check distinct(const IZELServerString& resourceName, const IZELServerString& itemName, Where where = Where::current());
 
 // The "enableFilter" value the server knows for the caller's "ENABLE_FILTER" directive ("ALL",
 // "ENABLED", "DISABLED", compared exactly, give "All", "Enabled", "Disabled"); empty for any other

@@ -24,9 +24,9 @@ IZELServerStatus* askTruth(bool& flag, Ask ask)
 
 }  // namespace
 
-CheckedCommand ZELServerSecurityManager::on(const char* keyword, const IZELServerString& accountName) const
+CheckedCommand ZELServerSecurityManager::on(const char* keyword, const IZELServerString& accountName, Where where) const
 {
-    CheckedCommand command(channel_, keyword);
+    CheckedCommand command(channel_, keyword, where);
     command.add(kAccountName, accountName);
     return command;
 }

@@ -33,7 +33,7 @@ public:
 
 private:
     // A command of this manager: `keyword` with "userAccountName" as its first value.
-    CheckedCommand on(const char* keyword, const IZELServerString& accountName) const;
+    CheckedCommand on(const char* keyword, const IZELServerString& accountName, Where where = Where::current()) const;
     // The commands whose answer is the body "true" or "false".
     IZELServerStatus* askFlag(const char* keyword, const IZELServerString& accountName, bool& flag);
 

@@ -53,9 +53,9 @@ void ZELServerMountPoint::getDisplayName(IZELServerString& out) const { copyText
 
 void ZELServerMountPoint::getDescription(IZELServerString& out) const { copyText(fields_.description, out); }
 
-CheckedCommand ZELServerMountPoint::on(const char* keyword) const
+CheckedCommand ZELServerMountPoint::on(const char* keyword, Where where) const
 {
-    CheckedCommand command(channel_, keyword);
+    CheckedCommand command(channel_, keyword, where);
     command.add(kResourceName, fields_.name);
     return command;
 }

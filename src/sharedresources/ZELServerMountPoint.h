@@ -63,7 +63,7 @@ public:
 
 private:
     // A command inside this mount point: `keyword` with "srName" as its first value.
-    CheckedCommand on(const char* keyword) const;
+    CheckedCommand on(const char* keyword, Where where = Where::current()) const;
     // One "SR_LIST" reply read into `entries` (which the reader clears first).
     IZELServerStatus* listOnce(const IZELServerPath& path, IZELServerVector<IZELServerFileInfo>& entries);
 

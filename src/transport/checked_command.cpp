@@ -9,8 +9,8 @@
 
 namespace zel {
 
-CheckedCommand::CheckedCommand(IZELServerChannel* channel, std::string keyword)
-    : channel_(channel), keyword_(std::move(keyword))
+CheckedCommand::CheckedCommand(IZELServerChannel* channel, std::string keyword, Where where)
+    : channel_(channel), keyword_(std::move(keyword)), where_(where)
 {}
 
 CheckedCommand& CheckedCommand::check(const Check& check)
@@ -21,14 +21,20 @@ CheckedCommand& CheckedCommand::check(const Check& check)
     return *this;
 }
 
-CheckedCommand& CheckedCommand::check(bool condition, unsigned number, std::vector<std::string> parameters)
+CheckedCommand& CheckedCommand::check(bool condition, unsigned number, std::vector<std::string> parameters, Where where)
 {
-    return check(Check{condition, number, std::move(parameters)});
+    return check(Check{condition, number, std::move(parameters), where});
 }
 
-CheckedCommand& CheckedCommand::require(const IZELServerString& text) { return require(text.length() > 0); }
+CheckedCommand& CheckedCommand::require(const IZELServerString& text, Where where)
+{
+    return require(text.length() > 0, where);
+}
 
-CheckedCommand& CheckedCommand::require(bool condition) { return check(condition, msg::kRequiredValueMissing); }
+CheckedCommand& CheckedCommand::require(bool condition, Where where)
+{
+    return check(condition, msg::kRequiredValueMissing, {}, where);
+}
 
 CheckedCommand& CheckedCommand::addValue(Value value)
 {
@@ -108,19 +114,19 @@ CheckedCommand& CheckedCommand::addUserToken(const std::string& name, const IZEL
 
 CheckedCommand& CheckedCommand::addPath(const std::string& name, const IZELServerPath& path)
 {
-    return addValue([name, &path](Command& command) -> IZELServerStatus* {
+    return addValue([name, &path, where = where_](Command& command) -> IZELServerStatus* {
         const int code = command.request().addPathPayload(name, path);
-        return code == 0 ? nullptr : makeStatus(static_cast<unsigned>(code), name);
+        return code == 0 ? nullptr : makeStatus(static_cast<unsigned>(code), name, where);
     });
 }
 
 IZELServerStatus* CheckedCommand::run(const Exchange& exchange)
 {
     if (!failure_.holds) {
-        return makeStatus(failure_.number, failure_.parameters);
+        return makeStatus(failure_.number, failure_.parameters, failure_.where);
     }
     if (channel_ == nullptr) {
-        return makeStatus(msg::kNotConnected);
+        return makeStatus(msg::kNotConnected, where_);
     }
     // Every manager operation ends here, so this is where an exception from the exchange or from
     // reading the reply stops before it can leave the library.

@@ -33,6 +33,7 @@
 #include <zelserverapi/IZELServerStringArray.h>
 #include <zelserverapi/IZELServerUserToken.h>
 
+#include "api/status.h"
 #include "transport/IZELServerChannel.h"
 #include "transport/IZELServerRequest.h"
 #include "transport/IZELServerResponse.h"
@@ -41,10 +42,12 @@
 namespace zel {
 
 // One argument check: holds, or names the message (and its parameters) the command fails with.
+// `where` is the line that wrote the check, which the failure's status records.
 struct Check {
     bool holds = true;
     unsigned number = 0;
     std::vector<std::string> parameters;
+    Where where = Where::current();
 };
 
 // What a failed or unanswered command leaves in an out flag (see the header comment).
@@ -57,17 +60,19 @@ public:
     // Runs the exchange on a ready command; returns its status (null for success).
     using Exchange = std::function<IZELServerStatus*(Command&)>;
 
-    // `channel` is borrowed and may be null (see the header comment).
-    CheckedCommand(IZELServerChannel* channel, std::string keyword);
+    // `channel` is borrowed and may be null (see the header comment). Statuses the command makes
+    // itself (no channel, a path it cannot write) record `where`, the line that wrote the command.
+    CheckedCommand(IZELServerChannel* channel, std::string keyword, Where where = Where::current());
 
     // ---- Checks ----
     CheckedCommand& check(const Check& check);
     // Message `number` with `parameters` when `condition` is false.
-    CheckedCommand& check(bool condition, unsigned number, std::vector<std::string> parameters = {});
+    CheckedCommand& check(bool condition, unsigned number, std::vector<std::string> parameters = {},
+                          Where where = Where::current());
     // 393619 when the text is empty.
-    CheckedCommand& require(const IZELServerString& text);
+    CheckedCommand& require(const IZELServerString& text, Where where = Where::current());
     // 393619 when `condition` is false (unusable directives).
-    CheckedCommand& require(bool condition);
+    CheckedCommand& require(bool condition, Where where = Where::current());
 
     // ---- Values, in wire order ----
     CheckedCommand& add(const std::string& name, const std::string& value);
@@ -123,6 +128,7 @@ private:
 
     IZELServerChannel* channel_;
     std::string keyword_;
+    Where where_;
     std::vector<Value> values_;
     Check failure_;
 };

@@ -9,10 +9,12 @@
 #include <iterator>
 #include <memory>
 #include <string>
+#include <string_view>
 
 #include <gtest/gtest.h>
 #include <zelserverapi/IZELServerStatus.h>
 
+#include "api/ZELServerStatus.h"
 #include "api/ZELServerString.h"
 #include "session/ZELServerConnectionInfo.h"
 #include "support/fake_server.h"
@@ -27,7 +29,15 @@ inline std::string describe(const IZELServerStatus* status)
     if (status == nullptr) {
         return "(no status)";
     }
-    return std::to_string(status->getMessageNumber()) + ": " + status->getMessage();
+    std::string text = std::to_string(status->getMessageNumber()) + ": " + status->getMessage();
+    // Where the library made it, so that a failing test points at the line that failed.
+    if (const auto* own = dynamic_cast<const zel::ZELServerStatus*>(status)) {
+        const std::string_view file = own->where().file_name();
+        const std::size_t src = file.rfind("src/");
+        text += " [made at " + std::string(src == std::string_view::npos ? file : file.substr(src)) + ":" +
+                std::to_string(own->where().line()) + "]";
+    }
+    return text;
 }
 
 class SignedInChannelTest : public ::testing::Test {
