@@ -52,8 +52,8 @@ void ZELServerSession::teardown()
     repositoryManager_.reset();
     securityManager_.reset();
     mountPointManager_.reset();
-    // Only a host-and-port session ever makes a channel, so the kind check of the original teardown
-    // is always true where a channel exists; the channel is released either way.
+    // The managers go first: they borrow the channel. Whatever kind of connection information made
+    // the channel, it is released here.
     channel_.reset();
 }
 

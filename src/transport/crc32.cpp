@@ -8,8 +8,9 @@
 namespace zel {
 
 // zlib's CRC-32 is the same checksum, computed several bytes at a time: the checksum pass of an upload
-// runs at memory speed instead of limiting the transfer. Its state is the finished value, so the
-// running state here is kept complemented as before.
+// runs at memory speed instead of limiting the transfer. zlib's state is the finished value while
+// Crc32 keeps the running state of the definition (all ones at the start, complemented for the value;
+// see crc32.h), so the state is complemented on the way into zlib and back.
 void Crc32::update(const void* data, std::size_t count) noexcept
 {
     const auto* bytes = static_cast<const Bytef*>(data);
