@@ -158,10 +158,9 @@ Outcome wait(Context& context, unsigned id, unsigned limit)
         if (!stillGoing(code))
             break;
         if (limit != 0 && std::chrono::steady_clock::now() >= deadline)
-            return Failure{0,
-                           "job " + std::to_string(id) + " is still " + statusWord(code) + " after " +
-                               std::to_string(limit) + " seconds",
-                           kExitTimedOut};
+            return Failure{
+                0, "job " + std::to_string(id) + " is still " + statusWord(code) + " after " + secondsText(limit),
+                kExitTimedOut};
         if (spin) {
             std::fprintf(stderr, "\rjob %u %s %c ", id, statusWord(code).c_str(), spinner[turn % 4]);
             std::fflush(stderr);

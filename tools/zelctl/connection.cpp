@@ -80,7 +80,7 @@ Failure Connection::describe(const IZELServerStatus& status) const
     const Failure failure{status.getMessageNumber(), status.getMessage() ? status.getMessage() : ""};
     const std::string where = options_.host + ":" + std::to_string(options_.port);
     if (status.getCode() == kSocketTimedOut)
-        return {failure.number, "timed out after " + std::to_string(options_.timeout) + " seconds waiting for " + where,
+        return {failure.number, "timed out after " + secondsText(options_.timeout) + " waiting for " + where,
                 kExitTimedOut};
     if (failure.number != kConnectFailed)
         return failure;

@@ -93,6 +93,12 @@ private:
     std::vector<ZELServerOwned<IZELServerString>> strings_;
 };
 
+// "1 second", "5 seconds".
+inline std::string secondsText(unsigned seconds)
+{
+    return std::to_string(seconds) + (seconds == 1 ? " second" : " seconds");
+}
+
 // The parts of NAME=VALUE; nullopt when there is no "=" or the name is empty.
 std::optional<std::pair<std::string, std::string>> splitPair(const std::string& text);
 
