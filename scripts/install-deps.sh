@@ -9,7 +9,7 @@ packages=(
   g++ cmake ninja-build pkg-config binutils clang-format-16
   libxerces-c-dev zlib1g-dev
   libgtest-dev libgmock-dev libbenchmark-dev
-  libpugixml-dev libsqlite3-dev
+  libpugixml-dev libsqlite3-dev libcrypt-dev
   libcli11-dev nlohmann-json3-dev
   clang-16 libclang-rt-16-dev
 )

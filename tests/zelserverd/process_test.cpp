@@ -147,9 +147,9 @@ TEST_F(Executable, RefusesBadArgumentsAndConfigs)
     };
     writeFile(root_ + "/bad.conf", "[server]\nworkers = many\n");
     const Case cases[] = {
-        {{}, "usage: zelserverd", 2},
-        {{"--data"}, "bad argument '--data'", 2},
-        {{"--data", root_ + "/d", "--bogus"}, "bad argument '--bogus'", 2},
+        {{}, "--data DIR is required", 2},
+        {{"--data"}, "--data: 1 required TEXT missing", 2},
+        {{"--data", root_ + "/d", "--bogus"}, "not expected: --bogus", 2},
         {{"--data", root_ + "/d", "--listen", "nohost"}, "bad --listen address 'nohost'", 1},
         {{"--data", root_ + "/d", "--config", root_ + "/bad.conf"},
          root_ + "/bad.conf: line 2: workers must be 1 to 64",

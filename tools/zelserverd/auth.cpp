@@ -1,6 +1,9 @@
 #include "auth.h"
 
+#include <crypt.h>
+
 #include <array>
+#include <memory>
 #include <utility>
 
 #include "store.h"
@@ -10,8 +13,9 @@ namespace zelserverd {
 
 namespace {
 
-constexpr std::array<std::pair<std::string_view, std::uint32_t>, 8> kRightNames{{
+constexpr std::array<std::pair<std::string_view, std::uint32_t>, 9> kRightNames{{
     {"jobs", kRightJobs},
+    {"jobs.admin", kRightJobsAdmin},
     {"repository.read", kRightRepositoryRead},
     {"repository.write", kRightRepositoryWrite},
     {"repository.admin", kRightRepositoryAdmin},
@@ -26,6 +30,28 @@ constexpr std::uint32_t kUserRights = kViewerRights | kRightJobs | kRightSharedW
 constexpr std::uint32_t kAuthorRights = kUserRights | kRightRepositoryWrite;
 
 }  // namespace
+
+bool isPasswordHash(std::string_view stored) { return !stored.empty() && stored.front() == '$'; }
+
+std::string hashPassword(std::string_view password)
+{
+    // Default cost; the random salt comes from the kernel.
+    char setting[CRYPT_GENSALT_OUTPUT_SIZE];
+    if (!crypt_gensalt_rn("$y$", 0, nullptr, 0, setting, sizeof setting))
+        return {};
+    auto data = std::make_unique<crypt_data>();
+    const char* hash = crypt_r(std::string(password).c_str(), setting, data.get());
+    return hash && hash[0] == '$' ? std::string(hash) : std::string();
+}
+
+bool passwordMatches(const std::string& stored, const std::string& given)
+{
+    if (!isPasswordHash(stored))
+        return constantTimeEquals(stored, given);
+    auto data = std::make_unique<crypt_data>();
+    const char* hash = crypt_r(given.c_str(), stored.c_str(), data.get());
+    return hash && constantTimeEquals(hash, stored);
+}
 
 std::optional<std::uint32_t> rightFromName(std::string_view name)
 {
@@ -85,7 +111,7 @@ SignInOutcome Authenticator::withPassword(const std::string& name, const std::st
 {
     const UserConfig* user = config_.findUser(name);
     // Unknown user and wrong password read the same, so the reply does not confirm account names.
-    if (!user || !constantTimeEquals(user->password, password))
+    if (!user || !passwordMatches(user->password, password))
         return {std::nullopt, "invalid user name or password"};
     return {principalFor(*user), {}};
 }

@@ -25,8 +25,18 @@ enum Right : std::uint32_t {
     kRightTokensAdmin = 1u << 5,  // anyone's token
     kRightSharedRead = 1u << 6,
     kRightSharedWrite = 1u << 7,
-    kRightAll = (1u << 8) - 1,
+    kRightJobsAdmin = 1u << 8,  // everyone's jobs, not only one's own
+    kRightAll = (1u << 9) - 1,
 };
+
+// Passwords are kept as crypt(3) hashes ("$y$..." from hashPassword, or any other method
+// libcrypt knows); a stored value not starting with '$' is a plain password, accepted for quick
+// starts.
+bool isPasswordHash(std::string_view stored);
+// A fresh yescrypt hash of `password`; empty when libcrypt fails.
+std::string hashPassword(std::string_view password);
+// Whether `given` is the password `stored` (a hash or plain text) stands for.
+bool passwordMatches(const std::string& stored, const std::string& given);
 
 std::optional<std::uint32_t> rightFromName(std::string_view name);
 std::optional<std::uint32_t> builtInRoleRights(std::string_view role);

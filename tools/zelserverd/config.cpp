@@ -169,6 +169,10 @@ private:
             *limit->target = static_cast<unsigned>(*n);
             return {};
         }
+        if (key == "job_user") {
+            out_.jobUser = value;
+            return {};
+        }
         if (key == "sso_secret") {
             out_.ssoSecret = value;
             return {};

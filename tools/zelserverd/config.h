@@ -43,6 +43,7 @@ struct Config {
     unsigned maxConnections = 64;                                // further clients are turned away
     unsigned idleTimeoutSeconds = 300;                           // between commands; 0: no limit
     unsigned ioTimeoutSeconds = 30;                              // a stalled frame, transfer or send
+    std::string jobUser = "nobody";                              // runs the jobs when the server is root
     std::string ssoSecret;                                       // empty: single sign-on refused
     std::map<std::string, std::vector<std::string>> roleRights;  // roles the file defines
     std::vector<UserConfig> users;

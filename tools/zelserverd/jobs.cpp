@@ -2,7 +2,9 @@
 
 #include <fcntl.h>
 #include <signal.h>
-#include <spawn.h>
+#include <grp.h>
+#include <pwd.h>
+#include <sys/prctl.h>
 #include <poll.h>
 #include <sys/stat.h>
 #include <sys/syscall.h>
@@ -148,6 +150,17 @@ std::string JobManager::open()
     fs::create_directories(dir_, ec);
     if (ec || !fs::is_directory(dir_))
         return "cannot create jobs directory '" + dir_ + "'";
+    // A server running as root never runs a workspace as root.
+    if (::geteuid() == 0) {
+        passwd entry{};
+        passwd* found = nullptr;
+        char buffer[4096];
+        if (::getpwnam_r(config_.jobUser.c_str(), &entry, buffer, sizeof buffer, &found) != 0 || !found)
+            return "job_user '" + config_.jobUser + "' is not an account of this machine";
+        if (found->pw_uid == 0)
+            return "job_user '" + config_.jobUser + "' is root; jobs need an unprivileged account";
+        jobAccount_ = JobAccount{found->pw_uid, found->pw_gid};
+    }
     std::lock_guard lock(db_.mutex());
     Statement update(db_, "UPDATE jobs SET status = 'ABORTED', time_finished = ?, "
                           "result_number = ?, result_message = 'the server stopped before the "
@@ -173,7 +186,7 @@ void JobManager::stop()
         stopping_ = true;
         for (auto& [id, job] : active_)
             if (job->pid > 0)
-                ::kill(-job->pid, SIGKILL);
+                ::kill(job->pid, SIGTERM);
     }
     wake_.notify_all();
     for (auto& worker : workers_)
@@ -305,6 +318,8 @@ std::string JobManager::prepare(Job& job, const JobSubmission& submission, int w
     fs::create_directories(job.dir + "/work", ec);
     if (ec)
         return "cannot create job directory: " + ec.message();
+    if (jobAccount_ && ::chown((job.dir + "/work").c_str(), jobAccount_->uid, jobAccount_->gid) != 0)
+        return std::string("cannot hand the job directory to the job's account: ") + std::strerror(errno);
     // The job runs the workspace as it was when submitted, whatever happens to the item later.
     UniqueFd copy(::open((job.dir + "/workspace").c_str(), O_WRONLY | O_CREAT | O_TRUNC | O_CLOEXEC, 0644));
     if (!copy.valid())
@@ -364,55 +379,169 @@ void JobManager::worker()
     }
 }
 
+namespace {
+
+// Everything the job's processes need, made before fork: a server with threads may only make
+// async-signal-safe calls in a forked child, so nothing below allocates.
+struct Launch {
+    std::vector<char*> argv;
+    std::vector<char*> envp;
+    int logFd = -1;
+    int scriptFd = -1;
+    const char* workDir = nullptr;
+    bool dropPrivileges = false;
+    uid_t uid = 0;
+    gid_t gid = 0;
+};
+
+// The shell, in a process group of its own: the plain signal state, standard input from
+// /dev/null, output to the log, the workspace on descriptor 3 and nothing else open, the job's
+// account when the server runs as root.
+[[noreturn]] void execShell(const Launch& launch)
+{
+    ::setpgid(0, 0);
+    sigset_t none;
+    sigemptyset(&none);
+    ::sigprocmask(SIG_SETMASK, &none, nullptr);
+    for (int s : {SIGPIPE, SIGINT, SIGTERM, SIGHUP, SIGQUIT, SIGCHLD})
+        ::signal(s, SIG_DFL);
+    int devNull = ::open("/dev/null", O_RDONLY);
+    bool ok = devNull >= 0 && ::dup2(devNull, 0) == 0 && ::dup2(launch.logFd, 1) == 1 && ::dup2(launch.logFd, 2) == 2 &&
+              ::dup2(launch.scriptFd, 3) == 3 && ::close_range(4, ~0u, 0) == 0 && ::chdir(launch.workDir) == 0;
+    if (ok && launch.dropPrivileges)
+        ok = ::setgroups(0, nullptr) == 0 && ::setgid(launch.gid) == 0 && ::setuid(launch.uid) == 0;
+    if (ok)
+        ::execve("/bin/sh", launch.argv.data(), launch.envp.data());
+    ::_exit(127);
+}
+
+// The pids in "/proc/self/task/TID/children", read without allocating; 0 ends the list.
+void childrenOf(pid_t self, pid_t (&out)[256])
+{
+    char path[64] = "/proc/self/task/";
+    char digits[16];
+    int n = 0;
+    for (pid_t v = self; v > 0; v /= 10)
+        digits[n++] = static_cast<char>('0' + v % 10);
+    std::size_t at = std::strlen(path);
+    while (n > 0)
+        path[at++] = digits[--n];
+    std::memcpy(path + at, "/children", 10);
+    out[0] = 0;
+    int fd = ::open(path, O_RDONLY | O_CLOEXEC);
+    if (fd < 0)
+        return;
+    char text[4096];
+    ssize_t size = ::read(fd, text, sizeof text - 1);
+    ::close(fd);
+    std::size_t count = 0;
+    pid_t value = 0;
+    for (ssize_t i = 0; i < size && count < 255; ++i) {
+        if (text[i] >= '0' && text[i] <= '9') {
+            value = value * 10 + (text[i] - '0');
+        } else if (value > 0) {
+            out[count++] = value;
+            value = 0;
+        }
+    }
+    out[count] = 0;
+}
+
+// Kills the shell's group and every process still below the supervisor. As a subreaper the
+// supervisor inherits whatever a killed process leaves behind (a `setsid` daemon too), so it
+// repeats until it has no child left.
+void killDescendants(pid_t shell)
+{
+    ::kill(-shell, SIGKILL);
+    pid_t self = ::getpid();
+    for (;;) {
+        pid_t children[256];
+        childrenOf(self, children);
+        for (pid_t* p = children; *p; ++p)
+            ::kill(*p, SIGKILL);
+        if (::waitpid(-1, nullptr, 0) < 0 && errno == ECHILD)
+            return;
+    }
+}
+
+// The job's supervisor: starts the shell, waits for it, then kills everything the job left
+// behind; SIGTERM (an abort, a time-out, the server stopping or dying) kills everything at once.
+// It ends the way the shell did.
+[[noreturn]] void supervise(const Launch& launch)
+{
+    ::setpgid(0, 0);
+    ::prctl(PR_SET_CHILD_SUBREAPER, 1);
+    ::prctl(PR_SET_PDEATHSIG, SIGTERM);
+    sigset_t wanted;
+    sigemptyset(&wanted);
+    sigaddset(&wanted, SIGCHLD);
+    sigaddset(&wanted, SIGTERM);
+    ::sigprocmask(SIG_BLOCK, &wanted, nullptr);
+    pid_t shell = ::fork();
+    if (shell == 0)
+        execShell(launch);
+    int status = 127 << 8;
+    bool ended = shell < 0;
+    while (!ended) {
+        siginfo_t info{};
+        if (::sigwaitinfo(&wanted, &info) < 0)
+            continue;
+        if (info.si_signo == SIGTERM)
+            break;
+        int st = 0;
+        for (pid_t p; (p = ::waitpid(-1, &st, WNOHANG)) > 0;)
+            if (p == shell) {
+                status = st;
+                ended = true;
+            }
+    }
+    if (shell > 0)
+        killDescendants(shell);
+    if (WIFSIGNALED(status)) {
+        ::signal(WTERMSIG(status), SIG_DFL);
+        ::sigprocmask(SIG_UNBLOCK, &wanted, nullptr);
+        ::kill(::getpid(), WTERMSIG(status));
+    }
+    ::_exit(WIFEXITED(status) ? WEXITSTATUS(status) : 127);
+}
+
+}  // namespace
+
 pid_t JobManager::spawn(Job& job, std::string& error)
 {
     UniqueFd logFd(::open(logPath(job.record.id).c_str(), O_WRONLY | O_APPEND | O_CREAT | O_CLOEXEC, 0644));
-    if (!logFd.valid()) {
-        error = std::string("cannot open the job log: ") + std::strerror(errno);
+    UniqueFd scriptFd(::open((job.dir + "/workspace").c_str(), O_RDONLY | O_CLOEXEC));
+    if (!logFd.valid() || !scriptFd.valid()) {
+        error = std::string("cannot open the job log or workspace: ") + std::strerror(errno);
         return 0;
     }
-    posix_spawn_file_actions_t actions;
-    posix_spawnattr_t attr;
-    posix_spawn_file_actions_init(&actions);
-    posix_spawnattr_init(&attr);
     std::string work = job.dir + "/work";
-    posix_spawn_file_actions_addopen(&actions, 0, "/dev/null", O_RDONLY, 0);
-    posix_spawn_file_actions_adddup2(&actions, logFd.get(), 1);
-    posix_spawn_file_actions_adddup2(&actions, logFd.get(), 2);
-    posix_spawn_file_actions_addclosefrom_np(&actions, 3);
-    posix_spawn_file_actions_addchdir_np(&actions, work.c_str());
-    // Its own process group, so an abort reaches everything the workspace started; and the
-    // signal state of a plain process, not the server's (which blocks SIGINT and SIGTERM for
-    // sigwait and ignores SIGPIPE).
-    sigset_t none, defaults;
-    sigemptyset(&none);
-    sigemptyset(&defaults);
-    for (int s : {SIGPIPE, SIGINT, SIGTERM, SIGHUP, SIGQUIT})
-        sigaddset(&defaults, s);
-    posix_spawnattr_setpgroup(&attr, 0);
-    posix_spawnattr_setsigmask(&attr, &none);
-    posix_spawnattr_setsigdefault(&attr, &defaults);
-    posix_spawnattr_setflags(&attr, POSIX_SPAWN_SETPGROUP | POSIX_SPAWN_SETSIGMASK | POSIX_SPAWN_SETSIGDEF);
-    std::string script = job.dir + "/workspace";
-    std::vector<char*> argv = {const_cast<char*>("sh"), script.data(), nullptr};
-    std::vector<char*> envp;
+    Launch launch;
+    launch.argv = {const_cast<char*>("sh"), const_cast<char*>("/dev/fd/3"), nullptr};
     for (auto& entry : job.environment)
-        envp.push_back(entry.data());
-    envp.push_back(nullptr);
-    pid_t pid = 0;
-    int rc = posix_spawn(&pid, "/bin/sh", &actions, &attr, argv.data(), envp.data());
-    posix_spawn_file_actions_destroy(&actions);
-    posix_spawnattr_destroy(&attr);
-    if (rc != 0) {
-        error = std::string("cannot start /bin/sh: ") + std::strerror(rc);
+        launch.envp.push_back(entry.data());
+    launch.envp.push_back(nullptr);
+    launch.logFd = logFd.get();
+    launch.scriptFd = scriptFd.get();
+    launch.workDir = work.c_str();
+    launch.dropPrivileges = jobAccount_.has_value();
+    if (jobAccount_) {
+        launch.uid = jobAccount_->uid;
+        launch.gid = jobAccount_->gid;
+    }
+    pid_t pid = ::fork();
+    if (pid == 0)
+        supervise(launch);
+    if (pid < 0) {
+        error = std::string("cannot start the job: ") + std::strerror(errno);
         return 0;
     }
     return pid;
 }
 
-// Blocks until the process has ended, killing its group when the job time-out passes first; true
-// when it did. The process is left a zombie (WNOWAIT), so its process group id stays taken and
-// the group can still be killed without hitting a stranger that reused the number.
+// Blocks until the supervisor has ended, stopping it when the job time-out passes first; true when
+// it did. The supervisor is left a zombie (WNOWAIT), so its pid stays taken until it is reaped and
+// a signal for it cannot hit a stranger that reused the number.
 bool JobManager::waitForExit(pid_t pid)
 {
     // A pidfd becomes readable when the process ends: no polling interval stands between a job's
@@ -428,7 +557,7 @@ bool JobManager::waitForExit(pid_t pid)
         bool limited = config_.jobTimeoutSeconds && !timedOut;
         if (limited && Clock::now() >= deadline) {
             timedOut = true;
-            ::kill(-pid, SIGKILL);
+            ::kill(pid, SIGTERM);
             continue;
         }
         auto left = std::chrono::duration_cast<std::chrono::milliseconds>(deadline - Clock::now()).count() + 1;
@@ -466,7 +595,7 @@ void JobManager::run(Job& job)
         job.pid = pid;
         // An abort or a stop that came while the process was being started must still reach it.
         if (!job.abortedBy.empty() || stopping_)
-            ::kill(-pid, SIGKILL);
+            ::kill(pid, SIGTERM);
     }
     bool timedOut = waitForExit(pid);
     int status = 0;
@@ -474,8 +603,7 @@ void JobManager::run(Job& job)
     bool stopped;
     {
         std::lock_guard lock(mutex_);
-        // Whatever the workspace left running in its group ends with it.
-        ::kill(-pid, SIGKILL);
+        // The supervisor has killed whatever the workspace left running before it ended.
         ::waitpid(pid, &status, 0);
         job.pid = 0;
         abortedBy = job.abortedBy;
@@ -568,9 +696,25 @@ std::string JobManager::abort(std::int64_t id, const std::string& user)
     }
     job->abortedBy = user;
     if (job->pid > 0)
-        ::kill(-job->pid, SIGKILL);
+        ::kill(job->pid, SIGTERM);
     bool ended = ended_.wait_for(lock, std::chrono::seconds(10), [&] { return !active_.count(id); });
     return ended ? std::string() : "job " + std::to_string(id) + " did not end in time";
+}
+
+std::optional<std::string> JobManager::owner(std::int64_t id)
+{
+    {
+        std::lock_guard lock(mutex_);
+        auto it = active_.find(id);
+        if (it != active_.end())
+            return it->second->user;
+    }
+    std::lock_guard lock(db_.mutex());
+    Statement one(db_, "SELECT user FROM jobs WHERE id = ?");
+    one.bind(1, id);
+    if (!one.step())
+        return std::nullopt;
+    return one.text(0);
 }
 
 std::optional<std::string> JobManager::resultText(std::int64_t id)

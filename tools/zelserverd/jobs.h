@@ -1,5 +1,6 @@
-// Jobs: a workspace run by /bin/sh in its own working directory and process group, on a pool of
-// workers with one queue. Every job is recorded in the database and leaves a log in
+// Jobs: a workspace run by /bin/sh in its own working directory and process group, under a
+// supervisor that kills everything the job started when it ends, on a pool of workers with one
+// queue. Every job is recorded in the database and leaves a log in
 // DATA/jobs/ID/job.log that holds the server's own lines ("zelserverd: ...") and the run's
 // standard output and error. Jobs that a client transacts get their result text delivered on a
 // new connection to the client's result port.
@@ -80,6 +81,8 @@ public:
     // an unknown job.
     std::optional<std::string> resultText(std::int64_t id);
     std::string logPath(std::int64_t id) const;
+    // The user who submitted a job; nullopt for an unknown job.
+    std::optional<std::string> owner(std::int64_t id);
 
 private:
     struct Job;
@@ -103,6 +106,11 @@ private:
     std::condition_variable wake_;   // workers: a job arrived, came due, or stop
     std::condition_variable ended_;  // abort: a job was recorded as ended
     std::map<std::int64_t, std::shared_ptr<Job>> active_;
+    struct JobAccount {
+        uid_t uid;
+        gid_t gid;
+    };
+    std::optional<JobAccount> jobAccount_;  // set when the server runs as root
     std::vector<std::thread> workers_;
     bool stopping_ = false;
 };

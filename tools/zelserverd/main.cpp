@@ -1,62 +1,51 @@
 // zelserverd: the local development server. See docs/zelserverd.md.
+#include <termios.h>
+#include <unistd.h>
+
+#include <CLI/CLI.hpp>
 #include <csignal>
 #include <cstdio>
-#include <cstring>
+#include <iostream>
 #include <string>
 
 #include "server.h"
 
 namespace {
 
-void usage(std::FILE* out)
+// Reads one password line from standard input, without echo on a terminal, and prints its hash.
+int hashPasswordCommand()
 {
-    std::fprintf(out,
-                 "usage: zelserverd --data DIR [--listen HOST:PORT] [--config FILE] [--quiet]\n"
-                 "  --data DIR          state directory (database, repositories, jobs, logs)\n"
-                 "  --listen HOST:PORT  address to bind (default 127.0.0.1:%u; port 0 picks one)\n"
-                 "  --config FILE       users, roles, shared resources, job services, limits\n"
-                 "  --quiet             no log line per command on standard error\n",
-                 static_cast<unsigned>(zelserverd::kDefaultPort));
+    termios saved{};
+    bool terminal = ::isatty(STDIN_FILENO) && ::tcgetattr(STDIN_FILENO, &saved) == 0;
+    if (terminal) {
+        termios quiet = saved;
+        quiet.c_lflag &= ~static_cast<tcflag_t>(ECHO);
+        ::tcsetattr(STDIN_FILENO, TCSANOW, &quiet);
+        std::fprintf(stderr, "password: ");
+    }
+    std::string password;
+    std::getline(std::cin, password);
+    if (terminal) {
+        ::tcsetattr(STDIN_FILENO, TCSANOW, &saved);
+        std::fprintf(stderr, "\n");
+    }
+    if (!password.empty() && password.back() == '\r')
+        password.pop_back();
+    if (password.empty()) {
+        std::fprintf(stderr, "zelserverd: no password given on standard input\n");
+        return 1;
+    }
+    std::string hash = zelserverd::hashPassword(password);
+    if (hash.empty()) {
+        std::fprintf(stderr, "zelserverd: cannot hash the password\n");
+        return 1;
+    }
+    std::printf("%s\n", hash.c_str());
+    return 0;
 }
 
-}  // namespace
-
-int main(int argc, char** argv)
+int serve(const zelserverd::ServerOptions& options)
 {
-    zelserverd::ServerOptions options;
-    for (int i = 1; i < argc; ++i) {
-        std::string arg = argv[i];
-        auto value = [&](std::string& out) {
-            if (i + 1 >= argc)
-                return false;
-            out = argv[++i];
-            return true;
-        };
-        bool ok = true;
-        if (arg == "--data")
-            ok = value(options.dataDir);
-        else if (arg == "--listen")
-            ok = value(options.listen);
-        else if (arg == "--config")
-            ok = value(options.configFile);
-        else if (arg == "--quiet")
-            options.quiet = true;
-        else if (arg == "--help" || arg == "-h") {
-            usage(stdout);
-            return 0;
-        } else
-            ok = false;
-        if (!ok) {
-            std::fprintf(stderr, "zelserverd: bad argument '%s'\n", arg.c_str());
-            usage(stderr);
-            return 2;
-        }
-    }
-    if (options.dataDir.empty()) {
-        usage(stderr);
-        return 2;
-    }
-
     // Signals are taken by sigwait on this thread only: every thread started below inherits the
     // blocked mask, so no handler ever runs in the middle of a command.
     sigset_t signals;
@@ -89,4 +78,31 @@ int main(int argc, char** argv)
     server->stop();
     server->state().log.info("stopped");
     return 0;
+}
+
+}  // namespace
+
+int main(int argc, char** argv)
+{
+    zelserverd::ServerOptions options;
+    CLI::App app{"zelserverd: the local development server (see docs/zelserverd.md)", "zelserverd"};
+    app.set_version_flag("--version", "zelserverd " ZEL_VERSION " (zelserverapi " ZEL_VERSION ")");
+    app.add_option("--data", options.dataDir, "State directory (database, repositories, jobs, logs)");
+    app.add_option("--listen", options.listen, "Address to bind, HOST:PORT (default 127.0.0.1:7071; port 0 picks one)");
+    app.add_option("--config", options.configFile, "Users, roles, shared resources, job services, limits");
+    app.add_flag("--quiet", options.quiet, "No log line per command on standard error");
+    CLI::App* hash = app.add_subcommand(
+        "hash-password", "Read a password on standard input and print the hash to put in the configuration");
+    try {
+        app.parse(argc, argv);
+    } catch (const CLI::ParseError& e) {
+        return app.exit(e) == 0 ? 0 : 2;
+    }
+    if (hash->parsed())
+        return hashPasswordCommand();
+    if (options.dataDir.empty()) {
+        std::fprintf(stderr, "zelserverd: --data DIR is required\n%s", app.help().c_str());
+        return 2;
+    }
+    return serve(options);
 }

@@ -43,12 +43,21 @@ std::string Server::prepare(const ServerOptions& options)
     state_->dataDir = fs::canonical(options.dataDir, ec).string();
     if (ec)
         return "cannot resolve data directory '" + options.dataDir + "': " + ec.message();
+    // The database, the stored files, the job folders and the administrator's password are the
+    // server's alone: nobody else, jobs included, may look inside.
+    if (::chmod(state_->dataDir.c_str(), 0700) != 0)
+        return "cannot restrict data directory '" + state_->dataDir + "': " + std::strerror(errno);
 
     Config& config = state_->config;
     std::string error =
         options.configFile.empty() ? prepareDefaultConfig() : loadConfigFile(options.configFile, config);
     if (!error.empty())
         return error;
+    for (const auto& user : config.users)
+        if (!isPasswordHash(user.password))
+            state_->log.info("warning: user '" + user.name +
+                             "' has a plain-text password in the configuration; put the output of "
+                             "'zelserverd hash-password' there instead");
     if (!options.listen.empty() && !splitHostPort(options.listen, config.listenHost, config.listenPort))
         return "bad --listen address '" + options.listen + "' (expected HOST:PORT)";
     for (const auto& area : config.sharedResources) {
@@ -86,11 +95,28 @@ std::string Server::prepare(const ServerOptions& options)
     return {};
 }
 
+namespace {
+
+// Writes a new file that only the server's account may read, replacing an older one.
+std::string writePrivateFile(const std::string& path, const std::string& content)
+{
+    ::unlink(path.c_str());
+    UniqueFd fd(::open(path.c_str(), O_WRONLY | O_CREAT | O_EXCL | O_CLOEXEC, 0600));
+    if (!fd.valid() || ::write(fd.get(), content.data(), content.size()) != static_cast<ssize_t>(content.size()) ||
+        ::fsync(fd.get()) != 0)
+        return "cannot write '" + path + "': " + std::strerror(errno);
+    return {};
+}
+
+}  // namespace
+
 std::string Server::prepareDefaultConfig()
 {
-    // Without a configuration there is one administrator whose password is generated once and
-    // kept, readable by the owner only, in the data directory. There is no built-in password.
+    // Without a configuration there is one administrator whose password is generated once. Its
+    // plain text goes to the owner's file only (mode 0600, in the data directory that jobs cannot
+    // reach); the server keeps and checks a hash. There is no built-in password.
     std::string path = state_->dataDir + "/" + std::string(kAdminPasswordFile);
+    std::string hashPath = path + ".hash";
     std::string password;
     std::ifstream existing(path);
     if (existing) {
@@ -102,12 +128,22 @@ std::string Server::prepareDefaultConfig()
         password = randomHex(12);
         if (password.empty())
             return "cannot read random bytes for the administrator password";
-        UniqueFd fd(::open(path.c_str(), O_WRONLY | O_CREAT | O_EXCL | O_CLOEXEC, 0600));
-        std::string line = password + "\n";
-        if (!fd.valid() || ::write(fd.get(), line.data(), line.size()) != static_cast<ssize_t>(line.size()))
-            return "cannot write '" + path + "': " + std::strerror(errno);
+        std::string error = writePrivateFile(path, password + "\n");
+        if (!error.empty())
+            return error;
+        ::unlink(hashPath.c_str());
         generatedPassword_ = password;
     }
+    std::string hash;
+    std::ifstream stored(hashPath);
+    if (!stored || !std::getline(stored, hash) || !passwordMatches(hash, password)) {
+        hash = hashPassword(password);
+        std::string error =
+            hash.empty() ? "cannot hash the administrator password" : writePrivateFile(hashPath, hash + "\n");
+        if (!error.empty())
+            return error;
+    }
+    password = hash;
     Config& config = state_->config;
     config.users.push_back(UserConfig{"admin", password, {"admin"}});
     config.sharedResources.push_back(SharedResourceConfig{std::string(kDefaultSharedResource),

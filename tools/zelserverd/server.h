@@ -22,7 +22,8 @@
 
 namespace zelserverd {
 
-constexpr std::string_view kServerVersion = "0.1.0";
+// The server is released with the library and carries its version.
+constexpr std::string_view kServerVersion = ZEL_VERSION;
 constexpr std::string_view kAdminPasswordFile = "admin-password";
 // How long stop() lets connections finish the reply they are writing.
 constexpr std::chrono::seconds kStopGrace{2};

@@ -125,6 +125,12 @@ std::optional<Reply> resolveJob(CommandContext& context, std::int64_t& id)
     if (!value || *value < INT32_MIN || *value > static_cast<std::int64_t>(UINT32_MAX))
         return Reply::error("bad job id '" + *text + "'");
     id = static_cast<std::int64_t>(static_cast<std::uint32_t>(*value));
+    // A job, its log and its result are its owner's; "jobs.admin" reaches everyone's.
+    const Principal& principal = context.principal();
+    std::optional<std::string> owner = context.server.jobs->owner(id);
+    if (owner && *owner != principal.user && !(principal.rights & kRightJobsAdmin))
+        return Reply::authorization("user '" + principal.user + "' may not reach job " + std::to_string(id) +
+                                    " of user '" + *owner + "'");
     return std::nullopt;
 }
 
