@@ -5,6 +5,7 @@
 
 #include <filesystem>
 #include <fstream>
+#include <thread>
 
 #include "auth.h"
 #include "support/server_fixture.h"
@@ -85,6 +86,41 @@ TEST_F(Isolation, JobsOfARootServerCannotReadOrWriteTheServersFiles)
     EXPECT_EQ(waitForEnd(id)["result"], "5:workspace exited with status 5");
     EXPECT_NE(readFile(dataDir_ + "/jobs/" + std::to_string(id) + "/work/uid.txt"), "0\n");
     EXPECT_FALSE(std::filesystem::exists(dataDir_ + "/intruder"));
+}
+
+TEST_F(Isolation, RepeatedSignInFailuresLockTheAccountAndTheAddressForAWhile)
+{
+    TestClient client;
+    ASSERT_TRUE(client.connect(port()));
+    for (int i = 0; i < 6; ++i)
+        EXPECT_EQ(client.signIn("ann", "guess").body, "Authentication Error: invalid user name or password") << i;
+    for (const char* user : {"ann", "vic"})
+        EXPECT_EQ(client.signIn(user, std::string(user) + "pw").body,
+                  "Authentication Error: too many failed sign-ins for this account or from this address; try "
+                  "again in 1 seconds");
+    std::this_thread::sleep_for(std::chrono::milliseconds(1100));
+    EXPECT_TRUE(client.signIn("ann", "annpw").ok());
+    EXPECT_TRUE(client.signIn("vic", "vicpw").ok());
+}
+
+TEST_F(Isolation, TemporariesStayInTheServersOwnFolderAndAreSweptAtStart)
+{
+    using namespace std::string_literals;
+    writeFile(areaDir_ + "/.zelserverd-notes", "a user's own file");
+    auto ann = connectAs("ann");
+    ASSERT_TRUE(ann->sendFrame(requestPayload("SR_UPLOAD", {{"srName", "AREA"}, {"srDestPath", pathDocument("u")}})));
+    ASSERT_EQ(splitReply(ann->readFrame().value_or("")).body, "ready_to_transfer");
+    ASSERT_TRUE(ann->sendFrame("fileLength=100\0fileCRC=0"s));
+    ASSERT_EQ(splitReply(ann->readFrame().value_or("")).body, "ready_to_transfer");
+    ASSERT_TRUE(ann->sendRaw("partial"));
+    EXPECT_EQ(entriesOf(areaDir_), std::vector<std::string>{".zelserverd-notes"});
+    EXPECT_EQ(entriesOf(dataDir_ + "/tmp").size(), 1u);
+    WireReply listed = connectAs("vic")->command("SR_LIST", {{"srName", "AREA"}, {"srPath", pathDocument("")}});
+    EXPECT_NE(listed.body.find("name=\".zelserverd-notes\""), std::string::npos) << listed.body;
+    writeFile(dataDir_ + "/tmp/.zelserverd-crashed", "left by a crash");
+    ann.reset();
+    startServer();
+    EXPECT_TRUE(entriesOf(dataDir_ + "/tmp").empty());
 }
 
 TEST(Passwords, HashesAreCheckedPlainTextStaysAcceptedAndNothingElseMatches)

@@ -2,7 +2,9 @@
 
 #include <crypt.h>
 
+#include <algorithm>
 #include <array>
+#include <chrono>
 #include <memory>
 #include <utility>
 
@@ -89,17 +91,88 @@ std::uint32_t rightsOfRoles(const Config& config, const std::vector<std::string>
     return rights;
 }
 
-SignInOutcome Authenticator::signIn(const Request& request, const std::string& peer) const
+namespace {
+
+std::int64_t steadyMs()
 {
-    if (const std::string* token = request.find("userToken"))
-        return withToken(*token, peer);
-    if (const std::string* sso = request.find("ssoAuthData"))
-        return withSingleSignOn(*sso);
+    return std::chrono::duration_cast<std::chrono::milliseconds>(std::chrono::steady_clock::now().time_since_epoch())
+        .count();
+}
+
+}  // namespace
+
+std::int64_t SignInThrottle::lockedFor(const std::string& account, const std::string& address)
+{
+    std::lock_guard lock(mutex_);
+    std::int64_t now = steadyMs();
+    std::int64_t left = 0;
+    for (const std::string& key : {"user:" + account, "address:" + address}) {
+        auto it = entries_.find(key);
+        if (it != entries_.end())
+            left = std::max(left, it->second.lockedUntil - now);
+    }
+    return (left + 999) / 1000;
+}
+
+void SignInThrottle::failed(const std::string& account, const std::string& address)
+{
+    std::lock_guard lock(mutex_);
+    std::int64_t now = steadyMs();
+    if (!account.empty())
+        fail("user:" + account, now);
+    fail("address:" + address, now);
+}
+
+void SignInThrottle::succeeded(const std::string& account, const std::string& address)
+{
+    std::lock_guard lock(mutex_);
+    entries_.erase("user:" + account);
+    entries_.erase("address:" + address);
+}
+
+void SignInThrottle::fail(const std::string& key, std::int64_t now)
+{
+    if (!entries_.count(key))
+        makeRoom(now);
+    Entry& entry = entries_[key];
+    entry.last = now;
+    if (++entry.failures > kFreeFailures) {
+        unsigned doublings = std::min(entry.failures - kFreeFailures - 1, 6u);
+        entry.lockedUntil = now + 1000 * std::min<std::int64_t>(std::int64_t{1} << doublings, kMaxLockSeconds);
+    }
+}
+
+void SignInThrottle::makeRoom(std::int64_t now)
+{
+    if (entries_.size() < kMaxKeys)
+        return;
+    std::erase_if(entries_, [&](const auto& item) { return item.second.lockedUntil <= now; });
+    while (entries_.size() >= kMaxKeys)
+        entries_.erase(std::min_element(entries_.begin(), entries_.end(),
+                                        [](const auto& a, const auto& b) { return a.second.last < b.second.last; }));
+}
+
+SignInOutcome Authenticator::signIn(const Request& request, const std::string& peer)
+{
     const std::string* user = request.find("userID");
-    const std::string* password = request.find("userPassword");
-    if (!user || !password)
+    std::string account = user ? *user : std::string();
+    if (std::int64_t left = throttle_.lockedFor(account, peer))
+        return {std::nullopt, "too many failed sign-ins for this account or from this address; try again in " +
+                                  std::to_string(left) + " seconds"};
+    SignInOutcome outcome;
+    if (const std::string* token = request.find("userToken"))
+        outcome = withToken(*token, peer);
+    else if (const std::string* sso = request.find("ssoAuthData"))
+        outcome = withSingleSignOn(*sso);
+    else if (!user || !request.find("userPassword"))
         return {std::nullopt, "no credentials were given"};
-    return withPassword(*user, *password);
+    else
+        outcome = withPassword(*user, *request.find("userPassword"));
+    if (outcome.principal)
+        throttle_.succeeded(outcome.principal->user, peer);
+    else
+        throttle_.failed(account, peer);
+    return outcome;
 }
 
 Principal Authenticator::principalFor(const UserConfig& user) const

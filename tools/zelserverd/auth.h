@@ -4,6 +4,8 @@
 #pragma once
 
 #include <cstdint>
+#include <map>
+#include <mutex>
 #include <optional>
 #include <string>
 #include <string_view>
@@ -55,10 +57,39 @@ struct SignInOutcome {
     std::string error;  // without the "Authentication Error: " prefix
 };
 
+// Failed sign-ins per account and per client address. After kFreeFailures failures in a row a
+// key is locked, first for one second, doubling with each further failure up to kMaxLockSeconds;
+// while either key of an attempt is locked the attempt is refused unchecked. A success clears
+// both keys. At most kMaxKeys keys are kept: past that the ones whose lock ran out go first, then
+// the oldest.
+class SignInThrottle {
+public:
+    static constexpr unsigned kFreeFailures = 5;
+    static constexpr std::int64_t kMaxLockSeconds = 60;
+    static constexpr std::size_t kMaxKeys = 4096;
+
+    // Seconds left on the lock of either key, 0 when the attempt may go ahead.
+    std::int64_t lockedFor(const std::string& account, const std::string& address);
+    void failed(const std::string& account, const std::string& address);
+    void succeeded(const std::string& account, const std::string& address);
+
+private:
+    struct Entry {
+        unsigned failures = 0;
+        std::int64_t lockedUntil = 0;  // steady clock, milliseconds
+        std::int64_t last = 0;
+    };
+    void fail(const std::string& key, std::int64_t now);
+    void makeRoom(std::int64_t now);
+
+    std::mutex mutex_;
+    std::map<std::string, Entry> entries_;
+};
+
 class Authenticator {
 public:
     Authenticator(const Config& config, TokenStore* tokens) : config_(config), tokens_(tokens) {}
-    SignInOutcome signIn(const Request& request, const std::string& peerAddress) const;
+    SignInOutcome signIn(const Request& request, const std::string& peerAddress);
 
 private:
     SignInOutcome withPassword(const std::string& user, const std::string& password) const;
@@ -68,6 +99,7 @@ private:
 
     const Config& config_;
     TokenStore* tokens_;
+    SignInThrottle throttle_;
 };
 
 }  // namespace zelserverd

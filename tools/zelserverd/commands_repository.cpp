@@ -106,7 +106,7 @@ Reply putItem(CommandContext& context, const Target& t, bool replace)
                             "'");
     bool checkCrc = context.request.get("itemFileCRCCheckingEnabled") == "true";
     UploadResult upload =
-        receiveUpload(context.io, context.server.repos.dir(), checkCrc, context.server.config.maxFileBytes);
+        receiveUpload(context.io, context.server.tempDir, checkCrc, context.server.config.maxFileBytes);
     if (upload.outcome == TransferOutcome::Lost)
         return Reply::close();
     if (upload.outcome == TransferOutcome::Refused)
@@ -168,7 +168,7 @@ Reply putResource(CommandContext& context, const Target& t, bool replace)
                             item.name + "'");
     bool checkCrc = context.request.get("resourceFileCRCCheckingEnabled") == "true";
     UploadResult upload =
-        receiveUpload(context.io, context.server.repos.dir(), checkCrc, context.server.config.maxFileBytes);
+        receiveUpload(context.io, context.server.tempDir, checkCrc, context.server.config.maxFileBytes);
     if (upload.outcome == TransferOutcome::Lost)
         return Reply::close();
     if (upload.outcome == TransferOutcome::Refused)

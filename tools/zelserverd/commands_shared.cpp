@@ -121,11 +121,8 @@ Reply list(CommandContext& context, const Target& t)
         return Reply::error("'" + path.relative + "' is not a directory");
     std::error_code ec;
     std::vector<std::string> names;
-    for (const auto& entry : fs::directory_iterator(path.full, ec)) {
-        std::string name = entry.path().filename().string();
-        if (name.rfind(kTempPrefix, 0) != 0)
-            names.push_back(name);
-    }
+    for (const auto& entry : fs::directory_iterator(path.full, ec))
+        names.push_back(entry.path().filename().string());
     if (ec)
         return Reply::error("cannot list '" + path.relative + "': " + ec.message());
     std::sort(names.begin(), names.end());
@@ -181,7 +178,7 @@ Reply copyFile(const std::string& from, const std::string& to, const std::string
     return error.empty() ? Reply::ok() : Reply::error(error);
 }
 
-Reply copyOrMove(const Target& t, bool move)
+Reply copyOrMove(CommandContext& context, const Target& t, bool move)
 {
     const AreaPath& source = t.source;
     const AreaPath& destination = t.destination;
@@ -200,7 +197,7 @@ Reply copyOrMove(const Target& t, bool move)
         return Reply::ok();
     }
     if (S_ISREG(info.st_mode))
-        return copyFile(source.full, destination.full, parent);
+        return copyFile(source.full, destination.full, context.server.tempDir);
     std::error_code ec;
     if (fs::exists(destination.full))
         return Reply::error("'" + destination.relative + "' already exists");
@@ -212,8 +209,8 @@ Reply copyOrMove(const Target& t, bool move)
     return Reply::ok();
 }
 
-Reply copy(CommandContext&, const Target& t) { return copyOrMove(t, false); }
-Reply move(CommandContext&, const Target& t) { return copyOrMove(t, true); }
+Reply copy(CommandContext& context, const Target& t) { return copyOrMove(context, t, false); }
+Reply move(CommandContext& context, const Target& t) { return copyOrMove(context, t, true); }
 
 Reply upload(CommandContext& context, const Target& t)
 {
@@ -224,7 +221,8 @@ Reply upload(CommandContext& context, const Target& t)
     if (statPath(t.destination, info) && S_ISDIR(info.st_mode))
         return Reply::error("'" + t.destination.relative + "' is a directory");
     bool checkCrc = context.request.get("itemFileCRCCheckingEnabled") == "true";
-    UploadResult result = receiveUpload(context.io, parent, checkCrc, context.server.config.maxFileBytes);
+    UploadResult result =
+        receiveUpload(context.io, context.server.tempDir, checkCrc, context.server.config.maxFileBytes);
     if (result.outcome == TransferOutcome::Lost)
         return Reply::close();
     if (result.outcome == TransferOutcome::Refused)

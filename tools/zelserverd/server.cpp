@@ -48,6 +48,12 @@ std::string Server::prepare(const ServerOptions& options)
     if (::chmod(state_->dataDir.c_str(), 0700) != 0)
         return "cannot restrict data directory '" + state_->dataDir + "': " + std::strerror(errno);
 
+    // Temporaries live apart from everyone's files; what a crash left there is swept now.
+    state_->tempDir = state_->dataDir + "/tmp";
+    fs::remove_all(state_->tempDir, ec);
+    if (!fs::create_directory(state_->tempDir, ec))
+        return "cannot create '" + state_->tempDir + "': " + ec.message();
+
     Config& config = state_->config;
     std::string error =
         options.configFile.empty() ? prepareDefaultConfig() : loadConfigFile(options.configFile, config);

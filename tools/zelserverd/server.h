@@ -43,6 +43,7 @@ struct ServerState {
     {}
 
     std::string dataDir;
+    std::string tempDir;  // DATA/tmp: every upload and copy is received here, emptied at start
     Config config;
     Logger log;
     Database db;

@@ -57,11 +57,38 @@ std::string TempFile::commit(const std::string& destination)
     if (::fsync(fd_.get()) != 0)
         return std::string("cannot flush file: ") + std::strerror(errno);
     ::fchmod(fd_.get(), 0644);
-    if (::rename(path_.c_str(), destination.c_str()) != 0)
+    bool moved = ::rename(path_.c_str(), destination.c_str()) == 0;
+    if (!moved && !(errno == EXDEV && copyInto(destination)))
         return "cannot move file into place: " + std::string(std::strerror(errno));
-    fd_.reset();
-    path_.clear();
+    if (moved)
+        path_.clear();
+    discard();  // removes the temporary only when it was copied rather than moved
+    // The rename is durable only once the directory is on disk too; until then a power loss could
+    // lose an acknowledged file.
+    std::string dir = destination.substr(0, destination.rfind('/') + 1);
+    UniqueFd dirFd(::open(dir.empty() ? "." : dir.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC));
+    if (!dirFd.valid() || ::fsync(dirFd.get()) != 0)
+        return "cannot flush directory: " + std::string(std::strerror(errno));
     return {};
+}
+
+// A destination on another file system than the temporaries (a shared resource mounted elsewhere)
+// gets the content copied into a second temporary beside it, then renamed: still all or nothing.
+bool TempFile::copyInto(const std::string& destination)
+{
+    TempFile beside;
+    std::string dir = destination.substr(0, destination.rfind('/') + 1);
+    if (!beside.create(dir.empty() ? "." : dir).empty())
+        return false;
+    char buffer[65536];
+    off_t offset = 0;
+    for (ssize_t n; (n = ::pread(fd_.get(), buffer, sizeof buffer, offset)) != 0; offset += n)
+        if (n < 0 || ::write(beside.fd(), buffer, static_cast<std::size_t>(n)) != n)
+            return false;
+    int saved = errno;
+    bool ok = beside.commit(destination).empty();
+    errno = saved;
+    return ok;
 }
 
 void TempFile::discard()

@@ -1,8 +1,9 @@
 // File transfers alongside a command, from the server's side:
 //   upload:   C request; S ack; C file header; S ack; C raw content; S reply
 //   download: C request; S file header; C ack; S raw content; C ack; S reply
-// Received content always lands in a temporary file beside its destination and is renamed into
-// place only when complete and checked, so a failed or abandoned upload leaves nothing behind.
+// Received content always lands in a temporary file in the server's own folder for them and is
+// renamed into place only when complete and checked, so a failed or abandoned upload leaves
+// nothing behind among anyone's files.
 #pragma once
 
 #include <cstdint>
@@ -31,11 +32,13 @@ public:
     void discard();
 
 private:
+    bool copyInto(const std::string& destination);
+
     UniqueFd fd_;
     std::string path_;
 };
 
-// Names of temporary files start with this, so listings can leave them out.
+// Names of temporary files start with this.
 constexpr std::string_view kTempPrefix = ".zelserverd-";
 
 enum class TransferOutcome { Ok, Refused, Lost };
