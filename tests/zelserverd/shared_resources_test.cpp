@@ -94,8 +94,6 @@ TEST_F(Shared, UploadDownloadAndDescribe)
 
     EXPECT_EQ(withoutTimes(onPath("SR_GET", "in/deep/data.bin").body),
               document("<SR_GET>" + fileInfo("FILE", "300000", "data.bin", "in/deep") + "</SR_GET>"));
-    // Files being received have a temporary name and are not listed.
-    writeFile(areaDir_ + "/in/.zelserverd-partial", "x");
     EXPECT_EQ(withoutTimes(onPath("SR_LIST", "in").body),
               document("<SR_LIST>" + fileInfo("DIR", "0", "deep", "in") + "</SR_LIST>"));
     EXPECT_EQ(onPath("SR_LIST", "in/deep/data.bin").body, "'in/deep/data.bin' is not a directory");
