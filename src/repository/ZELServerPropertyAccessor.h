@@ -13,7 +13,7 @@
 
 #include "api/heap.h"
 #include "transport/IZELServerRequest.h"
-#include "transport/xml_element.h"
+#include "transport/xml_document.h"
 
 namespace zel {
 

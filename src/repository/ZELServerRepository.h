@@ -9,7 +9,7 @@
 #include "api/heap.h"
 #include "repository/repository_checks.h"
 #include "transport/IZELServerChannel.h"
-#include "transport/xml_element.h"
+#include "transport/xml_document.h"
 
 namespace zel {
 

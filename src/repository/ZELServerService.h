@@ -13,7 +13,7 @@
 #include "repository/repository_objects.h"
 #include "transport/IZELServerChannel.h"
 #include "transport/payload_fields.h"
-#include "transport/xml_element.h"
+#include "transport/xml_document.h"
 
 namespace zel {
 

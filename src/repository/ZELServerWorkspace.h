@@ -19,7 +19,7 @@
 #include "repository/ZELServerPropertyAccessor.h"
 #include "repository/repository_objects.h"
 #include "transport/IZELServerChannel.h"
-#include "transport/xml_element.h"
+#include "transport/xml_document.h"
 
 namespace zel {
 

@@ -19,7 +19,7 @@
 #include <zelserverapi/IZELServerWorkspaceSummary.h>
 
 #include "api/heap.h"
-#include "transport/xml_element.h"
+#include "transport/xml_document.h"
 
 namespace zel {
 

@@ -5,9 +5,7 @@
 #include "api/message_numbers.h"
 #include "transport/attribute_binding.h"
 #include "transport/xml_document.h"
-#include "transport/xml_element.h"
 #include "transport/xml_navigation.h"
-#include "transport/xml_node_list.h"
 
 namespace zel {
 namespace {

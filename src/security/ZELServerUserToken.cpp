@@ -5,7 +5,7 @@
 #include "api/ZELServerString.h"
 #include "transport/attribute_binding.h"
 #include "transport/object_reader.h"
-#include "transport/xml_element.h"
+#include "transport/xml_document.h"
 
 namespace zel {
 namespace {

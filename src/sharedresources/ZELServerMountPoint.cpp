@@ -16,9 +16,8 @@
 #include "transport/LocalFile.h"
 #include "transport/attribute_binding.h"
 #include "transport/checked_command.h"
-#include "transport/xml_element.h"
+#include "transport/xml_document.h"
 #include "transport/xml_navigation.h"
-#include "transport/xml_node_list.h"
 
 namespace zel {
 namespace {

@@ -13,7 +13,7 @@
 #include "api/text_encoding.h"
 #include "security/ZELServerIdentity.h"
 #include "transport/payload_fields.h"
-#include "transport/xml_element.h"
+#include "transport/xml_document.h"
 
 namespace zel {
 namespace {

@@ -22,7 +22,7 @@
 #include <type_traits>
 #include <variant>
 
-#include "transport/xml_element.h"
+#include "transport/xml_document.h"
 
 namespace zel {
 

@@ -15,7 +15,7 @@
 #include <zelserverapi/IZELServerVector.h>
 
 #include "api/message_numbers.h"
-#include "transport/xml_element.h"
+#include "transport/xml_document.h"
 #include "transport/xml_navigation.h"
 #include "transport/xml_reader.h"
 

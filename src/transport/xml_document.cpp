@@ -1,21 +1,111 @@
 #include "transport/xml_document.h"
 
 #include <memory>
+#include <new>
 
 #include <xercesc/dom/DOMConfiguration.hpp>
+#include <xercesc/dom/DOMDocument.hpp>
 #include <xercesc/dom/DOMImplementationLS.hpp>
 #include <xercesc/dom/DOMImplementationRegistry.hpp>
 #include <xercesc/dom/DOMLSOutput.hpp>
 #include <xercesc/dom/DOMLSSerializer.hpp>
+#include <xercesc/dom/DOMText.hpp>
 #include <xercesc/framework/MemBufFormatTarget.hpp>
 #include <xercesc/util/XMLUni.hpp>
 
 #include "api/message_numbers.h"
 #include "api/status.h"
-#include "transport/xml_exception.h"
+#include "api/text_encoding.h"
+#include "transport/xml_platform.h"
 #include "transport/xml_transcode.h"
 
 namespace zel {
+
+std::string XmlElement::name() const { return toUtf8(node_->getTagName()); }
+
+bool XmlElement::setAttribute(std::string_view name, std::string_view value)
+{
+    const XmlText xmlName(name);
+    const XmlText xmlValue(value);
+    if (!xmlName.valid() || !xmlValue.valid()) {
+        return false;
+    }
+    try {
+        node_->setAttribute(xmlName.get(), xmlValue.get());
+        return true;
+    } catch (...) {  // a DOM exception for an illegal name, or the library out of memory
+        return false;
+    }
+}
+
+bool XmlElement::setAttributeLocal(std::string_view name, std::string_view localValue)
+{
+    return setAttribute(name, latin1ToUtf8(localValue));
+}
+
+bool XmlElement::appendChild(XmlElement* child)
+{
+    if (child == nullptr) {
+        return false;
+    }
+    try {
+        node_->appendChild(child->node_);
+        return true;
+    } catch (...) {  // wrong document, or the child is an ancestor
+        return false;
+    }
+}
+
+bool XmlElement::appendText(std::string_view text)
+{
+    const XmlText xmlText(text);
+    if (!xmlText.valid()) {
+        return false;
+    }
+    try {
+        node_->appendChild(node_->getOwnerDocument()->createTextNode(xmlText.get()));
+        return true;
+    } catch (...) {
+        return false;
+    }
+}
+
+ZELServerDOMNodeList::~ZELServerDOMNodeList() { clear(); }
+
+void ZELServerDOMNodeList::clear() noexcept
+{
+    while (!wrappers_.empty()) {
+        delete wrappers_.back();
+        wrappers_.pop_back();
+    }
+    byNode_.clear();
+}
+
+XmlElement* ZELServerDOMNodeList::wrap(xercesc::DOMElement* node) noexcept
+{
+    if (node == nullptr) {
+        return nullptr;
+    }
+    if (auto found = byNode_.find(node); found != byNode_.end()) {
+        return found->second;
+    }
+    auto* wrapper = new XmlElement(node, *this);
+    if (wrapper == nullptr) {
+        return nullptr;
+    }
+    try {
+        wrappers_.push_back(wrapper);
+        byNode_.emplace(node, wrapper);
+    } catch (const std::bad_alloc&) {
+        if (!wrappers_.empty() && wrappers_.back() == wrapper) {
+            wrappers_.pop_back();
+        }
+        delete wrapper;
+        return nullptr;
+    }
+    return wrapper;
+}
+
 namespace {
 
 constexpr XMLCh kCoreFeature[] = {'C', 'o', 'r', 'e', 0};

@@ -1,27 +1,82 @@
 #pragma once
-// XmlDocument: builds one XML document at a time and serialises it into a byte string. Every
-// request payload (identity, job parameters, repositories, services, tokens, paths) is built here.
-//
-// Use: startXml() once, then createDocument(), createElement() / XmlElement operations, serialize(),
-// releaseDocument() (or just destroy the object). The element handles handed out are owned by the
-// document and die when the DOM document is released.
-//
-// The object holds its own reference to the XML library (xml_platform.h) from startXml() until it is
-// destroyed.
+// The DOM side both directions share and the writer: XmlElement, a non-owning handle to one DOM
+// element; ZELServerDOMNodeList, the owning list of the handles given out for one document; and
+// XmlDocument, which builds one document at a time and serialises it into a byte string (every
+// request payload is built here). Names and values are UTF-8 byte strings.
 
+#include <cstddef>
 #include <string>
 #include <string_view>
+#include <unordered_map>
+#include <vector>
 
 #include <xercesc/dom/DOMDocument.hpp>
+#include <xercesc/dom/DOMElement.hpp>
 #include <xercesc/dom/DOMImplementation.hpp>
 #include <zelserverapi/IZELServerStatus.h>
 
 #include "api/heap.h"
-#include "transport/xml_element.h"
-#include "transport/xml_node_list.h"
 #include "transport/xml_platform.h"
 
 namespace zel {
+
+class ZELServerDOMNodeList;
+
+class XmlElement : public HeapObject {
+public:
+    XmlElement(const XmlElement&) = delete;
+    XmlElement& operator=(const XmlElement&) = delete;
+
+    xercesc::DOMElement* node() const noexcept { return node_; }
+    // The list that owns this handle; handles of related elements (children, descendants) go there.
+    ZELServerDOMNodeList& owner() const noexcept { return *owner_; }
+
+    // The tag name as written.
+    std::string name() const;
+
+    // Sets (or replaces) an attribute. False, with the element unchanged, when the name is not a
+    // legal XML name or either text is not valid UTF-8 or holds a NUL.
+    bool setAttribute(std::string_view name, std::string_view value);
+    // Same with a value in the local single-byte encoding (Latin-1), converted to UTF-8 first.
+    bool setAttributeLocal(std::string_view name, std::string_view localValue);
+    // Appends `child` as the last child. A null child is ignored (false), as is a child of another
+    // document or one that would make a cycle.
+    bool appendChild(XmlElement* child);
+    // Appends a text node. False when the text is not valid UTF-8 or holds a NUL.
+    bool appendText(std::string_view text);
+
+private:
+    friend class ZELServerDOMNodeList;
+    XmlElement(xercesc::DOMElement* node, ZELServerDOMNodeList& owner) noexcept : node_(node), owner_(&owner) {}
+
+    xercesc::DOMElement* node_;
+    ZELServerDOMNodeList* owner_;
+};
+
+class XmlElement;
+
+class ZELServerDOMNodeList : public HeapObject {
+public:
+    ZELServerDOMNodeList() = default;
+    // Slot 0: clears, then frees the list.
+    virtual ~ZELServerDOMNodeList();
+    // Slot 1: deletes the wrappers, last first, until the list is empty.
+    virtual void clear() noexcept;
+
+    ZELServerDOMNodeList(const ZELServerDOMNodeList&) = delete;
+    ZELServerDOMNodeList& operator=(const ZELServerDOMNodeList&) = delete;
+
+    // The wrapper of `node`, owned by this list; a node wrapped before gets the same wrapper again.
+    // Null for a null node or when memory is exhausted.
+    XmlElement* wrap(xercesc::DOMElement* node) noexcept;
+
+    std::size_t size() const noexcept { return wrappers_.size(); }
+
+private:
+    std::vector<XmlElement*> wrappers_;
+    // Walking a large reply more than once must not multiply the wrappers.
+    std::unordered_map<const xercesc::DOMElement*, XmlElement*> byNode_;
+};
 
 class XmlDocument : public HeapObject {
 public:

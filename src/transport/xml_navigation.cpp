@@ -5,7 +5,7 @@
 #include <xercesc/dom/DOMNode.hpp>
 #include <xercesc/util/XMLString.hpp>
 
-#include "transport/xml_node_list.h"
+#include "transport/xml_document.h"
 #include "transport/xml_transcode.h"
 
 namespace zel {

@@ -1,14 +1,14 @@
 #pragma once
 // Reading helpers over parsed (or built) elements. Every helper accepts a null element and then finds
 // nothing. Element handles they return belong to the same owner as the element they start from
-// (see xml_element.h). Names and values are UTF-8 byte strings. Walks are iterative, so deeply
+// (see xml_document.h). Names and values are UTF-8 byte strings. Walks are iterative, so deeply
 // nested hostile replies cannot exhaust the stack.
 
 #include <string>
 #include <string_view>
 #include <vector>
 
-#include "transport/xml_element.h"
+#include "transport/xml_document.h"
 
 namespace zel {
 

@@ -1,16 +1,23 @@
 #include "transport/xml_platform.h"
 
+#include <exception>
 #include <mutex>
 #include <string>
 #include <utility>
 
+#include <xercesc/dom/DOMException.hpp>
+#include <xercesc/dom/DOMLSException.hpp>
+#include <xercesc/sax/SAXException.hpp>
+#include <xercesc/util/OutOfMemoryException.hpp>
 #include <xercesc/util/PlatformUtils.hpp>
 #include <xercesc/util/XMLException.hpp>
 
 #include "api/message_numbers.h"
 #include "api/status.h"
+#include "transport/xml_transcode.h"
 
 namespace zel {
+
 namespace {
 
 struct PlatformState {
@@ -120,6 +127,25 @@ void XmlPlatformRef::reset() noexcept
 {
     if (std::exchange(held_, false)) {
         XmlPlatform::release();
+    }
+}
+
+std::string currentXmlExceptionMessage()
+{
+    try {
+        throw;
+    } catch (const xercesc::OutOfMemoryException&) {
+        return "Out of memory";
+    } catch (const xercesc::XMLException& e) {
+        return toUtf8(e.getMessage());
+    } catch (const xercesc::DOMException& e) {  // DOMLSException too
+        return toUtf8(e.getMessage());
+    } catch (const xercesc::SAXException& e) {
+        return toUtf8(e.getMessage());
+    } catch (const std::exception& e) {
+        return e.what();
+    } catch (...) {
+        return "Unknown XML library failure";
     }
 }
 

@@ -11,6 +11,8 @@
 // XmlPlatformRef for its whole life; the documents and readers that each request and reply make take
 // their own references too, which is then cheap and keeps them valid should the session go first.
 
+#include <string>
+
 #include <zelserverapi/IZELServerStatus.h>
 
 namespace zel {
@@ -52,5 +54,9 @@ public:
 private:
     bool held_ = false;
 };
+
+// Call only inside a catch block. Gives the library's own message (DOM, parse, transcoding, I/O or
+// out-of-memory exceptions), the what() of a standard exception, or a fixed text for anything else.
+std::string currentXmlExceptionMessage();
 
 }  // namespace zel

@@ -3,15 +3,46 @@
 #include <atomic>
 #include <cstdint>
 #include <limits>
+#include <string>
 
 #include <xercesc/dom/DOMDocument.hpp>
 #include <xercesc/util/PlatformUtils.hpp>
 
 #include "api/message_numbers.h"
 #include "api/status.h"
-#include "transport/xml_exception.h"
+#include "transport/xml_transcode.h"
 
 namespace zel {
+
+xercesc::InputSource* XmlEntityRefusal::resolveEntity(xercesc::XMLResourceIdentifier* resource)
+{
+    std::string what = "External entities are not allowed";
+    if (resource != nullptr && resource->getSystemId() != nullptr) {
+        what += ": " + toUtf8(resource->getSystemId());
+    }
+    throw XmlEntityRefused(what);
+}
+
+void XmlErrorCollector::warning(const xercesc::SAXParseException&) {}
+
+void XmlErrorCollector::error(const xercesc::SAXParseException& exception) { record(exception); }
+
+void XmlErrorCollector::fatalError(const xercesc::SAXParseException& exception) { record(exception); }
+
+void XmlErrorCollector::resetErrors()
+{
+    failed_ = false;
+    message_.clear();
+}
+
+void XmlErrorCollector::record(const xercesc::SAXParseException& exception)
+{
+    if (!failed_) {
+        failed_ = true;
+        message_ = toUtf8(exception.getMessage());
+    }
+}
+
 namespace {
 
 constexpr const char* kSystemId = "memory based xml parsing buffer";

@@ -17,21 +17,53 @@
 
 #include <cstddef>
 #include <memory>
+#include <stdexcept>
+#include <string>
 #include <string_view>
 
 #include <xercesc/framework/MemBufInputSource.hpp>
 #include <xercesc/parsers/XercesDOMParser.hpp>
+#include <xercesc/sax/ErrorHandler.hpp>
+#include <xercesc/sax/SAXParseException.hpp>
 #include <xercesc/util/SecurityManager.hpp>
+#include <xercesc/util/XMLEntityResolver.hpp>
+#include <xercesc/util/XMLResourceIdentifier.hpp>
 #include <zelserverapi/IZELServerStatus.h>
 
 #include "api/heap.h"
-#include "transport/xml_element.h"
-#include "transport/xml_entity_refusal.h"
-#include "transport/xml_error_collector.h"
-#include "transport/xml_node_list.h"
+#include "transport/xml_document.h"
 #include "transport/xml_platform.h"
 
 namespace zel {
+
+class XmlEntityRefused : public std::runtime_error {
+public:
+    using std::runtime_error::runtime_error;
+};
+
+class XmlEntityRefusal : public xercesc::XMLEntityResolver {
+public:
+    // Never returns: throws XmlEntityRefused naming the refused system identifier.
+    xercesc::InputSource* resolveEntity(xercesc::XMLResourceIdentifier* resource) override;
+};
+
+class XmlErrorCollector : public xercesc::ErrorHandler {
+public:
+    void warning(const xercesc::SAXParseException& exception) override;
+    void error(const xercesc::SAXParseException& exception) override;
+    void fatalError(const xercesc::SAXParseException& exception) override;
+    void resetErrors() override;
+
+    bool failed() const noexcept { return failed_; }
+    // The parser's message of the first error (UTF-8).
+    const std::string& firstMessage() const noexcept { return message_; }
+
+private:
+    void record(const xercesc::SAXParseException& exception);
+
+    bool failed_ = false;
+    std::string message_;
+};
 
 class XmlReader : public HeapObject {
 public:

@@ -19,7 +19,6 @@
 #include "transport/ZELServerTCPIPRequest.h"
 #include "transport/payload_fields.h"
 #include "transport/xml_document.h"
-#include "transport/xml_element.h"
 #include "transport/xml_reader.h"
 
 namespace zel {
