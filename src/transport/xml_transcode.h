@@ -2,6 +2,7 @@
 // Conversion between the library's byte strings (UTF-8) and the XML library's 16-bit text. Every
 // function here needs the XML library started (see xml_platform.h).
 
+#include <cstddef>
 #include <string>
 #include <string_view>
 
@@ -22,7 +23,12 @@ public:
     const XMLCh* get() const noexcept { return text_; }
 
 private:
+    // Element and attribute names and most values are short ASCII: they are widened in place,
+    // without the transcoding service and without an allocation.
+    static constexpr std::size_t kInline = 48;
+
     XMLCh* text_ = nullptr;
+    XMLCh inline_[kInline];
 };
 
 // UTF-8 bytes of the XML library's text; null gives the empty string, and so does text that cannot
