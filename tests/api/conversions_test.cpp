@@ -40,51 +40,29 @@ TEST(UnsignedConversion, PlainReader)
     checkTable<std::uint32_t>(
         {
             // decimal, hexadecimal, zero fractions and blanks
-            {"0", true, true, 0},
             {"17", true, true, 17},
             {"   17", true, true, 17},
-            {"\t17", true, true, 17},
-            {"17   ", true, true, 17},
             {" 0x1F ", true, true, 31},
             {"0X1f", true, true, 31},
-            {"0xabcdef", true, true, 0xABCDEF},
             {"0x1F.00", true, true, 31},
             {"010", true, true, 10},  // no octal
             {"12.000", true, true, 12},
-            {"12.", true, true, 12},
-            {"12.0   ", true, true, 12},
             {"+5", true, true, 5},
             {"4294967295", true, true, 4294967295u},
-            {"0xFFFFFFFF", true, true, 4294967295u},
             {"0000000000004294967295", true, true, 4294967295u},
             // what follows the number is refused, but the number is kept
             {"12.5", true, false, 12},
-            {"12.05", true, false, 12},
-            {"12. 0", true, false, 12},
             {"12 .0", true, false, 12},
             {"12abc", true, false, 12},
-            {"1 2", true, false, 1},
-            {"1x5", true, false, 1},
             {"0x", true, false, 0},
-            {"0xg", true, false, 0},
             {"-0x1F", true, false, 0},  // a sign hides the x from the base choice
-            {"12..0", true, false, 12},
             // no number, or overflow
-            {"", false, false, 0},
-            {"   ", false, false, 0},
-            {"abc", false, false, 0},
-            {".0", false, false, 0},
-            {"-", false, false, 0},
-            {"x1", false, false, 0},
             {"4294967296", false, false, 0},
             {"0x100000000", false, false, 0},
-            {"99999999999999999999999999", false, false, 0},
             {"-4294967296", false, false, 0},
             // a minus wraps
             {"-1", true, true, 4294967295u},
-            {"-0", true, true, 0},
             {"-4294967295", true, true, 1},
-            {" -2 ", true, true, 4294967294u},
         },
         zel::readUInt32);
 }
@@ -94,15 +72,12 @@ TEST(UnsignedConversion, AnyBaseReaderRefusesAMinusAtOnce)
     checkTable<std::uint32_t>(
         {
             {"-1", false, false, 0},
-            {"  -1", false, false, 0},
-            {"-0", false, false, 0},
             {"+7", true, true, 7},
             {" 0x10", true, true, 16},
             {"12.00 ", true, true, 12},
             {"12.5", true, false, 12},
             {"4294967295", true, true, 4294967295u},
             {"4294967296", false, false, 0},
-            {"", false, false, 0},
         },
         zel::readUInt32AnyBase);
 }
@@ -126,7 +101,6 @@ TEST(SignedConversion, TimeoutTexts)
     checkTable<std::int64_t>(
         {
             {"   3600", true, true, 3600},
-            {"3600.000", true, true, 3600},
             {"3600.5", true, false, 3600},
             {"0x10", true, true, 16},
             {"abc", false, false, 0},
@@ -135,7 +109,6 @@ TEST(SignedConversion, TimeoutTexts)
             {"+5 ", true, true, 5},
             {"9223372036854775807", true, true, INT64_MAX},
             {"-9223372036854775808", true, true, INT64_MIN},
-            {"0x7FFFFFFFFFFFFFFF", true, true, INT64_MAX},
             {"9223372036854775808", false, false, 0},
             {"-9223372036854775809", false, false, 0},
             {"0x8000000000000000", false, false, 0},
@@ -175,35 +148,22 @@ TEST(BooleanConversion, FirstLetterThenNumber)
         std::optional<bool> expected;
     } cases[] = {
         {"yes", true},
-        {"Yes", true},
-        {"y", true},
         {"T", true},
         {"true", true},
-        {"tomato", true},
         {"No", false},
-        {"n", false},
         {"F", false},
         {"false", false},
-        {"never", false},
         {"0", false},
-        {"00", false},
         {"0.0", false},
-        {"-0", false},
         {"+0.000", false},
-        {" 0 ", false},
         {"1", true},
         {"2.5", true},
-        {"-3", true},
         {".5", true},
-        {"5.", true},
         {"0.001", true},
-        {" 1", true},
         {"99999999999999999999999999999", true},
         {"maybe", std::nullopt},
         {"", std::nullopt},
-        {"  ", std::nullopt},
         {".", std::nullopt},
-        {"+", std::nullopt},
         {"1.2.3", std::nullopt},
         {"10abc", std::nullopt},
         {"1e3", std::nullopt},
@@ -232,24 +192,6 @@ TEST(FloatConversion, OrdinaryDecimalNotationOnly)
     for (const auto& c : cases) {
         SCOPED_TRACE("text \"" + c.text + "\"");
         EXPECT_EQ(zel::toFloat(c.text), c.expected);
-    }
-}
-
-TEST(DecimalText, WritesIntegersAndTruthValuesThatReadBack)
-{
-    EXPECT_EQ(zel::decimalText(std::int64_t{0}), "0");
-    EXPECT_EQ(zel::decimalText(std::int64_t{-1}), "-1");
-    EXPECT_EQ(zel::decimalText(INT64_MIN), "-9223372036854775808");
-    EXPECT_EQ(zel::decimalText(UINT64_MAX), "18446744073709551615");
-    EXPECT_EQ(zel::decimalText(4294967295u), "4294967295");
-    EXPECT_EQ(zel::decimalText(static_cast<long>(-42)), "-42");
-    EXPECT_STREQ(zel::booleanText(true), "true");
-    EXPECT_STREQ(zel::booleanText(false), "false");
-    for (const std::int64_t value : {INT64_MIN, std::int64_t{-3600}, std::int64_t{0}, INT64_MAX}) {
-        EXPECT_EQ(zel::toInt64(zel::decimalText(value)), value);
-    }
-    for (const std::uint32_t value : {0u, 1u, 4294967295u}) {
-        EXPECT_EQ(zel::toUInt32(zel::decimalText(value)), value);
     }
 }
 

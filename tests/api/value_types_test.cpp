@@ -59,28 +59,6 @@ TEST(ServerString, EqualsComparesLengthAndBytesExactly)
     EXPECT_TRUE(ZELServerString().equals(nullptr));
 }
 
-TEST(ServerString, CopiesAreIndependent)
-{
-    ZELServerString original("one");
-    ZELServerString copy(original);
-    copy.assign("two");
-    EXPECT_EQ(original.str(), "one");
-    original = copy;
-    EXPECT_EQ(original.str(), "two");
-    EXPECT_EQ(zel::toStdString(ZELServerString("x\0y", 3)), std::string("x\0y", 3));
-}
-
-TEST(ServerString, AllocationFailureYieldsNull)
-{
-    zel::heap::failNextAllocations(1);
-    IZELServerString* text = new ZELServerString();
-    EXPECT_EQ(text, nullptr);
-    text = new ZELServerString("fine");
-    ASSERT_NE(text, nullptr);
-    EXPECT_STREQ(text->data(), "fine");
-    delete text;
-}
-
 // --- ZELServerStringArray
 
 TEST(ServerStringArray, AppendCopiesKeepingOrderDuplicatesAndNuls)
@@ -107,18 +85,6 @@ TEST(ServerStringArray, AppendCopiesKeepingOrderDuplicatesAndNuls)
     EXPECT_EQ(list.entries(), 0u);
     list.append("c");
     EXPECT_EQ(list.items(), (Items{"c"}));
-}
-
-TEST(ServerStringArray, SetElementReplacesOneAndIndexesPastTheEndTouchNothing)
-{
-    ZELServerStringArray list({"a", "b", "c"});
-    EXPECT_EQ(list.setElement(1, ZELServerString("B")), 0);
-    EXPECT_EQ(list.setElement(3, ZELServerString("x")), 0);
-    EXPECT_EQ(list.items(), (Items{"a", "B", "c"}));
-    EXPECT_STREQ(list.element(3), "");
-    ZELServerString out("kept");
-    EXPECT_EQ(list.getElement(7, out), 0);
-    EXPECT_EQ(out.str(), "kept");
 }
 
 TEST(ServerStringArray, ContainsAndRemoveAllAreExactAndKeepTheOrderOfTheRest)
@@ -152,20 +118,14 @@ TEST(ServerStringArray, TokenSplitters)
         {false, "a;b;c", ";", {"a", "b", "c"}},
         {false, "a;;b", ";", {"a", "", "b"}},
         {false, ";a;", ";", {"", "a", ""}},
-        {false, ";", ";", {"", ""}},
-        {false, "abc", ";", {"abc"}},
         {false, "a,b;c", ";,", {"a,b", "c"}},
         {false, "a%b%%c", "%", {"a", "b", "", "c"}},
-        {false, "", ";", {}},
         {false, nullptr, ";", {}},
         {false, "a;b", "", {"a;b"}},
         {false, "a;b", nullptr, {"a;b"}},
         // appendTokensAnyOf skips runs of any of the delimiters
         {true, ";;a; b;;", "; ", {"a", "b"}},
-        {true, "a b\tc", " \t", {"a", "b", "c"}},
-        {true, "abc", ";", {"abc"}},
         {true, ";;;", ";", {}},
-        {true, "", ";", {}},
         {true, nullptr, ";", {}},
         {true, "a;b", "", {"a;b"}},
         {true, "a;b", nullptr, {"a;b"}},
@@ -204,12 +164,6 @@ public:
 private:
     int id_;
 };
-
-class IOther {
-public:
-    virtual ~IOther() = default;
-};
-class Other final : public IOther, public zel::HeapObject {};
 
 using ThingVector = zel::ZELServerVector<IThing, Thing>;
 
@@ -250,36 +204,6 @@ TEST_F(ServerVector, InsertAtPlacesBeforeTheIndexOrAppendsAndNullItemsAreIgnored
     EXPECT_EQ(idsOf(vector), (std::vector<int>{4, 1, 5, 2, 3, 6}));
 }
 
-TEST_F(ServerVector, ElementPastTheEndLendsANullSlotSharedPerTypeAndResetOnEveryCall)
-{
-    ThingVector vector;
-    fill(vector, 1);
-    IThing*& slot = vector.element(1);
-    EXPECT_EQ(slot, nullptr);
-    Thing stray(99);
-    slot = &stray;
-    EXPECT_EQ(vector.entries(), 1u);
-    EXPECT_EQ(vector.element(0)->id(), 1);
-    EXPECT_EQ(vector.element(1), nullptr);
-    EXPECT_EQ(slot, nullptr);  // the same slot, reset by the call above
-    EXPECT_EQ(vector.at(1), nullptr);
-
-    ThingVector second;
-    zel::ZELServerVector<IOther, Other> other;
-    EXPECT_EQ(&vector.element(5), &second.element(3));
-    EXPECT_NE(static_cast<void*>(&second.element(0)), static_cast<void*>(&other.element(0)));
-}
-
-TEST_F(ServerVector, WritingThroughAnElementReplacesIt)
-{
-    ThingVector vector;
-    fill(vector, 1);
-    Thing* replaced = static_cast<Thing*>(vector.element(0));
-    vector.element(0) = new Thing(2);
-    delete replaced;
-    EXPECT_EQ(idsOf(vector), (std::vector<int>{2}));
-}
-
 TEST_F(ServerVector, RemoveLastAndClearHandOwnershipToTheCaller)
 {
     ThingVector vector;
@@ -315,18 +239,6 @@ TEST_F(ServerVector, ClearAndDestroyDestroysLastFirstAndGoesPastANullStoredByThe
     delete middle;
 }
 
-TEST_F(ServerVector, DestroyingTheVectorDestroysItsElements)
-{
-    auto* vector = new ThingVector;
-    ASSERT_NE(vector, nullptr);
-    fill(*vector, 2);
-    IZELServerVector<IThing>* asInterface = vector;
-    delete asInterface;
-    EXPECT_EQ(destroyed, (std::vector<int>{2, 1}));
-    zel::heap::failNextAllocations(1);
-    EXPECT_EQ(new ThingVector, nullptr);
-}
-
 // --- StringDict
 
 TEST(StringDict, ShortListsAndAnOddLastElementAreIgnoredAndTheFirstOccurrenceWins)
@@ -347,21 +259,6 @@ TEST(StringDict, ShortListsAndAnOddLastElementAreIgnoredAndTheFirstOccurrenceWin
     EXPECT_EQ(*built.find("k"), "one");
 }
 
-TEST(StringDict, KeysAreExactBytes)
-{
-    ZELServerStringArray pairs({"SSO_AUTH_DATA", ""});
-    pairs.append(ZELServerString("a\0b", 3));
-    pairs.append(ZELServerString("v\0w", 3));
-    const zel::StringDict dict(pairs);
-    EXPECT_TRUE(dict.contains("SSO_AUTH_DATA"));
-    EXPECT_EQ(*dict.find("SSO_AUTH_DATA"), "");
-    EXPECT_FALSE(dict.contains("sso_auth_data"));
-    EXPECT_FALSE(dict.contains("SSO_AUTH_DATA "));
-    ASSERT_NE(dict.find(std::string("a\0b", 3)), nullptr);
-    EXPECT_EQ(*dict.find(std::string("a\0b", 3)), std::string("v\0w", 3));
-    EXPECT_FALSE(dict.contains("a"));
-}
-
 TEST(StringDict, PublicDictionaryFromPairsLetsALaterValueWin)
 {
     const ZELServerStringDict dict = zel::toStringDict(ZELServerStringArray({"b", "1", "a", "2", "b", "3", "odd"}));
@@ -374,24 +271,6 @@ TEST(StringDict, PublicDictionaryFromPairsLetsALaterValueWin)
     existing.insert("keep", "me");
     zel::insertPairs(ZELServerStringArray({"x"}), existing);
     EXPECT_EQ(existing.entries(), 1u);
-}
-
-TEST(StringDict, PublicDictionaryWritesPairsInKeyOrder)
-{
-    ZELServerStringDict dict;
-    dict.insert("zeta", "last");
-    dict.insert("alpha", "first");
-    dict.insert(std::string("n\0ul", 4), std::string("v\0", 2));
-    ZELServerStringArray out({"already"});
-    zel::appendPairs(dict, out);
-    EXPECT_EQ(out.items(),
-              (Items{"already", "alpha", "first", std::string("n\0ul", 4), std::string("v\0", 2), "zeta", "last"}));
-
-    ZELServerStringArray pairsOnly;
-    zel::appendPairs(dict, pairsOnly);
-    const ZELServerStringDict back = zel::toStringDict(pairsOnly);
-    EXPECT_EQ(back.entries(), 3u);
-    EXPECT_EQ(*back.find(std::string("n\0ul", 4)), std::string("v\0", 2));
 }
 
 }  // namespace

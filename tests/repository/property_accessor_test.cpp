@@ -84,21 +84,6 @@ TEST(PropertyAccessor, NamesAndPairsComeInByteOrder)
     EXPECT_EQ(none.entries(), 0u);
 }
 
-TEST(PropertyAccessor, RemovingReportsWhetherSomethingWasThere)
-{
-    ZELServerPropertyAccessor accessor;
-    accessor.setProperty(S("c"), S("n"), S("v"));
-    accessor.setProperty(S("c"), S("m"), S("w"));
-    accessor.setProperty(S("d"), S("n"), S("v"));
-    EXPECT_TRUE(accessor.removeProperty(S("c"), S("n")));
-    EXPECT_FALSE(accessor.removeProperty(S("c"), S("n")));
-    EXPECT_FALSE(accessor.removeProperty(S("x"), S("m")));
-    EXPECT_EQ(valueOf(accessor, "c", "m"), "w");
-    EXPECT_TRUE(accessor.removeCategory(S("d")));
-    EXPECT_FALSE(accessor.removeCategory(S("d")));
-    EXPECT_EQ(accessor.getProperty(S("d"), S("n")), nullptr);
-}
-
 TEST(PropertyAccessor, GetPropertiesAppendsIndependentCopiesAndReadingMergesRepeats)
 {
     ZELServerPropertyAccessor accessor;

@@ -14,6 +14,7 @@ namespace zel::repotest {
 
 using zeltest::Bytes;
 using zeltest::describe;
+using zeltest::slurp;
 using zeltest::StatusPtr;
 
 inline ZELServerString S(const std::string& text) { return ZELServerString(text); }

@@ -40,15 +40,7 @@ protected:
     ZELServerRepository repository{channel.get(), S("Samples"), S("sample workspaces")};
 };
 
-// Records the progress calls in order.
-class ProgressLog final : public IZELServerProgressListener {
-public:
-    void totalSize(unsigned bytes) override { calls.push_back("total " + std::to_string(bytes)); }
-    void start() override { calls.push_back("start"); }
-    void position(unsigned bytes) override { calls.push_back("at " + std::to_string(bytes)); }
-    void finish() override { calls.push_back("finish"); }
-    std::vector<std::string> calls;
-};
+using zeltest::ProgressLog;
 
 // ---- Items ------------------------------------------------------------------------------------------
 

@@ -33,16 +33,11 @@ TEST(ConnectionInfo, BothWebAddressFormsGiveTheSameHostAndPort)
         unsigned short port;
     } cases[] = {
         {"https://srv/x", "srv", 443},
-        {"https://srv", "srv", 443},
         {"http://srv/x/y", "srv", 80},
         {"https://srv:8443/x", "srv", 8443},
-        {"http://srv:8080", "srv", 8080},
         // a bad explicit port never falls back to 443
         {"https://srv:abc", "srv", 80},
-        {"https://srv:/x", "srv", 80},
-        {"https://srv:-1", "srv", 80},
         {"https://srv:81x", "srv", 80},
-        {"https://srv:4294967296", "srv", 80},
         // only the low 16 bits of a port are kept
         {"http://srv:70000/x", "srv", 4464},
         // the colon is searched before the slash, so a colon in the path ends the host
@@ -50,9 +45,6 @@ TEST(ConnectionInfo, BothWebAddressFormsGiveTheSameHostAndPort)
         // no scheme, an upper-case one, or anything before it: the whole text is the host
         {"srv:81", "srv:81", 80},
         {"HTTP://srv", "HTTP://srv", 80},
-        {" http://srv", " http://srv", 80},
-        {"http:/srv", "http:/srv", 80},
-        {"", "", 80},
         {"http://", "", 80},
         {"https://:9", "", 9},
     };
@@ -102,9 +94,7 @@ TEST(ConnectionInfo, AuthenticationKindFollowsTheKeysOfThePropertiesInBothProper
         {{"SSO_AUTH_DATA", ""}, kSingleSignOnAuthentication},
         {{"USER_TOKEN", "t1"}, kTokenAuthentication},
         {{"USER_TOKEN", "t1", "SSO_AUTH_DATA", "d"}, kSingleSignOnAuthentication},
-        {{"SSO_AUTH_DATA", "d", "USER_TOKEN", "t1"}, kSingleSignOnAuthentication},
         {{"CLIENT_ID", "c1"}, kPropertyAuthentication},
-        {{}, kPropertyAuthentication},
         {{"CLIENT_ID", "c1", "USER_TOKEN"}, kPropertyAuthentication},           // a key without value is no key
         {{"user_token", "t1", "sso_auth_data", "d"}, kPropertyAuthentication},  // keys are exact bytes
         {{"CLIENT_ID", "SSO_AUTH_DATA"}, kPropertyAuthentication},              // a value that reads like a key

@@ -105,15 +105,6 @@ TEST(FrameworkHome, ModuleFolderWhenNothingIsSetAndTheResultIsKept)
     EXPECT_EQ(zel::frameworkHomeDirectory(), zeltest::programFolder());
 }
 
-TEST(FrameworkHome, AnEarlierResultOutlivesItsSource)
-{
-    ScopedEnv override("ZEL_HOME_OVERRIDE", nullptr);
-    ScopedEnv zelHome("ZEL_HOME", nullptr);
-    EXPECT_EQ(zel::frameworkHomeDirectory(native("/opt/once")), native("/opt/once/"));
-    zeltest::setEnv("ZEL_HOME", std::nullopt);
-    EXPECT_EQ(zel::frameworkHomeDirectory(), native("/opt/once/"));
-}
-
 TEST(Platform, FileProbes)
 {
     const zeltest::TempDir temp("zel-probe");

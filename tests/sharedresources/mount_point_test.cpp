@@ -30,6 +30,7 @@ namespace fs = std::filesystem;
 using namespace std::string_literals;
 using zeltest::Bytes;
 using zeltest::describe;
+using zeltest::slurp;
 using zeltest::StatusPtr;
 using Entries = ZELServerVector<IZELServerFileInfo, ZELServerFileInfo>;
 
@@ -42,15 +43,7 @@ unsigned numberOf(IZELServerStatus* raw)
 // A path released through the mount point that made it.
 using PathPtr = std::unique_ptr<IZELServerPath, std::function<void(IZELServerPath*)>>;
 
-// Records the progress calls in order.
-class ProgressLog final : public IZELServerProgressListener {
-public:
-    void totalSize(unsigned bytes) override { calls.push_back("total " + std::to_string(bytes)); }
-    void start() override { calls.push_back("start"); }
-    void position(unsigned bytes) override { calls.push_back("at " + std::to_string(bytes)); }
-    void finish() override { calls.push_back("finish"); }
-    std::vector<std::string> calls;
-};
+using zeltest::ProgressLog;
 
 std::string fileInfoElement(const std::string& type, const std::string& size, const std::string& directory,
                             const std::string& name)

@@ -4,12 +4,8 @@
 // handshake is scripted by SetUp, so a test scripts only the steps of its own commands and then
 // calls signIn().
 
-#include <filesystem>
-#include <fstream>
-#include <iterator>
 #include <memory>
 #include <string>
-#include <string_view>
 
 #include <gtest/gtest.h>
 #include <zelserverapi/IZELServerStatus.h>
@@ -18,27 +14,12 @@
 #include "api/ZELServerString.h"
 #include "session/ZELServerConnectionInfo.h"
 #include "support/fake_server.h"
+#include "support/helpers.h"
 #include "transport/ZELServerTCPIPChannel.h"
 
 namespace zeltest {
 
 using StatusPtr = std::unique_ptr<IZELServerStatus>;
-
-inline std::string describe(const IZELServerStatus* status)
-{
-    if (status == nullptr) {
-        return "(no status)";
-    }
-    std::string text = std::to_string(status->getMessageNumber()) + ": " + status->getMessage();
-    // Where the library made it, so that a failing test points at the line that failed.
-    if (const auto* own = dynamic_cast<const zel::ZELServerStatus*>(status)) {
-        const std::string_view file = own->where().file_name();
-        const std::size_t src = file.rfind("src/");
-        text += " [made at " + std::string(src == std::string_view::npos ? file : file.substr(src)) + ":" +
-                std::to_string(own->where().line()) + "]";
-    }
-    return text;
-}
 
 class SignedInChannelTest : public ::testing::Test {
 protected:
@@ -74,12 +55,6 @@ protected:
     static std::string xmlDocument(const std::string& root, const std::string& content)
     {
         return R"(<?xml version="1.0" encoding="UTF-8" standalone="no" ?><)" + root + ">" + content + "</" + root + ">";
-    }
-
-    static std::string slurp(const std::filesystem::path& path)
-    {
-        std::ifstream in(path, std::ios::binary);
-        return std::string(std::istreambuf_iterator<char>(in), {});
     }
 
     FakeServer server;

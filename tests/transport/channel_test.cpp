@@ -23,6 +23,7 @@
 #include "session/ZELServerConnectionInfo.h"
 #include "support/environment.h"
 #include "support/fake_server.h"
+#include "support/helpers.h"
 #include "support/ports.h"
 #include "transport/IZELServerRequest.h"
 #include "transport/IZELServerResponse.h"
@@ -35,7 +36,11 @@ namespace {
 namespace fs = std::filesystem;
 using namespace std::string_literals;
 using zeltest::Bytes;
+using zeltest::describe;
 using zeltest::FakeServer;
+using zeltest::pattern;
+using zeltest::ProgressLog;
+using zeltest::slurp;
 using zeltest::Values;
 
 using StatusPtr = std::unique_ptr<IZELServerStatus>;
@@ -61,34 +66,6 @@ Bytes firstHandshake()
 }
 
 Bytes signedIn() { return zeltest::reply("SUCCESS", kSessionDocument); }
-
-std::string describe(const IZELServerStatus* status)
-{
-    if (status == nullptr) {
-        return "(no status)";
-    }
-    return std::to_string(status->getMessageNumber()) + " code " + std::to_string(status->getCode()) + ": " +
-           status->getMessage();
-}
-
-// Records the progress calls in order.
-class ProgressLog final : public IZELServerProgressListener {
-public:
-    void totalSize(unsigned bytes) override { calls.push_back("total " + std::to_string(bytes)); }
-    void start() override { calls.push_back("start"); }
-    void position(unsigned bytes) override { calls.push_back("at " + std::to_string(bytes)); }
-    void finish() override { calls.push_back("finish"); }
-    std::vector<std::string> calls;
-};
-
-std::string pattern(std::size_t size)
-{
-    std::string data(size, '\0');
-    for (std::size_t i = 0; i < size; ++i) {
-        data[i] = static_cast<char>((i * 131 + i / 509) & 0xFF);
-    }
-    return data;
-}
 
 class ChannelTest : public ::testing::Test {
 protected:
@@ -126,16 +103,24 @@ protected:
         return status;
     }
 
+    // One transfer on the open channel; the body goes to `body` when given.
+    StatusPtr transfer(const std::string& path, unsigned direction, ProgressLog* progress = nullptr,
+                       std::string* body = nullptr)
+    {
+        const RequestPtr request(channel->createRequest("XFER"));
+        const ResponsePtr response(channel->createResponse());
+        StatusPtr status(channel->transferFile(*request, *response, path, direction, progress));
+        if (body != nullptr) {
+            response->getBody(*body);
+        }
+        return status;
+    }
+
     std::string file(const std::string& name, const std::string& content) const
     {
         const fs::path path = dir / name;
         std::ofstream(path, std::ios::binary) << content;
         return path.string();
-    }
-    static std::string slurp(const std::string& path)
-    {
-        std::ifstream in(path, std::ios::binary);
-        return std::string(std::istreambuf_iterator<char>(in), {});
     }
 
     FakeServer server;
@@ -348,15 +333,6 @@ TEST_F(ChannelTest, CloseDropsTheConnection)
     EXPECT_NE(channel->getIdentity(), nullptr);
 }
 
-TEST_F(ChannelTest, DestroyingTheChannelDropsTheConnection)
-{
-    server.expectFrame(firstHandshake()).sendFrame(signedIn()).expectPeerClose();
-    server.start();
-    open();
-    channel.reset();
-    EXPECT_TRUE(server.verify());
-}
-
 TEST_F(ChannelTest, SendAndReceiveFailuresCarryTheSocketCode)
 {
     server.expectFrame(firstHandshake()).sendFrame(signedIn()).expectAnyFrame().closeConnection();
@@ -484,95 +460,41 @@ TEST_F(ChannelTest, RefusedArgumentsSendNothing)
     EXPECT_EQ(server.frames().size(), 1u);
 }
 
-TEST_F(ChannelTest, RequestsCarryTheListsGivenAtCreation)
-{
-    const ZELServerStringArray directives({"a", "1", "b", "2"});
-    const ZELServerStringArray notifications({"n", "v"});
-    const RequestPtr request(channel->createRequest("CMD", directives, notifications));
-    ZELServerStringArray gotDirectives;
-    ZELServerStringArray gotNotifications;
-    request->getDirectives(gotDirectives);
-    request->getNotifications(gotNotifications);
-    EXPECT_EQ(gotDirectives.items(), directives.items());
-    EXPECT_EQ(gotNotifications.items(), notifications.items());
-    // No identity before the first sign-in: the text is the keyword and the client id.
-    std::string text;
-    request->getText(text);
-    EXPECT_EQ(text, "CMD\0clientID="s);
-}
-
 // ---- Uploads ----------------------------------------------------------------------------------------
 
 TEST_F(ChannelTest, UploadSendsHeaderAndContentBetweenTwoAcknowledgements)
 {
-    const std::string content = "hello, world\n";
-    const std::string path = file("up.txt", content);
-    server.expectFrame(firstHandshake())
-        .sendFrame(signedIn())
-        .expectFrame(zeltest::request(
-            "SR_UPLOAD", {{"identityObject", identityDocument("SR_UPLOAD")}, {"clientID", ""}, {"srPath", "/a"}}))
-        .sendFrame(zeltest::readyAck())
-        .expectFrame("fileLength=13\0fileCRC="s + std::to_string(zeltest::crc32(content)))
-        .sendFrame(zeltest::readyAck())
-        .expectRawBytes(content)
-        .sendFrame(zeltest::reply("SUCCESS", "stored"));
+    const struct {
+        std::size_t size;
+        std::vector<std::string> progress;
+    } cases[] = {
+        {13, {"total 13", "start", "at 0", "finish"}},
+        {0, {"total 0", "start", "finish"}},
+        {300000, {"total 300000", "start", "at 0", "at 131072", "at 262144", "finish"}},
+    };
+    server.expectFrame(firstHandshake()).sendFrame(signedIn());
+    for (const auto& c : cases) {
+        const std::string content = pattern(c.size);
+        server.expectFrame(zeltest::request("XFER", {{"identityObject", identityDocument("XFER")}, {"clientID", ""}}))
+            .sendFrame(zeltest::readyAck())
+            .expectFrame("fileLength=" + std::to_string(c.size) + "\0fileCRC="s +
+                         std::to_string(zeltest::crc32(content)))
+            .sendFrame(zeltest::readyAck());
+        if (c.size > 0) {
+            server.expectRawBytes(content);
+        }
+        server.sendFrame(zeltest::reply("SUCCESS", "stored"));
+    }
     server.start();
     open();
-    const RequestPtr request(channel->createRequest("SR_UPLOAD"));
-    const ResponsePtr response(channel->createResponse());
-    request->addValue("srPath", "/a");
-    ProgressLog progress;
-    const StatusPtr status(channel->transferFile(*request, *response, path, kUpload, &progress));
-    EXPECT_EQ(status, nullptr) << describe(status.get());
-    std::string body;
-    response->getBody(body);
-    EXPECT_EQ(body, "stored");
-    EXPECT_EQ(progress.calls, (std::vector<std::string>{"total 13", "start", "at 0", "finish"}));
-    EXPECT_TRUE(server.verify());
-}
-
-TEST_F(ChannelTest, UploadOfSeveralChunksReportsEachPosition)
-{
-    const std::string content = pattern(300000);
-    const std::string path = file("big", content);
-    server.expectFrame(firstHandshake())
-        .sendFrame(signedIn())
-        .expectAnyFrame()
-        .sendFrame(zeltest::readyAck())
-        .expectFrame(zeltest::fileHeader(content.size(), zeltest::crc32(content)))
-        .sendFrame(zeltest::readyAck())
-        .expectRawBytes(content)
-        .sendFrame(zeltest::reply("SUCCESS", "ok"));
-    server.start();
-    open();
-    const RequestPtr request(channel->createRequest("UP"));
-    const ResponsePtr response(channel->createResponse());
-    ProgressLog progress;
-    const StatusPtr status(channel->transferFile(*request, *response, path, kUpload, &progress));
-    EXPECT_EQ(status, nullptr) << describe(status.get());
-    EXPECT_EQ(progress.calls,
-              (std::vector<std::string>{"total 300000", "start", "at 0", "at 131072", "at 262144", "finish"}));
-    EXPECT_TRUE(server.verify());
-}
-
-TEST_F(ChannelTest, UploadOfAnEmptyFileSendsNoContent)
-{
-    const std::string path = file("empty", "");
-    server.expectFrame(firstHandshake())
-        .sendFrame(signedIn())
-        .expectAnyFrame()
-        .sendFrame(zeltest::readyAck())
-        .expectFrame("fileLength=0\0fileCRC=0"s)
-        .sendFrame(zeltest::readyAck())
-        .sendFrame(zeltest::reply("SUCCESS", "ok"));
-    server.start();
-    open();
-    const RequestPtr request(channel->createRequest("UP"));
-    const ResponsePtr response(channel->createResponse());
-    ProgressLog progress;
-    const StatusPtr status(channel->transferFile(*request, *response, path, kUpload, &progress));
-    EXPECT_EQ(status, nullptr) << describe(status.get());
-    EXPECT_EQ(progress.calls, (std::vector<std::string>{"total 0", "start", "finish"}));
+    for (const auto& c : cases) {
+        ProgressLog progress;
+        std::string body;
+        const StatusPtr status = transfer(file("up", pattern(c.size)), kUpload, &progress, &body);
+        EXPECT_EQ(status, nullptr) << describe(status.get());
+        EXPECT_EQ(body, "stored");
+        EXPECT_EQ(progress.calls, c.progress);
+    }
     EXPECT_TRUE(server.verify());
 }
 
@@ -613,47 +535,32 @@ TEST_F(ChannelTest, UploadStopsAtARefusedAcknowledgement)
     }
 }
 
-TEST_F(ChannelTest, UploadThatCannotBeReadSendsNothing)
+TEST_F(ChannelTest, LocalFileProblemsSendNothing)
 {
-    server.expectFrame(firstHandshake()).sendFrame(signedIn());
-    server.start();
-    open();
-    const RequestPtr request(channel->createRequest("UP"));
-    const ResponsePtr response(channel->createResponse());
-
-    const std::string missing = (dir / "missing").string();
-    const StatusPtr status(channel->transferFile(*request, *response, missing, kUpload, nullptr));
-    ASSERT_NE(status, nullptr);
-    EXPECT_EQ(status->getMessageNumber(), msg::kLocalFileRead);
-    EXPECT_NE(std::string(status->getMessage()).find(missing), std::string::npos) << describe(status.get());
-
-    const StatusPtr directory(channel->transferFile(*request, *response, dir.string(), kUpload, nullptr));
-    ASSERT_NE(directory, nullptr);
-    EXPECT_EQ(directory->getMessageNumber(), msg::kLocalFileRead);
-
-    EXPECT_TRUE(server.verify());
-    EXPECT_EQ(server.frames().size(), 1u);
-}
-
-TEST_F(ChannelTest, UploadOfFourGibibytesIsRefusedBeforeAnythingIsSent)
-{
-    const std::string path = file("huge", "");
+    const std::string huge = file("huge", "");
     std::error_code error;
-    fs::resize_file(path, std::uint64_t{1} << 32, error);
-    if (error) {
-        GTEST_SKIP() << "no sparse files here: " << error.message();
-    }
+    fs::resize_file(huge, std::uint64_t{1} << 32, error);  // 4 GiB do not fit the header
+    const struct {
+        std::string path;
+        unsigned direction;
+        unsigned number;
+    } cases[] = {
+        {(dir / "missing").string(), kUpload, msg::kLocalFileRead},
+        {dir.string(), kUpload, msg::kLocalFileRead},
+        {error ? (dir / "missing").string() : huge, kUpload, msg::kLocalFileRead},
+        {(dir / "no" / "such" / "dir" / "f").string(), kDownload, msg::kLocalFileWrite},
+    };
     server.expectFrame(firstHandshake()).sendFrame(signedIn());
     server.start();
     open();
-    const RequestPtr request(channel->createRequest("UP"));
-    const ResponsePtr response(channel->createResponse());
-    ProgressLog progress;
-    const StatusPtr status(channel->transferFile(*request, *response, path, kUpload, &progress));
-    ASSERT_NE(status, nullptr);
-    EXPECT_EQ(status->getMessageNumber(), msg::kLocalFileRead);
-    EXPECT_NE(std::string(status->getMessage()).find(path), std::string::npos) << describe(status.get());
-    EXPECT_TRUE(progress.calls.empty());
+    for (const auto& c : cases) {
+        ProgressLog progress;
+        const StatusPtr status = transfer(c.path, c.direction, &progress);
+        ASSERT_NE(status, nullptr) << c.path;
+        EXPECT_EQ(status->getMessageNumber(), c.number) << describe(status.get());
+        EXPECT_NE(std::string(status->getMessage()).find(c.path), std::string::npos) << describe(status.get());
+        EXPECT_TRUE(progress.calls.empty());
+    }
     EXPECT_TRUE(server.verify());
     EXPECT_EQ(server.frames().size(), 1u);
 }
@@ -662,51 +569,39 @@ TEST_F(ChannelTest, UploadOfFourGibibytesIsRefusedBeforeAnythingIsSent)
 
 TEST_F(ChannelTest, DownloadReceivesTheFileBetweenTwoAcknowledgements)
 {
-    const std::string content = pattern(300000);
-    const std::string path = (dir / "down").string();
-    server.expectFrame(firstHandshake())
-        .sendFrame(signedIn())
-        .expectFrame(
-            zeltest::request("LOG_GET_FILE", {{"identityObject", identityDocument("LOG_GET_FILE")}, {"clientID", ""}}))
-        .sendFrame(zeltest::fileHeader(content.size(), zeltest::crc32(content)))
-        .expectFrame(zeltest::readyAck())
-        .sendRaw(content)
-        .expectFrame(zeltest::readyAck())
-        .sendFrame(zeltest::reply("SUCCESS", "true"));
+    const struct {
+        Bytes header;  // the announced checksum is not checked; the prefixes are cut by length only
+        std::string content;
+        std::vector<std::string> progress;
+    } cases[] = {
+        {zeltest::fileHeader(300000, zeltest::crc32(pattern(300000))),
+         pattern(300000),
+         {"total 300000", "start", "at 0", "at 131072", "at 262144", "finish"}},
+        {"size_bytes:0x3\0fileCRC=12345"s, "abc", {"total 3", "start", "at 0", "finish"}},
+        {zeltest::fileHeader(0, 0), "", {"total 0", "start", "finish"}},
+    };
+    server.expectFrame(firstHandshake()).sendFrame(signedIn());
+    for (const auto& c : cases) {
+        server.expectFrame(zeltest::request("XFER", {{"identityObject", identityDocument("XFER")}, {"clientID", ""}}))
+            .sendFrame(c.header)
+            .expectFrame(zeltest::readyAck());
+        if (!c.content.empty()) {
+            server.sendRaw(c.content);
+        }
+        server.expectFrame(zeltest::readyAck()).sendFrame(zeltest::reply("SUCCESS", "true"));
+    }
     server.start();
     open();
-    const RequestPtr request(channel->createRequest("LOG_GET_FILE"));
-    const ResponsePtr response(channel->createResponse());
-    ProgressLog progress;
-    const StatusPtr status(channel->transferFile(*request, *response, path, kDownload, &progress));
-    EXPECT_EQ(status, nullptr) << describe(status.get());
-    std::string body;
-    response->getBody(body);
-    EXPECT_EQ(body, "true");
-    EXPECT_EQ(slurp(path), content);
-    EXPECT_EQ(progress.calls,
-              (std::vector<std::string>{"total 300000", "start", "at 0", "at 131072", "at 262144", "finish"}));
-    EXPECT_TRUE(server.verify());
-}
-
-TEST_F(ChannelTest, DownloadDoesNotCheckTheAnnouncedChecksum)
-{
-    const std::string path = (dir / "down").string();
-    server.expectFrame(firstHandshake())
-        .sendFrame(signedIn())
-        .expectAnyFrame()
-        .sendFrame("size_bytes:0x3\0fileCRC=12345"s)  // prefixes are cut by length only
-        .expectFrame(zeltest::readyAck())
-        .sendRaw("abc")
-        .expectFrame(zeltest::readyAck())
-        .sendFrame(zeltest::reply("SUCCESS", "true"));
-    server.start();
-    open();
-    const RequestPtr request(channel->createRequest("GET"));
-    const ResponsePtr response(channel->createResponse());
-    const StatusPtr status(channel->transferFile(*request, *response, path, kDownload, nullptr));
-    EXPECT_EQ(status, nullptr) << describe(status.get());
-    EXPECT_EQ(slurp(path), "abc");
+    for (const auto& c : cases) {
+        const std::string path = file("down", "old content");
+        ProgressLog progress;
+        std::string body;
+        const StatusPtr status = transfer(path, kDownload, &progress, &body);
+        EXPECT_EQ(status, nullptr) << describe(status.get());
+        EXPECT_EQ(body, "true");
+        EXPECT_EQ(slurp(path), c.content);
+        EXPECT_EQ(progress.calls, c.progress);
+    }
     EXPECT_TRUE(server.verify());
 }
 
@@ -722,13 +617,10 @@ TEST_F(ChannelTest, DownloadWithoutAFileGivesFalseAndReadsNothingMore)
         .sendFrame(zeltest::reply("SUCCESS", "fine"));
     server.start();
     open();
-    const RequestPtr request(channel->createRequest("GET"));
-    const ResponsePtr response(channel->createResponse());
     ProgressLog progress;
-    const StatusPtr status(channel->transferFile(*request, *response, path, kDownload, &progress));
-    EXPECT_EQ(status, nullptr) << describe(status.get());
     std::string body;
-    response->getBody(body);
+    const StatusPtr status = transfer(path, kDownload, &progress, &body);
+    EXPECT_EQ(status, nullptr) << describe(status.get());
     EXPECT_EQ(body, "false");
     EXPECT_TRUE(progress.calls.empty());
     std::string next;
@@ -742,51 +634,10 @@ TEST_F(ChannelTest, DownloadHeaderWithoutTwoPartsIsAnUnusableReply)
     server.expectFrame(firstHandshake()).sendFrame(signedIn()).expectAnyFrame().sendFrame("fileLength=3"s);
     server.start();
     open();
-    const RequestPtr request(channel->createRequest("GET"));
-    const ResponsePtr response(channel->createResponse());
-    const StatusPtr status(channel->transferFile(*request, *response, (dir / "d").string(), kDownload, nullptr));
+    const StatusPtr status = transfer((dir / "d").string(), kDownload);
     ASSERT_NE(status, nullptr);
     EXPECT_EQ(status->getMessageNumber(), msg::kReplyWithoutBody);
     EXPECT_TRUE(server.verify());
-}
-
-TEST_F(ChannelTest, DownloadOfAnEmptyFile)
-{
-    const std::string path = file("down", "old content");
-    server.expectFrame(firstHandshake())
-        .sendFrame(signedIn())
-        .expectAnyFrame()
-        .sendFrame(zeltest::fileHeader(0, 0))
-        .expectFrame(zeltest::readyAck())
-        .expectFrame(zeltest::readyAck())
-        .sendFrame(zeltest::reply("SUCCESS", "true"));
-    server.start();
-    open();
-    const RequestPtr request(channel->createRequest("GET"));
-    const ResponsePtr response(channel->createResponse());
-    ProgressLog progress;
-    const StatusPtr status(channel->transferFile(*request, *response, path, kDownload, &progress));
-    EXPECT_EQ(status, nullptr) << describe(status.get());
-    EXPECT_TRUE(fs::exists(path));
-    EXPECT_EQ(fs::file_size(path), 0u);
-    EXPECT_EQ(progress.calls, (std::vector<std::string>{"total 0", "start", "finish"}));
-    EXPECT_TRUE(server.verify());
-}
-
-TEST_F(ChannelTest, DownloadToAPathThatCannotBeWrittenSendsNothing)
-{
-    server.expectFrame(firstHandshake()).sendFrame(signedIn());
-    server.start();
-    open();
-    const RequestPtr request(channel->createRequest("GET"));
-    const ResponsePtr response(channel->createResponse());
-    const std::string path = (dir / "no" / "such" / "dir" / "f").string();
-    const StatusPtr status(channel->transferFile(*request, *response, path, kDownload, nullptr));
-    ASSERT_NE(status, nullptr);
-    EXPECT_EQ(status->getMessageNumber(), msg::kLocalFileWrite);
-    EXPECT_NE(std::string(status->getMessage()).find(path), std::string::npos) << describe(status.get());
-    EXPECT_TRUE(server.verify());
-    EXPECT_EQ(server.frames().size(), 1u);
 }
 
 TEST_F(ChannelTest, DownloadThatFailsToWriteStillReadsEverythingThenReports)
@@ -809,9 +660,7 @@ TEST_F(ChannelTest, DownloadThatFailsToWriteStillReadsEverythingThenReports)
         .sendFrame(zeltest::reply("SUCCESS", "still in step"));
     server.start();
     open();
-    const RequestPtr request(channel->createRequest("GET"));
-    const ResponsePtr response(channel->createResponse());
-    const StatusPtr status(channel->transferFile(*request, *response, "/dev/full", kDownload, nullptr));
+    const StatusPtr status = transfer("/dev/full", kDownload);
     ASSERT_NE(status, nullptr);
     EXPECT_EQ(status->getMessageNumber(), msg::kLocalFileWrite) << describe(status.get());
     std::string next;
@@ -854,114 +703,93 @@ FakeServer::Predicate resultPortRequest(Values rest, std::string* port = nullptr
 
 TEST_F(ChannelTest, ResultPortExchangeTakesTheResultFromTheServersCall)
 {
-    const Bytes result = "<RESULT id=\"7\"/>\0tail"s;
-    server.expectFrame(firstHandshake())
-        .sendFrame(signedIn())
-        .expectFrameWhere("result-port request", resultPortRequest({{"tag", "x"},
-                                                                    {"notificationMsg", "SUCCESS_TOPIC:done"},
-                                                                    {"notificationMsg", "FAILURE_TOPIC:failed"}}))
-        .sendFrame(zeltest::reply("SUCCESS", "queued"))
-        .connectBackAndSend(result);
-    server.start();
-    open();
-    const ZELServerStringArray directives({"tag", "x", "odd"});
-    const ZELServerStringArray notifications({"SUCCESS_TOPIC", "done", "FAILURE_TOPIC", "failed"});
-    const RequestPtr request(channel->createRequest("JOB", directives, notifications));
-    const ResponsePtr response(channel->createResponse());
-    const StatusPtr status(channel->sendRequest(*request, *response, kResultPortRequest));
-    EXPECT_EQ(status, nullptr) << describe(status.get());
-    std::string body;
-    response->getBody(body);
-    EXPECT_EQ(body, result) << zeltest::printable(body);
-    EXPECT_TRUE(server.verify());
-}
-
-TEST_F(ChannelTest, ResultPortDirectiveIsSentTwice)
-{
-    std::string bound;
-    server.expectFrame(firstHandshake())
-        .sendFrame(signedIn())
-        .expectFrameWhere("result-port request with the caller's port behind the bound one",
-                          resultPortRequest({{"requesterResultPort", "0"}, {"tag", "y"}}, &bound))
-        .sendFrame(zeltest::reply("SUCCESS", "queued"))
-        .connectBackAndSend("R");
-    server.start();
-    open();
-    const RequestPtr request(channel->createRequest(
-        "JOB", ZELServerStringArray({"requesterResultPort", "0", "tag", "y"}), ZELServerStringArray()));
-    const ResponsePtr response(channel->createResponse());
-    const StatusPtr status(channel->sendRequest(*request, *response, kResultPortRequest));
-    EXPECT_EQ(status, nullptr) << describe(status.get());
-    EXPECT_TRUE(server.verify());
-    EXPECT_NE(bound, "0");
-}
-
-TEST_F(ChannelTest, ResultPortListensOnTheRequestedPort)
-{
     const std::string wanted = std::to_string(zeltest::releasedPort());
-    server.expectFrame(firstHandshake())
-        .sendFrame(signedIn())
-        .expectFrameWhere("result-port request on the requested port",
-                          resultPortRequest({{"requesterResultPort", wanted}}))
-        .sendFrame(zeltest::reply("SUCCESS", "queued"))
-        .connectBackAndSend("R");
+    const struct {
+        const char* name;
+        std::vector<std::string> directives;
+        std::vector<std::string> notifications;
+        Values rest;        // after the bound port and this machine's address
+        std::string bound;  // the port listened on; empty: any but 0
+    } cases[] = {
+        {"directives and notifications",
+         {"tag", "x", "odd"},
+         {"SUCCESS_TOPIC", "done", "FAILURE_TOPIC", "failed"},
+         {{"tag", "x"}, {"notificationMsg", "SUCCESS_TOPIC:done"}, {"notificationMsg", "FAILURE_TOPIC:failed"}},
+         ""},
+        {"the caller's port 0 is sent again behind the bound one",
+         {"requesterResultPort", "0", "tag", "y"},
+         {},
+         {{"requesterResultPort", "0"}, {"tag", "y"}},
+         ""},
+        {"a requested port is listened on",
+         {"requesterResultPort", wanted},
+         {},
+         {{"requesterResultPort", wanted}},
+         wanted},
+    };
+    const Bytes result = "<RESULT id=\"7\"/>\0tail"s;
+    std::string bound[std::size(cases)];
+    server.expectFrame(firstHandshake()).sendFrame(signedIn());
+    for (std::size_t i = 0; i < std::size(cases); ++i) {
+        server.expectFrameWhere(cases[i].name, resultPortRequest(cases[i].rest, &bound[i]))
+            .sendFrame(zeltest::reply("SUCCESS", "queued"))
+            .connectBackAndSend(result);
+    }
     server.start();
     open();
-    const RequestPtr request(
-        channel->createRequest("JOB", ZELServerStringArray({"requesterResultPort", wanted}), ZELServerStringArray()));
-    const ResponsePtr response(channel->createResponse());
-    const StatusPtr status(channel->sendRequest(*request, *response, kResultPortRequest));
-    EXPECT_EQ(status, nullptr) << describe(status.get());
+    for (std::size_t i = 0; i < std::size(cases); ++i) {
+        SCOPED_TRACE(cases[i].name);
+        const RequestPtr request(channel->createRequest("JOB", ZELServerStringArray(cases[i].directives),
+                                                        ZELServerStringArray(cases[i].notifications)));
+        const ResponsePtr response(channel->createResponse());
+        const StatusPtr status(channel->sendRequest(*request, *response, kResultPortRequest));
+        EXPECT_EQ(status, nullptr) << describe(status.get());
+        std::string body;
+        response->getBody(body);
+        EXPECT_EQ(body, result) << zeltest::printable(body);
+    }
     EXPECT_TRUE(server.verify());
-    EXPECT_EQ(zeltest::requestValue(server.frames().at(1), "requesterResultPort"), wanted);
+    for (std::size_t i = 0; i < std::size(cases); ++i) {
+        EXPECT_TRUE(cases[i].bound.empty() ? bound[i] != "0" : bound[i] == cases[i].bound) << bound[i];
+    }
 }
 
-TEST_F(ChannelTest, ResultPortCallerNotInTheTrustedListIsSkipped)
+TEST_F(ChannelTest, ResultPortCallersOutsideTheTrustedListAreSkipped)
 {
-    server.expectFrame(firstHandshake())
-        .sendFrame(signedIn())
-        .expectAnyFrame()
-        .sendFrame(zeltest::reply("SUCCESS", "queued"))
-        .connectBackFromAndSend("127.0.0.2", "from a stranger")
-        .connectBackAndSend("from the server");
-    server.start();
-    const ZELServerStringArray options({"TRUSTED_HOST_NAMES", "10.255.255.1  127.0.0.1"});
-    open(&options);
-    const RequestPtr request(channel->createRequest("JOB", ZELServerStringArray(), ZELServerStringArray()));
-    const ResponsePtr response(channel->createResponse());
-    const StatusPtr status(channel->sendRequest(*request, *response, kResultPortRequest));
-    EXPECT_EQ(status, nullptr) << describe(status.get());
-    std::string body;
-    response->getBody(body);
-    EXPECT_EQ(body, "from the server");
-    EXPECT_TRUE(server.verify());
-}
-
-TEST_F(ChannelTest, ResultPortTrustsLocalhostAsThisMachinesName)
-{
+    // "localhost" in the list stands for this machine's own name.
     const std::string name = platform::localHostName(296);
     const std::vector<platform::Ipv4Address> addresses =
         name.empty() ? std::vector<platform::Ipv4Address>{} : platform::resolveIPv4(name.c_str());
-    if (addresses.empty() || platform::dottedAddress(addresses.front()) == "127.0.0.2") {
-        GTEST_SKIP() << "this machine's name does not resolve to a usable address";
+    const std::string own = addresses.empty() ? "127.0.0.2" : platform::dottedAddress(addresses.front());
+    const struct {
+        const char* trusted;
+        std::string from;
+    } cases[] = {{"10.255.255.1  127.0.0.1", "127.0.0.1"}, {"localhost", own}};
+    for (const auto& c : cases) {
+        if (c.from == "127.0.0.2") {
+            continue;  // this machine's name does not resolve to a usable address
+        }
+        SCOPED_TRACE(c.trusted);
+        FakeServer caseServer;
+        caseServer.expectFrame(firstHandshake())
+            .sendFrame(signedIn())
+            .expectAnyFrame()
+            .sendFrame(zeltest::reply("SUCCESS", "queued"))
+            .connectBackFromAndSend("127.0.0.2", "from a stranger")
+            .connectBackFromAndSend(c.from, "trusted");
+        caseServer.start();
+        ZELServerTCPIPChannel caseChannel;
+        const ZELServerStringArray options({"TRUSTED_HOST_NAMES", c.trusted});
+        ASSERT_EQ(StatusPtr(caseChannel.open(*passwordInfo("ann", "pw1", caseServer.port()), &options)), nullptr);
+        const RequestPtr request(caseChannel.createRequest("JOB", ZELServerStringArray(), ZELServerStringArray()));
+        const ResponsePtr response(caseChannel.createResponse());
+        const StatusPtr status(caseChannel.sendRequest(*request, *response, kResultPortRequest));
+        EXPECT_EQ(status, nullptr) << describe(status.get());
+        std::string body;
+        response->getBody(body);
+        EXPECT_EQ(body, "trusted");
+        EXPECT_TRUE(caseServer.verify());
     }
-    server.expectFrame(firstHandshake())
-        .sendFrame(signedIn())
-        .expectAnyFrame()
-        .sendFrame(zeltest::reply("SUCCESS", "queued"))
-        .connectBackFromAndSend("127.0.0.2", "stranger")
-        .connectBackFromAndSend(platform::dottedAddress(addresses.front()), "this machine");
-    server.start();
-    const ZELServerStringArray options({"TRUSTED_HOST_NAMES", "localhost"});
-    open(&options);
-    const RequestPtr request(channel->createRequest("JOB", ZELServerStringArray(), ZELServerStringArray()));
-    const ResponsePtr response(channel->createResponse());
-    const StatusPtr status(channel->sendRequest(*request, *response, kResultPortRequest));
-    EXPECT_EQ(status, nullptr) << describe(status.get());
-    std::string body;
-    response->getBody(body);
-    EXPECT_EQ(body, "this machine");
-    EXPECT_TRUE(server.verify());
 }
 
 TEST_F(ChannelTest, ResultPortServerErrorEndsTheExchangeBeforeAnyCall)

@@ -6,10 +6,6 @@
 #include <vector>
 
 #include <gtest/gtest.h>
-#include <zelserverapi/IZELServerPath.h>
-#include <zelserverapi/IZELServerPropertyAccessor.h>
-#include <zelserverapi/IZELServerService.h>
-#include <zelserverapi/IZELServerUserToken.h>
 
 #include "api/ZELServerString.h"
 #include "api/ZELServerStringArray.h"
@@ -17,7 +13,6 @@
 #include "api/message_numbers.h"
 #include "security/ZELServerIdentity.h"
 #include "transport/ZELServerTCPIPRequest.h"
-#include "transport/payload_fields.h"
 #include "transport/xml_document.h"
 #include "transport/xml_reader.h"
 
@@ -69,15 +64,6 @@ TEST(Request, WithIdentityCarriesTheIdentityDocumentBeforeTheClientId)
                                    "</REP_GET_REPOSITORIES>\0clientID=tool-7"s);
 }
 
-TEST(Request, UnauthenticatedIdentityWithoutRolesIsStillAttached)
-{
-    const ZELServerIdentity identity;
-    const ZELServerTCPIPRequest request("SERVER_SESSION_INIT", &identity, "");
-    EXPECT_EQ(textOf(request), "SERVER_SESSION_INIT\0identityObject="s + kDeclaration +
-                                   R"(<SERVER_SESSION_INIT><IDENTITY id="" is_authenticated="false"><ROLES/>)"
-                                   "</IDENTITY></SERVER_SESSION_INIT>\0clientID="s);
-}
-
 TEST(Request, KeywordThatIsNoElementNameLeavesTheIdentityOut)
 {
     ZELServerIdentity identity;
@@ -108,16 +94,6 @@ TEST_F(RequestWithoutXml, RefusesEveryDocumentAndKeepsPlainValues)
 
 // ---- Named values -----------------------------------------------------------------------------------
 
-TEST(Request, ValuesAreAppendedAsGivenInEveryForm)
-{
-    ZELServerTCPIPRequest request("K", nullptr, "");
-    request.addValue("a", ZELServerString("1=2"));
-    request.addValue("b", std::string("x"));
-    request.addValue(ZELServerString("c"), ZELServerString(""));
-    request.addValue("a", "again");
-    EXPECT_EQ(textOf(request), "K\0clientID=\0a=1=2\0b=x\0c=\0a=again"s);
-}
-
 TEST(Request, BooleanIsTrueOnlyForExactlyOne)
 {
     ZELServerTCPIPRequest request("K", nullptr, "");
@@ -147,8 +123,7 @@ TEST_P(ValueList, AddsEachCompletePairWithoutTheListName)
 }
 
 INSTANTIATE_TEST_SUITE_P(Request, ValueList,
-                         ::testing::Values(ListCase{{}, ""}, ListCase{{"enableFilter"}, ""},
-                                           ListCase{{"enableFilter", "All"}, "\0enableFilter=All"s},
+                         ::testing::Values(ListCase{{"enableFilter"}, ""},
                                            ListCase{{"enableFilter", "All", "odd"}, "\0enableFilter=All"s},
                                            ListCase{{"a", "1", "b", ""}, "\0a=1\0b="s}));
 
@@ -208,17 +183,6 @@ TEST(RequestXmlValue, FailuresAddNothingAndLeaveTheRequestUsable)
     EXPECT_EQ(textOf(request), "K\0clientID=\0good="s + kDeclaration + R"(<ROOT><ITEM value="y"/></ROOT>)");
 }
 
-TEST(RequestPayload, RepositoryDocument)
-{
-    ZELServerTCPIPRequest request("REP_ADD_REPOSITORY", nullptr, "");
-    EXPECT_EQ(request.addRepositoryPayload("repositoryObject", ZELServerString("Samples"),
-                                           ZELServerString("Tom's \"demo\" & more")),
-              0);
-    EXPECT_EQ(textOf(request), "REP_ADD_REPOSITORY\0clientID=\0repositoryObject="s + kDeclaration +
-                                   R"(<REP_ADD_REPOSITORY><REPOSITORY description="Tom's &quot;demo&quot; &amp; more" )"
-                                   R"(name="Samples"/></REP_ADD_REPOSITORY>)");
-}
-
 TEST(RequestPayload, LocalTextIsConvertedAndIllegalCharactersFailTheSerialiser)
 {
     ZELServerTCPIPRequest request("REP_ADD_REPOSITORY", nullptr, "");
@@ -231,136 +195,6 @@ TEST(RequestPayload, LocalTextIsConvertedAndIllegalCharactersFailTheSerialiser)
     EXPECT_EQ(failing.addRepositoryPayload("repositoryObject", ZELServerString("r"), ZELServerString("\x01")),
               static_cast<int>(msg::kSerializeFailed));
     EXPECT_EQ(textOf(failing), "REP_ADD_REPOSITORY\0clientID="s);
-}
-
-class FixedToken : public IZELServerUserToken {
-public:
-    void getToken(IZELServerString& out) const override { out.assign("tk-1"); }
-    void getClientAddress(IZELServerString& out) const override { out.assign("10.0.0.1"); }
-    long long getExpirationTimeout() const override { return -3600; }
-};
-
-class ServerToken final : public FixedToken, public UserTokenPayloadFields {
-public:
-    std::string firstTokenDate() const override { return "2024-01-01"; }
-    std::string lastTokenDate() const override { return "2024-02-01"; }
-    std::string expirationDate() const override { return "2025-01-01"; }
-};
-
-TEST(RequestPayload, UserTokenDocumentUnderTheKeyword)
-{
-    ZELServerTCPIPRequest request("SEC_ADD_USERTOKEN", nullptr, "");
-    EXPECT_EQ(request.addUserTokenPayload("userTokenObject", ServerToken()), 0);
-    EXPECT_EQ(request.addUserTokenPayload("userTokenObject", FixedToken()), 0);
-    EXPECT_EQ(textOf(request),
-              "SEC_ADD_USERTOKEN\0clientID=\0userTokenObject="s + kDeclaration +
-                  R"(<SEC_ADD_USERTOKEN><USERTOKEN clientaddress="10.0.0.1" expirationdate="2025-01-01" )"
-                  R"(expirationtimeout="-3600" firsttokendate="2024-01-01" lasttokendate="2024-02-01" token="tk-1"/>)"
-                  "</SEC_ADD_USERTOKEN>\0userTokenObject="s +
-                  kDeclaration +
-                  R"(<SEC_ADD_USERTOKEN><USERTOKEN clientaddress="10.0.0.1" expirationdate="" )"
-                  R"(expirationtimeout="-3600" firsttokendate="" lasttokendate="" token="tk-1"/></SEC_ADD_USERTOKEN>)");
-}
-
-class FixedPath final : public IZELServerPath {
-public:
-    void getName(IZELServerString& out) const override { out.assign("a.txt"); }
-    void getDirectoryPath(IZELServerString& out) const override { out.assign("/data/in"); }
-    void getAbsolutePath(IZELServerString& out) const override { out.assign("/data/in/a.txt"); }
-};
-
-TEST(RequestPayload, PathDocumentUnderTheKeyword)
-{
-    ZELServerTCPIPRequest request("SR_EXISTS", nullptr, "");
-    EXPECT_EQ(request.addPathPayload("srPath", FixedPath()), 0);
-    EXPECT_EQ(textOf(request), "SR_EXISTS\0clientID=\0srPath="s + kDeclaration +
-                                   R"(<SR_EXISTS><PATH abspath="/data/in/a.txt" dirpath="/data/in" name="a.txt"/>)"
-                                   "</SR_EXISTS>");
-}
-
-// A service as the request sees it: only its getters are used.
-class NoProperties final : public IZELServerPropertyAccessor {
-public:
-    void getCategoryNames(IZELServerStringArray&) const override {}
-    void getPropertyNames(const IZELServerString&, IZELServerStringArray&) const override {}
-    bool getPropertyPairs(const IZELServerString&, IZELServerStringArray&) const override { return false; }
-    bool getPropertyValue(const IZELServerString&, const IZELServerString&, IZELServerString&) const override
-    {
-        return false;
-    }
-    void setProperty(const IZELServerString&, const IZELServerString&, const IZELServerString&) override {}
-    bool removeCategory(const IZELServerString&) override { return false; }
-    bool removeProperty(const IZELServerString&, const IZELServerString&) override { return false; }
-    void getProperties(const IZELServerString&, IZELServerVector<IZELServerProperty>&) const override {}
-    const IZELServerProperty* getProperty(const IZELServerString&, const IZELServerString&) const override
-    {
-        return nullptr;
-    }
-};
-
-class FixedService : public IZELServerService {
-public:
-    void getName(IZELServerString& out) const override { out.assign("svc"); }
-    void setName(const IZELServerString&) override {}
-    void getDisplayName(IZELServerString& out) const override { out.assign("Service <1>"); }
-    void setDisplayName(const IZELServerString&) override {}
-    void getDescription(IZELServerString& out) const override { out.assign(""); }
-    void setDescription(const IZELServerString&) override {}
-    void getUrlPattern(IZELServerString& out) const override { out.assign("/svc/*"); }
-    void setUrlPattern(const IZELServerString&) override {}
-    unsigned isEnabled() const override { return 1; }
-    void setEnabled(unsigned) override {}
-    IZELServerPropertyAccessor& getPropertyAccessor() override { return properties_; }
-    IZELServerStatus* updatePropertyAccessor(const IZELServerPropertyAccessor&) override { return nullptr; }
-    unsigned isWorkspaceRegistrationAllowed() const override { return 0; }
-    void setWorkspaceRegistrationAllowed(unsigned) override {}
-    // custom formats and templates allowed, custom transformers not; 7 counts as set
-    unsigned isRegistrationAllowed(unsigned itemType) const override
-    {
-        return itemType == 2 ? 7 : itemType == 4 ? 1 : 0;
-    }
-    void setRegistrationAllowed(unsigned, unsigned) override {}
-    IZELServerStatus* itemRegistered(const IZELServerString&, const IZELServerString&, unsigned&) override
-    {
-        return nullptr;
-    }
-    IZELServerStatus* registerItem(const IZELServerString&, const IZELServerString&) override { return nullptr; }
-    IZELServerStatus* deregisterItem(const IZELServerString&, const IZELServerString&, unsigned&) override
-    {
-        return nullptr;
-    }
-    IZELServerStatus* getRegisteredItems(const ZELServerStringDict*, IZELServerVector<IZELServerItem>&) override
-    {
-        return nullptr;
-    }
-
-private:
-    NoProperties properties_;
-};
-
-class ServerService final : public FixedService, public ServicePayloadFields {
-public:
-    std::string serviceId() const override { return "42"; }
-};
-
-TEST(RequestPayload, ServiceDocumentKeepsTheAddRootAndWritesFlagsAsWords)
-{
-    ZELServerTCPIPRequest request("REP_UPDATE_SERVICE", nullptr, "");
-    EXPECT_EQ(request.addServicePayload("serviceObject", ServerService()), 0);
-    const auto document = [](const std::string& id) {
-        return kDeclaration +
-               R"(<REP_ADD_SERVICE><SERVICE description="" display_name="Service &lt;1>" )"
-               R"(is_customformat_reg_allowed="true" is_customtransform_reg_allowed="false" )"
-               R"(is_enabled="true" is_template_reg_allowed="true" is_workspace_reg_allowed="false" )"
-               R"(name="svc" service_id=")" +
-               id + R"(" url_pattern="/svc/*"/></REP_ADD_SERVICE>)";
-    };
-    EXPECT_EQ(textOf(request), "REP_UPDATE_SERVICE\0clientID=\0serviceObject="s + document("42"));
-
-    // a service that never came from the server has the id of a fresh one
-    ZELServerTCPIPRequest fresh("REP_ADD_SERVICE", nullptr, "");
-    EXPECT_EQ(fresh.addServicePayload("serviceObject", FixedService()), 0);
-    EXPECT_EQ(textOf(fresh), "REP_ADD_SERVICE\0clientID=\0serviceObject="s + document("-1"));
 }
 
 }  // namespace

@@ -62,9 +62,7 @@ TEST_P(ReadBoolean, AcceptsExactlyTrueAndFalse)
 INSTANTIATE_TEST_SUITE_P(Response, ReadBoolean,
                          ::testing::Values(BooleanCase{"true", 0, 1}, BooleanCase{"false", 0, 0},
                                            BooleanCase{"True", 393604, 7}, BooleanCase{"true ", 393604, 7},
-                                           BooleanCase{"", 393604, 7}, BooleanCase{"FALSE", 393604, 7},
-                                           BooleanCase{" false", 393604, 7}, BooleanCase{"1", 393604, 7},
-                                           BooleanCase{"true\0"s, 393604, 7}));
+                                           BooleanCase{"", 393604, 7}, BooleanCase{"true\0"s, 393604, 7}));
 
 // ---- Sign-in reply ----------------------------------------------------------------------------------
 
@@ -244,14 +242,6 @@ TEST(ObjectReader, ListHoldsEveryElementAtAnyDepthInDocumentOrder)
               0);
     EXPECT_EQ(namesOf(things), (std::vector<std::string>{"root", "a", "a1", "b"}));
     EXPECT_EQ(alive, 4);  // the earlier element was destroyed, not just forgotten
-}
-
-TEST(ObjectReader, ListWithoutElementsIsEmptyAndSucceeds)
-{
-    ThingVector things;
-    things.append(new Thing());
-    EXPECT_EQ(readThings("<REPLY><OTHER/></REPLY>", things), 0);
-    EXPECT_EQ(things.entries(), 0u);
 }
 
 TEST(ObjectReader, ListStopsAtAnElementItsReaderRefusesAndKeepsWhatCameBefore)

@@ -73,24 +73,6 @@ TEST(TcpSocketReceive, CountBelowOneReturnsAtOnceWithoutReading)
     EXPECT_EQ(failed.receiveExact(buffer, 0, nullptr), 0);
 }
 
-TEST(TcpSocketReceive, AssemblesBytesThatArriveInPieces)
-{
-    FakeServer server;
-    const std::string payload = "SUCCESS\0body with \0 NULs"s;
-    const std::string wire = zeltest::frame(payload);
-    server.sendRaw(wire.substr(0, 3)).sendRaw(wire.substr(3, 7)).sendRaw(wire.substr(10));
-    server.start();
-
-    TcpSocket client("127.0.0.1", server.port());
-    ASSERT_EQ(client.errorCode, 0);
-    std::string received(wire.size(), '\0');
-    std::int32_t counter = 0;
-    EXPECT_EQ(client.receiveExact(received.data(), static_cast<std::int32_t>(wire.size()), &counter), 0);
-    EXPECT_EQ(counter, static_cast<std::int32_t>(wire.size()));
-    EXPECT_EQ(received, wire);
-    EXPECT_TRUE(server.verify());
-}
-
 TEST(TcpSocketReceive, PeerClosingInsideAFrameGivesReceiveFailedWithThePartialCount)
 {
     FakeServer server;
@@ -134,20 +116,6 @@ TEST(TcpSocketReceive, CloseBeforeAnyByteIsAReceiveFailureEvenAfterAWouldBlockPr
 
 // ---- sendBuffer -------------------------------------------------------------------------------------
 
-TEST(TcpSocketSend, SendsAWholeFrameByteForByte)
-{
-    FakeServer server;
-    const std::string payload = zeltest::request("SERVER_SESSION_INIT", {{"clientID", ""}});
-    server.expectFrame(payload);
-    server.start();
-
-    TcpSocket client("127.0.0.1", server.port());
-    ASSERT_EQ(client.errorCode, 0);
-    const std::string wire = zeltest::frame(payload);
-    EXPECT_EQ(client.sendBuffer(wire.data(), wire.size()), 0);
-    EXPECT_TRUE(server.verify());
-}
-
 TEST(TcpSocketSend, SendToAClosedPeerEventuallyFails)
 {
     FakeServer server;
@@ -189,21 +157,16 @@ TEST(TcpSocketConnect, ConnectsByNameAndRecordsHostAndPort)
     EXPECT_TRUE(server.verify());
 }
 
-TEST(TcpSocketConnect, ClosedPortGivesConnectFailed)
+TEST(TcpSocketConnect, ClosedPortsAndUnknownHostsFail)
 {
     const zeltest::ClosedPort closed;
-    TcpSocket client("127.0.0.1", closed.port());
-    EXPECT_EQ(client.errorCode, zel::SOCK_CONNECT_FAILED);
-    EXPECT_EQ(client.getHostName(), nullptr);
-    EXPECT_EQ(client.getPort(), 0);
-    EXPECT_FALSE(client.probeConnection());
-}
-
-TEST(TcpSocketConnect, UnknownHostGivesHostUnknown)
-{
-    TcpSocket client("no-such-host.invalid", 4000);
-    EXPECT_EQ(client.errorCode, zel::SOCK_HOST_UNKNOWN);
-    EXPECT_EQ(client.getHostName(), nullptr);
+    TcpSocket refused("127.0.0.1", closed.port());
+    EXPECT_EQ(refused.errorCode, zel::SOCK_CONNECT_FAILED);
+    EXPECT_EQ(refused.getHostName(), nullptr);
+    EXPECT_EQ(refused.getPort(), 0);
+    EXPECT_FALSE(refused.probeConnection());
+    TcpSocket unknown("no-such-host.invalid", 4000);
+    EXPECT_EQ(unknown.errorCode, zel::SOCK_HOST_UNKNOWN);
 }
 
 // ---- listener constructor ---------------------------------------------------------------------------
@@ -298,38 +261,7 @@ TEST(TcpSocketAccept, SecondAcceptReplacesThePeer)
     EXPECT_EQ(byte, '2');
 }
 
-TEST(TcpSocketAccept, AcceptOnAClientSocketFails)
-{
-    FakeServer server;
-    server.expectPeerClose();
-    server.start();
-    TcpSocket client("127.0.0.1", server.port());
-    ASSERT_EQ(client.errorCode, 0);
-    EXPECT_EQ(client.acceptPeer(), zel::SOCK_ACCEPT_FAILED);
-    EXPECT_EQ(client.getPeerAddress(), nullptr);
-    client.close();
-    EXPECT_TRUE(server.verify());
-}
-
 // ---- probeConnection --------------------------------------------------------------------------------
-
-TEST(TcpSocketProbe, IdleOpenConnectionIsUsableAndStaysBlocking)
-{
-    FakeServer server;
-    server.exchange("ping", "pong");
-    server.start();
-
-    TcpSocket client("127.0.0.1", server.port());
-    ASSERT_EQ(client.errorCode, 0);
-    EXPECT_TRUE(client.probeConnection());
-    // Had the probe left the socket non-blocking, this read would come back before the answer.
-    const std::string ping = zeltest::frame("ping");
-    ASSERT_EQ(client.sendBuffer(ping.data(), ping.size()), 0);
-    std::string answer(8, '\0');
-    EXPECT_EQ(client.receiveExact(answer.data(), 8), 0);
-    EXPECT_EQ(answer, zeltest::frame("pong"));
-    EXPECT_TRUE(server.verify());
-}
 
 TEST(TcpSocketProbe, ConnectionClosedByTheServerIsNotUsable)
 {
@@ -344,7 +276,7 @@ TEST(TcpSocketProbe, ConnectionClosedByTheServerIsNotUsable)
     EXPECT_TRUE(server.verify());
 }
 
-TEST(TcpSocketProbe, PendingByteMakesTheConnectionUsableAndIsConsumed)
+TEST(TcpSocketProbe, IdleOrPendingConnectionIsUsableAndStaysBlocking)
 {
     FakeServer server;
     // One write, so "AB" is already waiting when "pong" has been read.
@@ -353,6 +285,8 @@ TEST(TcpSocketProbe, PendingByteMakesTheConnectionUsableAndIsConsumed)
 
     TcpSocket client("127.0.0.1", server.port());
     ASSERT_EQ(client.errorCode, 0);
+    // Had the probe left the socket non-blocking, the read below would come back before the answer.
+    EXPECT_TRUE(client.probeConnection());
     const std::string ping = zeltest::frame("ping");
     ASSERT_EQ(client.sendBuffer(ping.data(), ping.size()), 0);
     char buffer[4];
@@ -422,30 +356,6 @@ TEST(TcpSocketLibrary, TwoSocketsStartTheLibraryOnceAndCleanUpOnce)
     EXPECT_EQ(TcpSocket::socketLibraryUsers(), users);
     EXPECT_EQ(TcpSocket::socketLibraryCleanups(), cleanups + firstUse);
     EXPECT_EQ(TcpSocket::socketLibraryStartups(), startups + firstUse);
-}
-
-TEST(TcpSocketLibrary, FailedConnectKeepsItsCountForGood)
-{
-    const std::uint32_t users = TcpSocket::socketLibraryUsers();
-    const std::uint32_t cleanups = TcpSocket::socketLibraryCleanups();
-    {
-        const zeltest::ClosedPort closed;
-        TcpSocket failed("127.0.0.1", closed.port());
-        EXPECT_EQ(failed.errorCode, zel::SOCK_CONNECT_FAILED);
-        EXPECT_EQ(TcpSocket::socketLibraryUsers(), users + 1);
-        failed.close();
-    }
-    EXPECT_EQ(TcpSocket::socketLibraryUsers(), users + 1);
-    EXPECT_EQ(TcpSocket::socketLibraryCleanups(), cleanups);
-
-    // A working socket opened and closed afterwards no longer brings the count to zero.
-    {
-        std::uint16_t port = 0;
-        TcpSocket listener(port);
-        ASSERT_EQ(listener.errorCode, 0);
-    }
-    EXPECT_EQ(TcpSocket::socketLibraryUsers(), users + 1);
-    EXPECT_EQ(TcpSocket::socketLibraryCleanups(), cleanups);
 }
 
 TEST(TcpSocketClose, ClosingAListenerAlsoClosesItsAcceptedPeer)

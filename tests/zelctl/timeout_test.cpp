@@ -16,8 +16,7 @@ TEST_F(Zelctl, GlobalTimeoutEndsTheWaitForASilentServer)
     for (const char* command : {"ping", "whoami"}) {
         const Outcome run = raw({"--port", port, "--user", "ann", "--timeout", "1", command}, "", false);
         EXPECT_EQ(run.status, 5) << command << ": " << run.err;
-        EXPECT_NE(run.err.find("timed out after 1 second waiting for 127.0.0.1:" + port), std::string::npos)
-            << run.err;
+        EXPECT_NE(run.err.find("timed out after 1 second waiting for 127.0.0.1:" + port), std::string::npos) << run.err;
     }
 }
 
