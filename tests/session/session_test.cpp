@@ -224,10 +224,46 @@ TEST_F(SessionTest, EveryFactoryMakesAnObjectItsDestroyTakesBackAndNullIsAccepte
     IZELServerSession& s = *session;
     using S = IZELServerSession;
     roundTrip<IZELServerString>(s, &S::createString, &S::destroyString);
+    roundTrip<IZELServerStringArray>(s, &S::createStringArray, &S::destroyStringArray);
+    roundTrip<IZELServerTransformationResult>(s, &S::createTransformationResult, &S::destroyTransformationResult);
+    roundTrip<IZELServerService>(s, &S::createService, &S::destroyService);
+    roundTrip<IZELServerVector<IZELServerService>>(s, &S::createServiceVector, &S::destroyServiceVector);
+    roundTrip<IZELServerWorkspace>(s, &S::createWorkspace, &S::destroyWorkspace);
+    roundTrip<IZELServerVector<IZELServerWorkspace>>(s, &S::createWorkspaceVector, &S::destroyWorkspaceVector);
+    roundTrip<IZELServerRepository>(s, &S::createRepository, &S::destroyRepository);
+    roundTrip<IZELServerVector<IZELServerRepository>>(s, &S::createRepositoryVector, &S::destroyRepositoryVector);
+    roundTrip<IZELServerWorkspaceSummary>(s, &S::createWorkspaceSummary, &S::destroyWorkspaceSummary);
+    roundTrip<IZELServerVector<IZELServerWorkspaceSummary>>(s, &S::createWorkspaceSummaryVector,
+                                                            &S::destroyWorkspaceSummaryVector);
+    roundTrip<IZELServerWorkspaceService>(s, &S::createWorkspaceService, &S::destroyWorkspaceService);
+    roundTrip<IZELServerVector<IZELServerWorkspaceService>>(s, &S::createWorkspaceServiceVector,
+                                                            &S::destroyWorkspaceServiceVector);
+    roundTrip<IZELServerCustomFormat>(s, &S::createCustomFormat, &S::destroyCustomFormat);
+    roundTrip<IZELServerVector<IZELServerCustomFormat>>(s, &S::createCustomFormatVector, &S::destroyCustomFormatVector);
+    roundTrip<IZELServerCustomTransformer>(s, &S::createCustomTransformer, &S::destroyCustomTransformer);
     roundTrip<IZELServerVector<IZELServerCustomTransformer>>(s, &S::createCustomTransformerVector,
                                                              &S::destroyCustomTransformerVector);
+    roundTrip<IZELServerResource>(s, &S::createResource, &S::destroyResource);
+    roundTrip<IZELServerVector<IZELServerResource>>(s, &S::createResourceVector, &S::destroyResourceVector);
+    roundTrip<IZELServerPropertyAccessor>(s, &S::createPropertyAccessor, &S::destroyPropertyAccessor);
+    roundTrip<IZELServerVector<IZELServerProperty>>(s, &S::createPropertyVector, &S::destroyPropertyVector);
+    roundTrip<IZELServerLogFileInfo>(s, &S::createLogFileInfo, &S::destroyLogFileInfo);
+    roundTrip<IZELServerTemplate>(s, &S::createTemplate, &S::destroyTemplate);
+    roundTrip<IZELServerVector<IZELServerTemplate>>(s, &S::createTemplateVector, &S::destroyTemplateVector);
+    roundTrip<IZELServerVector<IZELServerItem>>(s, &S::createItemVector, &S::destroyItemVector);
     roundTrip<IZELServerMountPoint>(s, &S::createMountPoint, &S::destroyMountPoint);
+    roundTrip<IZELServerVector<IZELServerMountPoint>>(s, &S::createMountPointVector, &S::destroyMountPointVector);
+    roundTrip<IZELServerFileInfo>(s, &S::createFileInfo, &S::destroyFileInfo);
     roundTrip<IZELServerVector<IZELServerFileInfo>>(s, &S::createFileInfoVector, &S::destroyFileInfoVector);
+
+    // Objects made before any reply was read into them are empty and disabled.
+    IZELServerWorkspace* workspace = s.createWorkspace();
+    IZELServerWorkspaceSummary* summary = s.createWorkspaceSummary();
+    EXPECT_FALSE(workspace->isEnabled());
+    EXPECT_EQ(workspace->getFileSize(), 0);
+    EXPECT_FALSE(summary->isEnabled());
+    s.destroyWorkspace(&workspace);
+    s.destroyWorkspaceSummary(&summary);
 
     // Destroying nothing is harmless and leaves null.
     IZELServerString* string = nullptr;

@@ -64,6 +64,15 @@ TEST(Request, WithIdentityCarriesTheIdentityDocumentBeforeTheClientId)
                                    "</REP_GET_REPOSITORIES>\0clientID=tool-7"s);
 }
 
+TEST(Request, UnauthenticatedIdentityWithoutRolesIsStillAttached)
+{
+    const ZELServerIdentity identity;
+    const ZELServerTCPIPRequest request("SERVER_SESSION_INIT", &identity, "");
+    EXPECT_EQ(textOf(request), "SERVER_SESSION_INIT\0identityObject="s + kDeclaration +
+                                   R"(<SERVER_SESSION_INIT><IDENTITY id="" is_authenticated="false"><ROLES/>)"
+                                   "</IDENTITY></SERVER_SESSION_INIT>\0clientID="s);
+}
+
 TEST(Request, KeywordThatIsNoElementNameLeavesTheIdentityOut)
 {
     ZELServerIdentity identity;

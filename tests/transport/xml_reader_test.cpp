@@ -201,6 +201,9 @@ TEST(XmlReaderPlatform, TwoReadersAliveStartTheLibraryOnceAndStopItOnce)
     const unsigned long starts = XmlPlatform::startCount();
     const unsigned long stops = XmlPlatform::stopCount();
     EXPECT_FALSE(XmlReader::readerInitialisedLibrary());
+    {
+        XmlReader idle;
+    }  // a reader that never parsed holds nothing and gives nothing back
 
     auto first = std::make_unique<XmlReader>();
     auto second = std::make_unique<XmlReader>();
