@@ -29,15 +29,10 @@ public:
     virtual void getDescription(IZELServerString& out) const = 0;
 
     virtual IZELServerStatus* exists(const IZELServerPath& path, unsigned& present) = 0;
-    // Downloads `source` into the local file `localTarget`, through a temporary file that replaces
-    // the target only after a completed transfer (a failed download leaves the target untouched).
-    // The temporary file, "wb-tmp-XXXXXX.tmp" with the X replaced to make the name unique, is made in
-    // the target's folder; with an empty `localTarget` it is made in the system's folder for
-    // temporary files, and the file stays there under its temporary name. `received` is the server's
-    // answer: 0 when the server sent no file, and the target is then replaced by an empty file
-    // like after any completed exchange. 393624 when the temporary file cannot be made (with the target, or the folder
-    // for an empty target), before anything is sent, or when it cannot be moved onto the target.
-    // `listener` (owned by the caller, may be null) follows the transfer.
+    // Downloads `source` into the local file `localTarget` by the download rule of
+    // IZELServerRepository.h (393638 names the source's absolute path). With an empty `localTarget`
+    // the temporary file is made in the system's folder for temporary files and stays there under
+    // its temporary name. `listener` (owned by the caller, may be null) follows the transfer.
     virtual IZELServerStatus* download(const IZELServerPath& source, const IZELServerString& localTarget,
                                        unsigned& received, IZELServerProgressListener* listener) = 0;
     // Uploads the local file `localSource` to `destination`. 393617 ("src", the path) when the local
@@ -56,7 +51,9 @@ public:
     // Fills `entries` (cleared first) with the entries of the directory at `path`, in the server's
     // order. With `depth` 0 that is all: one listing. With a larger depth each directory entry is
     // followed by its own entries, listed the same way with depth - 1. When a deeper listing fails,
-    // its status is returned and the entries gathered so far stay in `entries`.
+    // its status is returned and the entries gathered so far stay in `entries`. A listing stops with
+    // 393604 once it has met more than 1,000,000 entries in all (each single reply is bounded by the
+    // connection's "MAX_REPLY_BYTES" as well).
     virtual IZELServerStatus* list(const IZELServerPath& path, unsigned depth,
                                    IZELServerVector<IZELServerFileInfo>& entries) = 0;
     // As list with depth 0.

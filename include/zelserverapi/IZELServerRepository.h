@@ -16,6 +16,14 @@
 //   393627  a resource named like its item (addItemResource, updateItemResource);
 //   393623  a local file to upload that cannot be opened (the path);
 //   393624  a local file to download into that cannot be opened (the path).
+//
+// Every download (shared resource, item, item resource, job log) follows one rule: the file is
+// received into a temporary file "wb-tmp-XXXXXX.tmp" in the destination's folder, which replaces the
+// destination only after a complete exchange whose final answer is "true" (`received` then 1). A
+// failed download never truncates, empties or deletes an existing destination: 393624 when the
+// temporary file cannot be made (before anything is sent) or cannot replace the destination; the
+// server's refusal as 393625 with its text; 393638 naming the source when the server sent no file;
+// a final answer "false" gives success with `received` 0; any other answer 393604.
 // The connection's statuses come back unchanged. Out flags are set to 0 first and then to the server's
 // answer, so they read 0 after any failure. Found flags become 1 when the reply described the object.
 //
@@ -45,9 +53,8 @@ public:
     virtual void getDescription(IZELServerString& out) const = 0;
 
     virtual IZELServerStatus* itemExists(const IZELServerString& itemName, unsigned& exists) = 0;
-    // Downloads the item into `destinationPath`, through a temporary file: a failed or empty download
-    // never replaces an existing destination. 393624 names the temporary file when that cannot be
-    // made; 393638 (the item name) when the server sent zero bytes. `received` is the server's answer.
+    // Downloads the item into `destinationPath` by the download rule above; an item of zero bytes
+    // counts as no file (393638 with the item name).
     virtual IZELServerStatus* getItem(const IZELServerString& itemName, const IZELServerString& destinationPath,
                                       unsigned& received, IZELServerProgressListener* listener) = 0;
     virtual IZELServerStatus* getItem(const IZELServerString& itemName, const IZELServerString& destinationPath,
@@ -64,8 +71,8 @@ public:
 
     virtual IZELServerStatus* itemResourceExists(const IZELServerString& itemName, const IZELServerString& resourceName,
                                                  unsigned& exists) = 0;
-    // Downloads the resource straight into `destinationPath` (replacing it); `received` is the
-    // server's answer.
+    // Downloads the resource into `destinationPath` by the download rule above (393638 names the
+    // resource).
     virtual IZELServerStatus* getItemResource(const IZELServerString& itemName, const IZELServerString& resourceName,
                                               const IZELServerString& destinationPath, unsigned& received,
                                               IZELServerProgressListener* listener) = 0;

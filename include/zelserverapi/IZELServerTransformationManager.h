@@ -85,9 +85,9 @@ public:
     // Fills `info` with the log's description. `found` is set to 0 first and to 1 when the reply could
     // be read; an unreadable reply is no failure (null, `found` 0).
     virtual IZELServerStatus* getLogFileInfo(unsigned jobId, IZELServerLogFileInfo& info, unsigned& found) = 0;
-    // Downloads the log into the local file `localPath`, replacing it. 393624 (the path) when the file
-    // cannot be written; nothing is sent then. `success` is the server's answer; when it is 0 the local
-    // file is deleted. After a failed exchange a partly written file stays.
+    // Downloads the log into the local file `localPath` by the download rule of IZELServerRepository.h
+    // (393638 names "job " and the ID): the file replaces `localPath` only when the server's final
+    // answer is "true"; after "false" (`success` 0) or a failure an existing file is left as it was.
     virtual IZELServerStatus* getLogFile(unsigned jobId, const IZELServerString& localPath, unsigned& success) = 0;
 
     virtual ~IZELServerTransformationManager() = default;

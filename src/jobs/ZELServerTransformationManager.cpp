@@ -13,7 +13,6 @@
 #include "api/conversions.h"
 #include "api/message_numbers.h"
 #include "api/status.h"
-#include "transport/LocalFile.h"
 #include "transport/checked_command.h"
 
 namespace zel {
@@ -286,28 +285,12 @@ IZELServerStatus* ZELServerTransformationManager::getLogFileInfo(unsigned jobId,
 IZELServerStatus* ZELServerTransformationManager::getLogFile(unsigned jobId, const IZELServerString& localPath,
                                                              unsigned& success)
 {
-    const std::string path = toStdString(localPath);
-    // Opened before anything is sent, so that a path that cannot be written costs no exchange.
-    LocalFile check(path, LocalFile::Mode::Write);
+    const std::string job = jobIdText(jobId);
     // The client never asks the server to check the log's checksum.
     return CheckedCommand(channel(), "LOG_GET_FILE")
-        .check(check.isOpen(), msg::kLocalFileWrite, {path})
-        .add("jobID", jobIdText(jobId))
+        .add("jobID", job)
         .add("logFileCRCCheckingEnabled", "false")
-        .run(success, [&](Command& command) -> IZELServerStatus* {
-            unsigned answer = 2;  // neither truth value: the reply did not say
-            if (IZELServerStatus* status = command.receive(path, answer, nullptr)) {
-                return status;
-            }
-            success = answer == 1 ? 1 : 0;
-            if (answer == 0) {
-                // Only a log the server says it has not got is deleted; closed first, because
-                // some systems refuse to delete a file that is still open.
-                check.close();
-                std::remove(path.c_str());
-            }
-            return nullptr;
-        });
+        .download({toStdString(localPath), "job " + job}, success, nullptr);
 }
 
 }  // namespace zel

@@ -4,6 +4,7 @@
 // operation the C++ library has no portable form for: creating a file only when it is new. Implemented once
 // for POSIX (platform/posix) and once for Windows (platform/windows).
 
+#include <cstdio>
 #include <optional>
 #include <string>
 
@@ -45,8 +46,9 @@ bool findFirstFile(const std::string& pattern);
 enum class NewFile { Created, Exists, Failed };
 
 // Creates an empty file at `path` only when nothing of that name exists, in one step, so that two
-// processes guessing the same name cannot both have it.
-NewFile createNewFile(const std::string& path);
+// processes guessing the same name cannot both have it. With `writer`, the file is left open for
+// writing in binary mode through *writer (the caller closes it), so nothing has to open it again.
+NewFile createNewFile(const std::string& path, std::FILE** writer = nullptr);
 
 // Reads a text value under HKEY_LOCAL_MACHINE\keyPath. A missing key or value, or a system without
 // a registry, gives the empty string.

@@ -1,8 +1,6 @@
 #include "repository/ZELServerRepository.h"
 
-#include <filesystem>
 #include <optional>
-#include <system_error>
 
 #include "api/ZELServerString.h"
 #include "api/ZELServerStringArray.h"
@@ -10,12 +8,9 @@
 #include "api/status.h"
 #include "transport/attribute_binding.h"
 #include "repository/reply_readers.h"
-#include "sharedresources/temporary_file.h"
 
 namespace zel {
 namespace {
-
-namespace fs = std::filesystem;
 
 constexpr AttributeBinding<RepositoryFields> kRepositoryAttributes[] = {
     {"name", &RepositoryFields::name},
@@ -56,49 +51,6 @@ std::string bodyOf(const IZELServerResponse& response)
     std::string body;
     response.getBody(body);
     return body;
-}
-
-// Size of a received file; 0 when it cannot be told, which counts as empty.
-std::uintmax_t receivedSize(const std::string& path)
-{
-    std::error_code error;
-    const std::uintmax_t size = fs::file_size(path, error);
-    return error ? 0 : size;
-}
-
-// A rename cannot cross file systems, and the temporary directory often lies on another one than
-// the destination; the contents are then copied across.
-bool moveOnto(TemporaryFile& received, const std::string& destination)
-{
-    if (received.moveTo(destination)) {
-        return true;
-    }
-    std::error_code error;
-    fs::copy_file(received.path(), destination, fs::copy_options::overwrite_existing, error);
-    return !error;
-}
-
-// The item arrives in a temporary file first, so that a failed or empty transfer never replaces
-// what the destination held.
-IZELServerStatus* downloadItem(Command& command, const std::string& itemName, const std::string& destination,
-                               unsigned& received, IZELServerProgressListener* progress)
-{
-    const std::string directory = TemporaryFile::directoryFor("");
-    std::optional<TemporaryFile> file = TemporaryFile::createIn(directory);
-    if (!file) {
-        const std::string pattern = std::string(TemporaryFile::kPrefix) + "XXXXXX" + TemporaryFile::kSuffix;
-        return makeStatus(msg::kLocalFileWrite, (fs::path(directory) / pattern).string());
-    }
-    if (IZELServerStatus* status = command.receive(file->path(), received, progress)) {
-        return status;
-    }
-    if (receivedSize(file->path()) < 1) {
-        return makeStatus(msg::kEmptyDownload, itemName);
-    }
-    if (!moveOnto(*file, destination)) {
-        return makeStatus(msg::kLocalFileWrite, destination);
-    }
-    return nullptr;
 }
 
 }  // namespace
@@ -143,14 +95,13 @@ IZELServerStatus* ZELServerRepository::getItem(const IZELServerString& itemName,
                                                IZELServerProgressListener* listener)
 {
     const std::string item = toStdString(itemName);
-    const std::string destination = toStdString(destinationPath);
     return on("REP_GET_ITEM")
         .require(itemName)
         .require(destinationPath)
         .check(allowedName(itemName))
         .add("itemName", item)
         .add("itemFileCRCCheckingEnabled", kNoCrcCheck)
-        .run(received, [&](Command& command) { return downloadItem(command, item, destination, received, listener); });
+        .download({toStdString(destinationPath), item, true}, received, listener);
 }
 
 IZELServerStatus* ZELServerRepository::getItem(const IZELServerString& itemName,
@@ -223,8 +174,7 @@ IZELServerStatus* ZELServerRepository::getItemResource(const IZELServerString& i
                                                        const IZELServerString& destinationPath, unsigned& received,
                                                        IZELServerProgressListener* listener)
 {
-    // A resource is received straight into its destination: no temporary file and no size check.
-    const std::string destination = toStdString(destinationPath);
+    // Unlike an item, an empty resource is a resource.
     return on("REP_GET_ITEMRESOURCE")
         .require(itemName)
         .require(resourceName)
@@ -234,7 +184,7 @@ IZELServerStatus* ZELServerRepository::getItemResource(const IZELServerString& i
         .add("itemName", itemName)
         .add("resourceName", resourceName)
         .add("resourceFileCRCCheckingEnabled", kNoCrcCheck)
-        .download(destination, received, listener);
+        .download({toStdString(destinationPath), toStdString(resourceName)}, received, listener);
 }
 
 IZELServerStatus* ZELServerRepository::getItemResource(const IZELServerString& itemName,

@@ -40,11 +40,19 @@ bool ZELServerUserToken::readFrom(const XmlElement& element)
     return true;
 }
 
+// The token is a child of the document element: a document element that is itself "USERTOKEN", or
+// a token deeper down, describes something else.
 int readUserTokenReply(std::string_view body, IZELServerUserToken& token)
 {
-    return readFirstObject<ZELServerUserToken>(
-        body, "USERTOKEN", token,
-        [](ZELServerUserToken& target, const XmlElement& element) { return target.readFrom(element); });
+    return readReplyDocument(body, [&token](const XmlElement& root) {
+        auto* concrete = dynamic_cast<ZELServerUserToken*>(&token);
+        for (const XmlElement* child : childElements(&root)) {
+            if (child->name() == "USERTOKEN") {
+                return concrete != nullptr && concrete->readFrom(*child);
+            }
+        }
+        return false;
+    });
 }
 
 }  // namespace zel

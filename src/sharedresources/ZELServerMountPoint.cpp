@@ -1,6 +1,8 @@
 #include "sharedresources/ZELServerMountPoint.h"
 
+#include <memory>
 #include <optional>
+#include <utility>
 #include <vector>
 
 #include <xercesc/dom/DOMElement.hpp>
@@ -12,7 +14,6 @@
 #include "api/status.h"
 #include "sharedresources/ZELServerFileInfo.h"
 #include "sharedresources/ZELServerPath.h"
-#include "sharedresources/temporary_file.h"
 #include "transport/LocalFile.h"
 #include "transport/attribute_binding.h"
 #include "transport/checked_command.h"
@@ -67,29 +68,12 @@ IZELServerStatus* ZELServerMountPoint::exists(const IZELServerPath& path, unsign
 IZELServerStatus* ZELServerMountPoint::download(const IZELServerPath& source, const IZELServerString& localTarget,
                                                 unsigned& received, IZELServerProgressListener* listener)
 {
-    const std::string target = toStdString(localTarget);
+    ZELServerString sourcePath;
+    source.getAbsolutePath(sourcePath);
     return on("SR_DOWNLOAD")
         .addPath(kSourcePath, source)
         .add(kCrcChecking, "true")
-        .run(received, [&](Command& command) -> IZELServerStatus* {
-            const std::string directory = TemporaryFile::directoryFor(target);
-            // Made before the command goes out: a target in a folder that cannot be written fails
-            // here, with the connection untouched.
-            std::optional<TemporaryFile> temporary = TemporaryFile::createIn(directory);
-            if (!temporary) {
-                return makeStatus(msg::kLocalFileWrite, target.empty() ? directory : target);
-            }
-            if (IZELServerStatus* status = command.receive(temporary->path(), received, listener)) {
-                return status;  // the temporary file goes with `temporary`; the target was never touched
-            }
-            // A server that sent no file is answered "false" by the channel; the (empty) temporary
-            // file still takes the target's place, as a completed exchange always does here.
-            if (target.empty()) {
-                temporary->keep();
-                return nullptr;
-            }
-            return temporary->moveTo(target) ? nullptr : makeStatus(msg::kLocalFileWrite, target);
-        });
+        .download({toStdString(localTarget), sourcePath.str()}, received, listener);
 }
 
 IZELServerStatus* ZELServerMountPoint::upload(const IZELServerString& localSource, const IZELServerPath& destination,
@@ -137,29 +121,57 @@ IZELServerStatus* ZELServerMountPoint::listOnce(const IZELServerPath& path,
 IZELServerStatus* ZELServerMountPoint::list(const IZELServerPath& path, unsigned depth,
                                             IZELServerVector<IZELServerFileInfo>& entries)
 {
+    return listWithin(path, depth, entries, kMaxListedEntries);
+}
+
+IZELServerStatus* ZELServerMountPoint::listWithin(const IZELServerPath& path, unsigned depth,
+                                                  IZELServerVector<IZELServerFileInfo>& entries, std::size_t limit)
+{
     entries.clearAndDestroy();
-    if (IZELServerStatus* status = listOnce(path, entries)) {
+    using Listing = ZELServerVector<IZELServerFileInfo, ZELServerFileInfo>;
+    // One listing per directory still being walked: its entries not yet handed on, and its level.
+    // The walk is depth first without recursion, and every entry is appended once, so a server that
+    // reports a directory inside itself costs round trips up to the caller's depth, never the stack,
+    // and a long listing costs time linear in its length.
+    struct Open {
+        std::unique_ptr<Listing> listing;
+        unsigned next = 0;
+        unsigned level = 0;
+    };
+    std::vector<Open> open;
+    open.push_back({std::make_unique<Listing>(), 0, 0});
+    if (IZELServerStatus* status = listOnce(path, *open.back().listing)) {
         return status;
     }
-    // Deeper listings are spliced in right behind their directory, so the walk needs no recursion:
-    // a server that reports a directory inside itself costs round trips up to the caller's depth,
-    // never the stack.
-    std::vector<unsigned> levels(entries.entries(), 0);
-    for (unsigned i = 0; i < entries.entries(); ++i) {
-        const IZELServerFileInfo* entry = entries.element(i);
-        if (entry == nullptr || !entry->isDirectory() || levels[i] >= depth) {
+    std::size_t total = open.back().listing->entries();
+    while (!open.empty()) {
+        Open& top = open.back();
+        if (top.next == top.listing->entries()) {
+            open.pop_back();
             continue;
         }
-        ZELServerVector<IZELServerFileInfo, ZELServerFileInfo> children;
-        if (IZELServerStatus* status = listOnce(entry->getPath(), children)) {
+        IZELServerFileInfo* entry = std::exchange(top.listing->element(top.next++), nullptr);
+        const unsigned level = top.level;
+        entries.append(entry);
+        if (entry == nullptr || !entry->isDirectory() || level >= depth) {
+            continue;
+        }
+        auto children = std::make_unique<Listing>();
+        IZELServerStatus* status = listOnce(entry->getPath(), *children);
+        total += children->entries();
+        if (status == nullptr && total > limit) {
+            status = makeStatus(msg::kUnexpectedReply, "a listing of more than " + decimalText(limit) + " entries");
+        }
+        if (status != nullptr) {
+            // What was listed before stays, without the unlisted directories' own entries.
+            for (auto frame = open.rbegin(); frame != open.rend(); ++frame) {
+                while (frame->next < frame->listing->entries()) {
+                    entries.append(std::exchange(frame->listing->element(frame->next++), nullptr));
+                }
+            }
             return status;
         }
-        const unsigned count = children.entries();
-        for (unsigned k = 0; k < count; ++k) {
-            entries.insertAt(i + 1 + k, children.at(k));
-        }
-        children.clear();  // `entries` owns them now
-        levels.insert(levels.begin() + i + 1, count, levels[i] + 1);
+        open.push_back({std::move(children), 0, level + 1});
     }
     return nullptr;
 }

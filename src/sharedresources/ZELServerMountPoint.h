@@ -2,6 +2,7 @@
 // One shared resource (mount point) and the "SR_" file commands inside it, over the channel it was
 // made or read with.
 
+#include <cstddef>
 #include <string>
 
 #include <zelserverapi/IZELServerMountPoint.h>
@@ -49,6 +50,12 @@ public:
     IZELServerStatus* list(const IZELServerPath& path, unsigned depth,
                            IZELServerVector<IZELServerFileInfo>& entries) override;
     IZELServerStatus* list(const IZELServerPath& path, IZELServerVector<IZELServerFileInfo>& entries) override;
+
+    // The most entries list() gathers with depth, over all its directories together.
+    static constexpr std::size_t kMaxListedEntries = 1000000;
+    // list() with a bound of `limit` entries in all.
+    IZELServerStatus* listWithin(const IZELServerPath& path, unsigned depth,
+                                 IZELServerVector<IZELServerFileInfo>& entries, std::size_t limit);
     IZELServerStatus* makeDirectory(const IZELServerPath& path) override;
     IZELServerStatus* remove(const IZELServerPath& path, unsigned& removed) override;
     unsigned reserved() const override { return 0; }

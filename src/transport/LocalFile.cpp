@@ -12,17 +12,27 @@ namespace {
 // Large enough that the checksum pass costs few system calls, small enough to sit on the heap once.
 constexpr std::size_t kCrcBlockSize = 256 * 1024;
 
-std::ios::openmode openModeOf(LocalFile::Mode mode)
-{
-    return mode == LocalFile::Mode::Read ? std::ios::in | std::ios::binary
-                                         : std::ios::out | std::ios::trunc | std::ios::binary;
-}
-
 }  // namespace
 
+// Files are written through a C stream, so that a download can go on through the stream its
+// temporary file was created with.
 LocalFile::LocalFile(std::string path, Mode mode) : path_(std::move(path)), mode_(mode)
 {
-    stream_.open(path_, openModeOf(mode_));
+    if (mode_ == Mode::Read) {
+        stream_.open(path_, std::ios::in | std::ios::binary);
+    } else {
+        writer_ = std::fopen(path_.c_str(), "wb");
+    }
+}
+
+LocalFile::LocalFile(std::string path, std::FILE* writer) : path_(std::move(path)), mode_(Mode::Write), writer_(writer)
+{}
+
+LocalFile::~LocalFile()
+{
+    if (writer_ != nullptr) {
+        std::fclose(writer_);
+    }
 }
 
 std::optional<std::uint64_t> LocalFile::size()
@@ -71,11 +81,12 @@ std::optional<std::size_t> LocalFile::read(char* buffer, std::size_t count)
 
 bool LocalFile::write(const char* data, std::size_t count)
 {
-    if (!isOpen() || mode_ != Mode::Write) {
+    if (writer_ == nullptr) {
         return false;
     }
-    stream_.write(data, static_cast<std::streamsize>(count));
-    return static_cast<bool>(stream_);
+    const std::size_t done = std::fwrite(data, 1, count, writer_);
+    written_ += done;
+    return done == count;
 }
 
 bool LocalFile::close()
@@ -84,9 +95,12 @@ bool LocalFile::close()
         return false;
     }
     if (mode_ == Mode::Write) {
-        stream_.flush();
+        const bool flushed = std::fflush(writer_) == 0 && std::ferror(writer_) == 0;
+        const bool closed = std::fclose(writer_) == 0;
+        writer_ = nullptr;
+        return flushed && closed;
     }
-    const bool good = !stream_.bad() && !(mode_ == Mode::Write && stream_.fail());
+    const bool good = !stream_.bad();
     stream_.close();
     return good && !stream_.fail();
 }

@@ -5,6 +5,7 @@
 
 #include <cstddef>
 #include <cstdint>
+#include <cstdio>
 #include <fstream>
 #include <optional>
 #include <string>
@@ -21,13 +22,15 @@ public:
     };
 
     LocalFile(std::string path, Mode mode);
-    ~LocalFile() = default;
+    // Writes through a stream the caller opened (Mode::Write); the file takes it over and closes it.
+    LocalFile(std::string path, std::FILE* writer);
+    ~LocalFile();
 
     LocalFile(const LocalFile&) = delete;
     LocalFile& operator=(const LocalFile&) = delete;
 
     // Whether the stream opened (and has not been closed since).
-    bool isOpen() const { return stream_.is_open(); }
+    bool isOpen() const { return mode_ == Mode::Write ? writer_ != nullptr : stream_.is_open(); }
     const std::string& path() const { return path_; }
     Mode mode() const { return mode_; }
 
@@ -43,6 +46,8 @@ public:
 
     // Writes all `count` bytes. False on a write error.
     bool write(const char* data, std::size_t count);
+    // Bytes written so far.
+    std::uint64_t written() const { return written_; }
 
     // Flushes and closes the stream. False when the last bytes could not be written out.
     bool close();
@@ -54,7 +59,9 @@ public:
 private:
     std::string path_;
     Mode mode_;
-    std::fstream stream_;
+    std::fstream stream_;          // Mode::Read
+    std::FILE* writer_ = nullptr;  // Mode::Write
+    std::uint64_t written_ = 0;
 };
 
 }  // namespace zel

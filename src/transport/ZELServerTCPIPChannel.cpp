@@ -576,6 +576,11 @@ IZELServerStatus* ZELServerTCPIPChannel::downloadFile(Transfer& transfer, bool& 
         return makeStatus(msg::kReplyWithoutBody, payload);
     }
     if (header.outcome == wire::HeaderParse::Unusable) {
+        // A refusal comes as an "ERROR" reply in place of the header: the server's own words.
+        const std::optional<wire::Reply> refusal = wire::splitReply(payload);
+        if (refusal && refusal->status == wire::kError) {
+            return serverErrorStatus(refusal->body);
+        }
         noFile = true;
         return nullptr;
     }

@@ -226,10 +226,10 @@ IZELServerStatus* CheckedCommand::upload(const IZELServerString& path, IZELServe
     return run([&localPath, progress](Command& command) { return command.transfer(localPath, kUpload, progress); });
 }
 
-IZELServerStatus* CheckedCommand::download(const std::string& localPath, unsigned& received,
+IZELServerStatus* CheckedCommand::download(const DownloadTarget& target, unsigned& received,
                                            IZELServerProgressListener* progress)
 {
-    return run(received, [&](Command& command) { return command.receive(localPath, received, progress); });
+    return run(received, [&](Command& command) { return command.receive(target, received, progress); });
 }
 
 }  // namespace zel

@@ -112,9 +112,9 @@ public:
     // Sends the local file `path` with the command. 393623 with the path, nothing sent, when it
     // cannot be opened.
     IZELServerStatus* upload(const IZELServerString& path, IZELServerProgressListener* progress);
-    // Receives the command's file into `localPath` (see Command::receive); `received` is the reply's
-    // truth value.
-    IZELServerStatus* download(const std::string& localPath, unsigned& received, IZELServerProgressListener* progress);
+    // Receives the command's file for `target` (see Command::receive, the one download rule);
+    // `received` is 1 when the file replaced the destination.
+    IZELServerStatus* download(const DownloadTarget& target, unsigned& received, IZELServerProgressListener* progress);
     // The checks, then `exchange` on the ready command (for exchanges that need more than one step).
     IZELServerStatus* run(const Exchange& exchange);
     // As run, for an exchange that answers through `flag`, which the policy governs.

@@ -1,7 +1,13 @@
 #include "transport/command.h"
 
+#include <filesystem>
+#include <optional>
+#include <system_error>
+
 #include "api/message_numbers.h"
 #include "api/status.h"
+#include "transport/LocalFile.h"
+#include "transport/temporary_file.h"
 
 namespace zel {
 
@@ -76,13 +82,44 @@ IZELServerStatus* Command::transfer(const std::string& localPath, unsigned direc
     return channel_.transferFile(*request_, *response_, localPath, direction, progress);
 }
 
-IZELServerStatus* Command::receive(const std::string& localPath, unsigned& received,
+IZELServerStatus* Command::receive(const DownloadTarget& target, unsigned& received,
                                    IZELServerProgressListener* progress)
 {
-    if (IZELServerStatus* status = transfer(localPath, kDownload, progress)) {
+    if (!ready()) {
+        return notReady();
+    }
+    // A folder could never be replaced by the file; found out before anything is sent.
+    std::error_code ignored;
+    std::optional<TemporaryFile> temporary = std::filesystem::is_directory(target.destination, ignored)
+                                                 ? std::nullopt
+                                                 : TemporaryFile::createBeside(target.destination);
+    if (!temporary) {
+        const std::string& named = target.destination;
+        return makeStatus(msg::kLocalFileWrite, named.empty() ? TemporaryFile::directoryFor(named) : named);
+    }
+    // Declared after the temporary file, so it is closed before that file is deleted.
+    LocalFile file(temporary->path(), temporary->takeWriter());
+    if (IZELServerStatus* status = channel_.exchange(*request_, *response_, nullptr, &file, progress)) {
         return status;
     }
-    response_->readBoolean(received);
+    // The channel closes the file once the announced content is in: one still open got nothing.
+    if (file.isOpen() || (target.emptyIsMissing && file.written() == 0)) {
+        return makeStatus(msg::kEmptyDownload, target.source);
+    }
+    const std::string answer = body();
+    if (answer != "true") {
+        if (answer != "false") {
+            return makeStatus(msg::kUnexpectedReply, answer);
+        }
+        received = 0;
+        return nullptr;
+    }
+    if (target.destination.empty()) {
+        temporary->keep();
+    } else if (!temporary->moveTo(target.destination)) {
+        return makeStatus(msg::kLocalFileWrite, target.destination);
+    }
+    received = 1;
     return nullptr;
 }
 

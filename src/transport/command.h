@@ -23,6 +23,13 @@
 
 namespace zel {
 
+// Where a downloaded file goes and what names it in a status.
+struct DownloadTarget {
+    std::string destination;      // the caller's file; empty: the file stays under its temporary name
+    std::string source;           // what the server was asked for (393638 names it)
+    bool emptyIsMissing = false;  // a file of no bytes counts as no file
+};
+
 class Command {
 public:
     // `channel` is borrowed and must outlive the command.
@@ -55,9 +62,17 @@ public:
     IZELServerStatus* transfer(const std::string& localPath, unsigned direction,
                                IZELServerProgressListener* progress = nullptr);
 
-    // transfer() into `localPath` (direction kDownload), then the reply's truth value into
-    // `received`; a reply that is none leaves `received` as it was.
-    IZELServerStatus* receive(const std::string& localPath, unsigned& received,
+    // The one way a file comes down. It is received into a temporary file beside the destination and
+    // moved onto the destination only after a complete, successful exchange, so a failed download
+    // never truncates, empties or deletes what the destination held:
+    //  - the temporary file cannot be made: 393624 (the destination), nothing sent;
+    //  - the exchange fails: its status (an "ERROR" frame in place of the file: 393625 with the
+    //    server's text);
+    //  - the server sends no file (or, with emptyIsMissing, an empty one): 393638 naming the source;
+    //  - the final reply is "false": success with `received` 0; neither "true" nor "false": 393604;
+    //  - "true": the file replaces the destination (393624 when it cannot) and `received` is 1.
+    // `received` is written only in the last two cases.
+    IZELServerStatus* receive(const DownloadTarget& target, unsigned& received,
                               IZELServerProgressListener* progress = nullptr);
 
     // The reply body as the exchange left it; empty before an exchange or without a response.

@@ -177,7 +177,7 @@ TEST_F(Jobs, RequestsTheServerRefusesAreErrors)
         << "an unknown job has no result";
     auto info = client.own(session->createLogFileInfo(), &Session::destroyLogFileInfo);
     EXPECT_EQ(client.flag([&](unsigned& f) { return jobs->getLogFileInfo(424242, *info, f); }), -1);
-    EXPECT_EQ(client.flag([&](unsigned& f) { return jobs->getLogFile(424242, client.text(local("no.log")), f); }), 0);
+    EXPECT_EQ(client.flag([&](unsigned& f) { return jobs->getLogFile(424242, client.text(local("no.log")), f); }), -1);
     EXPECT_EQ(client.flag([&](unsigned& f) { return jobs->logFileExists(424242, f); }), 0);
 }
 

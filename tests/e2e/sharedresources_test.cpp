@@ -119,8 +119,8 @@ TEST_F(SharedResources, FileOperationsOnMissingEntriesAreRefused)
     EXPECT_EQ(client.flag([&](unsigned& f) { return area->exists(path("/none.txt"), f); }), 0);
     EXPECT_EQ(client.flag([&](unsigned& f) { return area->remove(path("/none.txt"), f); }), 0);
     writeFile(local("kept.txt"), "kept");
-    EXPECT_EQ(download(path("/none.txt"), "kept.txt"), 0);
-    EXPECT_EQ(readAll(local("kept.txt")), "") << "no file is a completed exchange: the target is emptied";
+    EXPECT_EQ(download(path("/none.txt"), "kept.txt"), -1);
+    EXPECT_EQ(readAll(local("kept.txt")), "kept") << "a failed download leaves the target alone";
     EXPECT_EQ(client.take(area->makeDirectory(path("/ok"))), 0u);
     EXPECT_EQ(client.take(area->copy(path("/ok"), path("/ok"))), kRefused) << "a directory copy needs a new name";
 }
@@ -147,7 +147,7 @@ TEST_F(SharedResources, PathsLeavingTheResourceAreRefused)
         EXPECT_EQ(client.take(area->makeDirectory(target)), kRefused);
         EXPECT_EQ(client.take(area->remove(target, flag)), kRefused);
         EXPECT_EQ(client.take(area->copy(target, path("/stolen.txt"))), kRefused);
-        EXPECT_EQ(download(target, "stolen.txt"), 0);
+        EXPECT_EQ(download(target, "stolen.txt"), -1);
     }
     EXPECT_EQ(readAll(local("outside/secret.txt")), "secret");
     EXPECT_EQ(readAll(local("stolen.txt")), "");

@@ -426,7 +426,7 @@ protected:
     const std::string path = (scratch.path() / "job.log").string();
 };
 
-TEST_F(LogDownload, ReceivesTheLogAndAFinalFalseDeletesIt)
+TEST_F(LogDownload, ReceivesTheLogAndAFinalFalseLeavesTheFileAsItWas)
 {
     const Bytes content = "line one\nline two\0binary\n"s;
     for (const char* answer : {"true", "false"}) {
@@ -448,24 +448,7 @@ TEST_F(LogDownload, ReceivesTheLogAndAFinalFalseDeletesIt)
     status.reset(manager.getLogFile(3, str(path), success));
     EXPECT_EQ(status, nullptr) << describe(status.get());
     EXPECT_EQ(success, 0u);
-    EXPECT_FALSE(fs::exists(path));
-    EXPECT_TRUE(server.verify());
-}
-
-TEST_F(LogDownload, ServerWithoutALogLeavesNoFileBehind)
-{
-    // A first frame that is no file header ends the exchange; the channel reads it as "false".
-    server.expectFrame(logCommand("3")).sendFrame(reply("SUCCESS", "false"));
-    server.expectFrame(logCommand("4")).sendFrame(reply("ERROR", "no log for job 4"));
-    signIn();
-    std::ofstream(path) << "an older log";
-    for (const unsigned jobId : {3u, 4u}) {
-        unsigned success = kUntouched;
-        StatusPtr status(manager.getLogFile(jobId, str(path), success));
-        EXPECT_EQ(status, nullptr) << describe(status.get());
-        EXPECT_EQ(success, 0u) << jobId;
-        EXPECT_FALSE(fs::exists(path)) << jobId;
-    }
+    EXPECT_EQ(slurp(path), content);
     EXPECT_TRUE(server.verify());
 }
 
@@ -485,7 +468,7 @@ TEST_F(LogDownload, UnwritablePathFailsBeforeAnythingIsSent)
     EXPECT_EQ(server.frames().size(), 1u);  // the sign-in only
 }
 
-TEST_F(LogDownload, BrokenTransferKeepsThePartlyWrittenFile)
+TEST_F(LogDownload, BrokenTransferLeavesNoFileBehind)
 {
     server.expectFrame(logCommand("3"))
         .sendFrame(fileHeader(10, 0))
@@ -498,7 +481,7 @@ TEST_F(LogDownload, BrokenTransferKeepsThePartlyWrittenFile)
     ASSERT_NE(status, nullptr);
     EXPECT_EQ(status->getMessageNumber(), msg::kReceiveFailed);
     EXPECT_EQ(success, 0u);
-    EXPECT_TRUE(fs::exists(path));
+    EXPECT_FALSE(fs::exists(path));
     EXPECT_TRUE(server.verify());
 }
 

@@ -1,8 +1,13 @@
 // The library against a server that lies, stalls or never answers: every case ends in a status, in
-// bounded time and memory, and a connection left in the middle of a message is given up.
+// bounded time and memory, a connection left in the middle of a message is given up, and a download
+// that does not complete leaves the caller's file as it was.
 
 #include <chrono>
 #include <cstdint>
+#include <filesystem>
+#include <fstream>
+#include <functional>
+#include <iterator>
 #include <optional>
 #include <string>
 #include <vector>
@@ -10,6 +15,7 @@
 #include <gtest/gtest.h>
 
 #include "hostile_fixture.h"
+#include "support/environment.h"
 #include "support/sockets.h"
 #include "transport/connection_limits.h"
 
@@ -154,6 +160,125 @@ TEST(ConnectionLimits, SecondsAreReadToTheMillisecond)
     const Case cases[] = {{"30", 30000}, {"0", 0}, {"0.25", 250}, {"1.5", 1500}, {"0.001", 1}, {"2000000", 2000000000}};
     for (const Case& c : cases) {
         EXPECT_EQ(zel::secondsAsMilliseconds(c.text), c.milliseconds) << c.text;
+    }
+}
+
+// Each download of the library, as one call on a signed-in session into `destination`.
+struct DownloadKind {
+    const char* name;
+    const char* source;  // what 393638 names
+    std::function<IZELServerStatus*(IZELServerSession&, const std::string& destination, unsigned& received)> call;
+};
+
+IZELServerStatus* withStrings(IZELServerSession& session, const std::vector<std::string>& values,
+                              const std::function<IZELServerStatus*(std::vector<IZELServerString*>&)>& call)
+{
+    std::vector<IZELServerString*> strings;
+    for (const std::string& value : values) {
+        strings.push_back(session.createString());
+        strings.back()->assign(value.c_str());
+    }
+    IZELServerStatus* status = call(strings);
+    for (IZELServerString*& string : strings) {
+        session.destroyString(&string);
+    }
+    return status;
+}
+
+const DownloadKind kDownloads[] = {
+    {"shared resource", "/in/a.txt",
+     [](IZELServerSession& session, const std::string& destination, unsigned& received) {
+         IZELServerMountPoint* area = session.createMountPoint();
+         IZELServerStatus* status =
+             withStrings(session, {"/in/a.txt", destination}, [&](std::vector<IZELServerString*>& s) {
+                 IZELServerPath* path = area->createPath(*s[0]);
+                 IZELServerStatus* result = area->download(*path, *s[1], received, nullptr);
+                 area->releaseObject(path);
+                 return result;
+             });
+         session.destroyMountPoint(&area);
+         return status;
+     }},
+    {"item", "plan.zlw",
+     [](IZELServerSession& session, const std::string& destination, unsigned& received) {
+         IZELServerRepository* repository = session.createRepository();
+         IZELServerStatus* status = withStrings(session, {"plan.zlw", destination},
+                                                [&](auto& s) { return repository->getItem(*s[0], *s[1], received); });
+         session.destroyRepository(&repository);
+         return status;
+     }},
+    {"item resource", "notes.txt",
+     [](IZELServerSession& session, const std::string& destination, unsigned& received) {
+         IZELServerRepository* repository = session.createRepository();
+         IZELServerStatus* status = withStrings(session, {"plan.zlw", "notes.txt", destination}, [&](auto& s) {
+             return repository->getItemResource(*s[0], *s[1], *s[2], received);
+         });
+         session.destroyRepository(&repository);
+         return status;
+     }},
+    {"job log", "job 42",
+     [](IZELServerSession& session, const std::string& destination, unsigned& received) {
+         return withStrings(session, {destination}, [&](auto& s) {
+             return session.getTransformationManager()->getLogFile(42, *s[0], received);
+         });
+     }},
+};
+
+// A file the server offers after the command: header, the client's go-ahead, then the content.
+FakeServer& offerFile(FakeServer& server, const std::string& content, std::size_t sent)
+{
+    return server.sendFrame(fileHeader(content.size(), crc32(content)))
+        .expectFrame(readyAck())
+        .sendRaw(content.substr(0, sent));
+}
+
+TEST_F(HostileSessionTest, FailedDownloadsLeaveTheDestinationAsItWas)
+{
+    struct Case {
+        const char* name;
+        std::function<void(FakeServer&)> answer;  // the server's part after reading the command
+        unsigned number;
+        const char* inMessage;  // "<source>" stands for the download's source
+        unsigned received;
+        bool replaced;  // the destination holds the new content afterwards
+    };
+    const Case cases[] = {
+        {"refused in place of the file", [](FakeServer& s) { s.sendFrame(reply("ERROR", "no such file")); }, 393625,
+         "no such file", 0, false},
+        {"no file header", [](FakeServer& s) { s.sendFrame(reply("SUCCESS", "false")); }, 393638, "<source>", 0, false},
+        {"content breaks off", [](FakeServer& s) { offerFile(s, "fresh", 2).closeConnection(); }, 393608, "392008", 0,
+         false},
+        {"final answer false",
+         [](FakeServer& s) { offerFile(s, "fresh", 5).expectFrame(readyAck()).sendFrame(reply("SUCCESS", "false")); },
+         0, "", 0, false},
+        {"final answer neither",
+         [](FakeServer& s) { offerFile(s, "fresh", 5).expectFrame(readyAck()).sendFrame(reply("SUCCESS", "maybe")); },
+         393604, "maybe", 0, false},
+        {"complete",
+         [](FakeServer& s) { offerFile(s, "fresh", 5).expectFrame(readyAck()).sendFrame(reply("SUCCESS", "true")); }, 0,
+         "", 1, true},
+    };
+    for (const DownloadKind& kind : kDownloads) {
+        for (const Case& c : cases) {
+            SCOPED_TRACE(std::string(kind.name) + ": " + c.name);
+            const TempDir folder("zel-download");
+            const std::filesystem::path destination = folder.path() / "kept.txt";
+            std::ofstream(destination, std::ios::binary) << "old";
+            FakeServer server;
+            server.exchange(firstHandshake(), signedIn()).expectAnyFrame();
+            c.answer(server);
+            signIn(server);
+            unsigned received = 7;
+            const Outcome got = outcome(kind.call(*session, destination.string(), received));
+            EXPECT_EQ(got.number, c.number) << got.message;
+            const std::string expected = c.inMessage == std::string("<source>") ? kind.source : c.inMessage;
+            EXPECT_NE(got.message.find(expected), std::string::npos) << got.message;
+            EXPECT_EQ(received, c.received);
+            std::ifstream in(destination, std::ios::binary);
+            EXPECT_EQ(std::string(std::istreambuf_iterator<char>(in), {}), c.replaced ? "fresh" : "old");
+            EXPECT_EQ(std::distance(std::filesystem::directory_iterator(folder.path()), {}), 1) << "no temporary file";
+            EXPECT_TRUE(server.verify());
+        }
     }
 }
 

@@ -265,7 +265,7 @@ TEST_F(MountPointTest, DownloadReplacesTheTargetOnlyWhenTheExchangeCompletes)
     const std::string content = "id;value\n1;2\n"s + std::string(200000, 'z');
     expectDownload(content, zeltest::reply("SUCCESS", "true"));
     expectDownload("new!", zeltest::reply("ERROR", "CRC mismatch"));
-    // An exchange that completes without a file still moves the empty temporary file onto the target.
+    // The server's refusal in place of the file is a failed download like any other.
     server.exchange(downloadCommand(), zeltest::reply("ERROR", "cannot open 'out/r.csv'"));
     signIn();
     const std::string target = file("r.csv", "old content");
@@ -284,9 +284,10 @@ TEST_F(MountPointTest, DownloadReplacesTheTargetOnlyWhenTheExchangeCompletes)
     EXPECT_EQ(slurp(target), "old content");
 
     received = 9;
-    EXPECT_EQ(numberOf(mountPoint->download(*path("out/r.csv"), ZELServerString(target), received, nullptr)), 0u);
+    EXPECT_EQ(numberOf(mountPoint->download(*path("out/r.csv"), ZELServerString(target), received, nullptr)),
+              msg::kServerError);
     EXPECT_EQ(received, 0u);
-    EXPECT_EQ(slurp(target), "");
+    EXPECT_EQ(slurp(target), "old content");
     EXPECT_TRUE(temporaryFiles(dir).empty());
     EXPECT_TRUE(server.verify());
 }

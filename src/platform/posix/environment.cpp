@@ -84,13 +84,22 @@ bool findFirstFile(const std::string& pattern)
     return ::stat(pattern.c_str(), &info) == 0;
 }
 
-NewFile createNewFile(const std::string& path)
+NewFile createNewFile(const std::string& path, std::FILE** writer)
 {
     const int fd = ::open(path.c_str(), O_WRONLY | O_CREAT | O_EXCL | O_CLOEXEC, 0666);
     if (fd < 0) {
         return errno == EEXIST ? NewFile::Exists : NewFile::Failed;
     }
-    return ::close(fd) == 0 ? NewFile::Created : NewFile::Failed;
+    if (writer == nullptr) {
+        return ::close(fd) == 0 ? NewFile::Created : NewFile::Failed;
+    }
+    *writer = ::fdopen(fd, "wb");
+    if (*writer == nullptr) {
+        ::close(fd);
+        ::unlink(path.c_str());
+        return NewFile::Failed;
+    }
+    return NewFile::Created;
 }
 
 std::string readMachineRegistryString(const char* /*keyPath*/, const char* /*valueName*/) { return std::string(); }

@@ -8,6 +8,10 @@
 #endif
 #include <windows.h>
 
+#include <fcntl.h>
+#include <io.h>
+
+#include <cstdint>
 #include <cstdlib>
 #include <vector>
 
@@ -99,14 +103,30 @@ bool findFirstFile(const std::string& pattern)
     return true;
 }
 
-NewFile createNewFile(const std::string& path)
+NewFile createNewFile(const std::string& path, std::FILE** writer)
 {
     HANDLE file = ::CreateFileA(path.c_str(), GENERIC_WRITE, 0, nullptr, CREATE_NEW, FILE_ATTRIBUTE_NORMAL, nullptr);
     if (file == INVALID_HANDLE_VALUE) {
         const DWORD error = ::GetLastError();
         return error == ERROR_FILE_EXISTS || error == ERROR_ALREADY_EXISTS ? NewFile::Exists : NewFile::Failed;
     }
-    return ::CloseHandle(file) ? NewFile::Created : NewFile::Failed;
+    if (writer == nullptr) {
+        return ::CloseHandle(file) ? NewFile::Created : NewFile::Failed;
+    }
+    // The handle becomes a C runtime descriptor and then a stream; each step owns what it wraps.
+    const int descriptor = ::_open_osfhandle(reinterpret_cast<intptr_t>(file), _O_WRONLY | _O_BINARY);
+    if (descriptor < 0) {
+        ::CloseHandle(file);
+        ::DeleteFileA(path.c_str());
+        return NewFile::Failed;
+    }
+    *writer = ::_fdopen(descriptor, "wb");
+    if (*writer == nullptr) {
+        ::_close(descriptor);
+        ::DeleteFileA(path.c_str());
+        return NewFile::Failed;
+    }
+    return NewFile::Created;
 }
 
 std::string readMachineRegistryString(const char* keyPath, const char* valueName)

@@ -1,4 +1,4 @@
-#include "sharedresources/temporary_file.h"
+#include "transport/temporary_file.h"
 
 #include "platform/environment.h"
 
@@ -29,8 +29,9 @@ std::string randomLetters(std::mt19937& generator)
 
 }  // namespace
 
-std::optional<TemporaryFile> TemporaryFile::createIn(const std::string& directory)
+std::optional<TemporaryFile> TemporaryFile::createBeside(const std::string& destination)
 {
+    const std::string directory = directoryFor(destination);
     const fs::path folder = directory.empty() ? fs::path(".") : fs::path(directory);
     std::random_device seed;
     std::mt19937 generator(seed());
@@ -38,9 +39,10 @@ std::optional<TemporaryFile> TemporaryFile::createIn(const std::string& director
         const std::string path = (folder / (kPrefix + randomLetters(generator) + kSuffix)).string();
         // Created only when new: that is what makes the name ours even when another process
         // guesses the same one.
-        switch (platform::createNewFile(path)) {
+        std::FILE* writer = nullptr;
+        switch (platform::createNewFile(path, &writer)) {
         case platform::NewFile::Created:
-            return TemporaryFile(path);
+            return TemporaryFile(path, writer);
         case platform::NewFile::Exists:
             continue;
         case platform::NewFile::Failed:
@@ -50,30 +52,37 @@ std::optional<TemporaryFile> TemporaryFile::createIn(const std::string& director
     return std::nullopt;
 }
 
-std::string TemporaryFile::directoryFor(const std::string& target)
+std::string TemporaryFile::directoryFor(const std::string& destination)
 {
-    if (!target.empty()) {
-        return fs::path(target).parent_path().string();
+    if (!destination.empty()) {
+        return fs::path(destination).parent_path().string();
     }
     std::error_code error;
     const fs::path folder = fs::temp_directory_path(error);
     return error ? std::string() : folder.string();
 }
 
-TemporaryFile::TemporaryFile(TemporaryFile&& other) noexcept : path_(std::exchange(other.path_, std::string())) {}
+TemporaryFile::TemporaryFile(TemporaryFile&& other) noexcept
+    : path_(std::exchange(other.path_, std::string())), writer_(std::exchange(other.writer_, nullptr))
+{}
 
 TemporaryFile::~TemporaryFile()
 {
+    if (writer_ != nullptr) {
+        std::fclose(writer_);
+    }
     if (!path_.empty()) {
         std::error_code ignored;
         fs::remove(path_, ignored);
     }
 }
 
-bool TemporaryFile::moveTo(const std::string& target)
+std::FILE* TemporaryFile::takeWriter() { return std::exchange(writer_, nullptr); }
+
+bool TemporaryFile::moveTo(const std::string& destination)
 {
     std::error_code error;
-    fs::rename(path_, target, error);
+    fs::rename(path_, destination, error);
     if (error) {
         return false;
     }
