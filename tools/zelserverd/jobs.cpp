@@ -517,7 +517,11 @@ pid_t JobManager::spawn(Job& job, std::string& error)
     }
     std::string work = job.dir + "/work";
     Launch launch;
-    launch.argv = {const_cast<char*>("sh"), const_cast<char*>("/dev/fd/3"), nullptr};
+    // The workspace is read through the descriptor the server opened: naming it as /dev/fd/3 would
+    // reopen the file with the job account's rights, which the server's private copy does not grant.
+    static const char kRunScript[] = "script=$(cat <&3) && exec 3<&- && eval \"$script\"";
+    launch.argv = {const_cast<char*>("sh"), const_cast<char*>("-c"), const_cast<char*>(kRunScript),
+                   const_cast<char*>("sh"), nullptr};
     for (auto& entry : job.environment)
         launch.envp.push_back(entry.data());
     launch.envp.push_back(nullptr);
