@@ -49,9 +49,10 @@ TcpSocket::TcpSocket(std::uint16_t& localPort)
 
 TcpSocket::~TcpSocket() { close(); }
 
-// The count is taken before the connect or listen is tried and a failed constructor leaves no main
-// socket for close() to give it back through. Each failed socket therefore keeps the library started
-// for the rest of the process; that is how the library has always behaved and it stays so.
+// Contract: every constructor counts one user before it tries to connect or listen, and only close()
+// of a socket that holds a main socket gives the count back. A failed constructor's count is kept, so
+// after any failed socket the platform's socket library stays started until the process ends; a
+// later start-up is therefore never repeated while a caller may still be using the library.
 void TcpSocket::countLibraryUser()
 {
     const std::lock_guard<std::mutex> lock(libraryMutex);
