@@ -89,6 +89,11 @@ const std::vector<Step> kSignIn = {readFrame(), answer(kSignedIn)};
 const std::vector<Step> kRepository = {readFrame(), answer(kSignedIn), readFrame(),
                                        answer(reply("SUCCESS", R"(<R><REPOSITORY name="R"/></R>)"))};
 
+// Every download answers the same way: the file header, the content, and the final "true".
+const std::vector<Step> kDownloadCut = {readFrame(), answer(fileHeader(kContent.size(), crc32(kContent))),
+                                        readFrame(), {Step::Write, kContent},
+                                        readFrame(), answer(reply("SUCCESS", "true"))};
+
 unsigned withRepository(Client& client, const std::function<IZELServerStatus*(IZELServerRepository&)>& call)
 {
     client.repository = client.session->createRepository();
@@ -125,19 +130,24 @@ const Kind kKinds[] = {
          spew(source, kContent);
          return withRepository(c, [&](IZELServerRepository& r) { return r.addItem(c.text("a.zlw"), c.text(source)); });
      }},
-    {"download",
-     kRepository,
-     {readFrame(),
-      answer(fileHeader(kContent.size(), crc32(kContent))),
-      readFrame(),
-      {Step::Write, kContent},
-      readFrame(),
-      answer(reply("SUCCESS", "true"))},
+    {"download", kRepository, kDownloadCut,
      [](Client& c, const std::string& folder) {
          unsigned received = 0;
          return withRepository(c, [&](IZELServerRepository& r) {
              return r.getItem(c.text("a.zlw"), c.text(folder + "/kept"), received);
          });
+     }},
+    {"item resource", kRepository, kDownloadCut,
+     [](Client& c, const std::string& folder) {
+         unsigned received = 0;
+         return withRepository(c, [&](IZELServerRepository& r) {
+             return r.getItemResource(c.text("a.zlw"), c.text("notes.txt"), c.text(folder + "/kept"), received);
+         });
+     }},
+    {"job log", kSignIn, kDownloadCut,
+     [](Client& c, const std::string& folder) {
+         unsigned success = 0;
+         return c.take(c.session->getTransformationManager()->getLogFile(7, c.text(folder + "/kept"), success));
      }},
     // Only the answer on the command's own connection: after all of it the library waits for the
     // server's call on the result port, which no hang-up ends.
