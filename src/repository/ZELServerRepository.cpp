@@ -206,12 +206,13 @@ IZELServerStatus* ZELServerRepository::getItemResourceView(const IZELServerStrin
         .askObject(found, [&](const IZELServerResponse& response) { return response.readResource(resource); });
 }
 
-IZELServerStatus* ZELServerRepository::addItemResource(const IZELServerString& itemName,
-                                                       const IZELServerString& resourceName,
-                                                       const IZELServerString& sourcePath,
-                                                       IZELServerProgressListener* listener)
+// Adding and replacing a resource differ only in their keyword.
+IZELServerStatus* ZELServerRepository::sendItemResource(const char* keyword, const IZELServerString& itemName,
+                                                        const IZELServerString& resourceName,
+                                                        const IZELServerString& sourcePath,
+                                                        IZELServerProgressListener* listener, Where where)
 {
-    return on("REP_ADD_ITEMRESOURCE")
+    return on(keyword, where)
         .require(itemName)
         .require(resourceName)
         .require(sourcePath)
@@ -222,6 +223,14 @@ IZELServerStatus* ZELServerRepository::addItemResource(const IZELServerString& i
         .add("resourceName", resourceName)
         .add("resourceFileCRCCheckingEnabled", kNoCrcCheck)
         .upload(sourcePath, listener);
+}
+
+IZELServerStatus* ZELServerRepository::addItemResource(const IZELServerString& itemName,
+                                                       const IZELServerString& resourceName,
+                                                       const IZELServerString& sourcePath,
+                                                       IZELServerProgressListener* listener)
+{
+    return sendItemResource("REP_ADD_ITEMRESOURCE", itemName, resourceName, sourcePath, listener);
 }
 
 IZELServerStatus* ZELServerRepository::addItemResource(const IZELServerString& itemName,
@@ -236,17 +245,7 @@ IZELServerStatus* ZELServerRepository::updateItemResource(const IZELServerString
                                                           const IZELServerString& sourcePath,
                                                           IZELServerProgressListener* listener)
 {
-    return on("REP_UPDATE_ITEMRESOURCE")
-        .require(itemName)
-        .require(resourceName)
-        .require(sourcePath)
-        .check(allowedName(itemName))
-        .check(allowedName(resourceName))
-        .check(distinct(resourceName, itemName))
-        .add("itemName", itemName)
-        .add("resourceName", resourceName)
-        .add("resourceFileCRCCheckingEnabled", kNoCrcCheck)
-        .upload(sourcePath, listener);
+    return sendItemResource("REP_UPDATE_ITEMRESOURCE", itemName, resourceName, sourcePath, listener);
 }
 
 IZELServerStatus* ZELServerRepository::updateItemResource(const IZELServerString& itemName,

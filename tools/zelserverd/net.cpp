@@ -189,15 +189,19 @@ constexpr std::size_t kFrameGrowth = 65536;
 
 // The socket stays blocking for everyone else; these calls never block in the kernel, they wait
 // in poll, where a time-out and a shutdown both reach them.
-bool sendAll(int fd, const void* data, std::size_t size, int stallMs)
+namespace {
+
+// One loop for both directions: `io` moves at most `size` bytes without blocking, and a full or
+// empty socket is waited for in poll for `event`.
+template <typename Byte, typename Io>
+bool moveAll(int fd, Byte* bytes, std::size_t size, short event, int stallMs, Io io)
 {
-    const char* bytes = static_cast<const char*>(data);
     while (size > 0) {
-        ssize_t n = ::send(fd, bytes, size, MSG_NOSIGNAL | MSG_DONTWAIT);
+        ssize_t n = io(fd, bytes, size);
         if (n < 0 && errno == EINTR)
             continue;
         if (n < 0 && (errno == EAGAIN || errno == EWOULDBLOCK)) {
-            if (!waitFor(fd, POLLOUT, stallMs))
+            if (!waitFor(fd, event, stallMs))
                 return false;
             continue;
         }
@@ -209,24 +213,18 @@ bool sendAll(int fd, const void* data, std::size_t size, int stallMs)
     return true;
 }
 
+}  // namespace
+
+bool sendAll(int fd, const void* data, std::size_t size, int stallMs)
+{
+    return moveAll(fd, static_cast<const char*>(data), size, POLLOUT, stallMs,
+                   [](int f, const char* p, std::size_t n) { return ::send(f, p, n, MSG_NOSIGNAL | MSG_DONTWAIT); });
+}
+
 bool recvExact(int fd, void* data, std::size_t size, int stallMs)
 {
-    char* bytes = static_cast<char*>(data);
-    while (size > 0) {
-        ssize_t n = ::recv(fd, bytes, size, MSG_DONTWAIT);
-        if (n < 0 && errno == EINTR)
-            continue;
-        if (n < 0 && (errno == EAGAIN || errno == EWOULDBLOCK)) {
-            if (!waitFor(fd, POLLIN, stallMs))
-                return false;
-            continue;
-        }
-        if (n <= 0)
-            return false;
-        bytes += n;
-        size -= static_cast<std::size_t>(n);
-    }
-    return true;
+    return moveAll(fd, static_cast<char*>(data), size, POLLIN, stallMs,
+                   [](int f, char* p, std::size_t n) { return ::recv(f, p, n, MSG_DONTWAIT); });
 }
 
 FrameStatus FrameIo::readFrame(std::string& payload)
