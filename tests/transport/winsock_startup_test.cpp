@@ -87,31 +87,4 @@ TEST(WinsockStartup, LibrarySocketsWorkWithoutAStartUpOfTheCallerAndCleanUpAfter
     EXPECT_EQ(::WSAGetLastError(), WSANOTINITIALISED);
 }
 
-TEST(WinsockStartup, FailedSocketKeepsExactlyOneStartUpForTheRestOfTheProcess)
-{
-    if (const auto reason = notFresh()) {
-        GTEST_SKIP() << *reason;
-    }
-    ASSERT_EQ(socketCallError(), WSANOTINITIALISED) << "Winsock was already started in this process";
-    {
-        TcpSocket failed("no-such-host.invalid", 4000);
-        ASSERT_EQ(failed.errorCode, zel::SOCK_HOST_UNKNOWN);
-        failed.close();
-    }
-    EXPECT_EQ(TcpSocket::socketLibraryUsers(), 1u);
-    EXPECT_EQ(socketCallError(), 0);
-    {
-        std::uint16_t port = 0;
-        TcpSocket listener(port);
-        ASSERT_EQ(listener.errorCode, 0);
-    }
-    // The working socket came and went; the failed one's start-up is still held.
-    EXPECT_EQ(socketCallError(), 0);
-    // That one start-up, and no more: the first clean-up here succeeds, the second finds none left.
-    EXPECT_EQ(::WSACleanup(), 0);
-    EXPECT_EQ(socketCallError(), WSANOTINITIALISED);
-    EXPECT_EQ(::WSACleanup(), SOCKET_ERROR);
-    EXPECT_EQ(::WSAGetLastError(), WSANOTINITIALISED);
-}
-
 #endif  // _WIN32

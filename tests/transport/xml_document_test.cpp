@@ -8,7 +8,6 @@
 #include "api/message_numbers.h"
 #include "transport/xml_document.h"
 #include "transport/xml_navigation.h"
-#include "transport/xml_platform.h"
 #include "transport/xml_reader.h"
 
 namespace zel {
@@ -160,23 +159,6 @@ TEST_F(XmlDocumentTest, IllegalCharacterFailsSerialisationWithLibraryMessage)
     EXPECT_NE(std::string(failure->getMessage()).find("illegal XML character"), std::string::npos)
         << failure->getMessage();
     EXPECT_EQ(out, "untouched");
-}
-
-TEST(XmlDocumentLifecycle, DocumentHoldsOneLibraryReferenceUntilDestroyed)
-{
-    const unsigned before = XmlPlatform::referenceCount();
-    {
-        XmlDocument doc;
-        EXPECT_EQ(XmlPlatform::referenceCount(), before);
-        StatusPtr failure(doc.startXml());
-        ASSERT_EQ(failure, nullptr);
-        StatusPtr again(doc.startXml());
-        EXPECT_EQ(again, nullptr);
-        EXPECT_TRUE(doc.started());
-        EXPECT_EQ(XmlPlatform::referenceCount(), before + 1);
-        ASSERT_NE(doc.createDocument("", "R"), nullptr);
-    }
-    EXPECT_EQ(XmlPlatform::referenceCount(), before);
 }
 
 TEST(XmlNodeList, WrapsEachNodeOnceAndClearsLastFirst)
