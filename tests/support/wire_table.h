@@ -1,0 +1,96 @@
+#pragma once
+// Table-driven wire tests of the managers on the signed-in channel. A row is one call: the command
+// bytes it must send with the server's answer (no command: the call must send nothing at all), then
+// the status number and the out values the call must leave. One test body runs a whole table in order
+// on one connection, so a row also shows that the session stays usable after the rows before it.
+
+#include <functional>
+#include <string>
+#include <type_traits>
+#include <vector>
+
+#include "support/signed_in_channel.h"
+
+namespace zeltest {
+
+// What a call left: its status number (0 for none) and its out values, each followed by a space.
+struct Outcome {
+    unsigned number = 0;
+    std::string outs;
+    bool operator==(const Outcome&) const = default;
+};
+
+inline std::ostream& operator<<(std::ostream& out, const Outcome& outcome)
+{
+    return out << outcome.number << " [" << outcome.outs << "]";
+}
+
+inline std::string outText(unsigned value) { return std::to_string(value); }
+inline std::string outText(const std::string& value) { return value; }
+inline std::string outText(const IZELServerString& value) { return std::string(value.data(), value.length()); }
+// A reader of something the call filled, run after the call.
+template <class Read>
+    requires std::is_invocable_r_v<std::string, const Read&>
+std::string outText(const Read& read)
+{
+    return read();
+}
+
+// Takes the status; the out values are read after the call, as they are bound by reference.
+template <class... Outs>
+Outcome outcome(IZELServerStatus* raw, const Outs&... outs)
+{
+    const StatusPtr status(raw);
+    Outcome result{status ? status->getMessageNumber() : 0, {}};
+    ((result.outs += outText(outs) + " "), ...);
+    return result;
+}
+
+// The steps after the command of an upload: the file header, the raw content, then `answer`.
+inline std::function<void(FakeServer&)> uploadOf(const std::string& content, const Bytes& answer)
+{
+    return [=](FakeServer& server) {
+        server.exchange(fileHeader(content.size(), crc32(content)), readyAck()).expectRawBytes(content).sendFrame(answer);
+    };
+}
+
+// The steps after the file header of a download: the content after the client's go-ahead, then
+// `answer` after the second.
+inline std::function<void(FakeServer&)> downloadOf(const std::string& content, const Bytes& answer)
+{
+    return [=](FakeServer& server) {
+        server.expectFrame(readyAck()).sendRaw(content).exchange(readyAck(), answer);
+    };
+}
+
+struct WireRow {
+    const char* what;
+    Bytes request;  // empty: nothing may be sent
+    Bytes answer;
+    std::function<Outcome()> call;
+    unsigned number;
+    std::string outs;
+    std::function<void(FakeServer&)> then = {};  // steps after the answer (file transfers)
+};
+
+class WireTableTest : public SignedInChannelTest {
+protected:
+    void run(const std::vector<WireRow>& rows)
+    {
+        for (const WireRow& row : rows) {
+            if (!row.request.empty()) {
+                server.exchange(row.request, row.answer);
+                if (row.then) {
+                    row.then(server);
+                }
+            }
+        }
+        signIn();
+        for (const WireRow& row : rows) {
+            EXPECT_EQ(row.call(), (Outcome{row.number, row.outs})) << row.what;
+        }
+        EXPECT_TRUE(server.verify());
+    }
+};
+
+}  // namespace zeltest
