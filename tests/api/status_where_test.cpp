@@ -27,15 +27,6 @@ std::string_view fileOf(const IZELServerStatus* status)
     return own != nullptr ? own->where().file_name() : "(not the library's status)";
 }
 
-TEST(StatusWhere, RecordsTheCallersLine)
-{
-    const unsigned line = __LINE__ + 1;
-    const StatusPtr status(makeStatus(msg::kNotConnected));
-    const auto& own = dynamic_cast<const ZELServerStatus&>(*status);
-    EXPECT_EQ(own.where().line(), line);
-    EXPECT_TRUE(std::string_view(own.where().file_name()).ends_with("status_where_test.cpp"));
-}
-
 TEST(StatusWhere, FailuresBeforeSendingPointAtTheOperationsFile)
 {
     ZELServerRepository repository(nullptr);

@@ -2,18 +2,17 @@
 // bounded time and memory, a connection left in the middle of a message is given up, and a download
 // that does not complete leaves the caller's file as it was.
 
+#include <atomic>
 #include <chrono>
 #include <cstdint>
 #include <filesystem>
-#include <fstream>
-#include <functional>
-#include <iterator>
 #include <optional>
 #include <string>
 #include <vector>
 
 #include <gtest/gtest.h>
 
+#include "api/heap.h"
 #include "hostile_fixture.h"
 #include "support/environment.h"
 #include "support/sockets.h"
@@ -96,17 +95,8 @@ TEST_F(HostileSessionTest, TimeOutsEndTheStepThatWaitedWithTheSocketCode)
         FakeServer server;
         server.exchange(firstHandshake(), signedIn()).expectAnyFrame().sendRaw(c.served);
         signIn(server, c.properties);
-        Outcome got;
-        if (c.resultPort) {
-            IZELServerString* text = session->createString();
-            IZELServerStringArray* directives = session->createStringArray();
-            text->assign("job");
-            got = outcome(session->getTransformationManager()->transactJobString(*text, *text, *directives, *text));
-            session->destroyString(&text);
-            session->destroyStringArray(&directives);
-        } else {
-            got = sessionProperty();
-        }
+        unsigned unused = 0;
+        const Outcome got = c.resultPort ? outcome(transactJob(*session, "", unused)) : sessionProperty();
         EXPECT_EQ(got.number, c.number) << got.message;
         EXPECT_EQ(got.code, kTimedOut) << got.message;
         if (c.dropped) {
@@ -163,66 +153,9 @@ TEST(ConnectionLimits, SecondsAreReadToTheMillisecond)
     }
 }
 
-// Each download of the library, as one call on a signed-in session into `destination`.
-struct DownloadKind {
-    const char* name;
-    const char* source;  // what 393638 names
-    std::function<IZELServerStatus*(IZELServerSession&, const std::string& destination, unsigned& received)> call;
-};
-
-IZELServerStatus* withStrings(IZELServerSession& session, const std::vector<std::string>& values,
-                              const std::function<IZELServerStatus*(std::vector<IZELServerString*>&)>& call)
-{
-    std::vector<IZELServerString*> strings;
-    for (const std::string& value : values) {
-        strings.push_back(session.createString());
-        strings.back()->assign(value.c_str());
-    }
-    IZELServerStatus* status = call(strings);
-    for (IZELServerString*& string : strings) {
-        session.destroyString(&string);
-    }
-    return status;
-}
-
-const DownloadKind kDownloads[] = {
-    {"shared resource", "/in/a.txt",
-     [](IZELServerSession& session, const std::string& destination, unsigned& received) {
-         IZELServerMountPoint* area = session.createMountPoint();
-         IZELServerStatus* status =
-             withStrings(session, {"/in/a.txt", destination}, [&](std::vector<IZELServerString*>& s) {
-                 IZELServerPath* path = area->createPath(*s[0]);
-                 IZELServerStatus* result = area->download(*path, *s[1], received, nullptr);
-                 area->releaseObject(path);
-                 return result;
-             });
-         session.destroyMountPoint(&area);
-         return status;
-     }},
-    {"item", "plan.zlw",
-     [](IZELServerSession& session, const std::string& destination, unsigned& received) {
-         IZELServerRepository* repository = session.createRepository();
-         IZELServerStatus* status = withStrings(session, {"plan.zlw", destination},
-                                                [&](auto& s) { return repository->getItem(*s[0], *s[1], received); });
-         session.destroyRepository(&repository);
-         return status;
-     }},
-    {"item resource", "notes.txt",
-     [](IZELServerSession& session, const std::string& destination, unsigned& received) {
-         IZELServerRepository* repository = session.createRepository();
-         IZELServerStatus* status = withStrings(session, {"plan.zlw", "notes.txt", destination}, [&](auto& s) {
-             return repository->getItemResource(*s[0], *s[1], *s[2], received);
-         });
-         session.destroyRepository(&repository);
-         return status;
-     }},
-    {"job log", "job 42",
-     [](IZELServerSession& session, const std::string& destination, unsigned& received) {
-         return withStrings(session, {destination}, [&](auto& s) {
-             return session.getTransformationManager()->getLogFile(42, *s[0], received);
-         });
-     }},
-};
+// Each download of the library, and the source its refusal names.
+const std::pair<Call, const char*> kDownloads[] = {
+    {downloadSharedFile, "/in/a.txt"}, {getItem, "plan.zlw"}, {getItemResource, "notes.txt"}, {getLogFile, "job 42"}};
 
 // A file the server offers after the command: header, the client's go-ahead, then the content.
 FakeServer& offerFile(FakeServer& server, const std::string& content, std::size_t sent)
@@ -246,8 +179,6 @@ TEST_F(HostileSessionTest, FailedDownloadsLeaveTheDestinationAsItWas)
         {"refused in place of the file", [](FakeServer& s) { s.sendFrame(reply("ERROR", "no such file")); }, 393625,
          "no such file", 0, false},
         {"no file header", [](FakeServer& s) { s.sendFrame(reply("SUCCESS", "false")); }, 393638, "<source>", 0, false},
-        {"content breaks off", [](FakeServer& s) { offerFile(s, "fresh", 2).closeConnection(); }, 393608, "392008", 0,
-         false},
         {"final answer false",
          [](FakeServer& s) { offerFile(s, "fresh", 5).expectFrame(readyAck()).sendFrame(reply("SUCCESS", "false")); },
          0, "", 0, false},
@@ -258,28 +189,71 @@ TEST_F(HostileSessionTest, FailedDownloadsLeaveTheDestinationAsItWas)
          [](FakeServer& s) { offerFile(s, "fresh", 5).expectFrame(readyAck()).sendFrame(reply("SUCCESS", "true")); }, 0,
          "", 1, true},
     };
-    for (const DownloadKind& kind : kDownloads) {
+    for (const auto& [call, source] : kDownloads) {
         for (const Case& c : cases) {
-            SCOPED_TRACE(std::string(kind.name) + ": " + c.name);
+            SCOPED_TRACE(std::string(source) + ": " + c.name);
             const TempDir folder("zel-download");
             const std::filesystem::path destination = folder.path() / "kept.txt";
-            std::ofstream(destination, std::ios::binary) << "old";
+            spew(destination, "old");
             FakeServer server;
             server.exchange(firstHandshake(), signedIn()).expectAnyFrame();
             c.answer(server);
             signIn(server);
             unsigned received = 7;
-            const Outcome got = outcome(kind.call(*session, destination.string(), received));
+            const Outcome got = outcome(call(*session, destination.string(), received));
             EXPECT_EQ(got.number, c.number) << got.message;
-            const std::string expected = c.inMessage == std::string("<source>") ? kind.source : c.inMessage;
+            const std::string expected = c.inMessage == std::string("<source>") ? source : c.inMessage;
             EXPECT_NE(got.message.find(expected), std::string::npos) << got.message;
             EXPECT_EQ(received, c.received);
-            std::ifstream in(destination, std::ios::binary);
-            EXPECT_EQ(std::string(std::istreambuf_iterator<char>(in), {}), c.replaced ? "fresh" : "old");
+            EXPECT_EQ(slurp(destination), c.replaced ? "fresh" : "old");
             EXPECT_EQ(std::distance(std::filesystem::directory_iterator(folder.path()), {}), 1) << "no temporary file";
             EXPECT_TRUE(server.verify());
         }
     }
+}
+
+TEST_F(HostileSessionTest, CommandsWithoutAConnectionReportNotConnected)
+{
+    EXPECT_EQ(sessionProperty().number, 393622u) << "before init";
+    FakeServer server;
+    server.exchange(firstHandshake(), signedIn());
+    signIn(server);
+    EXPECT_EQ(outcome(session->disconnect()).number, 0u);
+    EXPECT_EQ(sessionProperty().number, 393622u) << "after disconnect";
+    unsigned received = 7;
+    EXPECT_EQ(outcome(getItem(*session, "x", received)).number, 393622u);
+    EXPECT_TRUE(server.verify());
+}
+
+TEST_F(HostileSessionTest, RefusedSignInLeavesAnUnauthenticatedIdentity)
+{
+    FakeServer server;
+    server.exchange(firstHandshake(), reply("SUCCESS", "<S/>"));
+    server.start();
+    EXPECT_EQ(init(server.port()).number, 393631u);
+    ASSERT_NE(session->getIdentity(), nullptr);
+    EXPECT_FALSE(session->getIdentity()->isAuthenticated());
+    EXPECT_TRUE(server.verify());
+}
+
+std::atomic<int> exhaustionReports{0};
+
+TEST_F(HostileSessionTest, NoExceptionLeavesTheInterface)
+{
+    const zel::heap::FailureRoutine previous = zel::heap::setFailureRoutine([](int) { ++exhaustionReports; });
+    const struct {
+        const char* thrown;
+        const char* message;
+        int reports;  // calls of the out-of-memory routine
+    } cases[] = {{"memory", "Not enough memory for the operation.", 1}, {"no store", "no store", 0}};
+    for (const auto& c : cases) {
+        exhaustionReports = 0;
+        const Outcome got = init(1, {{"!throw", c.thrown}});
+        EXPECT_EQ(got.number, 393625u);
+        EXPECT_EQ(got.message, c.message);
+        EXPECT_EQ(exhaustionReports.load(), c.reports);
+    }
+    zel::heap::setFailureRoutine(previous);
 }
 
 }  // namespace
