@@ -29,15 +29,13 @@ std::string work(std::uint16_t port, const std::string& dir, int n)
     const std::string workspace = "#!/bin/sh\n# @parameter MARK | TEXT | none\necho \"mark $MARK\"\n";
     const std::string itemFile = dir + "/" + tag + ".zlw";
     writeFile(itemFile, workspace);
-    IZELServerRepository* repository = client.repository("crowd");
+    auto repository = client.repository("crowd");
     IZELServerString& item = client.text(tag + ".zlw");
     check(client.take(repository->addItem(item, client.text(itemFile))) == 0, "addItem");
 
-    IZELServerMountPoint* area = client.area("DATA");
-    if (!area) {
-        session.destroyRepository(&repository);
+    auto area = client.area("DATA");
+    if (!area)
         return failures + tag + ": no area\n";
-    }
     const std::string content(1000 + n * 997, static_cast<char>('a' + n));
     writeFile(dir + "/" + tag + ".dat", content);
     IZELServerPath* folder = area->createPath(client.text("/" + tag));
@@ -57,33 +55,30 @@ std::string work(std::uint16_t port, const std::string& dir, int n)
     check(client.take(area->upload(client.text(dir + "/" + tag + ".dat"), *file, nullptr)) == 0, "upload");
     refusedUpload();
 
-    IZELServerTransformationRequest* request =
-        session.createTransformationRequest(client.text("zeljob"), client.text("crowd"), item);
+    auto request = client.own(session.createTransformationRequest(client.text("zeljob"), client.text("crowd"), item));
     request->setPublishedParameter(client.text("MARK"), client.text(tag));
-    IZELServerTransformationResult* result = session.createTransformationResult();
+    auto result = client.own(session.createTransformationResult());
     unsigned id = 0;
     IZELServerTransformationManager* jobs = session.getTransformationManager();
     if (check(client.take(jobs->submitJob(*request, id)) == 0, "submitJob")) {
         check(client.waitForJob(id, *result, 60) == kSucceeded, "job result");
         const std::string log = dir + "/" + tag + ".log";
-        check(client.flag([&](unsigned& f) { return jobs->getLogFile(id, client.text(log), f); }) == 1, "getLogFile");
+        check(client.outcome([&](unsigned& f) { return jobs->getLogFile(id, client.text(log), f); }) == 1,
+              "getLogFile");
         check(readAll(log).find("mark " + tag + "\n") != std::string::npos, "log holds the mark");
     }
     refusedUpload();
 
-    check(client.flag([&](unsigned& f) { return repository->getItem(item, client.text(itemFile + ".back"), f); }) == 1,
+    check(client.outcome([&](unsigned& f) { return repository->getItem(item, client.text(itemFile + ".back"), f); }) ==
+              1,
           "getItem");
     check(readAll(itemFile + ".back") == workspace, "item content");
     IZELServerString& back = client.text(dir + "/" + tag + ".back");
-    check(client.flag([&](unsigned& f) { return area->download(*file, back, f, nullptr); }) == 1, "download");
+    check(client.outcome([&](unsigned& f) { return area->download(*file, back, f, nullptr); }) == 1, "download");
     check(readAll(dir + "/" + tag + ".back") == content, "shared file content");
 
-    session.destroyTransformationResult(&result);
-    session.destroyTransformationRequest(&request);
     area->releaseObject(folder);
     area->releaseObject(file);
-    session.destroyMountPoint(&area);
-    session.destroyRepository(&repository);
     return failures;
 }
 
@@ -91,7 +86,7 @@ TEST_F(EndToEnd, SixteenSessionsInParallelLoseNothing)
 {
     Client audit;
     ASSERT_EQ(audit.signIn(server->port(), "ann", "pw-ann"), 0u);
-    IZELServerRepository* crowd = audit.repository("crowd");
+    auto crowd = audit.repository("crowd");
     std::vector<std::string> failures(kSessions);
     std::vector<std::thread> threads;
     for (int n = 0; n < kSessions; ++n)
@@ -102,9 +97,8 @@ TEST_F(EndToEnd, SixteenSessionsInParallelLoseNothing)
         EXPECT_EQ(failure, "");
     for (int n = 0; n < kSessions; ++n) {
         IZELServerString& name = audit.text("t" + std::to_string(n) + ".zlw");
-        EXPECT_EQ(audit.flag([&](unsigned& f) { return crowd->itemExists(name, f); }), 1) << n;
+        EXPECT_EQ(audit.outcome([&](unsigned& f) { return crowd->itemExists(name, f); }), 1) << n;
     }
-    audit.session().destroyRepository(&crowd);
 }
 
 }  // namespace

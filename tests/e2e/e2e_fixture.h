@@ -1,6 +1,7 @@
 #pragma once
 // End-to-end tests: the library, through its public interface only, against the local development
-// server started for the test.
+// server started for the test. Each suite walks one manager's operations as a table of steps run in
+// order, every operation with its success and its refusal.
 
 #include <gtest/gtest.h>
 
@@ -13,6 +14,7 @@
 #include <thread>
 #include <vector>
 
+#include <zelserverapi/ZELServerOwned.h>
 #include <zelserverapi/interfaces.h>
 #include <zelserverapi/zelserverapi.h>
 
@@ -41,48 +43,77 @@ inline void writeFile(const std::string& path, const std::string& content)
     std::ofstream(path, std::ios::binary) << content;
 }
 
-using Session = IZELServerSession;
-
-// The status number of a request the server answered with an error.
+// The status number of a request the server answered with an error, and of an argument the library
+// refuses before sending.
 constexpr unsigned kRefused = 393625;
+constexpr unsigned kBadArgument = 393619;
 
 // Job status codes of IZELServerTransformationResult::getJobStatus.
-enum JobStatus : unsigned {
-    kQueued = 1,
-    kDelayed = 2,
-    kInProcess = 4,
-    kAborted = 6,
-    kSucceeded = 7,
-    kServiceFailed = 8,
-    kJobFailed = 9
+enum JobStatus : unsigned { kQueued = 1, kDelayed = 2, kInProcess = 4, kAborted = 6, kSucceeded = 7, kJobFailed = 9 };
+
+// One operation of a table: it answers through `flag` (which starts out as kUntouched, so an answer
+// the operation forgot to set shows) and returns its status.
+using Operation = std::function<IZELServerStatus*(unsigned& flag)>;
+constexpr unsigned kUntouched = 7;
+struct Step {
+    const char* what;
+    Operation operation;
+    long expected;  // the flag after success, or minus the status number
 };
+// The outcome of a step the server refuses, and of one the library refuses before sending.
+constexpr long kDenied = -static_cast<long>(kRefused);
+constexpr long kInvalid = -static_cast<long>(kBadArgument);
+// `operation`, answering the entries of `list` after it.
+template <typename List>
+Operation counting(List& list, std::function<IZELServerStatus*()> operation)
+{
+    return [&list, operation](unsigned& flag) {
+        IZELServerStatus* status = operation();
+        flag = list.entries();
+        return status;
+    };
+}
+// `operation`, whose answer becomes kCheckFailed when one of `checks` fails after it (also after a
+// refusal).
+constexpr unsigned kCheckFailed = 1000;
+template <typename... Checks>
+Operation checking(Operation operation, Checks... checks)
+{
+    return [operation, checks...](unsigned& flag) {
+        IZELServerStatus* status = operation(flag);
+        if (!(checks() && ...))
+            flag = kCheckFailed;
+        return status;
+    };
+}
+
+// For operations that answer through a bool, which a refusal leaves as the caller set it (true).
+inline Operation boolean(std::function<IZELServerStatus*(bool&)> operation)
+{
+    return [operation](unsigned& flag) {
+        bool answer = true;
+        IZELServerStatus* status = operation(answer);
+        flag = status == nullptr ? answer : answer ? kUntouched : kCheckFailed;
+        return status;
+    };
+}
 
 // A session of the library; strings made for a test are released before the session goes.
 class Client {
 public:
-    Client() { ZEL_createServerSession(&session_); }
-    ~Client()
-    {
-        strings_.clear();
-        session_->destroyConnectionInfo(&info_);
-        ZEL_destroyServerSession(&session_);
-    }
+    Client() : session_(zelServerCreateSession()) {}
 
     IZELServerSession& session() { return *session_; }
 
-    // An object made by the session, destroyed through `destroy` when the owner goes; owners go
-    // before their Client.
     template <typename T>
-    using Owned = std::unique_ptr<T, std::function<void(T*)>>;
-    template <typename T>
-    Owned<T> own(T* object, void (IZELServerSession::*destroy)(T**))
+    ZELServerOwned<T> own(T* object)
     {
-        return Owned<T>(object, [session = session_, destroy](T* p) { (session->*destroy)(&p); });
+        return zelServerOwn(*session_, object);
     }
 
     IZELServerString& text(const std::string& value = "")
     {
-        strings_.emplace_back(session_->createString(), Releaser{session_});
+        strings_.push_back(own(session_->createString()));
         strings_.back()->set(value.data(), static_cast<unsigned>(value.size()));
         return *strings_.back();
     }
@@ -90,24 +121,22 @@ public:
     // Signs in with a password; the status number, 0 on success.
     unsigned signIn(std::uint16_t port, const std::string& user, const std::string& password)
     {
-        session_->destroyConnectionInfo(&info_);
-        info_ = session_->createConnectionInfo(text("127.0.0.1"), port, text(user), text(password));
+        info_ = own(session_->createConnectionInfo(text("127.0.0.1"), port, text(user), text(password)));
         return take(session_->init(*info_, nullptr));
     }
 
     // Signs in with connection properties (flat pairs).
     unsigned signInWith(std::uint16_t port, const std::vector<std::string>& properties)
     {
-        IZELServerStringArray* list = session_->createStringArray();
+        auto list = own(session_->createStringArray());
         for (const std::string& entry : properties)
             list->append(entry.c_str());
-        session_->destroyConnectionInfo(&info_);
-        info_ = session_->createConnectionInfo(text("127.0.0.1"), port, *list);
-        session_->destroyStringArray(&list);
+        info_ = own(session_->createConnectionInfo(text("127.0.0.1"), port, *list));
         return take(session_->init(*info_, nullptr));
     }
 
-    // The number of a status, which is released; 0 for success. The text of the last one is kept.
+    // The number of a status, which is released; 0 for success. The text and kind of the last one
+    // are kept (kind 1 authentication, 2 authorization, 0 anything else).
     unsigned take(IZELServerStatus* status)
     {
         lastMessage_ = status ? status->getMessage() : "";
@@ -117,27 +146,36 @@ public:
         return number;
     }
     const std::string& lastMessage() const { return lastMessage_; }
-    // The kind of the last status: 1 authentication, 2 authorization, 0 anything else.
     unsigned lastCode() const { return lastCode_; }
 
-    // Runs an operation that answers through a flag: the flag when it succeeded, else -1. The flag
-    // starts out as 7 (or true), so an answer the operation forgot to set shows.
-    template <typename Flag = unsigned, typename Operation>
-    long flag(Operation operation)
+    // The flag of a successful operation, else minus its status number; a refused operation must
+    // not answer true.
+    long outcome(const Operation& operation)
     {
-        Flag value = static_cast<Flag>(7);
-        return take(operation(value)) == 0 ? static_cast<long>(value) : -1;
+        unsigned flag = kUntouched;
+        const unsigned number = take(operation(flag));
+        if (number == 0)
+            return flag;
+        EXPECT_TRUE(flag == 0 || flag == kUntouched) << "flag after the refusal: " << flag;
+        return -static_cast<long>(number);
+    }
+    void run(const std::vector<Step>& steps)
+    {
+        for (const Step& step : steps) {
+            SCOPED_TRACE(step.what);
+            EXPECT_EQ(outcome(step.operation), step.expected) << lastMessage_;
+        }
     }
 
-    // Adds a repository (when missing) and fetches it; owned by the caller (destroyRepository).
-    IZELServerRepository* repository(const std::string& name)
+    // Adds a repository (when missing) and fetches it.
+    ZELServerOwned<IZELServerRepository> repository(const std::string& name)
     {
         IZELServerRepositoryManager* manager = session_->getRepositoryManager();
         unsigned exists = 0;
         take(manager->repositoryExists(text(name), exists));
         if (!exists)
             take(manager->addRepository(text(name), text("")));
-        IZELServerRepository* repository = session_->createRepository();
+        auto repository = own(session_->createRepository());
         unsigned found = 0;
         take(manager->getRepository(text(name), *repository, found));
         return repository;
@@ -162,25 +200,20 @@ public:
         return status;
     }
 
-    // The shared resource of that name, or null; owned by the caller (destroyMountPoint).
-    IZELServerMountPoint* area(const std::string& name)
+    // The shared resource of that name, or null.
+    ZELServerOwned<IZELServerMountPoint> area(const std::string& name)
     {
-        IZELServerMountPoint* area = session_->createMountPoint();
+        auto area = own(session_->createMountPoint());
         unsigned found = 0;
         if (take(session_->getMountPointManager()->getSharedResource(text(name), *area, found)) != 0 || !found)
-            session_->destroyMountPoint(&area);
+            area.reset();
         return area;
     }
 
 private:
-    struct Releaser {
-        IZELServerSession* owner;
-        void operator()(IZELServerString* s) const { owner->destroyString(&s); }
-    };
-
-    IZELServerSession* session_ = nullptr;
-    IZELServerConnectionInfo* info_ = nullptr;
-    std::vector<std::unique_ptr<IZELServerString, Releaser>> strings_;
+    ZELServerOwned<IZELServerSession> session_;  // goes last
+    ZELServerOwned<IZELServerConnectionInfo> info_;
+    std::vector<ZELServerOwned<IZELServerString>> strings_;
     std::string lastMessage_;
     unsigned lastCode_ = 0;
 };

@@ -1,5 +1,5 @@
-// Repositories and services end to end: each operation of the repository manager, of a repository
-// and of a service against the local server, with the refusals as the library reports them. The
+// Repositories and services end to end: every operation of the repository manager, of a repository
+// and of a service against the local server, with its refusal as the library reports it. The
 // server's own texts for each refusal are the server suite's to check.
 
 #include "e2e/e2e_fixture.h"
@@ -7,13 +7,9 @@
 namespace zeltest {
 namespace {
 
-const char* kWorkspace = "#!/bin/sh\n"
-                         "# @title Roads\n"
-                         "# @parameter SOURCE | FILENAME | in.csv | Where to read\n"
-                         "# @source CSV | roads | /data/roads.csv\n"
-                         "# @featuretype road | A road\n"
-                         "# @attribute id | zel_int32 | 10 | 0\n"
-                         "true\n";
+const char* kWorkspace = "#!/bin/sh\n# @title Roads\n# @parameter SOURCE | FILENAME | in.csv | Where to read\n"
+                         "# @source CSV | roads | /data/roads.csv\n# @featuretype road | A road\n"
+                         "# @attribute id | zel_int32 | 10 | 0\ntrue\n";
 
 class Repositories : public EndToEnd {
 protected:
@@ -21,8 +17,7 @@ protected:
     {
         EndToEnd::SetUp();
         ASSERT_EQ(client.signIn(server->port(), "ann", "pw-ann"), 0u) << client.lastMessage();
-        session = &client.session();
-        manager = session->getRepositoryManager();
+        manager = client.session().getRepositoryManager();
         repo = client.repository("roads");
         for (const auto& [name, content] : {std::pair{"roads.zlw", kWorkspace},
                                             {"off.zlw", "# @enabled false\n"},
@@ -32,217 +27,318 @@ protected:
             ASSERT_EQ(addItem(client, *repo, name, content), 0u) << name << ": " << client.lastMessage();
     }
 
-    void TearDown() override
+    IZELServerString& t(const std::string& value) { return client.text(value); }
+    // A check that the local file `name` holds `content`.
+    std::function<bool()> holds(const std::string& name, const std::string& content)
     {
-        if (session != nullptr)
-            session->destroyRepository(&repo);
+        return [this, name, content] { return readAll(local(name)) == content; };
+    }
+    // A check of the title or the description of a view, read through `get` when it runs.
+    template <typename View>
+    std::function<bool()> reads(View& view, void (View::*get)(IZELServerString&) const, const std::string& expected)
+    {
+        return [this, &view, get, expected] {
+            IZELServerString& text = client.text();
+            (view.*get)(text);
+            return text.equals(expected.c_str());
+        };
     }
 
-    IZELServerString& text(const std::string& value) { return client.text(value); }
+    template <typename T>
+    ZELServerOwned<T> make(T* (IZELServerSession::*create)())
+    {
+        return client.own((client.session().*create)());
+    }
 
     Client client;
-    IZELServerSession* session = nullptr;
     IZELServerRepositoryManager* manager = nullptr;
-    IZELServerRepository* repo = nullptr;
+    ZELServerOwned<IZELServerRepository> repo;
+    // What the views fill.
+    ZELServerOwned<IZELServerWorkspace> workspace = make(&IZELServerSession::createWorkspace);
+    ZELServerOwned<IZELServerVector<IZELServerWorkspace>> workspaces = make(&IZELServerSession::createWorkspaceVector);
+    ZELServerOwned<IZELServerVector<IZELServerWorkspaceSummary>> summaries =
+        make(&IZELServerSession::createWorkspaceSummaryVector);
+    ZELServerOwned<IZELServerCustomFormat> format = make(&IZELServerSession::createCustomFormat);
+    ZELServerOwned<IZELServerVector<IZELServerCustomFormat>> formats =
+        make(&IZELServerSession::createCustomFormatVector);
+    ZELServerOwned<IZELServerCustomTransformer> transformer = make(&IZELServerSession::createCustomTransformer);
+    ZELServerOwned<IZELServerVector<IZELServerCustomTransformer>> transformers =
+        make(&IZELServerSession::createCustomTransformerVector);
+    ZELServerOwned<IZELServerTemplate> page = make(&IZELServerSession::createTemplate);
+    ZELServerOwned<IZELServerVector<IZELServerTemplate>> templates = make(&IZELServerSession::createTemplateVector);
+    ZELServerOwned<IZELServerResource> resource = make(&IZELServerSession::createResource);
+    ZELServerOwned<IZELServerVector<IZELServerResource>> resources = make(&IZELServerSession::createResourceVector);
+    ZELServerOwned<IZELServerVector<IZELServerWorkspaceService>> registrations =
+        make(&IZELServerSession::createWorkspaceServiceVector);
 };
 
-TEST_F(Repositories, TheManagerAddsListsAndRemovesRepositories)
+TEST_F(Repositories, TheManagerAndItsRepositories)
 {
-    EXPECT_EQ(client.take(manager->addRepository(text("roads"), text(""))), kRefused) << "a duplicate";
-    EXPECT_EQ(client.take(manager->addRepository(text("second"), text("Two"))), 0u);
-    auto all = client.own(session->createRepositoryVector(), &Session::destroyRepositoryVector);
-    EXPECT_EQ(client.take(manager->getRepositories(nullptr, *all)), 0u);
-    EXPECT_EQ(all->entries(), 2u);
-    auto absent = client.own(session->createRepository(), &Session::destroyRepository);
-    EXPECT_EQ(client.flag([&](unsigned& f) { return manager->getRepository(text("absent"), *absent, f); }), 0);
-    EXPECT_EQ(client.flag([&](unsigned& f) { return manager->removeRepository(text("second"), f); }), 1);
-    EXPECT_EQ(client.flag([&](unsigned& f) { return manager->removeRepository(text("second"), f); }), 0);
-    EXPECT_EQ(client.flag([&](unsigned& f) { return manager->repositoryExists(text("second"), f); }), 0);
-    EXPECT_EQ(client.flag([&](unsigned& f) { return manager->repositoryExists(text("roads"), f); }), 1);
-
+    IZELServerSession& s = client.session();
+    auto all = client.own(s.createRepositoryVector());
+    auto second = client.own(s.createRepository());
+    auto items = client.own(s.createPropertyAccessor());
     ZELServerStringDict global;
     global.insert("GLOBAL", "ALLITEMS");
-    auto items = client.own(session->createPropertyAccessor(), &Session::destroyPropertyAccessor);
-    EXPECT_EQ(client.take(manager->getGlobalItems(&global, *items)), 0u) << client.lastMessage();
     IZELServerString& kind = client.text();
-    EXPECT_TRUE(items->getPropertyValue(text("roads"), text("roads.zlw"), kind));
-    EXPECT_STREQ(kind.c_str(), "WORKSPACE");
+    client.run({
+        {"a duplicate", [&](unsigned&) { return manager->addRepository(t("roads"), t("")); }, kDenied},
+        {"add", [&](unsigned&) { return manager->addRepository(t("second"), t("Two")); }, kUntouched},
+        {"list", counting(*all, [&] { return manager->getRepositories(nullptr, *all); }), 2},
+        {"get",
+         checking([&](unsigned& f) { return manager->getRepository(t("second"), *second, f); },
+                  reads(*second, &IZELServerRepository::getDescription, "Two")),
+         1},
+        {"get the absent", [&](unsigned& f) { return manager->getRepository(t("absent"), *second, f); }, 0},
+        {"exists", [&](unsigned& f) { return manager->repositoryExists(t("second"), f); }, 1},
+        {"global items",
+         checking(
+             [&](unsigned&) { return manager->getGlobalItems(&global, *items); },
+             [&] { return items->getPropertyValue(t("roads"), t("roads.zlw"), kind) && kind.equals("WORKSPACE"); }),
+         kUntouched},
+        {"remove", [&](unsigned& f) { return manager->removeRepository(t("second"), f); }, 1},
+        {"remove again", [&](unsigned& f) { return manager->removeRepository(t("second"), f); }, 0},
+        {"exists no more", [&](unsigned& f) { return manager->repositoryExists(t("second"), f); }, 0},
+    });
+
+    // Every operation of a repository that is gone is refused, and answers nothing.
+    IZELServerRepository& gone = *second;
+    IZELServerString& item = t("roads.zlw");
+    IZELServerString& file = t(local("roads.zlw"));
+    client.run({
+        {"itemExists", [&](unsigned& f) { return gone.itemExists(item, f); }, kDenied},
+        {"getItem", [&](unsigned& f) { return gone.getItem(item, t(local("x")), f); }, kDenied},
+        {"addItem", [&](unsigned&) { return gone.addItem(item, file); }, kDenied},
+        {"updateItem", [&](unsigned&) { return gone.updateItem(item, file); }, kDenied},
+        {"removeItem", [&](unsigned& f) { return gone.removeItem(item, f); }, kDenied},
+        {"itemResourceExists", [&](unsigned& f) { return gone.itemResourceExists(item, item, f); }, kDenied},
+        {"getItemResource", [&](unsigned& f) { return gone.getItemResource(item, item, t(local("x")), f); }, kDenied},
+        {"getItemResourceView", [&](unsigned& f) { return gone.getItemResourceView(item, item, *resource, f); },
+         kDenied},
+        {"addItemResource", [&](unsigned&) { return gone.addItemResource(item, t("r"), file); }, kDenied},
+        {"updateItemResource", [&](unsigned&) { return gone.updateItemResource(item, t("r"), file); }, kDenied},
+        {"removeItemResource", [&](unsigned& f) { return gone.removeItemResource(item, t("r"), f); }, kDenied},
+        {"getItemResourcesView", [&](unsigned&) { return gone.getItemResourcesView(item, nullptr, *resources); },
+         kDenied},
+        {"getWorkspaceSummariesView", [&](unsigned&) { return gone.getWorkspaceSummariesView(nullptr, *summaries); },
+         kDenied},
+        {"getWorkspacesView", [&](unsigned&) { return gone.getWorkspacesView(nullptr, *workspaces); }, kDenied},
+        {"getWorkspaceView", [&](unsigned& f) { return gone.getWorkspaceView(item, *workspace, f); }, kDenied},
+        {"getCustomFormatsView", [&](unsigned&) { return gone.getCustomFormatsView(nullptr, *formats); }, kDenied},
+        {"getCustomFormatView", [&](unsigned& f) { return gone.getCustomFormatView(item, *format, f); }, kDenied},
+        {"getCustomTransformersView", [&](unsigned&) { return gone.getCustomTransformersView(nullptr, *transformers); },
+         kDenied},
+        {"getCustomTransformerView", [&](unsigned& f) { return gone.getCustomTransformerView(item, *transformer, f); },
+         kDenied},
+        {"getTemplatesView", [&](unsigned&) { return gone.getTemplatesView(nullptr, *templates); }, kDenied},
+        {"getTemplateView", [&](unsigned& f) { return gone.getTemplateView(item, *page, f); }, kDenied},
+        {"getWorkspaceServices", [&](unsigned&) { return gone.getWorkspaceServices(nullptr, *registrations); },
+         kDenied},
+        {"workspaceServiceExists", [&](unsigned& f) { return gone.workspaceServiceExists(item, t("s"), f); }, kDenied},
+        {"registerWorkspaceService", [&](unsigned&) { return gone.registerWorkspaceService(item, t("s")); }, kDenied},
+        {"deregisterWorkspaceService", [&](unsigned& f) { return gone.deregisterWorkspaceService(item, t("s"), f); },
+         kDenied},
+    });
 }
 
-TEST_F(Repositories, ItemsAndResourcesAreAddedUpdatedFetchedAndRemoved)
+TEST_F(Repositories, ItemsAndResources)
 {
-    IZELServerString& roads = text("roads.zlw");
-    writeFile(local("v2.zlw"), "#!/bin/sh\n# @title Roads 2\ntrue\n");
-    EXPECT_EQ(client.take(repo->updateItem(roads, text(local("v2.zlw")))), 0u);
-    EXPECT_EQ(addItem(client, *repo, "roads.zlw", "again"), kRefused) << "refused before the transfer";
-    EXPECT_EQ(addItem(client, *repo, "bad.zlw", "#!/bin/sh\n# @colour red\ntrue\n"), kRefused) << "and after it";
-    EXPECT_NE(client.lastMessage().find("unknown key '@colour'"), std::string::npos) << client.lastMessage();
-
-    EXPECT_EQ(client.flag([&](unsigned& f) { return repo->getItem(roads, text(local("got.zlw")), f); }), 1);
-    EXPECT_EQ(readAll(local("got.zlw")), readAll(local("v2.zlw")));
-    writeFile(local("kept.zlw"), "kept");
-    EXPECT_EQ(client.flag([&](unsigned& f) { return repo->getItem(text("no.zlw"), text(local("kept.zlw")), f); }), -1);
-    EXPECT_EQ(readAll(local("kept.zlw")), "kept") << "a failed download leaves the destination alone";
-
-    IZELServerString& r = text("r.txt");
+    const std::string v2 = "#!/bin/sh\n# @title Roads 2\ntrue\n";
+    writeFile(local("v2.zlw"), v2);
+    writeFile(local("bad.zlw"), "#!/bin/sh\n# @colour red\ntrue\n");
+    writeFile(local("empty"), "");
     writeFile(local("r1"), "first");
     writeFile(local("r2"), "second!");
-    EXPECT_EQ(client.take(repo->addItemResource(roads, r, text(local("r1")))), 0u);
-    EXPECT_EQ(client.take(repo->updateItemResource(roads, r, text(local("r2")))), 0u);
-    EXPECT_EQ(client.take(repo->updateItemResource(roads, text("no.txt"), text(local("r2")))), kRefused);
-    EXPECT_EQ(client.flag([&](unsigned& f) { return repo->itemResourceExists(roads, r, f); }), 1);
-    EXPECT_EQ(client.flag([&](unsigned& f) { return repo->getItemResource(roads, r, text(local("r3")), f); }), 1);
-    EXPECT_EQ(readAll(local("r3")), "second!");
-    auto resource = client.own(session->createResource(), &Session::destroyResource);
-    EXPECT_EQ(client.flag([&](unsigned& f) { return repo->getItemResourceView(roads, r, *resource, f); }), 1);
-    EXPECT_EQ(resource->getFileSize(), 7);
-    auto resources = client.own(session->createResourceVector(), &Session::destroyResourceVector);
-    EXPECT_EQ(client.take(repo->getItemResourcesView(roads, nullptr, *resources)), 0u);
-    EXPECT_EQ(resources->entries(), 1u);
-
-    EXPECT_EQ(client.flag([&](unsigned& f) { return repo->removeItemResource(roads, r, f); }), 1);
-    EXPECT_EQ(client.flag([&](unsigned& f) { return repo->removeItem(roads, f); }), 1);
-    EXPECT_EQ(client.flag([&](unsigned& f) { return repo->itemExists(roads, f); }), 0);
-    unsigned removed = 1;
-    EXPECT_EQ(client.take(repo->removeItemResource(roads, r, removed)), kRefused) << "the item is gone";
-    EXPECT_EQ(removed, 0u);
+    writeFile(local("kept"), "kept");
+    IZELServerString& roads = t("roads.zlw");
+    IZELServerString& r = t("r.txt");
+    client.run({
+        {"update", [&](unsigned&) { return repo->updateItem(roads, t(local("v2.zlw"))); }, kUntouched},
+        {"update a missing item", [&](unsigned&) { return repo->updateItem(t("no.zlw"), t(local("v2.zlw"))); },
+         kDenied},
+        {"add a duplicate: refused before the transfer",
+         [&](unsigned&) { return repo->addItem(roads, t(local("v2.zlw"))); }, kDenied},
+        {"add a bad header: refused after it",
+         [&](unsigned&) { return repo->addItem(t("bad.zlw"), t(local("bad.zlw"))); }, kDenied},
+        {"add from a missing file", [&](unsigned&) { return repo->addItem(t("new.zlw"), t(local("none"))); }, -393623},
+        {"add an empty item", [&](unsigned&) { return repo->addItem(t("empty.zlw"), t(local("empty"))); }, kUntouched},
+        {"exists", [&](unsigned& f) { return repo->itemExists(roads, f); }, 1},
+        {"get", checking([&](unsigned& f) { return repo->getItem(roads, t(local("got")), f); }, holds("got", v2)), 1},
+        {"get a missing item, keeping the destination",
+         checking([&](unsigned& f) { return repo->getItem(t("no.zlw"), t(local("kept")), f); }, holds("kept", "kept")),
+         kDenied},
+        {"an empty item is no file",
+         checking([&](unsigned& f) { return repo->getItem(t("empty.zlw"), t(local("kept")), f); },
+                  holds("kept", "kept")),
+         -393638},
+        {"add a resource", [&](unsigned&) { return repo->addItemResource(roads, r, t(local("r1"))); }, kUntouched},
+        {"add it again", [&](unsigned&) { return repo->addItemResource(roads, r, t(local("r1"))); }, kDenied},
+        {"update it", [&](unsigned&) { return repo->updateItemResource(roads, r, t(local("r2"))); }, kUntouched},
+        {"update a missing one", [&](unsigned&) { return repo->updateItemResource(roads, t("no"), t(local("r2"))); },
+         kDenied},
+        {"resource exists", [&](unsigned& f) { return repo->itemResourceExists(roads, r, f); }, 1},
+        {"missing resource", [&](unsigned& f) { return repo->itemResourceExists(roads, t("no"), f); }, 0},
+        {"get it",
+         checking([&](unsigned& f) { return repo->getItemResource(roads, r, t(local("r3")), f); },
+                  holds("r3", "second!")),
+         1},
+        {"get a missing one",
+         checking([&](unsigned& f) { return repo->getItemResource(roads, t("no"), t(local("kept")), f); },
+                  holds("kept", "kept")),
+         kDenied},
+        {"its view",
+         checking([&](unsigned& f) { return repo->getItemResourceView(roads, r, *resource, f); },
+                  [&] { return resource->getFileSize() == 7; }),
+         1},
+        {"a missing view", [&](unsigned& f) { return repo->getItemResourceView(roads, t("no"), *resource, f); }, 0},
+        {"all views", counting(*resources, [&] { return repo->getItemResourcesView(roads, nullptr, *resources); }), 1},
+        {"remove it", [&](unsigned& f) { return repo->removeItemResource(roads, r, f); }, 1},
+        {"remove it again", [&](unsigned& f) { return repo->removeItemResource(roads, r, f); }, 0},
+        {"remove the item", [&](unsigned& f) { return repo->removeItem(roads, f); }, 1},
+        {"remove it again", [&](unsigned& f) { return repo->removeItem(roads, f); }, 0},
+        {"the item is gone", [&](unsigned& f) { return repo->itemExists(roads, f); }, 0},
+        {"and its resources", [&](unsigned& f) { return repo->removeItemResource(roads, r, f); }, kDenied},
+    });
 }
 
 TEST_F(Repositories, ViewsDescribeTheItemsByKind)
 {
+    IZELServerSession& s = client.session();
     ZELServerStringDict enabled;
     enabled.insert("ENABLE_FILTER", "ENABLED");
-    auto summaries = client.own(session->createWorkspaceSummaryVector(), &Session::destroyWorkspaceSummaryVector);
-    EXPECT_EQ(client.take(repo->getWorkspaceSummariesView(&enabled, *summaries)), 0u) << client.lastMessage();
-    EXPECT_EQ(summaries->entries(), 1u) << "the disabled workspace is filtered out";
     ZELServerStringDict wrong;
     wrong.insert("ENABLE_FILTER", "SOME");
-    EXPECT_EQ(client.take(repo->getWorkspaceSummariesView(&wrong, *summaries)), 393619u) << "refused before sending";
-    auto workspaces = client.own(session->createWorkspaceVector(), &Session::destroyWorkspaceVector);
-    EXPECT_EQ(client.take(repo->getWorkspacesView(nullptr, *workspaces)), 0u);
-    EXPECT_EQ(workspaces->entries(), 2u);
+    IZELServerString& roads = t("roads.zlw");
+    client.run({
+        {"enabled summaries",
+         counting(*summaries, [&] { return repo->getWorkspaceSummariesView(&enabled, *summaries); }), 1},
+        {"a bad filter, refused before sending",
+         [&](unsigned&) { return repo->getWorkspaceSummariesView(&wrong, *summaries); }, kInvalid},
+        {"workspaces", counting(*workspaces, [&] { return repo->getWorkspacesView(nullptr, *workspaces); }), 2},
+        {"a workspace",
+         checking(
+             [&](unsigned& f) { return repo->getWorkspaceView(roads, *workspace, f); },
+             [&] { return workspace->getParameters().entries() == 1 && workspace->getSourceDatasets().entries() == 1; },
+             reads(*workspace, &IZELServerWorkspace::getTitle, "Roads")),
+         1},
+        {"a missing workspace", [&](unsigned& f) { return repo->getWorkspaceView(t("no.zlw"), *workspace, f); }, 0},
+        {"formats", counting(*formats, [&] { return repo->getCustomFormatsView(nullptr, *formats); }), 1},
+        {"a format",
+         checking([&](unsigned& f) { return repo->getCustomFormatView(t("fmt.zds"), *format, f); },
+                  reads(*format, &IZELServerCustomFormat::getTitle, "Format")),
+         1},
+        {"a workspace is no format", [&](unsigned& f) { return repo->getCustomFormatView(roads, *format, f); }, 0},
+        {"transformers",
+         counting(*transformers, [&] { return repo->getCustomTransformersView(nullptr, *transformers); }), 1},
+        {"a transformer", [&](unsigned& f) { return repo->getCustomTransformerView(t("tr.zlx"), *transformer, f); }, 1},
+        {"a missing transformer", [&](unsigned& f) { return repo->getCustomTransformerView(roads, *transformer, f); },
+         0},
+        {"templates", counting(*templates, [&] { return repo->getTemplatesView(nullptr, *templates); }), 1},
+        {"a template",
+         checking([&](unsigned& f) { return repo->getTemplateView(t("page.zlwt"), *page, f); },
+                  reads(*page, &IZELServerTemplate::getTitle, "Page")),
+         1},
+        {"a missing template", [&](unsigned& f) { return repo->getTemplateView(roads, *page, f); }, 0},
+    });
 
-    IZELServerString& title = client.text();
-    auto workspace = client.own(session->createWorkspace(), &Session::destroyWorkspace);
-    EXPECT_EQ(client.flag([&](unsigned& f) { return repo->getWorkspaceView(text("roads.zlw"), *workspace, f); }), 1);
-    workspace->getTitle(title);
-    EXPECT_STREQ(title.c_str(), "Roads");
-    EXPECT_EQ(workspace->getParameters().entries(), 1u);
-    EXPECT_EQ(workspace->getSourceDatasets().entries(), 1u);
-    EXPECT_EQ(client.flag([&](unsigned& f) { return repo->getWorkspaceView(text("no.zlw"), *workspace, f); }), 0);
-
-    auto format = client.own(session->createCustomFormat(), &Session::destroyCustomFormat);
-    EXPECT_EQ(client.flag([&](unsigned& f) { return repo->getCustomFormatView(text("fmt.zds"), *format, f); }), 1);
-    format->getTitle(title);
-    EXPECT_STREQ(title.c_str(), "Format");
-    EXPECT_EQ(client.flag([&](unsigned& f) { return repo->getCustomFormatView(text("roads.zlw"), *format, f); }), 0)
-        << "a workspace is no custom format";
-    auto formats = client.own(session->createCustomFormatVector(), &Session::destroyCustomFormatVector);
-    EXPECT_EQ(client.take(repo->getCustomFormatsView(nullptr, *formats)), 0u);
-    EXPECT_EQ(formats->entries(), 1u);
-
-    auto transformer = client.own(session->createCustomTransformer(), &Session::destroyCustomTransformer);
-    IZELServerString& tr = text("tr.zlx");
-    EXPECT_EQ(client.flag([&](unsigned& f) { return repo->getCustomTransformerView(tr, *transformer, f); }), 1);
-    auto transformers = client.own(session->createCustomTransformerVector(), &Session::destroyCustomTransformerVector);
-    EXPECT_EQ(client.take(repo->getCustomTransformersView(nullptr, *transformers)), 0u);
-    EXPECT_EQ(transformers->entries(), 1u);
-
-    auto page = client.own(session->createTemplate(), &Session::destroyTemplate);
-    EXPECT_EQ(client.flag([&](unsigned& f) { return repo->getTemplateView(text("page.zlwt"), *page, f); }), 1);
-    page->getTitle(title);
-    EXPECT_STREQ(title.c_str(), "Page");
-    auto pages = client.own(session->createTemplateVector(), &Session::destroyTemplateVector);
-    EXPECT_EQ(client.take(repo->getTemplatesView(nullptr, *pages)), 0u);
-    EXPECT_EQ(pages->entries(), 1u);
+    // Properties set through a workspace's and a dataset's accessors are what the next view reads.
+    ASSERT_EQ(client.outcome([&](unsigned& f) { return repo->getWorkspaceView(roads, *workspace, f); }), 1);
+    IZELServerPropertyAccessor& own = workspace->getPropertyAccessor();
+    own.setProperty(t("ui"), t("colour"), t("green"));
+    IZELServerDataset& dataset = *workspace->getSourceDatasets().element(0);
+    IZELServerPropertyAccessor& datasetOwn = dataset.getPropertyAccessor();
+    datasetOwn.setProperty(t("io"), t("encoding"), t("utf-8"));
+    auto again = client.own(s.createWorkspace());
+    IZELServerString& value = client.text();
+    auto holdsProperty = [&](IZELServerPropertyAccessor& accessor, const char* category, const char* name,
+                             const char* expected) {
+        return accessor.getPropertyValue(t(category), t(name), value) && value.equals(expected);
+    };
+    client.run({
+        {"update a workspace's", [&](unsigned&) { return workspace->updatePropertyAccessor(own); }, kUntouched},
+        {"update a dataset's", [&](unsigned&) { return dataset.updatePropertyAccessor(datasetOwn); }, kUntouched},
+        {"read them back",
+         checking([&](unsigned& f) { return repo->getWorkspaceView(roads, *again, f); },
+                  [&] {
+                      return holdsProperty(again->getPropertyAccessor(), "ui", "colour", "green") &&
+                             holdsProperty(again->getSourceDatasets().element(0)->getPropertyAccessor(), "io",
+                                           "encoding", "utf-8");
+                  }),
+         1},
+        {"remove the workspace", [&](unsigned& f) { return repo->removeItem(roads, f); }, 1},
+        {"its accessor is refused", [&](unsigned&) { return workspace->updatePropertyAccessor(own); }, kDenied},
+        {"so is its dataset's", [&](unsigned&) { return dataset.updatePropertyAccessor(datasetOwn); }, kDenied},
+    });
 }
 
 TEST_F(Repositories, ServicesAndRegistrations)
 {
-    auto service = client.own(session->createService(text("pub"), text("Publisher"), text("first"), text("")),
-                              &Session::destroyService);
+    IZELServerSession& s = client.session();
+    auto service = client.own(s.createService(t("pub"), t("Publisher"), t("first"), t("")));
     EXPECT_EQ(service->isEnabled(), 1u) << "a new service is enabled and open to workspaces only";
     EXPECT_EQ(service->isWorkspaceRegistrationAllowed(), 1u);
     EXPECT_EQ(service->isRegistrationAllowed(2), 0u);
     service->setRegistrationAllowed(2, 1);
-    ASSERT_EQ(client.take(manager->addService(*service)), 0u) << client.lastMessage();
-    EXPECT_EQ(client.take(manager->addService(*service)), kRefused) << "a duplicate";
-    service->setDescription(text("second"));
-    EXPECT_EQ(client.take(manager->updateService(*service)), 0u) << client.lastMessage();
-    auto ghost =
-        client.own(session->createService(text("ghost"), text(""), text(""), text("")), &Session::destroyService);
-    EXPECT_EQ(client.take(manager->updateService(*ghost)), kRefused) << "an unknown service";
-
-    EXPECT_EQ(client.flag([&](unsigned& f) { return manager->serviceExists(text("pub"), f); }), 1);
-    auto services = client.own(session->createServiceVector(), &Session::destroyServiceVector);
-    EXPECT_EQ(client.take(manager->getServices(nullptr, *services)), 0u);
-    EXPECT_EQ(services->entries(), 1u);
-    auto fetched = client.own(session->createService(), &Session::destroyService);
-    ASSERT_EQ(client.flag([&](unsigned& f) { return manager->getService(text("pub"), *fetched, f); }), 1);
-    IZELServerString& description = client.text();
-    fetched->getDescription(description);
-    EXPECT_STREQ(description.c_str(), "second");
-    EXPECT_EQ(fetched->isRegistrationAllowed(2), 1u) << "the server kept the flags";
-    EXPECT_EQ(fetched->isRegistrationAllowed(3), 0u);
-
-    IZELServerString& repository = text("roads");
-    IZELServerString& format = text("fmt.zds");
-    EXPECT_EQ(client.take(fetched->registerItem(repository, format)), 0u) << client.lastMessage();
-    EXPECT_EQ(client.take(fetched->registerItem(repository, format)), kRefused) << "twice";
-    EXPECT_EQ(client.flag([&](unsigned& f) { return fetched->itemRegistered(repository, format, f); }), 1);
-    auto items = client.own(session->createItemVector(), &Session::destroyItemVector);
-    EXPECT_EQ(client.take(fetched->getRegisteredItems(nullptr, *items)), 0u);
-    EXPECT_EQ(items->entries(), 1u);
-    EXPECT_EQ(client.flag([&](unsigned& f) { return fetched->deregisterItem(repository, format, f); }), 1);
-
-    IZELServerString& roads = text("roads.zlw");
-    EXPECT_EQ(client.take(repo->registerWorkspaceService(roads, text("pub"))), 0u) << client.lastMessage();
-    EXPECT_EQ(client.take(repo->registerWorkspaceService(format, text("pub"))), kRefused) << "no workspace";
-    EXPECT_EQ(client.flag([&](unsigned& f) { return repo->workspaceServiceExists(roads, text("pub"), f); }), 1);
-    auto registrations = client.own(session->createWorkspaceServiceVector(), &Session::destroyWorkspaceServiceVector);
-    EXPECT_EQ(client.take(repo->getWorkspaceServices(nullptr, *registrations)), 0u) << client.lastMessage();
-    EXPECT_EQ(registrations->entries(), 1u);
-    EXPECT_EQ(client.flag([&](unsigned& f) { return repo->deregisterWorkspaceService(roads, text("pub"), f); }), 1);
-
-    IZELServerPropertyAccessor& properties = fetched->getPropertyAccessor();
-    properties.setProperty(text("cat"), text("key"), text("value"));
-    EXPECT_EQ(client.take(fetched->updatePropertyAccessor(properties)), 0u) << client.lastMessage();
-    auto again = client.own(session->createService(), &Session::destroyService);
-    EXPECT_EQ(client.flag([&](unsigned& f) { return manager->getService(text("pub"), *again, f); }), 1);
+    auto ghost = client.own(s.createService(t("ghost"), t(""), t(""), t("")));
+    auto services = client.own(s.createServiceVector());
+    auto fetched = client.own(s.createService());
+    auto items = client.own(s.createItemVector());
+    IZELServerString& repository = t("roads");
+    IZELServerString& format = t("fmt.zds");
+    IZELServerString& roads = t("roads.zlw");
+    IZELServerString& pub = t("pub");
     IZELServerString& value = client.text();
-    EXPECT_TRUE(again->getPropertyAccessor().getPropertyValue(text("cat"), text("key"), value));
-    EXPECT_STREQ(value.c_str(), "value");
-    EXPECT_EQ(client.flag([&](unsigned& f) { return manager->removeService(text("pub"), f); }), 1);
-    EXPECT_EQ(client.take(again->updatePropertyAccessor(again->getPropertyAccessor())), kRefused) << "it is gone";
-    EXPECT_EQ(client.flag([&](unsigned& f) { return manager->removeService(text("pub"), f); }), 0);
-}
-
-TEST_F(Repositories, WorkspaceAndDatasetPropertiesAreReplacedByTheirAccessors)
-{
-    auto workspace = client.own(session->createWorkspace(), &Session::destroyWorkspace);
-    ASSERT_EQ(client.flag([&](unsigned& f) { return repo->getWorkspaceView(text("roads.zlw"), *workspace, f); }), 1);
-    IZELServerPropertyAccessor& own = workspace->getPropertyAccessor();
-    own.setProperty(text("ui"), text("colour"), text("green"));
-    EXPECT_EQ(client.take(workspace->updatePropertyAccessor(own)), 0u) << client.lastMessage();
-    ASSERT_EQ(workspace->getSourceDatasets().entries(), 1u);
-    IZELServerDataset& dataset = *workspace->getSourceDatasets().element(0);
-    IZELServerPropertyAccessor& datasetOwn = dataset.getPropertyAccessor();
-    datasetOwn.setProperty(text("io"), text("encoding"), text("utf-8"));
-    EXPECT_EQ(client.take(dataset.updatePropertyAccessor(datasetOwn)), 0u) << client.lastMessage();
-
-    auto again = client.own(session->createWorkspace(), &Session::destroyWorkspace);
-    ASSERT_EQ(client.flag([&](unsigned& f) { return repo->getWorkspaceView(text("roads.zlw"), *again, f); }), 1);
-    IZELServerString& value = client.text();
-    EXPECT_TRUE(again->getPropertyAccessor().getPropertyValue(text("ui"), text("colour"), value));
-    EXPECT_STREQ(value.c_str(), "green");
-    ASSERT_EQ(again->getSourceDatasets().entries(), 1u);
-    EXPECT_TRUE(again->getSourceDatasets().element(0)->getPropertyAccessor().getPropertyValue(text("io"),
-                                                                                              text("encoding"), value));
-    EXPECT_STREQ(value.c_str(), "utf-8");
-
-    ASSERT_EQ(client.flag([&](unsigned& f) { return repo->removeItem(text("roads.zlw"), f); }), 1);
-    EXPECT_EQ(client.take(workspace->updatePropertyAccessor(own)), kRefused) << "the workspace is gone";
-    EXPECT_EQ(client.take(dataset.updatePropertyAccessor(datasetOwn)), kRefused);
+    client.run({
+        {"add", [&](unsigned&) { return manager->addService(*service); }, kUntouched},
+        {"add a duplicate", [&](unsigned&) { return manager->addService(*service); }, kDenied},
+        {"update",
+         [&](unsigned&) {
+             service->setDescription(t("second"));
+             return manager->updateService(*service);
+         },
+         kUntouched},
+        {"update an unknown service", [&](unsigned&) { return manager->updateService(*ghost); }, kDenied},
+        {"exists", [&](unsigned& f) { return manager->serviceExists(pub, f); }, 1},
+        {"does not exist", [&](unsigned& f) { return manager->serviceExists(t("ghost"), f); }, 0},
+        {"list", counting(*services, [&] { return manager->getServices(nullptr, *services); }), 1},
+        {"get, with the server's flags",
+         checking([&](unsigned& f) { return manager->getService(pub, *fetched, f); },
+                  [&] { return fetched->isRegistrationAllowed(2) == 1 && fetched->isRegistrationAllowed(3) == 0; },
+                  reads(*fetched, &IZELServerService::getDescription, "second")),
+         1},
+        {"get the unknown", [&](unsigned& f) { return manager->getService(t("ghost"), *ghost, f); }, 0},
+        {"register an item", [&](unsigned&) { return fetched->registerItem(repository, format); }, kUntouched},
+        {"register it twice", [&](unsigned&) { return fetched->registerItem(repository, format); }, kDenied},
+        {"registered", [&](unsigned& f) { return fetched->itemRegistered(repository, format, f); }, 1},
+        {"not registered", [&](unsigned& f) { return fetched->itemRegistered(repository, roads, f); }, 0},
+        {"registered items", counting(*items, [&] { return fetched->getRegisteredItems(nullptr, *items); }), 1},
+        {"deregister", [&](unsigned& f) { return fetched->deregisterItem(repository, format, f); }, 1},
+        {"deregister again", [&](unsigned& f) { return fetched->deregisterItem(repository, format, f); }, 0},
+        {"register a workspace", [&](unsigned&) { return repo->registerWorkspaceService(roads, pub); }, kUntouched},
+        {"a format is no workspace", [&](unsigned&) { return repo->registerWorkspaceService(format, pub); }, kDenied},
+        {"workspace registered", [&](unsigned& f) { return repo->workspaceServiceExists(roads, pub, f); }, 1},
+        {"registrations", counting(*registrations, [&] { return repo->getWorkspaceServices(nullptr, *registrations); }),
+         1},
+        {"deregister it", [&](unsigned& f) { return repo->deregisterWorkspaceService(roads, pub, f); }, 1},
+        {"deregister it again", [&](unsigned& f) { return repo->deregisterWorkspaceService(roads, pub, f); }, 0},
+        {"set a property",
+         [&](unsigned&) {
+             fetched->getPropertyAccessor().setProperty(t("cat"), t("key"), t("value"));
+             return fetched->updatePropertyAccessor(fetched->getPropertyAccessor());
+         },
+         kUntouched},
+        {"read it back",
+         checking([&](unsigned& f) { return manager->getService(pub, *service, f); },
+                  [&] {
+                      return service->getPropertyAccessor().getPropertyValue(t("cat"), t("key"), value) &&
+                             value.equals("value");
+                  }),
+         1},
+        {"remove", [&](unsigned& f) { return manager->removeService(pub, f); }, 1},
+        {"a property of a removed service",
+         [&](unsigned&) { return fetched->updatePropertyAccessor(fetched->getPropertyAccessor()); }, kDenied},
+        {"remove again", [&](unsigned& f) { return manager->removeService(pub, f); }, 0},
+    });
 }
 
 }  // namespace
