@@ -3,7 +3,6 @@
 
 #include "jobs/ZELServerTransformationRequest.h"
 
-#include <cstdlib>
 #include <memory>
 #include <string>
 #include <vector>
@@ -14,6 +13,8 @@
 #include "api/ZELServerStringArray.h"
 #include "api/heap.h"
 #include "jobs/jobs_factories.h"
+#include "repository/ZELServerWorkspace.h"
+#include "repository/reply_readers.h"
 
 using namespace std::string_literals;
 
@@ -44,105 +45,51 @@ std::string parameter(const std::string& name, const std::string& value)
     return "<PUBLISHED_PARAMETER name=\"" + name + "\">" + value + "</PUBLISHED_PARAMETER>";
 }
 
-// A workspace of the repository model whose only answer is its name: the request must not ask it
-// for anything else.
-class NamedWorkspace final : public IZELServerWorkspace {
-public:
-    explicit NamedWorkspace(std::string name) : name_(std::move(name)) {}
-    void getName(IZELServerString& out) const override { out.set(name_.data(), static_cast<unsigned>(name_.size())); }
-    void getTitle(IZELServerString&) const override { unexpected(); }
-    void getDescription(IZELServerString&) const override { unexpected(); }
-    bool isEnabled() const override { unexpected(); }
-    IZELServerVector<IZELServerParameter>& getParameters() override { unexpected(); }
-    IZELServerVector<IZELServerDataset>& getSourceDatasets() override { unexpected(); }
-    IZELServerVector<IZELServerDataset>& getDestinationDatasets() override { unexpected(); }
-    IZELServerVector<IZELServerFeatureType>& getSourceFeatureTypes() override { unexpected(); }
-    IZELServerVector<IZELServerFeatureType>& getDestinationFeatureTypes() override { unexpected(); }
-    IZELServerPropertyAccessor& getPropertyAccessor() override { unexpected(); }
-    IZELServerVector<IZELServerResource>& getResources() override { unexpected(); }
-    IZELServerStatus* updatePropertyAccessor(const IZELServerPropertyAccessor&) override { unexpected(); }
-    long long getFileSize() const override { unexpected(); }
-
-private:
-    [[noreturn]] static void unexpected()
-    {
-        ADD_FAILURE() << "the request read more than the workspace's name";
-        std::abort();
-    }
-    std::string name_;
-};
-
-// ---- Workspace paths and factories
-
-TEST(TransformationRequest, WorkspacePathDropsFourCharactersForTheFolder)
+TEST(TransformationRequest, WorkspacePathDropsFourCharactersForTheFolderInEveryForm)
 {
     const struct {
         std::string repository;
         std::string workspace;
         std::string path;
     } cases[] = {
-        {"R", "w.zlw", "R/w/w.zlw"},
         {"Samples", "harbour.zlw", "Samples/harbour/harbour.zlw"},
-        // Four characters, whatever they are.
-        {"R", "x.zlwx", "R/x./x.zlwx"},
         {"R", "noextension", "R/noexten/noextension"},
-        {"R", "abcd", "R//abcd"},
-        // Shorter names lose everything they have, and nothing before them.
-        {"R", "abc", "R//abc"},
+        {"R", "abc", "R//abc"},  // shorter names lose everything they have, and nothing before them
         {"", "w.zlw", "/w/w.zlw"},
     };
     for (const auto& c : cases) {
-        SCOPED_TRACE(c.repository + " " + c.workspace);
-        EXPECT_EQ(workspacePathOf(c.repository, c.workspace), c.path);
-        EXPECT_EQ(Request(str("S"), str(c.repository), str(c.workspace)).workspacePath(), c.path);
-        EXPECT_EQ(Request(str("S"), str(c.repository), NamedWorkspace(c.workspace)).workspacePath(), c.path);
+        ZELServerWorkspace workspace(nullptr);
+        ASSERT_EQ(
+            readWorkspaceReply("<R><WORKSPACE_DEFINITIONS name=\"" + c.workspace + "\"/></R>", nullptr, workspace), 0);
+        const std::unique_ptr<IZELServerTransformationRequest> made[] = {
+            std::unique_ptr<IZELServerTransformationRequest>(
+                makeTransformationRequest(str("S"), str(c.repository), str(c.workspace))),
+            std::unique_ptr<IZELServerTransformationRequest>(
+                makeTransformationRequest(str("S"), str(c.repository), workspace)),
+        };
+        for (const auto& request : made) {
+            EXPECT_EQ(requestText(*request), textFor(c.path, "")) << c.workspace;
+        }
     }
-    // The path form takes the path as given.
-    const Request byPath(str("S"), str("any/thing here.zlw"));
-    EXPECT_EQ(byPath.workspacePath(), "any/thing here.zlw");
-    EXPECT_EQ(requestText(byPath), textFor("any/thing here.zlw", ""));
-}
-
-TEST(TransformationRequest, FactoriesMakeTheThreeFormsOrNullOnAnExhaustedHeap)
-{
-    std::unique_ptr<IZELServerTransformationRequest> byName(
-        makeTransformationRequest(str("S"), str("R"), str("w.zlw")));
-    std::unique_ptr<IZELServerTransformationRequest> byPath(makeTransformationRequest(str("S"), str("R/x/y")));
-    std::unique_ptr<IZELServerTransformationRequest> byObject(
-        makeTransformationRequest(str("S"), str("R"), NamedWorkspace("v.zlw")));
-    ASSERT_TRUE(byName && byPath && byObject);
-    EXPECT_EQ(requestText(*byName), textFor("R/w/w.zlw", ""));
-    EXPECT_EQ(requestText(*byPath), textFor("R/x/y", ""));
-    EXPECT_EQ(requestText(*byObject), textFor("R/v/v.zlw", ""));
-    ZELServerString keyword;
-    byObject->getKeyword(keyword);
-    EXPECT_EQ(keyword.str(), "S");
-
+    // The path form takes the path as given; an exhausted heap makes no request.
+    const std::unique_ptr<IZELServerTransformationRequest> byPath(
+        makeTransformationRequest(str("S"), str("any/thing here.zlw")));
+    EXPECT_EQ(requestText(*byPath), textFor("any/thing here.zlw", ""));
     heap::failNextAllocations(1);
     EXPECT_EQ(makeTransformationRequest(str("S"), str("R/x/y")), nullptr);
 }
 
-// ---- Request text
-
-TEST(TransformationRequest, ParametersInNameOrderWithTheLastValueThenEmbeddedDirectives)
+TEST(TransformationRequest, TextHoldsParametersInNameOrderEscapedAsUtf8ThenEmbeddedDirectives)
 {
-    Request request(str("S"), str("R"), str("w.zlw"));
+    Request request(str("S"), str("p"));
     request.setEmbeddedDirective(str("LOG_LEVEL"), str("2"));
     request.setPublishedParameter(str("ZONE"), str("first"));
     request.setPublishedParameter(str("AREA"), str("a<b & c>d"));
     request.setPublishedParameter(str("ZONE"), str("north"));
-    EXPECT_EQ(requestText(request),
-              textFor("R/w/w.zlw", parameter("AREA", "a&lt;b &amp; c&gt;d") + parameter("ZONE", "north") +
-                                       R"(<ZEL_DIRECTIVE name="LOG_LEVEL">2</ZEL_DIRECTIVE>)"));
-}
-
-TEST(TransformationRequest, AttributeQuotesAreEscapedAndLocalCodePageTextBecomesUtf8)
-{
-    Request request(str("S"), str("p"));
-    request.setPublishedParameter(str("a\"b"), str(""));
-    request.setPublishedParameter(str("CITY"), str("Z\xFCrich"));
-    EXPECT_EQ(requestText(request), textFor("p", parameter("CITY", "Z\xC3\xBCrich") +
-                                                     R"(<PUBLISHED_PARAMETER name="a&quot;b"></PUBLISHED_PARAMETER>)"));
+    request.setPublishedParameter(str("a\"b"), str("Z\xFCrich"));
+    EXPECT_EQ(requestText(request), textFor("p", parameter("AREA", "a&lt;b &amp; c&gt;d") + parameter("ZONE", "north") +
+                                                     parameter("a&quot;b", "Z\xC3\xBCrich") +
+                                                     R"(<ZEL_DIRECTIVE name="LOG_LEVEL">2</ZEL_DIRECTIVE>)"));
 }
 
 TEST(TransformationRequest, TextThatCannotBeWrittenLeavesOutUntouchedAndStaysDirty)
@@ -153,34 +100,12 @@ TEST(TransformationRequest, TextThatCannotBeWrittenLeavesOutUntouchedAndStaysDir
     request.getRequestText(out);
     EXPECT_EQ(out.str(), "before");
     EXPECT_TRUE(request.dirty());
-
-    // Once the value is fixed the next call composes it.
     request.setPublishedParameter(str("P"), str("ab"));
     EXPECT_EQ(requestText(request), textFor("p", parameter("P", "ab")));
     EXPECT_FALSE(request.dirty());
 }
 
-// ---- Dirty flag
-
-TEST(TransformationRequest, EmbeddedDirectivesDoNotRecomposeUntilKeywordIsSetAgain)
-{
-    Request request(str("S"), str("p"));
-    EXPECT_TRUE(request.dirty());
-    const std::string first = requestText(request);
-    EXPECT_FALSE(request.dirty());
-
-    request.setEmbeddedDirective(str("D"), str("1"));
-    request.setEmbeddedDirectives(ZELServerStringArray(Pairs{"E", "2"}));
-    EXPECT_FALSE(request.dirty());
-    EXPECT_EQ(requestText(request), first);
-
-    request.setKeyword(str("S"));
-    EXPECT_TRUE(request.dirty());
-    EXPECT_EQ(requestText(request), textFor("p", R"(<ZEL_DIRECTIVE name="D">1</ZEL_DIRECTIVE>)"
-                                                 R"(<ZEL_DIRECTIVE name="E">2</ZEL_DIRECTIVE>)"));
-}
-
-TEST(TransformationRequest, OnlyKeywordAndPublishedParametersSetTheDirtyFlag)
+TEST(TransformationRequest, OnlyKeywordAndPublishedParametersMakeTheTextBeComposedAgain)
 {
     const ZELServerStringArray pair(Pairs{"N", "1"});
     const struct {
@@ -196,19 +121,24 @@ TEST(TransformationRequest, OnlyKeywordAndPublishedParametersSetTheDirtyFlag)
         {"directive list", [](Request& r, const ZELServerStringArray& p) { r.setDirectives(p); }, false},
         {"embedded directive",
          [](Request& r, const ZELServerStringArray&) { r.setEmbeddedDirective(str("E"), str("1")); }, false},
+        {"embedded list", [](Request& r, const ZELServerStringArray& p) { r.setEmbeddedDirectives(p); }, false},
         {"notification", [](Request& r, const ZELServerStringArray&) { r.setNotification(str("T"), str("m")); }, false},
         {"notification list", [](Request& r, const ZELServerStringArray& p) { r.setNotifications(p); }, false},
     };
     for (const auto& c : cases) {
         Request request(str("S"), str("p"));
-        requestText(request);
-        ASSERT_FALSE(request.dirty());
+        const std::string before = requestText(request);
         c.change(request, pair);
         EXPECT_EQ(request.dirty(), c.dirty) << c.what;
+        EXPECT_EQ(requestText(request) == before, !c.dirty || std::string(c.what) == "keyword") << c.what;
     }
+    // Embedded directives wait for the next change that does.
+    Request request(str("S"), str("p"));
+    requestText(request);
+    request.setEmbeddedDirective(str("D"), str("1"));
+    request.setKeyword(str("S"));
+    EXPECT_EQ(requestText(request), textFor("p", R"(<ZEL_DIRECTIVE name="D">1</ZEL_DIRECTIVE>)"));
 }
-
-// ---- Dictionaries
 
 struct Dictionary {
     const char* what;

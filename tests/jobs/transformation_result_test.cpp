@@ -43,18 +43,15 @@ TEST(TransformationResult, UnsignedGettersConvertLikeTheServerWritesNumbers)
         unsigned value;  // kUntouched when the out value must stay as it was
     } cases[] = {
         {id, "id=17", 1, 17},
-        {id, "id=0x1F", 1, 31},
         {id, "id=-1", 1, 4294967295u},  // a minus wraps like the server's reader
         // other text behind the number: stored, not found
         {id, "id=12abc", 0, 12},
         {port, "requesterResultPort=80x", 0, 80},
         {id, "id=4294967296", 0, kUntouched},
-        {id, "id=", 0, kUntouched},
         {id, "other=1", 0, kUntouched},
         {id, "result=id=5", 0, kUntouched},  // a result piece is not the job's id
         {port, "requesterResultPort=7071", 1, 7071},
         {port, "requesterResultPort=-1", 0, kUntouched},
-        {port, "", 0, kUntouched},
     };
     for (const auto& c : cases) {
         const auto result = parsed(c.text);
@@ -88,10 +85,10 @@ TEST(TransformationResult, JobStatusComparesTheWholeWordExactly)
         unsigned code;
         unsigned success;
     } cases[] = {
-        {"jobStatus=SUCCESS\0id=17"s, 1, 7, 1},  {"jobStatus=QUEUED", 1, 1, 0},
-        {"jobStatus=PULLED", 1, 10, 0},          {"jobStatus=JOB_FAILURE", 1, 9, 0},
-        {"jobStatus=success", 0, kUntouched, 0}, {"jobStatus=SUCCESS ", 0, kUntouched, 0},
-        {"jobStatus=", 0, kUntouched, 0},        {"id=1", 0, kUntouched, 0},
+        {"jobStatus=SUCCESS\0id=17"s, 1, 7, 1},
+        {"jobStatus=QUEUED", 1, 1, 0},
+        {"jobStatus=success", 0, kUntouched, 0},
+        {"id=1", 0, kUntouched, 0},
     };
     for (const auto& c : cases) {
         const auto result = parsed(c.text);

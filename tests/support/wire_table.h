@@ -46,11 +46,24 @@ Outcome outcome(IZELServerStatus* raw, const Outs&... outs)
     return result;
 }
 
+// The texts of `count` things, each followed by a comma.
+template <class Text>
+std::string joined(std::size_t count, const Text& textOf)
+{
+    std::string all;
+    for (std::size_t i = 0; i < count; ++i) {
+        all += textOf(i) + ",";
+    }
+    return all;
+}
+
 // The steps after the command of an upload: the file header, the raw content, then `answer`.
 inline std::function<void(FakeServer&)> uploadOf(const std::string& content, const Bytes& answer)
 {
     return [=](FakeServer& server) {
-        server.exchange(fileHeader(content.size(), crc32(content)), readyAck()).expectRawBytes(content).sendFrame(answer);
+        server.exchange(fileHeader(content.size(), crc32(content)), readyAck())
+            .expectRawBytes(content)
+            .sendFrame(answer);
     };
 }
 
@@ -58,19 +71,18 @@ inline std::function<void(FakeServer&)> uploadOf(const std::string& content, con
 // `answer` after the second.
 inline std::function<void(FakeServer&)> downloadOf(const std::string& content, const Bytes& answer)
 {
-    return [=](FakeServer& server) {
-        server.expectFrame(readyAck()).sendRaw(content).exchange(readyAck(), answer);
-    };
+    return [=](FakeServer& server) { server.expectFrame(readyAck()).sendRaw(content).exchange(readyAck(), answer); };
 }
 
 struct WireRow {
     const char* what;
-    Bytes request;  // empty: nothing may be sent
+    Bytes request;  // empty (and no `then`): nothing may be sent
     Bytes answer;
     std::function<Outcome()> call;
     unsigned number;
     std::string outs;
-    std::function<void(FakeServer&)> then = {};  // steps after the answer (file transfers)
+    // Steps after the answer (file transfers), or the whole script of a row without a request.
+    std::function<void(FakeServer&)> then = {};
 };
 
 class WireTableTest : public SignedInChannelTest {
@@ -80,9 +92,9 @@ protected:
         for (const WireRow& row : rows) {
             if (!row.request.empty()) {
                 server.exchange(row.request, row.answer);
-                if (row.then) {
-                    row.then(server);
-                }
+            }
+            if (row.then) {
+                row.then(server);
             }
         }
         signIn();
