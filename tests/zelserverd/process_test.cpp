@@ -1,5 +1,5 @@
-// The real executable: its command line, its one stdout line, the generated administrator,
-// and a clean exit on SIGTERM and SIGINT.
+// The real executable: its command line, its one stdout line, the generated administrator kept as a
+// hash, and a clean exit on SIGTERM and SIGINT.
 #include <gtest/gtest.h>
 #include <poll.h>
 #include <signal.h>
@@ -11,6 +11,7 @@
 #include <regex>
 #include <thread>
 
+#include "auth.h"
 #include "support/server_fixture.h"
 
 namespace zeltest {
@@ -115,6 +116,9 @@ TEST_F(Executable, GeneratesAnAdministratorOnceAndStopsOnSigterm)
     ASSERT_EQ(::stat((data + "/admin-password").c_str(), &info), 0);
     EXPECT_EQ(info.st_mode & 0777, 0600u);
     EXPECT_EQ(password.size(), 24u);
+    const std::string stored = readFile(data + "/admin-password.hash");
+    EXPECT_EQ(stored.find(password), std::string::npos);
+    EXPECT_TRUE(zelserverd::passwordMatches(stored.substr(0, stored.size() - 1), password));
     {
         TestClient client;
         ASSERT_TRUE(client.connect(port));
@@ -163,6 +167,21 @@ TEST_F(Executable, RefusesBadArgumentsAndConfigs)
         EXPECT_EQ(code, c.code) << err;
         EXPECT_NE(err.find(c.expected), std::string::npos) << err;
     }
+}
+
+TEST(Passwords, HashesAreCheckedPlainTextStaysAcceptedAndNothingElseMatches)
+{
+    const std::string hash = zelserverd::hashPassword("s3cret");
+    ASSERT_EQ(hash.rfind("$y$", 0), 0u);
+    EXPECT_NE(hash, zelserverd::hashPassword("s3cret")) << "each hash has its own salt";
+    struct Case {
+        std::string stored;
+        std::string given;
+        bool matches;
+    };
+    for (const Case& c : {Case{hash, "s3cret", true}, Case{hash, "s3cret ", false}, Case{hash, hash, false},
+                          Case{"s3cret", "s3cret", true}, Case{"s3cret", "S3cret", false}, Case{"$bogus", "", false}})
+        EXPECT_EQ(zelserverd::passwordMatches(c.stored, c.given), c.matches) << c.stored << " / " << c.given;
 }
 
 }  // namespace

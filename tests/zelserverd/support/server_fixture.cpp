@@ -61,6 +61,13 @@ bool eventually(const std::function<bool()>& condition)
     return true;
 }
 
+bool processGone(const std::string& pid)
+{
+    const std::string text = readFile("/proc/" + pid + "/stat");
+    std::size_t paren = text.rfind(')');
+    return text.empty() || (paren != std::string::npos && text.substr(paren + 2, 1) == "Z");
+}
+
 std::string document(const std::string& elements) { return "<?xml version=\"1.0\"?>" + elements; }
 
 std::string withoutTimes(const std::string& text)
@@ -101,6 +108,10 @@ description = Files of the test
 [jobservice zeljob]
 )");
     startServer();
+    WireReply added = admin_->command("REP_ADD_REPOSITORY",
+                                      {{"repositoryObject", "<REP_ADD_REPOSITORY><REPOSITORY name=\"REPO\" "
+                                                            "description=\"Test repository\"/></REP_ADD_REPOSITORY>"}});
+    ASSERT_TRUE(added.ok()) << added.body;
 }
 
 void ServerFixture::TearDown()
@@ -121,13 +132,21 @@ void ServerFixture::startServer()
     server_ = zelserverd::Server::create(options, error);
     ASSERT_TRUE(server_) << error;
     server_->start();
+    admin_ = connectAs("admin");
 }
 
 void ServerFixture::stopServer()
 {
+    admin_.reset();
     if (server_)
         server_->stop();
     server_.reset();
+}
+
+void ServerFixture::restartWith(const std::string& settings)
+{
+    writeFile(configPath_, readFile(configPath_) + "\n[server]\n" + settings + "\n");
+    startServer();
 }
 
 std::unique_ptr<TestClient> ServerFixture::connectAs(const std::string& user)
@@ -142,13 +161,6 @@ std::unique_ptr<TestClient> ServerFixture::connectAs(const std::string& user)
 std::string ServerFixture::userOf(TestClient& client)
 {
     return client.command("SERVER_SESSION_GET_PROP", {{"sessionPropName", "USER_NAME"}}).body;
-}
-
-pugi::xml_node ServerFixture::parse(const WireReply& reply)
-{
-    EXPECT_TRUE(reply.ok()) << reply.body;
-    EXPECT_TRUE(doc_.load_string(reply.body.c_str())) << reply.body;
-    return doc_.document_element();
 }
 
 std::map<std::string, std::string> parseResult(const std::string& text)
@@ -179,47 +191,13 @@ std::string requestText(const std::string& workspace, const Values& parameters)
     return "REPO/" + stem + "/" + workspace + " -XML_PARAMETER " + xml;
 }
 
-void RepositoryFixture::SetUp()
-{
-    ServerFixture::SetUp();
-    admin_ = connectAs("admin");
-    WireReply added = admin_->command("REP_ADD_REPOSITORY",
-                                      {{"repositoryObject", "<REP_ADD_REPOSITORY><REPOSITORY name=\"REPO\" "
-                                                            "description=\"Test repository\"/></REP_ADD_REPOSITORY>"}});
-    ASSERT_TRUE(added.ok()) << added.body;
-}
-
-void RepositoryFixture::TearDown()
-{
-    admin_.reset();
-    ServerFixture::TearDown();
-}
-
-void RepositoryFixture::restart()
-{
-    admin_.reset();
-    startServer();
-    admin_ = connectAs("admin");
-}
-
-WireReply RepositoryFixture::addItem(const std::string& name, const std::string& content, const std::string& keyword)
+WireReply ServerFixture::addItem(const std::string& name, const std::string& content, const std::string& keyword)
 {
     return admin_->upload(
         keyword, {{"repositoryName", "REPO"}, {"itemName", name}, {"itemFileCRCCheckingEnabled", "true"}}, content);
 }
 
-WireReply RepositoryFixture::addResource(const std::string& item, const std::string& name, const std::string& content,
-                                         const std::string& keyword)
-{
-    return admin_->upload(keyword,
-                          {{"repositoryName", "REPO"},
-                           {"itemName", item},
-                           {"resourceName", name},
-                           {"resourceFileCRCCheckingEnabled", "false"}},
-                          content);
-}
-
-long RepositoryFixture::submit(const std::string& workspace, const Values& parameters, const Values& extra)
+long ServerFixture::submit(const std::string& workspace, const Values& parameters, const Values& extra)
 {
     Values values = {{"keyword", "zeljob"}, {"request", requestText(workspace, parameters)}};
     values.insert(values.end(), extra.begin(), extra.end());
@@ -227,12 +205,17 @@ long RepositoryFixture::submit(const std::string& workspace, const Values& param
     return lastReply_.ok() ? std::stol(lastReply_.body) : 0;
 }
 
-std::map<std::string, std::string> RepositoryFixture::result(long id)
+std::map<std::string, std::string> ServerFixture::result(long id)
 {
     return parseResult(admin_->command("GET_JOB_RESULT_STRING", {{"jobID", std::to_string(id)}}).body);
 }
 
-std::map<std::string, std::string> RepositoryFixture::waitForEnd(long id)
+std::string ServerFixture::jobFile(long id, const std::string& name) const
+{
+    return dataDir_ + "/jobs/" + std::to_string(id) + "/work/" + name;
+}
+
+std::map<std::string, std::string> ServerFixture::waitForEnd(long id)
 {
     auto deadline = std::chrono::steady_clock::now() + std::chrono::seconds(20);
     std::map<std::string, std::string> last;

@@ -1,9 +1,9 @@
-// Runs a server in-process on a free loopback port, with a fresh data directory and a
-// configuration of known users for each test; and what the suites share around it.
+// Runs a server in-process on a free loopback port, with a fresh data directory, a configuration of
+// known users, one repository "REPO" and an administrator's connection for each test; and what the
+// suites share around it.
 #pragma once
 
 #include <gtest/gtest.h>
-#include <pugixml.hpp>
 
 #include <functional>
 #include <map>
@@ -33,57 +33,46 @@ bool eventually(const std::function<bool()>& condition);
 std::string document(const std::string& elements);
 // `text` with every time stamp of the server's form replaced by "TIME".
 std::string withoutTimes(const std::string& text);
+// A result text split into its name=value entries.
+std::map<std::string, std::string> parseResult(const std::string& text);
+// A "TRANSFORMATION_REQUEST" request text for REPO/NAME/NAME.zlw with published parameters.
+std::string requestText(const std::string& workspace, const Values& parameters = {});
+// Gone, or a zombie nobody has reaped yet: either way no longer running.
+bool processGone(const std::string& pid);
 
 class ServerFixture : public ::testing::Test {
 protected:
     void SetUp() override;
     void TearDown() override;
 
-    // Starts (or restarts, on the same data directory) the server.
+    // Starts (or restarts, on the same data directory) the server, and signs the administrator in.
     void startServer();
     void stopServer();
+    // Restarts the server with `settings` added to its [server] section.
+    void restartWith(const std::string& settings);
     std::uint16_t port() const { return server_->port(); }
     zelserverd::ServerState& state() { return server_->state(); }
     // A connection already signed in as `user` (password: user + "pw").
     std::unique_ptr<TestClient> connectAs(const std::string& user);
     // The user the server has `client` signed in as: proof that the connection is in step.
     static std::string userOf(TestClient& client);
-    // The root element of a successful reply document; valid until the next call.
-    pugi::xml_node parse(const WireReply& reply);
+
+    WireReply addItem(const std::string& name, const std::string& content, const std::string& keyword = "REP_ADD_ITEM");
+    // Submits a job as the administrator; its id, or 0 (the reply is kept in lastReply_).
+    long submit(const std::string& workspace, const Values& parameters = {}, const Values& extra = {});
+    // Polls until the job has ended (or 20 seconds pass); the last result seen.
+    std::map<std::string, std::string> waitForEnd(long id);
+    std::map<std::string, std::string> result(long id);
+    // The file `name` in the work directory of job `id`.
+    std::string jobFile(long id, const std::string& name) const;
+    // Number of files in the content directory.
+    std::size_t storedFiles() { return entriesOf(dataDir_ + "/store").size(); }
 
     std::string root_;  // everything of this test lives below
     std::string dataDir_;
     std::string areaDir_;  // the shared resource "AREA"
     std::string configPath_;
     std::unique_ptr<zelserverd::Server> server_;
-    pugi::xml_document doc_;
-};
-
-// A result text split into its name=value entries.
-std::map<std::string, std::string> parseResult(const std::string& text);
-// A "TRANSFORMATION_REQUEST" request text for REPO/NAME/NAME.zlw with published parameters.
-std::string requestText(const std::string& workspace, const Values& parameters = {});
-
-// A server with one repository "REPO", an administrator's connection, and helpers for items and
-// jobs.
-class RepositoryFixture : public ServerFixture {
-protected:
-    void SetUp() override;
-    void TearDown() override;
-    // Restarts the server and signs the administrator in again.
-    void restart();
-
-    WireReply addItem(const std::string& name, const std::string& content, const std::string& keyword = "REP_ADD_ITEM");
-    WireReply addResource(const std::string& item, const std::string& name, const std::string& content,
-                          const std::string& keyword = "REP_ADD_ITEMRESOURCE");
-    // Submits a job; its id, or 0 (the reply is kept in lastReply_).
-    long submit(const std::string& workspace, const Values& parameters = {}, const Values& extra = {});
-    // Polls until the job has ended (or 20 seconds pass); the last result seen.
-    std::map<std::string, std::string> waitForEnd(long id);
-    std::map<std::string, std::string> result(long id);
-    // Number of files in the content directory.
-    std::size_t storedFiles() { return entriesOf(dataDir_ + "/store").size(); }
-
     std::unique_ptr<TestClient> admin_;
     WireReply lastReply_;
 };

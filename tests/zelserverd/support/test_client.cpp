@@ -49,11 +49,7 @@ std::uint32_t crc32(const std::string& data)
 
 std::string pathDocument(const std::string& path)
 {
-    std::size_t slash = path.rfind('/');
-    std::string name = slash == std::string::npos ? path : path.substr(slash + 1);
-    std::string dir = slash == std::string::npos ? std::string() : path.substr(0, slash);
-    return "<?xml version=\"1.0\" encoding=\"UTF-8\" standalone=\"no\" ?><SR_PATH><PATH name=\"" + name +
-           "\" dirpath=\"" + dir + "\" abspath=\"" + path + "\"/></SR_PATH>";
+    return "<?xml version=\"1.0\"?><SR_PATH><PATH abspath=\"" + path + "\"/></SR_PATH>";
 }
 
 TestClient::~TestClient() { close(); }
@@ -138,12 +134,6 @@ bool TestClient::closedByPeer(int timeoutMs)
     return n == 0 || (n < 0 && errno == ECONNRESET);
 }
 
-WireReply TestClient::readReply()
-{
-    std::optional<std::string> reply = readFrame();
-    return reply ? splitReply(*reply) : WireReply{};
-}
-
 WireReply TestClient::command(const std::string& keyword, const Values& values)
 {
     return sendFrame(requestPayload(keyword, values)) ? readReply() : WireReply{};
@@ -154,18 +144,21 @@ WireReply TestClient::signIn(const std::string& user, const std::string& passwor
     return command("SERVER_SESSION_INIT", {{"userID", user}, {"userPassword", password}});
 }
 
+WireReply TestClient::startUpload(const std::string& keyword, const Values& values, const std::string& header)
+{
+    WireReply reply = command(keyword, values);
+    if (!reply.ok() || reply.body != "ready_to_transfer")
+        return reply;
+    return sendFrame(header) ? readReply() : WireReply{};
+}
+
 WireReply TestClient::upload(const std::string& keyword, const Values& values, const std::string& content,
                              std::optional<std::uint32_t> announcedCrc)
 {
-    auto acknowledged = [](const WireReply& reply) { return reply.ok() && reply.body == "ready_to_transfer"; };
-    WireReply reply = command(keyword, values);
-    if (!acknowledged(reply))
-        return reply;
-    std::string crc = std::to_string(announcedCrc.value_or(crc32(content)));
-    if (!sendFrame("fileLength=" + std::to_string(content.size()) + "\0fileCRC="s + crc))
-        return {};
-    reply = readReply();
-    if (!acknowledged(reply))
+    const std::string crc = std::to_string(announcedCrc.value_or(crc32(content)));
+    WireReply reply =
+        startUpload(keyword, values, "fileLength=" + std::to_string(content.size()) + "\0fileCRC="s + crc);
+    if (!reply.ok() || reply.body != "ready_to_transfer")
         return reply;
     return sendRaw(content) ? readReply() : WireReply{};
 }

@@ -22,7 +22,7 @@ std::string requestPayload(const std::string& keyword, const Values& values);
 std::string frame(const std::string& payload);
 WireReply splitReply(const std::string& payload);
 std::uint32_t crc32(const std::string& data);
-// A "PATH" document as the library writes it for shared resource commands.
+// A "PATH" document for shared resource commands.
 std::string pathDocument(const std::string& path);
 
 struct Download {
@@ -39,10 +39,17 @@ public:
     ~TestClient();
 
     bool connect(std::uint16_t port);
+    // Takes over a connected socket (one the server made to the test).
+    void adopt(int fd)
+    {
+        close();
+        fd_ = fd;
+    }
     void close();
     bool sendRaw(const std::string& bytes);
     bool sendFrame(const std::string& payload) { return sendRaw(frame(payload)); }
     std::optional<std::string> readFrame(int timeoutMs = 5000);
+    WireReply readReply() { return splitReply(readFrame().value_or("")); }
     // True when the server closed the connection (end of stream within the time-out).
     bool closedByPeer(int timeoutMs = 5000);
 
@@ -52,10 +59,12 @@ public:
     // acknowledgement and returns that. `announcedCrc` overrides the true CRC.
     WireReply upload(const std::string& keyword, const Values& values, const std::string& content,
                      std::optional<std::uint32_t> announcedCrc = std::nullopt);
+    // Starts an upload with `header` for its file header (content left to the caller); the reply to
+    // the header, or the refusal of the request.
+    WireReply startUpload(const std::string& keyword, const Values& values, const std::string& header);
     Download download(const std::string& keyword, const Values& values);
 
 private:
-    WireReply readReply();
     bool waitReadable(int timeoutMs);
     bool recvExact(char* data, std::size_t size, int timeoutMs);
 
