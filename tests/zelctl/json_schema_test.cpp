@@ -51,76 +51,112 @@ std::vector<std::string> keysOf(const nlohmann::ordered_json& object)
     return keys;
 }
 
+// Whether `actual` holds what `expected` names: the keys of an object, every element of a list of
+// the same length, any other value as it is.
+bool holds(const nlohmann::ordered_json& actual, const nlohmann::json& expected)
+{
+    if (expected.is_object()) {
+        for (const auto& [key, value] : expected.items())
+            if (!actual.is_object() || !actual.contains(key) || !holds(actual[key], value))
+                return false;
+        return true;
+    }
+    if (!expected.is_array())
+        return actual == expected;
+    if (!actual.is_array() || actual.size() != expected.size())
+        return false;
+    for (std::size_t i = 0; i < expected.size(); ++i)
+        if (!holds(actual[i], expected[i]))
+            return false;
+    return true;
+}
+
 class JsonSchema : public Zelctl {
 protected:
-    nlohmann::ordered_json answer(const std::vector<std::string>& arguments)
+    // Runs a command with --json as ann; its answer must hold `expected` (JSON text, if any).
+    nlohmann::ordered_json& run(const std::string& command, std::vector<std::string> arguments,
+                                const char* expected = nullptr)
     {
-        std::vector<std::string> line = {"--json"};
-        line.insert(line.end(), arguments.begin(), arguments.end());
-        const Outcome run = ann(line);
-        EXPECT_EQ(run.status, 0) << arguments[0] << " " << arguments[1] << ": " << run.err;
-        return nlohmann::ordered_json::parse(run.out, nullptr, false);
+        arguments.insert(arguments.begin(), "--json");
+        const Outcome outcome = ann(arguments);
+        EXPECT_EQ(outcome.status, 0) << command << ": " << outcome.err;
+        nlohmann::ordered_json& answer = answers[command] = nlohmann::ordered_json::parse(outcome.out, nullptr, false);
+        // Nothing on standard error (no progress bar off a terminal) but the ID of a job run.
+        const std::string id = command == "job run" ? std::to_string(answer.value("job", 0u)) : "";
+        EXPECT_EQ(outcome.err, id.empty() ? "" : "job " + id + " submitted\n") << command;
+        if (expected)
+            EXPECT_TRUE(holds(answer, nlohmann::json::parse(expected))) << command << ": " << answer.dump();
+        return answer;
     }
+
+    std::map<std::string, nlohmann::ordered_json> answers;
 };
 
-TEST_F(JsonSchema, EveryCommandAnswersWithTheDocumentedKeys)
+// In order: what a command needs was made by an earlier one.
+TEST_F(JsonSchema, EveryCommandAnswersWithTheDocumentedKeysAndTheServersValues)
 {
-    std::ofstream(local("roads.zlw")) << "#!/bin/sh\n# @title Roads\n"
-                                         "# @parameter MODE | CHOICE | fast | How | SINGLECHOICE_CONFIG | fast%slow\n"
-                                         "# @source CSV | roads | /data/roads.csv\n# @featuretype road | A road\n"
-                                         "# @destination GPKG | out | out.gpkg\n# @featuretype line\necho done\n";
+    std::ofstream(local("roads.zlw"))
+        << "#!/bin/sh\n# @title Roads\n"
+           "# @parameter MODE | CHOICE | fast | How | SINGLECHOICE_CONFIG | fast%slow\n"
+           "# @source CSV | roads | /data/roads.csv\n# @featuretype road | A road\n"
+           "# @destination GPKG | out | out.gpkg\n# @featuretype line\necho \"Hello $MODE\"\n";
     std::ofstream(local("a.txt")) << "some text";
-    // In order: what a command needs was made by an earlier one.
-    std::map<std::string, nlohmann::ordered_json> answers;
-    auto run = [&](const std::string& command, const std::vector<std::string>& arguments) {
-        return answers[command] = answer(arguments);
-    };
     auto jobOf = [](const nlohmann::ordered_json& answer) { return std::to_string(answer.value("job", 0u)); };
-    run("ping", {"ping"});
-    run("whoami", {"whoami"});
-    run("prop", {"prop", "USER_NAME"});
-    run("repo create", {"repo", "create", "demo"});
-    run("item put", {"item", "put", "demo", local("roads.zlw")});
-    run("repo list", {"repo", "list"});
-    run("repo show", {"repo", "show", "demo"});
-    run("item list", {"item", "list", "demo"});
-    run("item get", {"item", "get", "demo", "roads.zlw", "-o", local("back.zlw")});
-    run("resource put", {"resource", "put", "demo", "roads.zlw", local("a.txt")});
-    run("resource list", {"resource", "list", "demo", "roads.zlw"});
-    run("resource get", {"resource", "get", "demo", "roads.zlw", "a.txt", "-o", local("back.txt")});
-    run("resource rm", {"resource", "rm", "demo", "roads.zlw", "a.txt"});
-    run("workspace list", {"workspace", "list", "demo"});
-    run("workspace show", {"workspace", "show", "demo", "roads.zlw"});
-    const std::string job = jobOf(run("job submit", {"job", "submit", "zeljob", "demo", "roads.zlw"}));
-    run("job wait", {"job", "wait", job});
-    run("job result", {"job", "result", job});
-    run("job log", {"job", "log", job});
-    run("job log -o", {"job", "log", job, "-o", local("job.log")});
-    run("job run", {"job", "run", "zeljob", "demo", "roads.zlw"});
-    run("job abort",
-        {"job", "abort", jobOf(run("job schedule", {"job", "schedule", "3600", "zeljob", "demo", "roads.zlw"}))});
-    run("service create", {"service", "create", "svc", "--workspace-registration", "true"});
-    run("service update", {"service", "update", "svc", "--description", "changed"});
-    run("service register", {"service", "register", "svc", "demo", "roads.zlw"});
-    run("service list", {"service", "list"});
-    run("service show", {"service", "show", "svc"});
-    run("service deregister", {"service", "deregister", "svc", "demo", "roads.zlw"});
-    run("service delete", {"service", "delete", "svc"});
-    run("token set", {"token", "set", "bob"});
-    run("token show", {"token", "show", "bob"});
-    run("token expired", {"token", "expired", "bob"});
-    run("token rm", {"token", "rm", "bob"});
-    run("sr list", {"sr", "list"});
-    run("sr mkdir", {"sr", "mkdir", "DATA", "/in"});
-    run("sr put", {"sr", "put", "DATA", local("a.txt"), "/in/a.txt"});
-    run("sr cp", {"sr", "cp", "DATA", "/in/a.txt", "/in/b.txt"});
-    run("sr mv", {"sr", "mv", "DATA", "/in/b.txt", "/c.txt"});
-    run("sr ls", {"sr", "ls", "DATA", "/in"});
-    run("sr stat", {"sr", "stat", "DATA", "/c.txt"});
-    run("sr get", {"sr", "get", "DATA", "/c.txt", "-o", local("c.txt")});
-    run("sr rm", {"sr", "rm", "DATA", "/c.txt"});
-    run("item rm", {"item", "rm", "demo", "roads.zlw"});
-    run("repo delete", {"repo", "delete", "demo"});
+    run("ping", {"ping"}, R"({"host":"127.0.0.1","up":true})");
+    run("whoami", {"whoami"}, R"({"account":"ann","authenticated":true,"roles":["admin"]})");
+    run("prop", {"prop", "USER_NAME"}, R"({"property":"USER_NAME","value":"ann"})");
+    run("repo create", {"repo", "create", "demo", "--description", "Demo items"}, R"({"done":"created"})");
+    run("item put", {"item", "put", "demo", local("roads.zlw")}, R"({"done":"added","item":"roads.zlw"})");
+    run("repo list", {"repo", "list"}, R"([{"repository":"demo","description":"Demo items"}])");
+    run("repo show", {"repo", "show", "demo"}, R"({"repository":"demo","description":"Demo items"})");
+    run("item list", {"item", "list", "demo"}, R"([{"item":"roads.zlw","type":"workspace","title":"Roads"}])");
+    run("item get", {"item", "get", "demo", "roads.zlw", "-o", local("back.zlw")}, R"({"done":"downloaded"})");
+    run("resource put", {"resource", "put", "demo", "roads.zlw", local("a.txt")}, R"({"resource":"a.txt"})");
+    run("resource list", {"resource", "list", "demo", "roads.zlw"}, R"([{"resource":"a.txt","size":9}])");
+    run("resource get", {"resource", "get", "demo", "roads.zlw", "a.txt", "-o", local("back.txt")},
+        R"({"done":"downloaded"})");
+    run("resource rm", {"resource", "rm", "demo", "roads.zlw", "a.txt"}, R"({"done":"removed"})");
+    run("workspace list", {"workspace", "list", "demo", "--filter", "enabled"}, R"([{"enabled":true}])");
+    run("workspace show", {"workspace", "show", "demo", "roads.zlw"},
+        R"({"title":"Roads","parameters":[{"name":"MODE","type":"CHOICE","default":"fast","choices":["fast","slow"]}]})");
+    const std::string job = jobOf(
+        run("job submit", {"job", "submit", "zeljob", "demo", "roads.zlw", "-p", "MODE=slow", "-d", "PRIORITY=50"}));
+    run("job wait", {"job", "wait", job}, R"({"status":"SUCCESS","success":true})");
+    run("job result", {"job", "result", job}, R"({"status":"SUCCESS"})");
+    EXPECT_NE(run("job log", {"job", "log", job})["log"].get<std::string>().find("Hello slow"), std::string::npos);
+    run("job log -o", {"job", "log", job, "-o", local("job.log")}, R"({"done":"downloaded"})");
+    run("job run", {"job", "run", "zeljob", "demo", "roads.zlw"}, R"({"status":"SUCCESS","success":true})");
+    const std::string later = jobOf(run("job schedule", {"job", "schedule", "3600", "zeljob", "demo", "roads.zlw"}));
+    run("job abort", {"job", "abort", later}, R"({"done":"aborted"})");
+    run("service create", {"service", "create", "svc", "--display-name", "Service", "--workspace-registration", "true"},
+        R"({"done":"created"})");
+    run("service update", {"service", "update", "svc", "--description", "changed", "--enabled", "false"},
+        R"({"done":"updated"})");
+    run("service register", {"service", "register", "svc", "demo", "roads.zlw"}, R"({"done":"registered"})");
+    run("service list", {"service", "list", "--filter", "disabled"}, R"([{"service":"svc"}])");
+    run("service show", {"service", "show", "svc"},
+        R"({"display_name":"Service","description":"changed","enabled":false,"workspace_registration":true,)"
+        R"("registered":[{"repository":"demo","item":"roads.zlw"}]})");
+    run("service deregister", {"service", "deregister", "svc", "demo", "roads.zlw"}, R"({"done":"deregistered"})");
+    run("service delete", {"service", "delete", "svc"}, R"({"done":"deleted"})");
+    run("token set", {"token", "set", "bob", "token-of-bob", "--expires-after", "3600"}, R"({"done":"added"})");
+    run("token show", {"token", "show", "bob"}, R"({"token":"token-of-bob","expires_after":3600})");
+    run("token expired", {"token", "expired", "bob"}, R"({"expired":false})");
+    run("token rm", {"token", "rm", "bob"}, R"({"done":"removed"})");
+    run("sr list", {"sr", "list"}, R"([{"shared_resource":"DATA"}])");
+    run("sr mkdir", {"sr", "mkdir", "DATA", "/in"}, R"({"done":"created"})");
+    run("sr put", {"sr", "put", "DATA", local("a.txt"), "/in/a.txt"}, R"({"done":"uploaded"})");
+    run("sr cp", {"sr", "cp", "DATA", "/in/a.txt", "/in/b.txt"}, R"({"done":"copied"})");
+    run("sr mv", {"sr", "mv", "DATA", "in/b.txt", "/c.txt"}, R"({"done":"moved"})");
+    run("sr ls", {"sr", "ls", "DATA", "/in"}, R"([{"name":"a.txt","type":"file","size":9}])");
+    run("sr stat", {"sr", "stat", "DATA", "/in"}, R"({"type":"dir"})");
+    run("sr get", {"sr", "get", "DATA", "/c.txt", "-o", local("c.txt")}, R"({"done":"downloaded"})");
+    run("sr rm", {"sr", "rm", "DATA", "/c.txt"}, R"({"done":"removed"})");
+    run("item rm", {"item", "rm", "demo", "roads.zlw"}, R"({"done":"removed"})");
+    run("repo delete", {"repo", "delete", "demo"}, R"({"done":"deleted"})");
+    for (const auto& [file, content] : {std::pair{"back.txt", "some text"}, {"c.txt", "some text"}})
+        EXPECT_EQ(readFile(local(file)), content) << file;
+    EXPECT_EQ(readFile(local("back.zlw")), readFile(local("roads.zlw")));
 
     const std::vector<Documented> documented = documentedKeys();
     ASSERT_GT(documented.size(), answers.size()) << "the table of docs/zelctl.md was not found";

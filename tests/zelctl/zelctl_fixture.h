@@ -81,27 +81,10 @@ protected:
         return run;
     }
 
-    Outcome as(const std::string& user, const std::string& password, std::vector<std::string> arguments)
+    Outcome ann(std::vector<std::string> arguments)
     {
-        arguments.insert(arguments.begin(), {"--user", user, "--password", password});
+        arguments.insert(arguments.begin(), {"--user", "ann", "--password", "pw-ann"});
         return raw(arguments);
-    }
-
-    Outcome ann(const std::vector<std::string>& arguments) { return as("ann", "pw-ann", arguments); }
-
-    // Runs and expects success with nothing on standard error.
-    nlohmann::json annJson(std::vector<std::string> arguments)
-    {
-        arguments.insert(arguments.begin(), "--json");
-        const Outcome run = ann(arguments);
-        EXPECT_EQ(run.status, 0) << run.err;
-        EXPECT_EQ(run.err, "");
-        try {
-            return run.json();
-        } catch (const std::exception&) {
-            ADD_FAILURE() << "not JSON: " << run.out;
-            return {};
-        }
     }
 
     std::unique_ptr<LocalServer> server;
