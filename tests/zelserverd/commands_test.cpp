@@ -111,8 +111,8 @@ TEST_F(Commands, RepositoriesItemsAndResources)
                                            : addResource(u.item, u.resource, "a,b,c\n", u.keyword);
         EXPECT_EQ(got.body, u.reply) << u.keyword << " " << u.item;
     }
-    WireReply crc = admin_->upload("REP_ADD_ITEM", repo({{"itemName", "c.zds"}, {"itemFileCRCCheckingEnabled", "true"}}),
-                                   "content", 12345u);
+    WireReply crc = admin_->upload(
+        "REP_ADD_ITEM", repo({{"itemName", "c.zds"}, {"itemFileCRCCheckingEnabled", "true"}}), "content", 12345u);
     EXPECT_EQ(crc.body.rfind("CRC mismatch", 0), 0u) << crc.body;
 
     const std::string repository = R"(<REPOSITORY name="REPO" description="Test repository"/>)";
@@ -126,7 +126,8 @@ TEST_F(Commands, RepositoriesItemsAndResources)
         {"admin", "REP_GET_REPOSITORY", repo({}), reply("REP_GET_REPOSITORY", repository)},
         {"admin", "REP_GET_REPOSITORY", {{"repositoryName", "NOPE"}}, reply("REP_GET_REPOSITORY")},
         {"admin", "REP_ADD_REPOSITORY", add("REPO"), "repository 'REPO' already exists"},
-        {"admin", "REP_ADD_REPOSITORY", add("a/b"), "repository name 'a/b' holds the character '/', one of \\/:*?\"<>|&='+%"},
+        {"admin", "REP_ADD_REPOSITORY", add("a/b"),
+         "repository name 'a/b' holds the character '/', one of \\/:*?\"<>|&='+%"},
         {"admin", "REP_ADD_REPOSITORY", add(""), "repository name is empty"},
         {"admin", "REP_ADD_REPOSITORY", {{"repositoryObject", "<X/>"}}, "repositoryObject holds no REPOSITORY element"},
         {"ann", "REP_REMOVE_REPOSITORY", repo({}), "Authorization Error: user 'ann' may not run REP_REMOVE_REPOSITORY"},
@@ -142,7 +143,8 @@ TEST_F(Commands, RepositoriesItemsAndResources)
         {"admin", "REP_ITEMRESOURCEEXISTS", repo({{"itemName", "roads.zlw"}}), "missing value \"resourceName\""},
         {"admin", "REP_GET_ITEMRESOURCEVIEW", lookup, reply("REP_GET_ITEMRESOURCEVIEW", resource)},
         {"admin", "REP_GET_ITEMRESOURCEVIEW", repo({{"itemName", "roads.zlw"}}), reply("REP_GET_ITEMRESOURCEVIEW")},
-        {"admin", "REP_GET_ITEMRESOURCESVIEW", repo({{"itemName", "roads.zlw"}}), reply("REP_GET_ITEMRESOURCESVIEW", resource)},
+        {"admin", "REP_GET_ITEMRESOURCESVIEW", repo({{"itemName", "roads.zlw"}}),
+         reply("REP_GET_ITEMRESOURCESVIEW", resource)},
     });
     EXPECT_EQ(storedFiles(), 2u) << "the replaced resource's content is gone";
     converse({{"admin", "REP_REMOVE_ITEM", repo({{"itemName", "roads.zlw"}}), "true"}});
@@ -191,7 +193,8 @@ TEST_F(Commands, ViewsByKindServicesRegistrationsAndProperties)
          "bad enableFilter 'enabled' (All, Enabled or Disabled)"},
         {"admin", "REP_GET_WORKSPACEVIEW", repo({{"workspaceName", "nope.zlw"}}), reply("REP_GET_WORKSPACEVIEW")},
         {"admin", "REP_GET_CUSTOMFORMATSVIEW", repo({}), reply("REP_GET_CUSTOMFORMATSVIEW", format)},
-        {"admin", "REP_GET_CUSTOMFORMATVIEW", repo({{"customFormatName", "fmt.zds"}}), reply("REP_GET_CUSTOMFORMATVIEW", format)},
+        {"admin", "REP_GET_CUSTOMFORMATVIEW", repo({{"customFormatName", "fmt.zds"}}),
+         reply("REP_GET_CUSTOMFORMATVIEW", format)},
         {"admin", "REP_GET_CUSTOMTRANSFORMERSVIEW", repo({}), reply("REP_GET_CUSTOMTRANSFORMERSVIEW", transformer)},
         {"admin", "REP_GET_TEMPLATEVIEW", repo({{"templateName", "t.zlwt"}}), reply("REP_GET_TEMPLATEVIEW", page)},
         // An item of another kind is not found under a view.
@@ -202,23 +205,30 @@ TEST_F(Commands, ViewsByKindServicesRegistrationsAndProperties)
         {"admin", "REP_UPDATE_SERVICE", {{"serviceObject", service("zz", true, true)}}, "unknown service 'zz'"},
         {"admin", "REP_UPDATE_SERVICE", {{"serviceObject", service("run", true, true)}}, "true"},
         {"admin", "REP_GET_SERVICES", {{"enableFilter", "Enabled"}}, reply("REP_GET_SERVICES", run)},
-        {"ann", "REP_ADD_SERVICE", {{"serviceObject", service("x", 1, 1)}},
+        {"ann",
+         "REP_ADD_SERVICE",
+         {{"serviceObject", service("x", 1, 1)}},
          "Authorization Error: user 'ann' may not run REP_ADD_SERVICE"},
         {"admin", "REP_REGISTER_WORKSPACESERVICE", reg("run", "workspaceName", "roads.zlw"), "true"},
         {"admin", "REP_REGISTER_WORKSPACESERVICE", reg("run", "workspaceName", "roads.zlw"),
          "'REPO/roads.zlw' is already registered with 'run'"},
-        {"admin", "REP_REGISTER_WORKSPACESERVICE", reg("run", "workspaceName", "t.zlwt"), "'t.zlwt' is not a workspace"},
+        {"admin", "REP_REGISTER_WORKSPACESERVICE", reg("run", "workspaceName", "t.zlwt"),
+         "'t.zlwt' is not a workspace"},
         {"admin", "REP_REGISTERITEM", reg("run", "itemName", "t.zlwt"), "true"},
         {"admin", "REP_REGISTERITEM", reg("off", "itemName", "fmt.zds"),
          "service 'off' does not accept items of kind CUSTOMFORMAT ('fmt.zds')"},
         {"admin", "REP_REGISTERITEM", reg("nope", "itemName", "t.zlwt"), "unknown service 'nope'"},
         {"admin", "REP_REGISTERITEM", reg("run", "itemName", "none"), "unknown item 'none' in 'REPO'"},
-        {"admin", "REP_GET_REGISTEREDITEMS", {{"serviceName", "run"}, {"itemType", "4"}},
+        {"admin",
+         "REP_GET_REGISTEREDITEMS",
+         {{"serviceName", "run"}, {"itemType", "4"}},
          reply("REP_GET_REGISTEREDITEMS", R"(<ITEM name="t.zlwt" repository_name="REPO" title="T" description="" )"
                                           R"(filesize="11" category="" requirements="" requirementskeyword="" )"
                                           R"(usage="" history="" lastsavedate="TIME" lastsavebuild="zelserverd )"
                                           R"(0.1.0" buildnumber="0" legaltermsconditions=""/>)")},
-        {"admin", "REP_GET_REGISTEREDITEMS", {{"serviceName", "run"}, {"itemType", "9"}},
+        {"admin",
+         "REP_GET_REGISTEREDITEMS",
+         {{"serviceName", "run"}, {"itemType", "9"}},
          "bad itemType '9' (0 to 4, or WORKSPACE, CUSTOMFORMAT, CUSTOMTRANSFORMER, TEMPLATE, OTHER)"},
         {"admin", "REP_GET_WORKSPACESERVICES", repo({{"enableFilter", "Enabled"}, {"workspaceName", "roads.zlw"}}),
          reply("REP_GET_WORKSPACESERVICES", "<WORKSPACE_SERVICE>" + on + run + "</WORKSPACE_SERVICE>")},
@@ -232,10 +242,14 @@ TEST_F(Commands, ViewsByKindServicesRegistrationsAndProperties)
         {"admin", "REP_UPDATE_FEATURETYPEPROPERTYACCESSOR", accessor("featureTypeID", "1.1.1"), "true"},
         {"admin", "REP_UPDATE_FEATURETYPEPROPERTYACCESSOR", accessor("featureTypeID", "1.1.2"),
          "unknown featuretype '1.1.2'"},
-        {"admin", "REP_GET_SERVICE", {{"serviceName", "run"}},
+        {"admin",
+         "REP_GET_SERVICE",
+         {{"serviceName", "run"}},
          reply("REP_GET_SERVICE", run.substr(0, run.size() - 2) + ">" + property("serviceID", "1") + "</SERVICE>")},
         // An update replaces the whole set of its owner.
-        {"admin", "REP_UPDATE_SERVICEPROPERTYACCESSOR", {{"serviceID", "1"}, {"propertyAccessorObject", "<EMPTY/>"}},
+        {"admin",
+         "REP_UPDATE_SERVICEPROPERTYACCESSOR",
+         {{"serviceID", "1"}, {"propertyAccessorObject", "<EMPTY/>"}},
          "true"},
         {"admin", "REP_GET_SERVICE", {{"serviceName", "run"}}, reply("REP_GET_SERVICE", run)},
         {"admin", "REP_DEREGISTER_WORKSPACESERVICE", reg("run", "workspaceName", "roads.zlw"), "true"},
@@ -330,17 +344,23 @@ TEST_F(Commands, SessionsRightsAndTokens)
         {"ann", "SERVER_SESSION_GET_PROP", prop("COLOUR"), "unknown session property \"COLOUR\""},
         {"ann", "SERVER_SESSION_GET_PROP", {}, "missing value \"sessionPropName\""},
         {"admin", "NO_SUCH_COMMAND", {}, "unknown command \"NO_SUCH_COMMAND\""},
-        {"vic", "SR_MAKE", {{"identityObject", forged}, {"srName", "AREA"}, {"srPath", pathDocument("x")}},
+        {"vic",
+         "SR_MAKE",
+         {{"identityObject", forged}, {"srName", "AREA"}, {"srPath", pathDocument("x")}},
          "Authorization Error: user 'vic' may not run SR_MAKE"},
         // A custom role grants its rights and nothing else.
         {"aud", "SR_EXISTS", {{"srName", "AREA"}, {"srPath", pathDocument("x")}}, "false"},
-        {"aud", "SEC_USERTOKEN_EXISTS", of("aud"), "Authorization Error: user 'aud' may not manage the user token of 'aud'"},
-        {"ann", "SEC_USERTOKEN_EXISTS", of("vic"), "Authorization Error: user 'ann' may not manage the user token of 'vic'"},
+        {"aud", "SEC_USERTOKEN_EXISTS", of("aud"),
+         "Authorization Error: user 'aud' may not manage the user token of 'aud'"},
+        {"ann", "SEC_USERTOKEN_EXISTS", of("vic"),
+         "Authorization Error: user 'ann' may not manage the user token of 'vic'"},
         {"ann", "SEC_GET_USERTOKEN", of("ann"), reply("SEC_GET_USERTOKEN")},
         {"ann", "SEC_USERTOKEN_EXPIRED", of("ann"), "account 'ann' has no user token"},
-        {"ann", "SEC_ADD_USERTOKEN", of("ann", "not xml"), "\"userTokenObject\" holds no USERTOKEN element: malformed XML: No document element found"},
+        {"ann", "SEC_ADD_USERTOKEN", of("ann", "not xml"),
+         "\"userTokenObject\" holds no USERTOKEN element: malformed XML: No document element found"},
         {"ann", "SEC_ADD_USERTOKEN", of("ann", "<X><OTHER/></X>"), "\"userTokenObject\" holds no USERTOKEN element"},
-        {"ann", "SEC_ADD_USERTOKEN", of("ann", token("t", "soon")), "expirationtimeout 'soon' is not a number of seconds"},
+        {"ann", "SEC_ADD_USERTOKEN", of("ann", token("t", "soon")),
+         "expirationtimeout 'soon' is not a number of seconds"},
         {"ann", "SEC_ADD_USERTOKEN", of("ann"), "missing value \"userTokenObject\""},
         {"ann", "SEC_ADD_USERTOKEN", of("ann", token("abc", "3600", "localhost")), "true"},
         {"ann", "SEC_USERTOKEN_EXPIRED", of("ann"), "false"},
