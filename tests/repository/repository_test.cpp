@@ -1,142 +1,444 @@
-// Repository operations on the wire: every command family byte for byte, the argument checks and
-// their deliberate exceptions, uploads, the item download through a temporary file, the resource
-// download straight into its destination, and the view filters.
+// The repository manager, a repository and a service on the wire: every command byte for byte, the
+// out values after answers, refusals and failures, the view filters, the file transfers, and the
+// argument checks that run before anything is sent.
 
-#include <filesystem>
 #include <functional>
-#include <optional>
 #include <string>
 #include <vector>
 
 #include <gtest/gtest.h>
 
 #include "api/ZELServerString.h"
+#include "api/ZELServerStringArray.h"
 #include "api/ZELServerVector.h"
 #include "api/message_numbers.h"
+#include "repository/ZELServerPropertyAccessor.h"
 #include "repository/ZELServerRepository.h"
+#include "repository/ZELServerRepositoryManager.h"
 #include "repository/ZELServerService.h"
 #include "repository/ZELServerWorkspace.h"
+#include "repository/reply_readers.h"
 #include "repository/repository_objects.h"
-#include "repository_fixture.h"
-#include "support/platform.h"
+#include "support/environment.h"
+#include "support/wire_table.h"
 
-namespace zel::repotest {
-namespace {
-
-namespace fs = std::filesystem;
 using namespace std::string_literals;
+using namespace zeltest;
+
+namespace zel {
+namespace {
 
 const std::string kForbidden = "\\/:*?\"<>|&='+%";
 
-class RepositoryTest : public RepositoryWireTest {
+ZELServerString S(const std::string& text) { return ZELServerString(text); }
+
+ZELServerStringDict dict(const std::vector<std::pair<std::string, std::string>>& pairs)
+{
+    ZELServerStringDict made;
+    for (const auto& [key, value] : pairs) {
+        made.insert(key, value);
+    }
+    return made;
+}
+
+template <class I>
+std::string names(IZELServerVector<I>& vector)
+{
+    return joined(vector.entries(), [&](unsigned i) {
+        ZELServerString name;
+        vector.element(i)->getName(name);
+        return name.str();
+    });
+}
+
+class RepositoryWire : public WireTableTest {
 protected:
-    // A command of this repository: its name first, then the command's own values.
-    static Bytes repoCommand(const std::string& keyword, zeltest::Values values = {})
+    // A command of the repository "Samples": its name first, then the command's own values.
+    static Bytes on(const std::string& keyword, Values values = {})
     {
         values.insert(values.begin(), {"repositoryName", "Samples"});
         return command(keyword, values);
     }
+    static Bytes ok(const std::string& body) { return reply("SUCCESS", body); }
+    // The accessor document of an update command holding the one property the tests set.
+    static Bytes accessorUpdate(const std::string& keyword, const char* idName, const char* id)
+    {
+        return command(keyword, {{idName, id},
+                                 {"propertyAccessorObject",
+                                  xmlDocument(keyword, R"(<PROPERTY category="run" name="priority" value="high"/>)")}});
+    }
+    unsigned& fresh()
+    {
+        flag = 7;
+        return flag;
+    }
+    std::string file(const std::string& name, const std::string& content) const
+    {
+        spew(scratch.path() / name, content);
+        return (scratch.path() / name).string();
+    }
 
+    ZELServerRepositoryManager manager{channel.get()};
     ZELServerRepository repository{channel.get(), S("Samples"), S("sample workspaces")};
+    ZELServerService service{channel.get(), "download", "Data Download", "", "", false, true, false, false, false};
+    unsigned flag = 7;
+    ProgressLog progress;
+    const TempDir scratch{"zel-repo"};
 };
 
-using zeltest::ProgressLog;
-
-// ---- Items ------------------------------------------------------------------------------------------
-
-TEST_F(RepositoryTest, FlagsAreSetOnlyByTheExactTruthValueAndClearedByErrors)
+TEST_F(RepositoryWire, ItemsResourcesAndTheirTransfers)
 {
-    server.exchange(repoCommand("REP_ITEMEXISTS", {{"itemName", "roads.zlw"}}), success("true"))
-        .exchange(repoCommand("REP_REMOVE_ITEM", {{"itemName", "a.zlw"}}), success("True"))
-        .exchange(repoCommand("REP_ITEMRESOURCEEXISTS", {{"itemName", "a.zlw"}, {"resourceName", "r.csv"}}),
-                  zeltest::reply("ERROR", "Authorization Error: no rights"));
-    signIn();
-    unsigned exists = 7;
-    unsigned removed = 7;
-    unsigned resource = 7;
-    EXPECT_EQ(StatusPtr(repository.itemExists(S("roads.zlw"), exists)), nullptr);
-    EXPECT_EQ(exists, 1u);
-    EXPECT_EQ(StatusPtr(repository.removeItem(S("a.zlw"), removed)), nullptr) << "no truth value is no failure";
-    EXPECT_EQ(removed, 0u);
-    const StatusPtr error(repository.itemResourceExists(S("a.zlw"), S("r.csv"), resource));
-    ASSERT_EQ(numberOf(error), msg::kServerError);
-    EXPECT_EQ(error->getCode(), 2u);
-    EXPECT_EQ(resource, 0u);
-    EXPECT_TRUE(server.verify());
+    const std::string item = file("roads.zlw", "workspace bytes\n");
+    const std::string resource = file("up.csv", "0123456789");
+    const std::string missing = (scratch.path() / "missing.zlw").string();
+    const std::string destination = (scratch.path() / "down.zlw").string();
+    const std::string big(200000, 'w');
+    const Values crcOff = {{"itemFileCRCCheckingEnabled", "false"}};
+    const auto resourceOf = [](const char* itemName, const char* resourceName) {
+        return Values{
+            {"itemName", itemName}, {"resourceName", resourceName}, {"resourceFileCRCCheckingEnabled", "false"}};
+    };
+    const auto downloaded = [&] { return slurp(destination).substr(0, 20); };
+    run({
+        {"item exists", on("REP_ITEMEXISTS", {{"itemName", "roads.zlw"}}), ok("true"),
+         [&] { return outcome(repository.itemExists(S("roads.zlw"), fresh()), flag); }, 0, "1 "},
+        {"only the exact truth word is true", on("REP_REMOVE_ITEM", {{"itemName", "a.zlw"}}), ok("True"),
+         [&] { return outcome(repository.removeItem(S("a.zlw"), fresh()), flag); }, 0, "0 "},
+        {"a refusal clears the flag", on("REP_ITEMRESOURCEEXISTS", {{"itemName", "a.zlw"}, {"resourceName", "r"}}),
+         reply("ERROR", "Authorization Error: no rights"),
+         [&] { return outcome(repository.itemResourceExists(S("a.zlw"), S("r"), fresh()), flag); }, msg::kServerError,
+         "0 "},
+        {"resource removed", on("REP_REMOVE_ITEMRESOURCE", {{"itemName", "a.zlw"}, {"resourceName", "r"}}), ok("true"),
+         [&] { return outcome(repository.removeItemResource(S("a.zlw"), S("r"), fresh()), flag); }, 0, "1 "},
+        {"add item", on("REP_ADD_ITEM", {{"itemName", "roads.zlw"}, crcOff[0]}), readyAck(),
+         [&] { return outcome(repository.addItem(S("roads.zlw"), S(item))); }, 0, "",
+         uploadOf("workspace bytes\n", ok("true"))},
+        {"add item checks the name", none, none, [&] { return outcome(repository.addItem(S("dir/a.zlw"), S(item))); },
+         msg::kForbiddenCharacter, ""},
+        {"update item lets any name through", on("REP_UPDATE_ITEM", {{"itemName", "dir/a.zlw"}, crcOff[0]}), readyAck(),
+         [&] { return outcome(repository.updateItem(S("dir/a.zlw"), S(item))); }, 0, "",
+         uploadOf("workspace bytes\n", ok("true"))},
+        {"update item of a missing file", none, none,
+         [&] { return outcome(repository.updateItem(S("roads.zlw"), S(missing))); }, msg::kLocalFileRead, ""},
+        {"add resource", on("REP_ADD_ITEMRESOURCE", resourceOf("a.zlw", "up.csv")), readyAck(),
+         [&] {
+             return outcome(repository.addItemResource(S("a.zlw"), S("up.csv"), S(resource), &progress), [&] {
+                 return joined(progress.calls.size(), [&](std::size_t i) { return progress.calls[i]; });
+             });
+         },
+         0, "total 10,start,at 0,finish, ", uploadOf("0123456789", ok("true"))},
+        {"update resource", on("REP_UPDATE_ITEMRESOURCE", resourceOf("roads.zlw", "codes.csv")), readyAck(),
+         [&] { return outcome(repository.updateItemResource(S("roads.zlw"), S("codes.csv"), S(resource))); }, 0, "",
+         uploadOf("0123456789", ok("true"))},
+        {"a resource named as its item", none, none,
+         [&] { return outcome(repository.addItemResource(S("a.zlw"), S("a.zlw"), S(missing))); },
+         msg::kResourceNamedAsItem, ""},
+        {"replacing a resource named as its item", none, none,
+         [&] { return outcome(repository.updateItemResource(S("a.zlw"), S("a.zlw"), S(missing))); },
+         msg::kResourceNamedAsItem, ""},
+        {"the character check comes first", none, none,
+         [&] { return outcome(repository.addItemResource(S("a%"), S("a%"), S(missing))); }, msg::kForbiddenCharacter,
+         ""},
+        {"names differing in case differ", none, none,
+         [&] { return outcome(repository.addItemResource(S("a.zlw"), S("A.zlw"), S(missing))); }, msg::kLocalFileRead,
+         ""},
+        {"get resource", on("REP_GET_ITEMRESOURCE", resourceOf("a.zlw", "up.csv")), fileHeader(0, crc32("")),
+         [&] { return outcome(repository.getItemResource(S("a.zlw"), S("up.csv"), S(destination), fresh()), flag); }, 0,
+         "1 ", downloadOf("", ok("true"))},
+        {"get resource into a missing folder", none, none,
+         [&] { return outcome(repository.getItemResource(S("a"), S("r"), S(missing + "/no/r"), fresh()), flag); },
+         msg::kLocalFileWrite, "0 "},
+        {"get item", on("REP_GET_ITEM", {{"itemName", "roads.zlw"}, crcOff[0]}), fileHeader(big.size(), crc32(big)),
+         [&] { return outcome(repository.getItem(S("roads.zlw"), S(destination), fresh()), flag, downloaded); }, 0,
+         "1 wwwwwwwwwwwwwwwwwwww ", downloadOf(big, ok("true"))},
+        {"an empty item is no item", on("REP_GET_ITEM", {{"itemName", "roads.zlw"}, crcOff[0]}),
+         fileHeader(0, crc32("")),
+         [&] { return outcome(repository.getItem(S("roads.zlw"), S(destination), fresh()), flag, downloaded); },
+         msg::kEmptyDownload, "0 wwwwwwwwwwwwwwwwwwww ", downloadOf("", ok("true"))},
+        {"get item into a missing folder", none, none,
+         [&] { return outcome(repository.getItem(S("roads.zlw"), S(missing + "/no/a.zlw"), fresh()), flag); },
+         msg::kLocalFileWrite, "0 "},
+    });
 }
 
-TEST_F(RepositoryTest, UploadsAndDownloadsTurnCrcCheckingOffAndReportProgress)
+TEST_F(RepositoryWire, ViewsFiltersAndRegistrations)
 {
-    const std::string item = "workspace bytes\n";
-    const std::string resource = "0123456789";
-    const std::string destination = (dir / "down.csv").string();
-    expectUpload(repoCommand("REP_ADD_ITEM", {{"itemName", "roads.zlw"}, {"itemFileCRCCheckingEnabled", "false"}}),
-                 item);
-    expectUpload(repoCommand("REP_UPDATE_ITEMRESOURCE", {{"itemName", "roads.zlw"},
-                                                         {"resourceName", "codes.csv"},
-                                                         {"resourceFileCRCCheckingEnabled", "false"}}),
-                 resource);
-    expectUpload(
-        repoCommand("REP_ADD_ITEMRESOURCE",
-                    {{"itemName", "a.zlw"}, {"resourceName", "up.csv"}, {"resourceFileCRCCheckingEnabled", "false"}}),
-        resource);
-    // updateItem deliberately sends an item name that addItem refuses.
-    expectUpload(
-        repoCommand("REP_UPDATE_ITEM", {{"itemName", "dir/roads.zlw"}, {"itemFileCRCCheckingEnabled", "false"}}), item);
-    // The resource is read back straight into its destination.
-    expectDownload(
-        repoCommand("REP_GET_ITEMRESOURCE",
-                    {{"itemName", "a.zlw"}, {"resourceName", "up.csv"}, {"resourceFileCRCCheckingEnabled", "false"}}),
-        resource, success("true"));
-    signIn();
-    const std::string itemFile = file("roads.zlw", item);
-    EXPECT_EQ(StatusPtr(repository.addItem(S("roads.zlw"), S(itemFile))), nullptr);
-    const std::string source = file("up.csv", resource);
-    EXPECT_EQ(StatusPtr(repository.updateItemResource(S("roads.zlw"), S("codes.csv"), S(source))), nullptr);
-    ProgressLog up;
-    EXPECT_EQ(StatusPtr(repository.addItemResource(S("a.zlw"), S("up.csv"), S(source), &up)), nullptr);
-    EXPECT_EQ(up.calls, (std::vector<std::string>{"total 10", "start", "at 0", "finish"}));
-    EXPECT_EQ(numberOf(StatusPtr(repository.addItem(S("dir/roads.zlw"), S(itemFile)))), msg::kForbiddenCharacter);
-    const StatusPtr slash(repository.updateItem(S("dir/roads.zlw"), S(itemFile)));
-    EXPECT_EQ(slash, nullptr) << describe(slash.get());
-    ProgressLog down;
-    unsigned received = 7;
-    EXPECT_EQ(StatusPtr(repository.getItemResource(S("a.zlw"), S("up.csv"), S(destination), received, &down)), nullptr);
-    EXPECT_EQ(received, 1u);
-    EXPECT_EQ(down.calls, (std::vector<std::string>{"total 10", "start", "at 0", "finish"}));
-    EXPECT_EQ(slurp(destination), resource);
-    EXPECT_TRUE(server.verify());
+    ZELServerVector<IZELServerWorkspaceSummary, ZELServerWorkspaceSummary> summaries;
+    ZELServerVector<IZELServerWorkspace, ZELServerWorkspace> workspaces;
+    ZELServerVector<IZELServerCustomFormat, ZELServerCustomFormat> formats;
+    ZELServerVector<IZELServerCustomTransformer, ZELServerCustomTransformer> transformers;
+    ZELServerVector<IZELServerTemplate, ZELServerTemplate> templates;
+    ZELServerVector<IZELServerResource, ZELServerResource> resources;
+    ZELServerVector<IZELServerWorkspaceService, ZELServerWorkspaceService> registrations;
+    ZELServerWorkspace workspace(nullptr);
+    ZELServerCustomFormat format;
+    ZELServerCustomTransformer transformer;
+    ZELServerTemplate templ;
+    ZELServerResource resource;
+    const ZELServerStringDict disabled = dict({{"ENABLE_FILTER", "DISABLED"}});
+    const auto summariesWith = [&](const ZELServerStringDict* filter) {
+        return [&, filter] {
+            return outcome(repository.getWorkspaceSummariesView(filter, summaries), [&] { return names(summaries); });
+        };
+    };
+    const Bytes twoSummaries = ok(R"(<R><WORKSPACE_SUMMARY name="s1"/><WORKSPACE_SUMMARY name="s2"/></R>)");
+    const ZELServerStringDict all = dict({{"ENABLE_FILTER", "ALL"}});
+    const ZELServerStringDict enabled = dict({{"ENABLE_FILTER", "ENABLED"}});
+    const ZELServerStringDict onlyWorkspace = dict({{"WORKSPACE_NAME", "roads.zlw"}});
+    const ZELServerStringDict disabledOf = dict({{"ENABLE_FILTER", "DISABLED"}, {"WORKSPACE_NAME", "w"}});
+    const auto registrationText = [&] {
+        ZELServerString name;
+        registrations.element(0)->getService().getName(name);
+        return name.str() + " " + std::to_string(registrations.element(0)->getWorkspaceSummary().isEnabled());
+    };
+    run({
+        {"no filter asks for all", on("REP_GET_WORKSPACESUMMARIESVIEW", {{"enableFilter", "All"}}), twoSummaries,
+         summariesWith(nullptr), 0, "s1,s2, "},
+        {"ALL", on("REP_GET_WORKSPACESUMMARIESVIEW", {{"enableFilter", "All"}}), twoSummaries, summariesWith(&all), 0,
+         "s1,s2, "},
+        {"ENABLED", on("REP_GET_WORKSPACESUMMARIESVIEW", {{"enableFilter", "Enabled"}}), twoSummaries,
+         summariesWith(&enabled), 0, "s1,s2, "},
+        {"DISABLED", on("REP_GET_WORKSPACESVIEW", {{"enableFilter", "Disabled"}}),
+         ok(R"(<R><WORKSPACE_DEFINITIONS name="w"/></R>)"),
+         [&] {
+             return outcome(repository.getWorkspacesView(&disabled, workspaces), [&] { return names(workspaces); });
+         },
+         0, "w, "},
+        {"list views ignore their directives", on("REP_GET_CUSTOMFORMATSVIEW", {{"enableFilter", "All"}}),
+         ok(R"(<R><CUSTOMFORMAT name="f.zds"/></R>)"),
+         [&] { return outcome(repository.getCustomFormatsView(&disabled, formats), [&] { return names(formats); }); },
+         0, "f.zds, "},
+        {"custom transformers", on("REP_GET_CUSTOMTRANSFORMERSVIEW", {{"enableFilter", "All"}}),
+         ok(R"(<R><CUSTOMTRANSFORMER name="t1.zlx"/><CUSTOMTRANSFORMER name="t2.zlx"/></R>)"),
+         [&] {
+             return outcome(repository.getCustomTransformersView(&disabled, transformers),
+                            [&] { return names(transformers); });
+         },
+         0, "t1.zlx,t2.zlx, "},
+        {"templates", on("REP_GET_TEMPLATESVIEW", {{"enableFilter", "All"}}), ok(R"(<R><TEMPLATE name="p"/></R>)"),
+         [&] { return outcome(repository.getTemplatesView(&disabled, templates), [&] { return names(templates); }); },
+         0, "p, "},
+        {"item resources, even of no item",
+         on("REP_GET_ITEMRESOURCESVIEW", {{"itemName", ""}, {"enableFilter", "All"}}),
+         ok(R"(<R><RESOURCE name="r1"/><RESOURCE name="r2"/></R>)"),
+         [&] {
+             return outcome(repository.getItemResourcesView(S(""), &disabled, resources),
+                            [&] { return names(resources); });
+         },
+         0, "r1,r2, "},
+        {"workspace view", on("REP_GET_WORKSPACEVIEW", {{"workspaceName", "roads.zlw"}}),
+         ok(R"(<R><WORKSPACE_DEFINITIONS name="roads.zlw"><DATASET name="A" is_source="true"/></WORKSPACE_DEFINITIONS></R>)"),
+         [&] {
+             return outcome(repository.getWorkspaceView(S("roads.zlw"), workspace, fresh()), flag,
+                            [&] { return names(workspace.getSourceDatasets()); });
+         },
+         0, "1 A, "},
+        {"custom format view", on("REP_GET_CUSTOMFORMATVIEW", {{"customFormatName", "f.zds"}}),
+         ok(R"(<R><CUSTOMFORMAT name="f.zds" filesize="12"/></R>)"),
+         [&] {
+             return outcome(repository.getCustomFormatView(S("f.zds"), format, fresh()), flag,
+                            [&] { return std::to_string(format.getFileSize()); });
+         },
+         0, "1 12 "},
+        {"custom transformer view", on("REP_GET_CUSTOMTRANSFORMERVIEW", {{"customTransformerName", "t.zlx"}}),
+         ok(R"(<R><CUSTOMTRANSFORMER name="t.zlx"/></R>)"),
+         [&] { return outcome(repository.getCustomTransformerView(S("t.zlx"), transformer, fresh()), flag); }, 0, "1 "},
+        {"resource view", on("REP_GET_ITEMRESOURCEVIEW", {{"itemName", "a.zlw"}, {"resourceName", "r.csv"}}),
+         ok(R"(<R><RESOURCE name="r.csv" filesize="5"/></R>)"),
+         [&] {
+             return outcome(repository.getItemResourceView(S("a.zlw"), S("r.csv"), resource, fresh()), flag,
+                            [&] { return std::to_string(resource.getFileSize()); });
+         },
+         0, "1 5 "},
+        {"resource view of no resource", on("REP_GET_ITEMRESOURCEVIEW", {{"itemName", "a.zlw"}, {"resourceName", ""}}),
+         ok("<R/>"),
+         [&] { return outcome(repository.getItemResourceView(S("a.zlw"), S(""), resource, fresh()), flag); }, 0, "0 "},
+        {"template view checks no characters", on("REP_GET_TEMPLATEVIEW", {{"templateName", "t*"}}), ok("<R/>"),
+         [&] { return outcome(repository.getTemplateView(S("t*"), templ, fresh()), flag); }, 0, "0 "},
+        {"registrations of one workspace",
+         on("REP_GET_WORKSPACESERVICES", {{"enableFilter", "All"}, {"workspaceName", "roads.zlw"}}),
+         ok(R"(<R><WORKSPACE_SERVICE><WORKSPACE_SUMMARY name="roads.zlw" is_enabled="true"/>)"
+            R"(<SERVICE name="download"/></WORKSPACE_SERVICE></R>)"),
+         [&] { return outcome(repository.getWorkspaceServices(&onlyWorkspace, registrations), registrationText); }, 0,
+         "download 1 "},
+        {"registrations filtered",
+         on("REP_GET_WORKSPACESERVICES", {{"enableFilter", "Disabled"}, {"workspaceName", "w"}}), ok("<R/>"),
+         [&] {
+             return outcome(repository.getWorkspaceServices(&disabledOf, registrations),
+                            [&] { return std::to_string(registrations.entries()); });
+         },
+         0, "0 "},
+        {"all registrations", on("REP_GET_WORKSPACESERVICES", {{"enableFilter", "All"}}), ok("<R/>"),
+         [&] { return outcome(repository.getWorkspaceServices(nullptr, registrations)); }, 0, ""},
+        {"registration exists checks no characters",
+         on("REP_WORKSPACESERVICEEXISTS", {{"workspaceName", "a/b"}, {"serviceName", "c:d"}}), ok("false"),
+         [&] { return outcome(repository.workspaceServiceExists(S("a/b"), S("c:d"), fresh()), flag); }, 0, "0 "},
+        {"register", on("REP_REGISTER_WORKSPACESERVICE", {{"workspaceName", "w"}, {"serviceName", "download"}}),
+         ok("true"), [&] { return outcome(repository.registerWorkspaceService(S("w"), S("download"))); }, 0, ""},
+        {"deregister", on("REP_DEREGISTER_WORKSPACESERVICE", {{"workspaceName", "w"}, {"serviceName", "download"}}),
+         ok("true"),
+         [&] { return outcome(repository.deregisterWorkspaceService(S("w"), S("download"), fresh()), flag); }, 0, "1 "},
+    });
 }
 
-TEST_F(RepositoryTest, LocalChecksAndFileProblemsAreReportedBeforeAnythingIsSent)
+TEST_F(RepositoryWire, ManagerAndServiceCommands)
 {
-    signIn();
-    const std::string missing = (dir / "missing.zlw").string();
-    const StatusPtr upload(repository.updateItem(S("roads.zlw"), S(missing)));
-    ASSERT_EQ(numberOf(upload), msg::kLocalFileRead);
-    EXPECT_NE(std::string(upload->getMessage()).find(missing), std::string::npos) << upload->getMessage();
-
-    const std::string destination = (dir / "missing" / "codes.csv").string();
-    unsigned received = 7;
-    const StatusPtr download(repository.getItemResource(S("roads.zlw"), S("codes.csv"), S(destination), received));
-    ASSERT_EQ(numberOf(download), msg::kLocalFileWrite);
-    EXPECT_NE(std::string(download->getMessage()).find(destination), std::string::npos) << download->getMessage();
-    EXPECT_EQ(received, 0u);
-
-    // A resource named like its item is refused before the file is opened; the character check comes
-    // first, and names that differ only in case are different names.
-    const ZELServerString noFile = S(missing);
-    EXPECT_EQ(numberOf(StatusPtr(repository.addItemResource(S("a.zlw"), S("a.zlw"), noFile))),
-              msg::kResourceNamedAsItem);
-    EXPECT_EQ(numberOf(StatusPtr(repository.updateItemResource(S("a.zlw"), S("a.zlw"), noFile))),
-              msg::kResourceNamedAsItem);
-    EXPECT_EQ(numberOf(StatusPtr(repository.addItemResource(S("a%"), S("a%"), noFile))), msg::kForbiddenCharacter);
-    EXPECT_EQ(numberOf(StatusPtr(repository.addItemResource(S("a.zlw"), S("A.zlw"), noFile))), msg::kLocalFileRead);
-    EXPECT_TRUE(server.verify());
+    ZELServerVector<IZELServerService, ZELServerService> services;
+    ZELServerVector<IZELServerRepository, ZELServerRepository> repositories;
+    ZELServerVector<IZELServerItem, ZELServerItem> items;
+    ZELServerService found(nullptr);
+    ZELServerRepository made(nullptr);
+    ZELServerPropertyAccessor accessor;
+    accessor.setProperty(S("run"), S("priority"), S("high"));
+    ZELServerWorkspace workspace(nullptr);
+    ASSERT_EQ(readWorkspaceReply(R"(<W><WORKSPACE_DEFINITIONS workspace_id="ws-17"><DATASET dataset_id="d-a" )"
+                                 R"(is_source="true"><FEATURE_TYPE feature_type_id="ft-a1"/></DATASET>)"
+                                 R"(</WORKSPACE_DEFINITIONS></W>)",
+                                 channel.get(), workspace),
+              0);
+    ZELServerService stored(channel.get());
+    ASSERT_EQ(readServiceReply(R"(<S><SERVICE service_id="7" name="download" is_customformat_reg_allowed="true"/></S>)",
+                               channel.get(), stored),
+              0);
+    const ZELServerService unsaved(channel.get(), "download", "Data Download", "Serves & stores", "/dl/{ws}", true,
+                                   true, false, false, true);
+    const std::string added = xmlDocument(
+        "REP_ADD_SERVICE",
+        R"(<SERVICE description="Serves &amp; stores" display_name="Data Download" is_customformat_reg_allowed="false" )"
+        R"(is_customtransform_reg_allowed="false" is_enabled="true" is_template_reg_allowed="true" )"
+        R"(is_workspace_reg_allowed="true" name="download" service_id="-1" url_pattern="/dl/{ws}"/>)");
+    const std::string updated =
+        xmlDocument("REP_ADD_SERVICE", R"(<SERVICE description="" display_name="" is_customformat_reg_allowed="true" )"
+                                       R"(is_customtransform_reg_allowed="false" is_enabled="false" )"
+                                       R"(is_template_reg_allowed="false" is_workspace_reg_allowed="false" )"
+                                       R"(name="download" service_id="7" url_pattern=""/>)");
+    const ZELServerStringDict lowerCase = dict({{"ENABLE_FILTER", "enabled"}, {"GLOBAL", "allitems"}});
+    const ZELServerStringDict allItems = dict({{"GLOBAL", "ALLITEMS"}});
+    const ZELServerStringDict templatesOnly = dict({{"ITEM_TYPE", "4"}, {"item_type", "1"}});
+    const ZELServerStringDict otherKey = dict({{"item_type", "1"}});
+    const Values registration = {{"serviceName", "download"}, {"repositoryName", "Samples"}, {"itemName", "a.zlw"}};
+    const auto servicesWith = [&](const ZELServerStringDict* filter) {
+        return [&, filter] { return outcome(manager.getServices(filter, services), [&] { return names(services); }); };
+    };
+    const auto description = [&](const IZELServerRepository& repository) {
+        ZELServerString text;
+        repository.getDescription(text);
+        return text.str();
+    };
+    ZELServerPropertyAccessor globalItems;
+    const auto categories = [&] {
+        ZELServerStringArray all;
+        globalItems.getCategoryNames(all);
+        return joined(all.entries(), [&](std::size_t i) { return all.items()[i]; });
+    };
+    run({
+        {"service exists checks no characters", command("REP_SERVICEEXISTS", {{"serviceName", "a/b"}}), ok("true"),
+         [&] { return outcome(manager.serviceExists(S("a/b"), fresh()), flag); }, 0, "1 "},
+        {"remove service", command("REP_REMOVE_SERVICE", {{"serviceName", "download"}}), ok("true"),
+         [&] { return outcome(manager.removeService(S("download"), fresh()), flag); }, 0, "1 "},
+        {"get service", command("REP_GET_SERVICE", {{"serviceName", "download"}}),
+         ok(R"(<R><SERVICE service_id="7" name="download"/></R>)"),
+         [&] {
+             return outcome(manager.getService(S("download"), found, fresh()), flag, [&] { return found.serviceId(); });
+         },
+         0, "1 7 "},
+        {"unknown service", command("REP_GET_SERVICE", {{"serviceName", "x"}}), ok("<R/>"),
+         [&] { return outcome(manager.getService(S("x"), found, fresh()), flag); }, 0, "0 "},
+        {"services", command("REP_GET_SERVICES", {{"enableFilter", "All"}}),
+         ok(R"(<R><SERVICE name="download"/><SERVICE name="s2"/></R>)"), servicesWith(nullptr), 0, "download,s2, "},
+        {"services filter is exact", none, none, servicesWith(&lowerCase), msg::kRequiredValueMissing, "download,s2, "},
+        {"a listed service works on the manager's connection", command("REP_ITEMREGISTERED", registration), ok("true"),
+         [&] { return outcome(services.element(0)->itemRegistered(S("Samples"), S("a.zlw"), fresh()), flag); }, 0,
+         "1 "},
+        {"add service", command("REP_ADD_SERVICE", {{"serviceObject", added}}), ok("true"),
+         [&] { return outcome(manager.addService(unsaved)); }, 0, ""},
+        {"update service under the add root", command("REP_UPDATE_SERVICE", {{"serviceObject", updated}}), ok("true"),
+         [&] { return outcome(manager.updateService(stored)); }, 0, ""},
+        {"repository exists checks no characters", command("REP_REPOSITORYEXISTS", {{"repositoryName", "a/b"}}),
+         ok("false"), [&] { return outcome(manager.repositoryExists(S("a/b"), fresh()), flag); }, 0, "0 "},
+        {"add repository",
+         command("REP_ADD_REPOSITORY",
+                 {{"repositoryObject", xmlDocument("REP_ADD_REPOSITORY",
+                                                   R"(<REPOSITORY description="Roads &lt;2024>" name="Samples"/>)")}}),
+         ok("true"), [&] { return outcome(manager.addRepository(S("Samples"), S("Roads <2024>"))); }, 0, ""},
+        {"remove repository", command("REP_REMOVE_REPOSITORY", {{"repositoryName", "Samples"}}), ok("true"),
+         [&] { return outcome(manager.removeRepository(S("Samples"), fresh()), flag); }, 0, "1 "},
+        {"repositories refuse directives", none, none,
+         [&] { return outcome(manager.getRepositories(&lowerCase, repositories)); }, msg::kRequiredValueMissing, ""},
+        {"repositories at any depth", command("REP_GET_REPOSITORIES", {{"enableFilter", "All"}}),
+         ok(R"(<R><REPOSITORY name="Samples" description="d1"/><X><REPOSITORY name="Other"/></X></R>)"),
+         [&] {
+             return outcome(
+                 manager.getRepositories(nullptr, repositories), [&] { return names(repositories); },
+                 [&] { return description(*repositories.element(0)); });
+         },
+         0, "Samples,Other, d1 "},
+        {"a listed repository works on the manager's connection",
+         command("REP_ITEMEXISTS", {{"repositoryName", "Other"}, {"itemName", "a.zlw"}}), ok("true"),
+         [&] { return outcome(repositories.element(1)->itemExists(S("a.zlw"), fresh()), flag); }, 0, "1 "},
+        {"get repository", command("REP_GET_REPOSITORY", {{"repositoryName", "Samples"}}),
+         ok(R"(<R><REPOSITORY name="Samples" description="sample workspaces"/></R>)"),
+         [&] {
+             return outcome(manager.getRepository(S("Samples"), made, fresh()), flag,
+                            [&] { return description(made); });
+         },
+         0, "1 sample workspaces "},
+        {"unknown repository", command("REP_GET_REPOSITORY", {{"repositoryName", "Nothing"}}), ok("<R/>"),
+         [&] { return outcome(manager.getRepository(S("Nothing"), made, fresh()), flag); }, 0, "0 "},
+        {"a repository read works on the manager's connection",
+         command("REP_ITEMEXISTS", {{"repositoryName", "Samples"}, {"itemName", "x.zlw"}}), ok("false"),
+         [&] { return outcome(made.itemExists(S("x.zlw"), fresh()), flag); }, 0, "0 "},
+        {"global items only for exactly ALLITEMS", none, none,
+         [&] { return outcome(manager.getGlobalItems(&lowerCase, globalItems), categories); }, 0, " "},
+        {"global items", command("REP_GLOBAL_GET_ALL_ITEMS", {{"enableFilter", "All"}}),
+         ok(R"(<R><REPOSITORY name="Samples"><PROPERTY category="Samples" name="roads.zlw" value="1"/></REPOSITORY>)"
+            R"(<PROPERTY category="Other" name="t.zlwt" value="4"/></R>)"),
+         [&] { return outcome(manager.getGlobalItems(&allItems, globalItems), categories); }, 0, "Other,Samples, "},
+        {"global items not XML", command("REP_GLOBAL_GET_ALL_ITEMS", {{"enableFilter", "All"}}), ok("not xml"),
+         [&] { return outcome(manager.getGlobalItems(&allItems, globalItems)); }, msg::kXmlFailure, ""},
+        {"global items refused", command("REP_GLOBAL_GET_ALL_ITEMS", {{"enableFilter", "All"}}), reply("ERROR", "busy"),
+         [&] { return outcome(manager.getGlobalItems(&allItems, globalItems)); }, msg::kServerError, ""},
+        // A service's own commands.
+        {"register a kind the service takes", command("REP_REGISTERITEM", registration), ok("true"),
+         [&] { return outcome(service.registerItem(S("Samples"), S("a.zlw"))); }, 0, ""},
+        {"a kind the service does not take", none, none,
+         [&] { return outcome(service.registerItem(S("Samples"), S("report.zlwt"))); }, msg::kRegistrationRefused, ""},
+        {"endings are case sensitive", none, none,
+         [&] { return outcome(service.registerItem(S("Samples"), S("A.ZLW"))); }, msg::kRegistrationRefused, ""},
+        {"no name", none, none, [&] { return outcome(service.registerItem(S("Samples"), S(""))); },
+         msg::kRequiredValueMissing, ""},
+        {"deregister", command("REP_DEREGISTERITEM", registration), ok("false"),
+         [&] { return outcome(service.deregisterItem(S("Samples"), S("a.zlw"), fresh()), flag); }, 0, "0 "},
+        {"registered items", command("REP_GET_REGISTEREDITEMS", {{"serviceName", "download"}}),
+         ok(R"(<R><ITEM name="a.zlw"/><ITEM name="b.zlwt"/></R>)"),
+         [&] {
+             return outcome(service.getRegisteredItems(&otherKey, items), [&] {
+                 return joined(items.entries(),
+                               [&](unsigned i) { return std::to_string(items.element(i)->getItemType()); });
+             });
+         },
+         0, "1,4, "},
+        {"registered items of one type",
+         command("REP_GET_REGISTEREDITEMS", {{"serviceName", "download"}, {"itemType", "4"}}),
+         ok(R"(<R><ITEM name="b.zlwt"/></R>)"),
+         [&] { return outcome(service.getRegisteredItems(&templatesOnly, items)); }, 0, ""},
+        // The property-accessor updates of the four kinds of owner, each document named after its command.
+        {"service not saved yet", accessorUpdate("REP_UPDATE_SERVICEPROPERTYACCESSOR", "serviceID", "-1"), ok("true"),
+         [&] { return outcome(service.updatePropertyAccessor(accessor)); }, 0, ""},
+        {"service", accessorUpdate("REP_UPDATE_SERVICEPROPERTYACCESSOR", "serviceID", "7"), ok("true"),
+         [&] { return outcome(stored.updatePropertyAccessor(accessor)); }, 0, ""},
+        {"workspace", accessorUpdate("REP_UPDATE_WORKSPACEPROPERTYACCESSOR", "workspaceID", "ws-17"), ok("true"),
+         [&] { return outcome(workspace.updatePropertyAccessor(accessor)); }, 0, ""},
+        {"dataset", accessorUpdate("REP_UPDATE_DATASETPROPERTYACCESSOR", "datasetID", "d-a"), ok("true"),
+         [&] { return outcome(workspace.getSourceDatasets().element(0)->updatePropertyAccessor(accessor)); }, 0, ""},
+        {"feature type", accessorUpdate("REP_UPDATE_FEATURETYPEPROPERTYACCESSOR", "featureTypeID", "ft-a1"),
+         reply("ERROR", "locked"),
+         [&] { return outcome(workspace.getSourceFeatureTypes().element(0)->updatePropertyAccessor(accessor)); },
+         msg::kServerError, ""},
+    });
 }
 
-// ---- Argument checks --------------------------------------------------------------------------------
-
+// Every operation of a repository that takes an item name, with the names it also takes.
 struct Call {
     const char* operation;
     bool takesResource;
@@ -146,7 +448,6 @@ struct Call {
         call;
 };
 
-// Every operation that takes an item name (and possibly a resource name and a path).
 std::vector<Call> itemOperations()
 {
     static unsigned flag = 0;
@@ -168,284 +469,73 @@ std::vector<Call> itemOperations()
     };
 }
 
-TEST_F(RepositoryTest, EmptyOrForbiddenNamesAreRefusedBeforeAnythingIsSent)
+unsigned numberOf(IZELServerStatus* status) { return outcome(status).number; }
+
+// The channel is never opened: a check that let a command through would answer "not connected".
+TEST(RepositoryChecks, EmptyOrForbiddenNamesAreRefusedBeforeAnythingIsSent)
 {
-    signIn();
-    const ZELServerString path = S(file("src", "x"));
+    ZELServerTCPIPChannel channel;
+    ZELServerRepository repository(&channel, S("Samples"), S(""));
+    const ZELServerString path = S("any");
     for (const Call& c : itemOperations()) {
         SCOPED_TRACE(c.operation);
-        EXPECT_EQ(numberOf(StatusPtr(c.call(repository, S(""), S("r.csv"), path))), msg::kRequiredValueMissing);
+        EXPECT_EQ(numberOf(c.call(repository, S(""), S("r.csv"), path)), msg::kRequiredValueMissing);
         if (c.takesResource) {
-            EXPECT_EQ(numberOf(StatusPtr(c.call(repository, S("a.zlw"), S(""), path))), msg::kRequiredValueMissing);
+            EXPECT_EQ(numberOf(c.call(repository, S("a.zlw"), S(""), path)), msg::kRequiredValueMissing);
         }
         if (c.takesPath) {
-            EXPECT_EQ(numberOf(StatusPtr(c.call(repository, S("a.zlw"), S("r.csv"), S("")))),
-                      msg::kRequiredValueMissing);
+            EXPECT_EQ(numberOf(c.call(repository, S("a.zlw"), S("r.csv"), S(""))), msg::kRequiredValueMissing);
         }
         // An empty name wins over a forbidden character in the other name.
-        EXPECT_EQ(numberOf(StatusPtr(c.call(repository, S(""), S("r/1"), path))), msg::kRequiredValueMissing);
+        EXPECT_EQ(numberOf(c.call(repository, S(""), S("r/1"), path)), msg::kRequiredValueMissing);
         // updateItem deliberately lets any item name through.
         const std::string forbiddenHere = std::string(c.operation) == "updateItem" ? "" : kForbidden;
         for (const char forbidden : forbiddenHere) {
             const std::string bad = "a"s + forbidden + "b";
-            const StatusPtr badItem(c.call(repository, S(bad), S("r.csv"), path));
-            ASSERT_EQ(numberOf(badItem), msg::kForbiddenCharacter) << "item " << bad;
-            EXPECT_NE(std::string(badItem->getMessage()).find(kForbidden), std::string::npos) << badItem->getMessage();
+            EXPECT_EQ(numberOf(c.call(repository, S(bad), S("r.csv"), path)), msg::kForbiddenCharacter) << bad;
             if (c.takesResource) {
-                EXPECT_EQ(numberOf(StatusPtr(c.call(repository, S("a.zlw"), S(bad), path))), msg::kForbiddenCharacter)
-                    << "resource " << bad;
+                EXPECT_EQ(numberOf(c.call(repository, S("a.zlw"), S(bad), path)), msg::kForbiddenCharacter) << bad;
             }
         }
     }
-    EXPECT_TRUE(server.verify());
-}
-
-TEST_F(RepositoryTest, ViewsAndRegistrationsCheckOnlyForEmptinessWithTheirOwnExceptions)
-{
-    server
-        .exchange(repoCommand("REP_WORKSPACESERVICEEXISTS", {{"workspaceName", "a/b"}, {"serviceName", "c:d"}}),
-                  success("false"))
-        .exchange(repoCommand("REP_GET_TEMPLATEVIEW", {{"templateName", "t*"}}), success("<R/>"))
-        .exchange(repoCommand("REP_GET_ITEMRESOURCESVIEW", {{"itemName", ""}, {"enableFilter", "All"}}),
-                  success("<R/>"))
-        .exchange(repoCommand("REP_GET_ITEMRESOURCEVIEW", {{"itemName", "a.zlw"}, {"resourceName", ""}}),
-                  success("<R/>"));
-    signIn();
+    ZELServerRepositoryManager manager(&channel);
     unsigned flag = 7;
-    EXPECT_EQ(StatusPtr(repository.workspaceServiceExists(S("a/b"), S("c:d"), flag)), nullptr);
-    EXPECT_EQ(flag, 0u);
-    ZELServerTemplate templ;
-    unsigned found = 7;
-    EXPECT_EQ(StatusPtr(repository.getTemplateView(S("t*"), templ, found)), nullptr);
-    EXPECT_EQ(found, 0u);
-    // The item resource views let an empty item or resource name through.
-    ZELServerVector<IZELServerResource, ZELServerResource> resources;
-    EXPECT_EQ(StatusPtr(repository.getItemResourcesView(S(""), nullptr, resources)), nullptr);
-    ZELServerResource resource;
-    found = 7;
-    EXPECT_EQ(StatusPtr(repository.getItemResourceView(S("a.zlw"), S(""), resource, found)), nullptr);
-    EXPECT_EQ(found, 0u);
-
+    for (const char forbidden : kForbidden) {
+        const std::string name = "a"s + forbidden;
+        EXPECT_EQ(numberOf(manager.getRepository(S(name), repository, flag)), msg::kForbiddenCharacter) << name;
+        EXPECT_EQ(numberOf(manager.addRepository(S(name), S("d"))), msg::kForbiddenCharacter) << name;
+        EXPECT_EQ(numberOf(manager.removeRepository(S(name), flag)), msg::kForbiddenCharacter) << name;
+    }
     ZELServerWorkspace workspace(nullptr);
-    const std::vector<std::pair<const char*, IZELServerStatus*>> refused = {
-        {"registerWorkspaceService", repository.registerWorkspaceService(S(""), S("svc"))},
-        {"deregisterWorkspaceService", repository.deregisterWorkspaceService(S("w"), S(""), flag)},
-        {"getWorkspaceView", repository.getWorkspaceView(S(""), workspace, found)},
-        {"getItemResourceView", repository.getItemResourceView(S(""), S("r.csv"), resource, found)},
-    };
-    for (const auto& [operation, raw] : refused) {
-        EXPECT_EQ(numberOf(StatusPtr(raw)), msg::kRequiredValueMissing) << operation;
-    }
-    EXPECT_TRUE(server.verify());
-}
-
-// ---- Item downloads ---------------------------------------------------------------------------------
-
-TEST_F(RepositoryTest, ItemDestinationIsReplacedOnlyByACompleteFileAndNoTemporaryFileStays)
-{
-    // The system's temporary folder points into the test's folder, so that leftovers can be seen.
-    const fs::path temporary = dir / "tmp";
-    fs::create_directory(temporary);
-    const zeltest::ScopedTemporaryFolder redirected(temporary);
-    const Bytes getItem =
-        repoCommand("REP_GET_ITEM", {{"itemName", "roads.zlw"}, {"itemFileCRCCheckingEnabled", "false"}});
-    const std::string big(200000, 'w');
-    expectDownload(getItem, big, success("true"));
-    server.exchange(getItem, success("false"));
-    expectDownload(getItem, "", success("true"));
-    expectDownload(getItem, "new contents", zeltest::reply("ERROR", "item is locked"));
-    signIn();
-
-    struct Case {
-        const char* what;
-        std::string destination;  // relative to the test's folder; made with the old contents unless missing
-        unsigned number;
-        std::optional<unsigned> received;
-        std::string after;  // the destination's contents afterwards
-        std::string named;  // text the status message must contain
-    };
-    const std::string old = "old contents";
-    const Case cases[] = {
-        {"complete file", "a.zlw", 0, 1, big, ""},
-        {"no file", "b.zlw", msg::kEmptyDownload, 0, old, "roads.zlw"},
-        {"zero bytes", "c.zlw", msg::kEmptyDownload, 0, old, "roads.zlw"},
-        {"error after the whole file", "d.zlw", msg::kServerError, 0, old, ""},
-        // The temporary file goes beside the destination, so nothing is sent.
-        {"missing folder", "no-such-dir/e.zlw", msg::kLocalFileWrite, 0, "", (dir / "no-such-dir/e.zlw").string()},
-    };
-    for (const Case& c : cases) {
-        SCOPED_TRACE(c.what);
-        const std::string destination = (dir / c.destination).string();
-        if (c.number != msg::kLocalFileWrite) {
-            file(c.destination, old);
-        }
-        unsigned received = 7;
-        const StatusPtr status(repository.getItem(S("roads.zlw"), S(destination), received));
-        ASSERT_EQ(numberOf(status), c.number) << describe(status.get());
-        if (c.received) {
-            EXPECT_EQ(received, *c.received);
-        }
-        EXPECT_EQ(slurp(destination), c.after);
-        if (!c.named.empty()) {
-            EXPECT_NE(std::string(status->getMessage()).find(c.named), std::string::npos) << status->getMessage();
-        }
-        EXPECT_TRUE(fs::is_empty(temporary));
-    }
-    EXPECT_TRUE(server.verify());
-}
-
-// ---- View filters -----------------------------------------------------------------------------------
-
-TEST_F(RepositoryTest, WorkspaceFiltersTranslateTheThreeValuesExactlyAndRefuseAnythingElse)
-{
-    const std::vector<std::pair<std::optional<std::string>, std::string>> sent = {
-        {std::nullopt, "All"}, {"ALL", "All"}, {"ENABLED", "Enabled"}, {"DISABLED", "Disabled"}};
-    for (const auto& [filter, value] : sent) {
-        server.exchange(repoCommand("REP_GET_WORKSPACESUMMARIESVIEW", {{"enableFilter", value}}),
-                        success(R"(<R><WORKSPACE_SUMMARY name="s1"/><WORKSPACE_SUMMARY name="s2"/></R>)"));
-    }
-    signIn();
-    ZELServerVector<IZELServerWorkspaceSummary, ZELServerWorkspaceSummary> summaries;
-    for (const auto& [filter, value] : sent) {
-        ZELServerStringDict directives;
-        if (filter) {
-            directives.insert("ENABLE_FILTER", *filter);
-        }
-        EXPECT_EQ(StatusPtr(repository.getWorkspaceSummariesView(filter ? &directives : nullptr, summaries)), nullptr);
-        EXPECT_EQ(summaries.entries(), 2u) << value;
-    }
-    for (const char* filter : {static_cast<const char*>(nullptr), "enabled", "All", "ENABLED ", ""}) {
-        ZELServerStringDict directives;
-        directives.insert("OTHER", "x");
-        if (filter) {
-            directives.insert("ENABLE_FILTER", filter);
-        }
-        ZELServerVector<IZELServerWorkspace, ZELServerWorkspace> workspaces;
-        EXPECT_EQ(numberOf(StatusPtr(repository.getWorkspacesView(&directives, workspaces))),
-                  msg::kRequiredValueMissing)
-            << (filter ? filter : "(missing)");
-        EXPECT_EQ(numberOf(StatusPtr(repository.getWorkspaceSummariesView(&directives, summaries))),
-                  msg::kRequiredValueMissing)
-            << (filter ? filter : "(missing)");
-    }
-    EXPECT_TRUE(server.verify());
-}
-
-TEST_F(RepositoryTest, ListViewsIgnoreTheirDirectivesAndAskForEverything)
-{
-    server
-        .exchange(repoCommand("REP_GET_CUSTOMFORMATSVIEW", {{"enableFilter", "All"}}),
-                  success(R"(<R><CUSTOMFORMAT name="f.zds"/></R>)"))
-        .exchange(repoCommand("REP_GET_CUSTOMTRANSFORMERSVIEW", {{"enableFilter", "All"}}),
-                  success(R"(<R><CUSTOMTRANSFORMER name="t1.zlx"/><CUSTOMTRANSFORMER name="t2.zlx"/></R>)"))
-        .exchange(repoCommand("REP_GET_TEMPLATESVIEW", {{"enableFilter", "All"}}),
-                  success(R"(<R><TEMPLATE name="p"/></R>)"))
-        .exchange(repoCommand("REP_GET_ITEMRESOURCESVIEW", {{"itemName", "a.zlw"}, {"enableFilter", "All"}}),
-                  success(R"(<R><RESOURCE name="r1"/><RESOURCE name="r2"/><RESOURCE name="r3"/></R>)"));
-    signIn();
-    ZELServerStringDict directives;
-    directives.insert("ENABLE_FILTER", "DISABLED");
-    ZELServerVector<IZELServerCustomFormat, ZELServerCustomFormat> formats;
-    ZELServerVector<IZELServerCustomTransformer, ZELServerCustomTransformer> transformers;
-    ZELServerVector<IZELServerTemplate, ZELServerTemplate> templates;
-    ZELServerVector<IZELServerResource, ZELServerResource> resources;
-    EXPECT_EQ(StatusPtr(repository.getCustomFormatsView(&directives, formats)), nullptr);
-    EXPECT_EQ(StatusPtr(repository.getCustomTransformersView(&directives, transformers)), nullptr);
-    EXPECT_EQ(StatusPtr(repository.getTemplatesView(&directives, templates)), nullptr);
-    EXPECT_EQ(StatusPtr(repository.getItemResourcesView(S("a.zlw"), &directives, resources)), nullptr);
-    EXPECT_EQ(
-        (std::vector<unsigned>{formats.entries(), transformers.entries(), templates.entries(), resources.entries()}),
-        (std::vector<unsigned>{1, 2, 1, 3}));
-    EXPECT_TRUE(server.verify());
-}
-
-TEST_F(RepositoryTest, SingleViewsFillTheCallersObjectAndSetFound)
-{
-    server
-        .exchange(repoCommand("REP_GET_WORKSPACEVIEW", {{"workspaceName", "roads.zlw"}}),
-                  success(R"(<R><WORKSPACE_DEFINITIONS workspace_id="w1" name="roads.zlw">)"
-                          R"(<DATASET name="A" is_source="true"/></WORKSPACE_DEFINITIONS></R>)"))
-        .exchange(repoCommand("REP_GET_CUSTOMFORMATVIEW", {{"customFormatName", "f.zds"}}),
-                  success(R"(<R><CUSTOMFORMAT name="f.zds" filesize="12"/></R>)"))
-        .exchange(repoCommand("REP_GET_CUSTOMTRANSFORMERVIEW", {{"customTransformerName", "t.zlx"}}),
-                  success(R"(<R><CUSTOMTRANSFORMER name="t.zlx"/></R>)"))
-        .exchange(repoCommand("REP_GET_ITEMRESOURCEVIEW", {{"itemName", "a.zlw"}, {"resourceName", "r.csv"}}),
-                  success(R"(<R><RESOURCE name="r.csv" filesize="5"/></R>)"));
-    signIn();
-    ZELServerWorkspace workspace(nullptr);
-    ZELServerCustomFormat format;
-    ZELServerCustomTransformer transformer;
     ZELServerResource resource;
-    unsigned found[4] = {7, 7, 7, 7};
-    EXPECT_EQ(StatusPtr(repository.getWorkspaceView(S("roads.zlw"), workspace, found[0])), nullptr);
-    EXPECT_EQ(StatusPtr(repository.getCustomFormatView(S("f.zds"), format, found[1])), nullptr);
-    EXPECT_EQ(StatusPtr(repository.getCustomTransformerView(S("t.zlx"), transformer, found[2])), nullptr);
-    EXPECT_EQ(StatusPtr(repository.getItemResourceView(S("a.zlw"), S("r.csv"), resource, found[3])), nullptr);
-    EXPECT_EQ(std::vector<unsigned>(found, found + 4), (std::vector<unsigned>{1, 1, 1, 1}));
-    EXPECT_EQ(workspace.getSourceDatasets().entries(), 1u);
-    EXPECT_EQ(format.getFileSize(), 12);
-    EXPECT_EQ(resource.getFileSize(), 5);
-    EXPECT_TRUE(server.verify());
-}
-
-// ---- Workspace registrations ------------------------------------------------------------------------
-
-TEST_F(RepositoryTest, WorkspaceServicesFilterAppendsTheWorkspaceNameAndRegistrationsNameBoth)
-{
-    const zeltest::Values names = {{"workspaceName", "roads.zlw"}, {"serviceName", "download"}};
-    server
-        .exchange(repoCommand("REP_GET_WORKSPACESERVICES", {{"enableFilter", "All"}, {"workspaceName", "roads.zlw"}}),
-                  success(R"(<R><WORKSPACE_SERVICE><WORKSPACE_SUMMARY name="roads.zlw" is_enabled="true"/>)"
-                          R"(<SERVICE service_id="3" name="download" is_workspace_reg_allowed="true"/>)"
-                          R"(</WORKSPACE_SERVICE></R>)"))
-        .exchange(repoCommand("REP_GET_WORKSPACESERVICES", {{"enableFilter", "Disabled"}, {"workspaceName", "w"}}),
-                  success("<R/>"))
-        .exchange(repoCommand("REP_GET_WORKSPACESERVICES", {{"enableFilter", "All"}}), success("<R/>"))
-        .exchange(repoCommand("REP_REGISTER_WORKSPACESERVICE", names), success("true"))
-        .exchange(repoCommand("REP_DEREGISTER_WORKSPACESERVICE", names), success("true"));
-    signIn();
-    ZELServerStringDict onlyWorkspace;
-    onlyWorkspace.insert("WORKSPACE_NAME", "roads.zlw");
+    ZELServerVector<IZELServerWorkspace, ZELServerWorkspace> workspaces;
+    ZELServerVector<IZELServerService, ZELServerService> services;
     ZELServerVector<IZELServerWorkspaceService, ZELServerWorkspaceService> registrations;
-    EXPECT_EQ(StatusPtr(repository.getWorkspaceServices(&onlyWorkspace, registrations)), nullptr);
-    ASSERT_EQ(registrations.entries(), 1u);
-    ZELServerString name;
-    registrations.element(0)->getWorkspaceSummary().getName(name);
-    EXPECT_EQ(name.str(), "roads.zlw");
-    EXPECT_TRUE(registrations.element(0)->getWorkspaceSummary().isEnabled());
-    registrations.element(0)->getService().getName(name);
-    EXPECT_EQ(name.str(), "download");
-    EXPECT_EQ(registrations.element(0)->getService().isWorkspaceRegistrationAllowed(), 1u);
-
-    ZELServerStringDict disabled;
-    disabled.insert("ENABLE_FILTER", "DISABLED");
-    disabled.insert("WORKSPACE_NAME", "w");
-    EXPECT_EQ(StatusPtr(repository.getWorkspaceServices(&disabled, registrations)), nullptr);
-    EXPECT_EQ(registrations.entries(), 0u);
-    EXPECT_EQ(StatusPtr(repository.getWorkspaceServices(nullptr, registrations)), nullptr);
-
-    ZELServerStringDict unknown;
-    unknown.insert("ENABLE_FILTER", "Enabled");
-    EXPECT_EQ(numberOf(StatusPtr(repository.getWorkspaceServices(&unknown, registrations))),
-              msg::kRequiredValueMissing);
-    EXPECT_EQ(StatusPtr(repository.registerWorkspaceService(S("roads.zlw"), S("download"))), nullptr);
-    unsigned deregistered = 0;
-    EXPECT_EQ(StatusPtr(repository.deregisterWorkspaceService(S("roads.zlw"), S("download"), deregistered)), nullptr);
-    EXPECT_EQ(deregistered, 1u);
-    EXPECT_TRUE(server.verify());
-}
-
-TEST(RepositoryObject, WithoutAChannelCommandsFailAfterTheirChecks)
-{
-    ZELServerRepository repository(nullptr);
-    unsigned exists = 7;
-    EXPECT_EQ(numberOf(StatusPtr(repository.itemExists(S(""), exists))), msg::kRequiredValueMissing);
-    EXPECT_EQ(numberOf(StatusPtr(repository.itemExists(S("a.zlw"), exists))), msg::kNotConnected);
-    EXPECT_EQ(exists, 0u);
-    ZELServerString name("stale");
-    repository.getName(name);
-    EXPECT_EQ(name.str(), "");
+    const ZELServerStringDict unknown = dict({{"ENABLE_FILTER", "Enabled"}});
+    const ZELServerStringDict spaced = dict({{"ENABLE_FILTER", "ENABLED "}});
+    const ZELServerStringDict none = dict({{"OTHER", "x"}});
+    for (IZELServerStatus* status : {
+             manager.repositoryExists(S(""), flag),
+             manager.getRepository(S(""), repository, flag),
+             manager.addRepository(S(""), S("d")),
+             manager.removeRepository(S(""), flag),
+             manager.serviceExists(S(""), flag),
+             manager.getServices(&none, services),
+             repository.registerWorkspaceService(S(""), S("svc")),
+             repository.deregisterWorkspaceService(S("w"), S(""), flag),
+             repository.getWorkspaceView(S(""), workspace, flag),
+             repository.getItemResourceView(S(""), S("r.csv"), resource, flag),
+             repository.getWorkspacesView(&unknown, workspaces),
+             repository.getWorkspacesView(&spaced, workspaces),
+             repository.getWorkspacesView(&none, workspaces),
+             repository.getWorkspaceServices(&unknown, registrations),
+         }) {
+        EXPECT_EQ(numberOf(status), msg::kRequiredValueMissing);
+    }
+    // Past the checks, the unopened channel answers; the flag is cleared.
+    EXPECT_EQ(numberOf(repository.itemExists(S("a.zlw"), flag)), msg::kNotConnected);
+    EXPECT_EQ(flag, 0u);
 }
 
 }  // namespace
-}  // namespace zel::repotest
+}  // namespace zel

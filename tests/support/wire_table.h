@@ -87,6 +87,9 @@ struct WireRow {
 
 class WireTableTest : public SignedInChannelTest {
 protected:
+    // Request and answer of a row that must send nothing.
+    static inline const Bytes none{};
+
     void run(const std::vector<WireRow>& rows)
     {
         for (const WireRow& row : rows) {
