@@ -31,7 +31,6 @@ echo copying
 
 // One request of a conversation and the reply body it must get, time stamps read as "TIME".
 struct Exchange {
-    const char* user;
     std::string keyword;
     Values values;
     std::string reply;
@@ -39,14 +38,11 @@ struct Exchange {
 
 class Commands : public ServerFixture {
 protected:
-    void converse(const std::vector<Exchange>& exchanges)
+    void converse(const std::vector<Exchange>& exchanges, TestClient* client = nullptr)
     {
-        for (const Exchange& e : exchanges) {
-            auto& client = clients_[e.user];
-            if (!client)
-                client = connectAs(e.user);
-            EXPECT_EQ(withoutTimes(client->command(e.keyword, e.values).body), e.reply) << e.user << " " << e.keyword;
-        }
+        for (const Exchange& e : exchanges)
+            EXPECT_EQ(withoutTimes((client ? client : admin_.get())->command(e.keyword, e.values).body), e.reply)
+                << e.keyword;
     }
     WireReply addResource(const std::string& item, const std::string& name, const std::string& content,
                           const std::string& keyword = "REP_ADD_ITEMRESOURCE")
@@ -54,8 +50,6 @@ protected:
         return admin_->upload(keyword, {{"repositoryName", "REPO"}, {"itemName", item}, {"resourceName", name}},
                               content);
     }
-
-    std::map<std::string, std::unique_ptr<TestClient>> clients_;
 };
 
 // `values` with the repository REPO first.
@@ -96,12 +90,8 @@ TEST_F(Commands, RepositoriesItemsAndResources)
     const struct {
         std::string keyword, item, resource, reply;
     } uploads[] = {
-        {"REP_ADD_ITEM", "roads.zlw", "", "item 'roads.zlw' already exists in 'REPO'"},
-        {"REP_UPDATE_ITEM", "new.zlw", "", "item 'new.zlw' does not exist in 'REPO'"},
         {"REP_ADD_ITEM", "a:b", "", "item name 'a:b' " + bad},
         {"REP_ADD_ITEM", "bad.zlw", "", "bad workspace header: line 1: @attribute before any @featuretype"},
-        {"REP_ADD_ITEMRESOURCE", "roads.zlw", "lookup.csv", "resource 'lookup.csv' already exists on 'roads.zlw'"},
-        {"REP_UPDATE_ITEMRESOURCE", "roads.zlw", "new.csv", "resource 'new.csv' does not exist on 'roads.zlw'"},
         {"REP_ADD_ITEMRESOURCE", "roads.zlw", "roads.zlw", "a resource cannot have the name of its item"},
         {"REP_ADD_ITEMRESOURCE", "none.zlw", "r", "unknown item 'none.zlw' in 'REPO'"},
         {"REP_UPDATE_ITEMRESOURCE", "roads.zlw", "lookup.csv", "true"},
@@ -115,45 +105,31 @@ TEST_F(Commands, RepositoriesItemsAndResources)
         "REP_ADD_ITEM", repo({{"itemName", "c.zds"}, {"itemFileCRCCheckingEnabled", "true"}}), "content", 12345u);
     EXPECT_EQ(crc.body.rfind("CRC mismatch", 0), 0u) << crc.body;
 
-    const std::string repository = R"(<REPOSITORY name="REPO" description="Test repository"/>)";
     const std::string resource = R"(<RESOURCE name="lookup.csv" description="" filesize="6"/>)";
     const Values lookup = repo({{"itemName", "roads.zlw"}, {"resourceName", "lookup.csv"}});
     auto add = [](const std::string& name) {
         return Values{{"repositoryObject", "<R><REPOSITORY name=\"" + name + "\"/></R>"}};
     };
     converse({
-        {"admin", "REP_GET_REPOSITORIES", {{"enableFilter", "All"}}, reply("REP_GET_REPOSITORIES", repository)},
-        {"admin", "REP_GET_REPOSITORY", repo({}), reply("REP_GET_REPOSITORY", repository)},
-        {"admin", "REP_GET_REPOSITORY", {{"repositoryName", "NOPE"}}, reply("REP_GET_REPOSITORY")},
-        {"admin", "REP_ADD_REPOSITORY", add("REPO"), "repository 'REPO' already exists"},
-        {"admin", "REP_ADD_REPOSITORY", add("a/b"),
-         "repository name 'a/b' holds the character '/', one of \\/:*?\"<>|&='+%"},
-        {"admin", "REP_ADD_REPOSITORY", add(""), "repository name is empty"},
-        {"admin", "REP_ADD_REPOSITORY", {{"repositoryObject", "<X/>"}}, "repositoryObject holds no REPOSITORY element"},
-        {"ann", "REP_REMOVE_REPOSITORY", repo({}), "Authorization Error: user 'ann' may not run REP_REMOVE_REPOSITORY"},
-        {"vic", "REP_REMOVE_ITEM", repo({}), "Authorization Error: user 'vic' may not run REP_REMOVE_ITEM"},
+        {"REP_ADD_REPOSITORY", add("a/b"), "repository name 'a/b' holds the character '/', one of \\/:*?\"<>|&='+%"},
+        {"REP_ADD_REPOSITORY", add(""), "repository name is empty"},
         // One property per item: repository, name and kind, with the details as attributes.
-        {"admin",
-         "REP_GLOBAL_GET_ALL_ITEMS",
+        {"REP_GLOBAL_GET_ALL_ITEMS",
          {{"enableFilter", "All"}},
          reply("REP_GLOBAL_GET_ALL_ITEMS", R"(<PROPERTY category="REPO" name="roads.zlw" value="WORKSPACE">)"
                                            R"(<ATTRIBUTE name="title" value="Roads"/><ATTRIBUTE name="description" )"
                                            R"(value="Copies roads&#10;and checks them"/><ATTRIBUTE name="filesize" )"
                                            R"(value="503"/><ATTRIBUTE name="lastsavedate" value="TIME"/></PROPERTY>)")},
-        {"admin", "REP_ITEMRESOURCEEXISTS", repo({{"itemName", "roads.zlw"}}), "missing value \"resourceName\""},
-        {"admin", "REP_GET_ITEMRESOURCEVIEW", lookup, reply("REP_GET_ITEMRESOURCEVIEW", resource)},
-        {"admin", "REP_GET_ITEMRESOURCEVIEW", repo({{"itemName", "roads.zlw"}}), reply("REP_GET_ITEMRESOURCEVIEW")},
-        {"admin", "REP_GET_ITEMRESOURCESVIEW", repo({{"itemName", "roads.zlw"}}),
-         reply("REP_GET_ITEMRESOURCESVIEW", resource)},
+        {"REP_GET_ITEMRESOURCEVIEW", lookup, reply("REP_GET_ITEMRESOURCEVIEW", resource)},
+        {"REP_GET_ITEMRESOURCESVIEW", repo({{"itemName", "roads.zlw"}}), reply("REP_GET_ITEMRESOURCESVIEW", resource)},
     });
     EXPECT_EQ(storedFiles(), 2u) << "the replaced resource's content is gone";
-    converse({{"admin", "REP_REMOVE_ITEM", repo({{"itemName", "roads.zlw"}}), "true"}});
+    converse({{"REP_REMOVE_ITEM", repo({{"itemName", "roads.zlw"}}), "true"}});
     EXPECT_EQ(storedFiles(), 0u) << "an item takes its resources along";
     ASSERT_TRUE(addItem("a.zlx", "transformer").ok());
     converse({
-        {"admin", "REP_REMOVE_REPOSITORY", repo({}), "true"},
-        {"admin", "REP_REMOVE_REPOSITORY", repo({}), "false"},
-        {"admin", "REP_ITEMEXISTS", repo({{"itemName", "a.zlx"}}), "unknown repository 'REPO'"},
+        {"REP_REMOVE_REPOSITORY", repo({}), "true"},
+        {"REP_ITEMEXISTS", repo({{"itemName", "a.zlx"}}), "unknown repository 'REPO'"},
     });
     EXPECT_EQ(storedFiles(), 0u) << "a repository takes its items along";
 }
@@ -185,78 +161,48 @@ TEST_F(Commands, ViewsByKindServicesRegistrationsAndProperties)
         return Values{{idName, id}, {"propertyAccessorObject", "<A>" + property(idName, id) + "</A>"}};
     };
     converse({
-        {"admin", "REP_GET_WORKSPACESUMMARIESVIEW", repo({{"enableFilter", "All"}}),
+        {"REP_GET_WORKSPACESUMMARIESVIEW", repo({{"enableFilter", "All"}}),
          reply("REP_GET_WORKSPACESUMMARIESVIEW", off + on)},
-        {"admin", "REP_GET_WORKSPACESUMMARIESVIEW", repo({{"enableFilter", "Disabled"}}),
+        {"REP_GET_WORKSPACESUMMARIESVIEW", repo({{"enableFilter", "Disabled"}}),
          reply("REP_GET_WORKSPACESUMMARIESVIEW", off)},
-        {"admin", "REP_GET_WORKSPACESVIEW", repo({{"enableFilter", "enabled"}}),
-         "bad enableFilter 'enabled' (All, Enabled or Disabled)"},
-        {"admin", "REP_GET_WORKSPACEVIEW", repo({{"workspaceName", "nope.zlw"}}), reply("REP_GET_WORKSPACEVIEW")},
-        {"admin", "REP_GET_CUSTOMFORMATSVIEW", repo({}), reply("REP_GET_CUSTOMFORMATSVIEW", format)},
-        {"admin", "REP_GET_CUSTOMFORMATVIEW", repo({{"customFormatName", "fmt.zds"}}),
-         reply("REP_GET_CUSTOMFORMATVIEW", format)},
-        {"admin", "REP_GET_CUSTOMTRANSFORMERSVIEW", repo({}), reply("REP_GET_CUSTOMTRANSFORMERSVIEW", transformer)},
-        {"admin", "REP_GET_TEMPLATEVIEW", repo({{"templateName", "t.zlwt"}}), reply("REP_GET_TEMPLATEVIEW", page)},
-        // An item of another kind is not found under a view.
-        {"admin", "REP_GET_TEMPLATEVIEW", repo({{"templateName", "notes.txt"}}), reply("REP_GET_TEMPLATEVIEW")},
-        {"admin", "REP_ADD_SERVICE", {{"serviceObject", service("run", true, false)}}, "true"},
-        {"admin", "REP_ADD_SERVICE", {{"serviceObject", service("off", false, true)}}, "true"},
-        {"admin", "REP_ADD_SERVICE", {{"serviceObject", service("run", true, false)}}, "service 'run' already exists"},
-        {"admin", "REP_UPDATE_SERVICE", {{"serviceObject", service("zz", true, true)}}, "unknown service 'zz'"},
-        {"admin", "REP_UPDATE_SERVICE", {{"serviceObject", service("run", true, true)}}, "true"},
-        {"admin", "REP_GET_SERVICES", {{"enableFilter", "Enabled"}}, reply("REP_GET_SERVICES", run)},
-        {"ann",
-         "REP_ADD_SERVICE",
-         {{"serviceObject", service("x", 1, 1)}},
-         "Authorization Error: user 'ann' may not run REP_ADD_SERVICE"},
-        {"admin", "REP_REGISTER_WORKSPACESERVICE", reg("run", "workspaceName", "roads.zlw"), "true"},
-        {"admin", "REP_REGISTER_WORKSPACESERVICE", reg("run", "workspaceName", "roads.zlw"),
+        {"REP_GET_CUSTOMFORMATSVIEW", repo({}), reply("REP_GET_CUSTOMFORMATSVIEW", format)},
+        {"REP_GET_CUSTOMTRANSFORMERSVIEW", repo({}), reply("REP_GET_CUSTOMTRANSFORMERSVIEW", transformer)},
+        {"REP_GET_TEMPLATEVIEW", repo({{"templateName", "t.zlwt"}}), reply("REP_GET_TEMPLATEVIEW", page)},
+        {"REP_ADD_SERVICE", {{"serviceObject", service("run", true, false)}}, "true"},
+        {"REP_ADD_SERVICE", {{"serviceObject", service("off", false, true)}}, "true"},
+        {"REP_UPDATE_SERVICE", {{"serviceObject", service("run", true, true)}}, "true"},
+        {"REP_GET_SERVICES", {{"enableFilter", "Enabled"}}, reply("REP_GET_SERVICES", run)},
+        {"REP_REGISTER_WORKSPACESERVICE", reg("run", "workspaceName", "roads.zlw"), "true"},
+        {"REP_REGISTER_WORKSPACESERVICE", reg("run", "workspaceName", "roads.zlw"),
          "'REPO/roads.zlw' is already registered with 'run'"},
-        {"admin", "REP_REGISTER_WORKSPACESERVICE", reg("run", "workspaceName", "t.zlwt"),
-         "'t.zlwt' is not a workspace"},
-        {"admin", "REP_REGISTERITEM", reg("run", "itemName", "t.zlwt"), "true"},
-        {"admin", "REP_REGISTERITEM", reg("off", "itemName", "fmt.zds"),
+        {"REP_REGISTERITEM", reg("run", "itemName", "t.zlwt"), "true"},
+        {"REP_REGISTERITEM", reg("off", "itemName", "fmt.zds"),
          "service 'off' does not accept items of kind CUSTOMFORMAT ('fmt.zds')"},
-        {"admin", "REP_REGISTERITEM", reg("nope", "itemName", "t.zlwt"), "unknown service 'nope'"},
-        {"admin", "REP_REGISTERITEM", reg("run", "itemName", "none"), "unknown item 'none' in 'REPO'"},
-        {"admin",
-         "REP_GET_REGISTEREDITEMS",
+        {"REP_REGISTERITEM", reg("nope", "itemName", "t.zlwt"), "unknown service 'nope'"},
+        {"REP_REGISTERITEM", reg("run", "itemName", "none"), "unknown item 'none' in 'REPO'"},
+        {"REP_GET_REGISTEREDITEMS",
          {{"serviceName", "run"}, {"itemType", "4"}},
          reply("REP_GET_REGISTEREDITEMS", R"(<ITEM name="t.zlwt" repository_name="REPO" title="T" description="" )"
                                           R"(filesize="11" category="" requirements="" requirementskeyword="" )"
                                           R"(usage="" history="" lastsavedate="TIME" lastsavebuild="zelserverd )"
                                           R"(0.1.0" buildnumber="0" legaltermsconditions=""/>)")},
-        {"admin",
-         "REP_GET_REGISTEREDITEMS",
-         {{"serviceName", "run"}, {"itemType", "9"}},
-         "bad itemType '9' (0 to 4, or WORKSPACE, CUSTOMFORMAT, CUSTOMTRANSFORMER, TEMPLATE, OTHER)"},
-        {"admin", "REP_GET_WORKSPACESERVICES", repo({{"enableFilter", "Enabled"}, {"workspaceName", "roads.zlw"}}),
+        {"REP_GET_WORKSPACESERVICES", repo({{"enableFilter", "Enabled"}, {"workspaceName", "roads.zlw"}}),
          reply("REP_GET_WORKSPACESERVICES", "<WORKSPACE_SERVICE>" + on + run + "</WORKSPACE_SERVICE>")},
-        {"admin", "REP_GET_WORKSPACESERVICES", repo({{"workspaceName", "x.zlw"}}), reply("REP_GET_WORKSPACESERVICES")},
-        {"admin", "REP_UPDATE_SERVICEPROPERTYACCESSOR", accessor("serviceID", "1"), "true"},
-        {"admin", "REP_UPDATE_SERVICEPROPERTYACCESSOR", accessor("serviceID", "999"), "unknown service id '999'"},
-        {"admin", "REP_UPDATE_WORKSPACEPROPERTYACCESSOR", accessor("workspaceID", "1"), "true"},
-        {"admin", "REP_UPDATE_WORKSPACEPROPERTYACCESSOR", accessor("workspaceID", "99"), "unknown workspace '99'"},
-        {"admin", "REP_UPDATE_DATASETPROPERTYACCESSOR", accessor("datasetID", "1.2"), "true"},
-        {"admin", "REP_UPDATE_DATASETPROPERTYACCESSOR", accessor("datasetID", "1.3"), "unknown dataset '1.3'"},
-        {"admin", "REP_UPDATE_FEATURETYPEPROPERTYACCESSOR", accessor("featureTypeID", "1.1.1"), "true"},
-        {"admin", "REP_UPDATE_FEATURETYPEPROPERTYACCESSOR", accessor("featureTypeID", "1.1.2"),
-         "unknown featuretype '1.1.2'"},
-        {"admin",
-         "REP_GET_SERVICE",
+        {"REP_UPDATE_SERVICEPROPERTYACCESSOR", accessor("serviceID", "1"), "true"},
+        {"REP_UPDATE_WORKSPACEPROPERTYACCESSOR", accessor("workspaceID", "1"), "true"},
+        {"REP_UPDATE_DATASETPROPERTYACCESSOR", accessor("datasetID", "1.2"), "true"},
+        {"REP_UPDATE_FEATURETYPEPROPERTYACCESSOR", accessor("featureTypeID", "1.1.1"), "true"},
+        {"REP_UPDATE_FEATURETYPEPROPERTYACCESSOR", accessor("featureTypeID", "1.1.2"), "unknown featuretype '1.1.2'"},
+        {"REP_GET_SERVICE",
          {{"serviceName", "run"}},
          reply("REP_GET_SERVICE", run.substr(0, run.size() - 2) + ">" + property("serviceID", "1") + "</SERVICE>")},
         // An update replaces the whole set of its owner.
-        {"admin",
-         "REP_UPDATE_SERVICEPROPERTYACCESSOR",
-         {{"serviceID", "1"}, {"propertyAccessorObject", "<EMPTY/>"}},
-         "true"},
-        {"admin", "REP_GET_SERVICE", {{"serviceName", "run"}}, reply("REP_GET_SERVICE", run)},
-        {"admin", "REP_DEREGISTER_WORKSPACESERVICE", reg("run", "workspaceName", "roads.zlw"), "true"},
-        {"admin", "REP_DEREGISTER_WORKSPACESERVICE", reg("run", "workspaceName", "roads.zlw"), "false"},
-        {"admin", "REP_REGISTER_WORKSPACESERVICE", reg("off", "workspaceName", "roads.zlw"), "true"},
-        {"admin", "REP_REMOVE_SERVICE", {{"serviceName", "run"}}, "true"},
-        {"admin", "REP_ITEMREGISTERED", reg("run", "itemName", "t.zlwt"), "unknown service 'run'"},
+        {"REP_UPDATE_SERVICEPROPERTYACCESSOR", {{"serviceID", "1"}, {"propertyAccessorObject", "<EMPTY/>"}}, "true"},
+        {"REP_GET_SERVICE", {{"serviceName", "run"}}, reply("REP_GET_SERVICE", run)},
+        {"REP_DEREGISTER_WORKSPACESERVICE", reg("run", "workspaceName", "roads.zlw"), "true"},
+        {"REP_REGISTER_WORKSPACESERVICE", reg("off", "workspaceName", "roads.zlw"), "true"},
+        {"REP_REMOVE_SERVICE", {{"serviceName", "run"}}, "true"},
+        {"REP_ITEMREGISTERED", reg("run", "itemName", "t.zlwt"), "unknown service 'run'"},
     });
 
     // The workspace view comes from the header, with the properties of each owner by its id; it and
@@ -264,9 +210,8 @@ TEST_F(Commands, ViewsByKindServicesRegistrationsAndProperties)
     // between rename and commit leaves) goes.
     writeFile(dataDir_ + "/store/orphan", "x");
     startServer();
-    clients_.clear();
     EXPECT_EQ(storedFiles(), 7u);
-    converse({{"admin", "REP_GET_WORKSPACEVIEW", repo({{"workspaceName", "roads.zlw"}}),
+    converse({{"REP_GET_WORKSPACEVIEW", repo({{"workspaceName", "roads.zlw"}}),
                reply("REP_GET_WORKSPACEVIEW",
                      R"(<WORKSPACE_DEFINITIONS workspace_id="1" name="roads.zlw" title="Roads" )"
                      R"(description="Copies roads&#10;and checks them" is_enabled="true" filesize="503">)"
@@ -285,7 +230,7 @@ TEST_F(Commands, ViewsByKindServicesRegistrationsAndProperties)
                          property("datasetID", "1.2") +
                          R"(</DATASET><RESOURCE name="lookup.csv" description="" filesize="1"/>)" +
                          property("workspaceID", "1") + "</WORKSPACE_DEFINITIONS>")},
-              {"admin", "REP_WORKSPACESERVICEEXISTS", reg("off", "workspaceName", "roads.zlw"), "true"}});
+              {"REP_WORKSPACESERVICEEXISTS", reg("off", "workspaceName", "roads.zlw"), "true"}});
 }
 
 TEST_F(Commands, SessionsRightsAndTokens)
@@ -316,67 +261,54 @@ TEST_F(Commands, SessionsRightsAndTokens)
         EXPECT_EQ(userOf(*vic), "Authentication Error: sign in with SERVER_SESSION_INIT first");
     }
 
-    auto prop = [](const char* name) { return Values{{"sessionPropName", name}}; };
-    // Rights come from the connection's sign-in, never from an identity object in the request.
+    auto ann = connectAs("ann");
+    const std::pair<const char*, const char*> properties[] = {
+        {"SERVER_NAME", "zelserverd"},    {"SERVER_VERSION", "0.1.0"},  {"API_VERSION", "1"},
+        {"USER_ROLES", "user"},           {"SECURITY_ENABLED", "true"}, {"MAX_REQUEST_BYTES", "65536"},
+        {"MAX_FILE_BYTES", "4294967295"}, {"JOB_SERVICES", "zeljob"},   {"SERVER_TIME", "TIME"}};
+    for (auto [name, value] : properties)
+        converse({{"SERVER_SESSION_GET_PROP", {{"sessionPropName", name}}, value}}, ann.get());
+    // Rights come from the connection's sign-in, never from an identity object in the request; a
+    // custom role grants its rights and nothing else.
     const std::string forged = "<?xml version=\"1.0\"?><SR_MAKE><IDENTITY id=\"admin\" is_authenticated=\"true\">"
                                "<ROLES><ROLE name=\"admin\"/></ROLES></IDENTITY></SR_MAKE>";
-    auto token = [](const std::string& text, const std::string& timeout, const std::string& address = "") {
-        return "<?xml version=\"1.0\"?><SEC_ADD_USERTOKEN><USERTOKEN token=\"" + text + "\" clientaddress=\"" +
-               address + "\" expirationtimeout=\"" + timeout +
-               "\" firsttokendate=\"x\" lasttokendate=\"y\" expirationdate=\"z\"/></SEC_ADD_USERTOKEN>";
-    };
+    converse({{"SR_MAKE",
+               {{"identityObject", forged}, {"srName", "AREA"}, {"srPath", pathDocument("x")}},
+               "Authorization Error: user 'vic' may not run SR_MAKE"}},
+             connectAs("vic").get());
     auto of = [](const char* account, const std::string& doc = "") {
         Values values{{"userAccountName", account}};
         if (!doc.empty())
             values.emplace_back("userTokenObject", doc);
         return values;
     };
+    converse(
+        {{"SR_EXISTS", {{"srName", "AREA"}, {"srPath", pathDocument("x")}}, "false"},
+         {"SEC_USERTOKEN_EXISTS", of("aud"), "Authorization Error: user 'aud' may not manage the user token of 'aud'"}},
+        connectAs("aud").get());
+    auto token = [](const std::string& text, const std::string& timeout, const std::string& address = "") {
+        return "<?xml version=\"1.0\"?><SEC_ADD_USERTOKEN><USERTOKEN token=\"" + text + "\" clientaddress=\"" +
+               address + "\" expirationtimeout=\"" + timeout +
+               "\" firsttokendate=\"x\" lasttokendate=\"y\" expirationdate=\"z\"/></SEC_ADD_USERTOKEN>";
+    };
     converse({
-        {"ann", "SERVER_SESSION_GET_PROP", prop("SERVER_NAME"), "zelserverd"},
-        {"ann", "SERVER_SESSION_GET_PROP", prop("SERVER_VERSION"), "0.1.0"},
-        {"ann", "SERVER_SESSION_GET_PROP", prop("API_VERSION"), "1"},
-        {"ann", "SERVER_SESSION_GET_PROP", prop("USER_ROLES"), "user"},
-        {"ann", "SERVER_SESSION_GET_PROP", prop("SECURITY_ENABLED"), "true"},
-        {"ann", "SERVER_SESSION_GET_PROP", prop("MAX_REQUEST_BYTES"), "65536"},
-        {"ann", "SERVER_SESSION_GET_PROP", prop("MAX_FILE_BYTES"), "4294967295"},
-        {"ann", "SERVER_SESSION_GET_PROP", prop("JOB_SERVICES"), "zeljob"},
-        {"ann", "SERVER_SESSION_GET_PROP", prop("SERVER_TIME"), "TIME"},
-        {"ann", "SERVER_SESSION_GET_PROP", prop("COLOUR"), "unknown session property \"COLOUR\""},
-        {"ann", "SERVER_SESSION_GET_PROP", {}, "missing value \"sessionPropName\""},
-        {"admin", "NO_SUCH_COMMAND", {}, "unknown command \"NO_SUCH_COMMAND\""},
-        {"vic",
-         "SR_MAKE",
-         {{"identityObject", forged}, {"srName", "AREA"}, {"srPath", pathDocument("x")}},
-         "Authorization Error: user 'vic' may not run SR_MAKE"},
-        // A custom role grants its rights and nothing else.
-        {"aud", "SR_EXISTS", {{"srName", "AREA"}, {"srPath", pathDocument("x")}}, "false"},
-        {"aud", "SEC_USERTOKEN_EXISTS", of("aud"),
-         "Authorization Error: user 'aud' may not manage the user token of 'aud'"},
-        {"ann", "SEC_USERTOKEN_EXISTS", of("vic"),
-         "Authorization Error: user 'ann' may not manage the user token of 'vic'"},
-        {"ann", "SEC_GET_USERTOKEN", of("ann"), reply("SEC_GET_USERTOKEN")},
-        {"ann", "SEC_USERTOKEN_EXPIRED", of("ann"), "account 'ann' has no user token"},
-        {"ann", "SEC_ADD_USERTOKEN", of("ann", "not xml"),
+        {"SEC_ADD_USERTOKEN", of("ann", "not xml"),
          "\"userTokenObject\" holds no USERTOKEN element: malformed XML: No document element found"},
-        {"ann", "SEC_ADD_USERTOKEN", of("ann", "<X><OTHER/></X>"), "\"userTokenObject\" holds no USERTOKEN element"},
-        {"ann", "SEC_ADD_USERTOKEN", of("ann", token("t", "soon")),
-         "expirationtimeout 'soon' is not a number of seconds"},
-        {"ann", "SEC_ADD_USERTOKEN", of("ann"), "missing value \"userTokenObject\""},
-        {"ann", "SEC_ADD_USERTOKEN", of("ann", token("abc", "3600", "localhost")), "true"},
-        {"ann", "SEC_USERTOKEN_EXPIRED", of("ann"), "false"},
+        {"SEC_ADD_USERTOKEN", of("ann", token("t", "soon")), "expirationtimeout 'soon' is not a number of seconds"},
+        {"SEC_ADD_USERTOKEN", of("ann", token("abc", "3600", "localhost")), "true"},
         // The dates are the server's, not what the client sent.
-        {"ann", "SEC_GET_USERTOKEN", of("ann"),
+        {"SEC_GET_USERTOKEN", of("ann"),
          reply("SEC_GET_USERTOKEN", R"(<USERTOKEN token="abc" clientaddress="localhost" expirationtimeout="3600" )"
                                     R"(firsttokendate="TIME" lasttokendate="TIME" expirationdate="TIME"/>)")},
-        {"ann", "SEC_UPDATE_USERTOKEN", of("ann", token("ghi", "0")), "true"},
-        {"ann", "SEC_GET_USERTOKEN", of("ann"),
+        {"SEC_UPDATE_USERTOKEN", of("ann", token("ghi", "0")), "true"},
+        {"SEC_GET_USERTOKEN", of("ann"),
          reply("SEC_GET_USERTOKEN", R"(<USERTOKEN token="ghi" clientaddress="" expirationtimeout="0" )"
                                     R"(firsttokendate="TIME" lasttokendate="TIME" expirationdate=""/>)")},
-        {"admin", "SEC_USERTOKEN_EXISTS", of("ghost"), "unknown user account 'ghost'"},
         // A token text belongs to one account only.
-        {"admin", "SEC_ADD_USERTOKEN", of("vic", token("ghi", "60")), "this token text is already in use"},
-        {"admin", "SEC_ADD_USERTOKEN", of("vic", token("elsewhere", "3600", "10.1.2.3")), "true"},
-        {"admin", "SEC_ADD_USERTOKEN", of("aud", token("", "60")), "true"},
+        {"SEC_ADD_USERTOKEN", of("vic", token("ghi", "60")), "this token text is already in use"},
+        {"SEC_ADD_USERTOKEN", of("vic", token("elsewhere", "3600", "10.1.2.3")), "true"},
+        {"SEC_ADD_USERTOKEN", of("aud", token("", "60")), "true"},
+        {"NO_SUCH_COMMAND", {}, "unknown command \"NO_SUCH_COMMAND\""},
     });
     // A token signs in, also after a restart (an empty text got one generated); one bound to another
     // address or expired is refused, and the expiry is kept too.

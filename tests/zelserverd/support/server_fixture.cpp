@@ -52,7 +52,7 @@ std::vector<std::string> entriesOf(const std::string& dir)
 
 bool eventually(const std::function<bool()>& condition)
 {
-    auto deadline = std::chrono::steady_clock::now() + std::chrono::seconds(10);
+    auto deadline = std::chrono::steady_clock::now() + std::chrono::seconds(20);
     while (!condition()) {
         if (std::chrono::steady_clock::now() > deadline)
             return false;
@@ -166,17 +166,10 @@ std::string ServerFixture::userOf(TestClient& client)
 std::map<std::string, std::string> parseResult(const std::string& text)
 {
     std::map<std::string, std::string> entries;
-    std::size_t start = 0;
-    while (start <= text.size()) {
-        std::size_t end = text.find('\0', start);
-        if (end == std::string::npos)
-            end = text.size();
-        std::string entry = text.substr(start, end - start);
-        std::size_t eq = entry.find('=');
-        if (eq != std::string::npos)
+    std::istringstream in(text);
+    for (std::string entry; std::getline(in, entry, '\0');)
+        if (std::size_t eq = entry.find('='); eq != std::string::npos)
             entries[entry.substr(0, eq)] = entry.substr(eq + 1);
-        start = end + 1;
-    }
     return entries;
 }
 
@@ -217,15 +210,11 @@ std::string ServerFixture::jobFile(long id, const std::string& name) const
 
 std::map<std::string, std::string> ServerFixture::waitForEnd(long id)
 {
-    auto deadline = std::chrono::steady_clock::now() + std::chrono::seconds(20);
     std::map<std::string, std::string> last;
-    while (std::chrono::steady_clock::now() < deadline) {
+    eventually([&] {
         last = result(id);
-        const std::string& status = last["jobStatus"];
-        if (status != "QUEUED" && status != "DELAYED" && status != "IN_PROCESS")
-            return last;
-        std::this_thread::sleep_for(std::chrono::milliseconds(20));
-    }
+        return last["jobStatus"] != "QUEUED" && last["jobStatus"] != "DELAYED" && last["jobStatus"] != "IN_PROCESS";
+    });
     return last;
 }
 

@@ -26,7 +26,7 @@ std::string readFile(const std::string& path);
 void writeFile(const std::string& path, const std::string& content);
 // The names in a directory, temporary files included, sorted.
 std::vector<std::string> entriesOf(const std::string& dir);
-// Polls `condition` for up to ten seconds; for what a server thread does after the test's last
+// Polls `condition` for up to twenty seconds; for what a server thread does after the test's last
 // exchange with it (a partial file discarded once a vanished client is noticed, a job ending).
 bool eventually(const std::function<bool()>& condition);
 // A reply document as the server writes it: the declaration, then `elements` as they are.
@@ -60,7 +60,7 @@ protected:
     WireReply addItem(const std::string& name, const std::string& content, const std::string& keyword = "REP_ADD_ITEM");
     // Submits a job as the administrator; its id, or 0 (the reply is kept in lastReply_).
     long submit(const std::string& workspace, const Values& parameters = {}, const Values& extra = {});
-    // Polls until the job has ended (or 20 seconds pass); the last result seen.
+    // Polls until the job has ended (or `eventually` gives up); the last result seen.
     std::map<std::string, std::string> waitForEnd(long id);
     std::map<std::string, std::string> result(long id);
     // The file `name` in the work directory of job `id`.
