@@ -1,12 +1,11 @@
 // The value types handed to callers: strings with embedded NULs, string lists and their token
-// splitters, the owning vector of interface pointers, and the pair dictionaries.
+// splitters, and the owning vector of interface pointers.
 
 #include <gtest/gtest.h>
 
 #include <string>
 #include <vector>
 
-#include "api/StringDict.h"
 #include "api/ZELServerString.h"
 #include "api/ZELServerStringArray.h"
 #include "api/ZELServerVector.h"
@@ -104,21 +103,6 @@ TEST(ServerVector, PlacesItemsIgnoresNullAndDestroysLastFirst)
     EXPECT_EQ(vector.entries(), 0u);
     EXPECT_EQ(destroyed, (std::vector<int>{2, 5, 1, 4}));
     delete last;
-}
-
-TEST(StringDict, ConnectionPropertiesKeepTheFirstValueThePublicDictionaryTheLast)
-{
-    const ZELServerStringArray pairs({"k", "first", "other", "x", "k", "second", "odd"});
-    const zel::StringDict properties(pairs);
-    EXPECT_EQ(properties.entries(), 2u);
-    ASSERT_NE(properties.find("k"), nullptr);
-    EXPECT_EQ(*properties.find("k"), "first");
-    EXPECT_EQ(properties.find("odd"), nullptr);
-
-    const ZELServerStringDict dict = zel::toStringDict(pairs);
-    EXPECT_EQ(dict.entries(), 2u);
-    EXPECT_STREQ(dict.lookup("k"), "second");
-    EXPECT_EQ(dict.lookup("odd"), nullptr);
 }
 
 }  // namespace

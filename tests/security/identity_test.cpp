@@ -1,4 +1,4 @@
-// The signed-in identity: reading it from the server's element and writing it for requests.
+// The signed-in identity: read from the server's element, and written back into every request.
 
 #include <memory>
 #include <string>
@@ -18,8 +18,6 @@ namespace {
 
 using StatusPtr = std::unique_ptr<IZELServerStatus>;
 
-constexpr const char* kDeclaration = R"(<?xml version="1.0" encoding="UTF-8" standalone="no" ?>)";
-
 // Parses `xml` and hands its document element to the identity.
 void readInto(IZELServerIdentity& identity, const std::string& xml)
 {
@@ -29,132 +27,95 @@ void readInto(IZELServerIdentity& identity, const std::string& xml)
     identity.readFromXml(*reader.rootOf()->node());
 }
 
-std::vector<std::string> rolesOf(const IZELServerIdentity& identity)
+// The identity element a request carries, or the failure's number.
+std::string written(const IZELServerIdentity& identity)
 {
-    ZELServerStringArray roles;
-    identity.getRoles(roles);
-    return roles.items();
-}
-
-std::string idOf(const IZELServerIdentity& identity)
-{
-    ZELServerString id("stale");
-    identity.getId(id);
-    return id.str();
-}
-
-TEST(Identity, ReadsIdFlagAndRolesAndReadingAgainReplacesIdAndFlagButAppendsRoles)
-{
-    const struct {
-        const char* xml;
-        const char* id;
-        bool authenticated;
-        std::vector<std::string> roles;
-    } cases[] = {
-        {R"(<IDENTITY id="ann"/>)", "ann", false, {}},
-        {R"(<IDENTITY is_authenticated="Yesterday"/>)", "", true, {}},
-        {R"(<IDENTITY is_authenticated="0.0"/>)", "", false, {}},
-        {R"(<IDENTITY is_authenticated="2.5"/>)", "", true, {}},
-        {R"(<IDENTITY is_authenticated="maybe"/>)", "", false, {}},
-        // Every ROLES child in document order, matched ignoring case, and nothing deeper.
-        {R"(<IDENTITY id="ann" is_authenticated="true"><ROLES><ROLE name="a"/><ROLE name="b"/></ROLES>)"
-         R"(<OTHER><ROLE name="not-a-role"/></OTHER><roles><Role name="c"/><ROLE/><ROLE nom="x"/></roles>)"
-         R"(<ROLES><GROUP><ROLE name="too-deep"/></GROUP></ROLES></IDENTITY>)",
-         "ann",
-         true,
-         {"a", "b", "c"}},
-    };
-    for (const auto& c : cases) {
-        ZELServerIdentity identity;
-        readInto(identity, c.xml);
-        EXPECT_EQ(idOf(identity), c.id) << c.xml;
-        EXPECT_EQ(identity.isAuthenticated(), c.authenticated) << c.xml;
-        EXPECT_EQ(rolesOf(identity), c.roles) << c.xml;
+    XmlDocument doc;
+    StatusPtr(doc.startXml());
+    doc.createDocument("", "R");
+    if (const unsigned failure = IdentityXml(identity).writeXml(doc)) {
+        return std::to_string(failure);
     }
+    std::string out;
+    StatusPtr(doc.serialize(out));
+    return out.substr(out.find("<R>") + 3, out.size() - out.find("<R>") - 7);
+}
+
+TEST(Identity, ReadsIdFlagAndRolesAndWritesThemBack)
+{
+    const std::pair<const char*, const char*> cases[] = {
+        {R"(<IDENTITY id="ann &amp; co"/>)",
+         R"(<IDENTITY id="ann &amp; co" is_authenticated="false"><ROLES/></IDENTITY>)"},
+        {R"(<IDENTITY is_authenticated="Yesterday"/>)",
+         R"(<IDENTITY id="" is_authenticated="true"><ROLES/></IDENTITY>)"},
+        {R"(<IDENTITY is_authenticated="0.0"/>)", R"(<IDENTITY id="" is_authenticated="false"><ROLES/></IDENTITY>)"},
+        {R"(<IDENTITY is_authenticated="2.5"/>)", R"(<IDENTITY id="" is_authenticated="true"><ROLES/></IDENTITY>)"},
+        {R"(<IDENTITY is_authenticated="maybe"/>)", R"(<IDENTITY id="" is_authenticated="false"><ROLES/></IDENTITY>)"},
+        // Every ROLES child in document order, matched ignoring case, and nothing deeper.
+        {R"(<IDENTITY id="a" is_authenticated="true"><ROLES><ROLE name="x"/><ROLE name="y"/></ROLES>)"
+         R"(<OTHER><ROLE name="not-a-role"/></OTHER><roles><Role name="z"/><ROLE/><ROLE nom="x"/></roles>)"
+         R"(<ROLES><GROUP><ROLE name="too-deep"/></GROUP></ROLES></IDENTITY>)",
+         R"(<IDENTITY id="a" is_authenticated="true"><ROLES><ROLE name="x"/><ROLE name="y"/><ROLE name="z"/>)"
+         R"(</ROLES></IDENTITY>)"},
+        // A single sign-on identity is written as a plain one.
+        {R"(<SSO_IDENTITY id="bob" is_authenticated="1" state="IN_PROGRESS"><ROLES><ROLE name="u"/></ROLES>)"
+         R"(</SSO_IDENTITY>)",
+         R"(<IDENTITY id="bob" is_authenticated="true"><ROLES><ROLE name="u"/></ROLES></IDENTITY>)"},
+    };
+    for (const auto& [xml, element] : cases) {
+        ZELServerIdentity plain;
+        ZELServerSingleSignOnIdentity singleSignOn;
+        IZELServerIdentity& identity = std::string(xml).starts_with("<SSO") ? singleSignOn : plain;
+        readInto(identity, xml);
+        EXPECT_EQ(written(identity), element) << xml;
+    }
+    // Reading again replaces id and flag but appends the roles; attribute names are exact.
     ZELServerIdentity identity;
     readInto(identity, R"(<IDENTITY id="ann" is_authenticated="y"><ROLES><ROLE name="r"/></ROLES></IDENTITY>)");
     readInto(identity, R"(<IDENTITY ID="ann" Is_Authenticated="true"><ROLES><ROLE name="r"/></ROLES></IDENTITY>)");
-    EXPECT_EQ(idOf(identity), "");
-    EXPECT_FALSE(identity.isAuthenticated());
-    ZELServerStringArray out(std::vector<std::string>{"kept"});
-    identity.getRoles(out);
-    EXPECT_EQ(out.items(), (std::vector<std::string>{"kept", "r", "r"}));
+    EXPECT_EQ(written(identity),
+              R"(<IDENTITY id="" is_authenticated="false"><ROLES><ROLE name="r"/><ROLE name="r"/></ROLES></IDENTITY>)");
 }
 
-TEST(SingleSignOnIdentity, StateIsExactlyOneOfTheTwoKnownWordsOrOther)
+TEST(SingleSignOnIdentity, StateIsOneOfTheTwoKnownWordsAndTheDataIsHandedOutOnce)
 {
     const std::pair<const char*, unsigned> cases[] = {
-        {R"(<SSO_IDENTITY state="SUCCEEDED"/>)", kSingleSignOnSucceeded},
-        {R"(<SSO_IDENTITY state="IN_PROGRESS"/>)", kSingleSignOnInProgress},
-        {R"(<SSO_IDENTITY state="succeeded"/>)", kSingleSignOnOther},
+        {R"(<SSO_IDENTITY state="SUCCEEDED" auth_data="tok=1&amp;x"/>)", kSingleSignOnSucceeded},
+        {R"(<SSO_IDENTITY state="IN_PROGRESS" auth_data="tok=1&amp;x"/>)", kSingleSignOnInProgress},
+        {R"(<SSO_IDENTITY state="succeeded" auth_data="tok=1&amp;x"/>)", kSingleSignOnOther},
     };
     for (const auto& [xml, state] : cases) {
         ZELServerSingleSignOnIdentity identity;
         readInto(identity, xml);
         EXPECT_EQ(identity.getState(), state) << xml;
+        ZELServerString data("stale");
+        identity.takeAuthData(data);
+        EXPECT_EQ(data.str(), "tok=1&x");
+        identity.takeAuthData(data);
+        EXPECT_EQ(data.str(), "");
     }
 }
 
-// ---- Writing ----------------------------------------------------------------------------------------
-
-// An identity whose fields are set directly, as the request sees any identity: through its getters.
-class FixedIdentity final : public IZELServerIdentity {
+// A caller's own identity, whose text the library cannot write unless it is UTF-8.
+class ForeignIdentity final : public IZELServerIdentity {
 public:
-    FixedIdentity(std::string id, std::vector<std::string> roles, bool authenticated)
-        : id_(std::move(id)), roles_(std::move(roles)), authenticated_(authenticated)
-    {}
-    void getId(IZELServerString& out) const override { out.set(id_.data(), static_cast<unsigned>(id_.size())); }
-    void getRoles(IZELServerStringArray& out) const override
-    {
-        for (const std::string& role : roles_) {
-            out.append(role.c_str());
-        }
-    }
-    bool isAuthenticated() const override { return authenticated_; }
+    ForeignIdentity(std::string id, std::string role) : id_(std::move(id)), role_(std::move(role)) {}
+    void getId(IZELServerString& out) const override { out.assign(id_.c_str()); }
+    void getRoles(IZELServerStringArray& out) const override { out.append(role_.c_str()); }
+    bool isAuthenticated() const override { return true; }
     void readFromXml(const xercesc_3_2::DOMElement&) override {}
 
 private:
     std::string id_;
-    std::vector<std::string> roles_;
-    bool authenticated_;
+    std::string role_;
 };
 
-TEST(IdentityXmlWriting, WritesIdFlagAndRolesInOrderOfAnyIdentityAndOnlyUtf8Text)
+TEST(Identity, AnyIdentityIsWrittenThroughItsGettersAndOnlyAsUtf8)
 {
-    // A single sign-on identity reads the identity's fields too, hands its data out once, and is
-    // written as a plain identity.
-    ZELServerSingleSignOnIdentity singleSignOn;
-    EXPECT_EQ(singleSignOn.getState(), kSingleSignOnOther);
-    readInto(singleSignOn, R"(<SSO_IDENTITY id="bob" is_authenticated="1" state="IN_PROGRESS" auth_data="tok=1&amp;x">)"
-                           R"(<ROLES><ROLE name="user"/></ROLES></SSO_IDENTITY>)");
-    ZELServerString data("stale");
-    singleSignOn.takeAuthData(data);
-    EXPECT_EQ(data.str(), "tok=1&x");
-    singleSignOn.takeAuthData(data);
-    EXPECT_EQ(data.str(), "");
-    const FixedIdentity withRoles("ann & co", {"admin", "dev", "admin"}, true);
-    const FixedIdentity bare("", {}, false);
-    const std::pair<const IZELServerIdentity*, std::string> cases[] = {
-        {&withRoles, R"(<IDENTITY id="ann &amp; co" is_authenticated="true"><ROLES><ROLE name="admin"/>)"
-                     R"(<ROLE name="dev"/><ROLE name="admin"/></ROLES></IDENTITY>)"},
-        {&bare, R"(<IDENTITY id="" is_authenticated="false"><ROLES/></IDENTITY>)"},
-        {&singleSignOn, R"(<IDENTITY id="bob" is_authenticated="true"><ROLES><ROLE name="user"/></ROLES></IDENTITY>)"},
-    };
-    for (const auto& [identity, element] : cases) {
-        XmlDocument doc;
-        ASSERT_EQ(StatusPtr(doc.startXml()), nullptr);
-        ASSERT_NE(doc.createDocument("", "REP_GET_REPOSITORIES"), nullptr);
-        EXPECT_EQ(IdentityXml(*identity).writeXml(doc), 0u);
-        std::string out;
-        ASSERT_EQ(StatusPtr(doc.serialize(out)), nullptr);
-        EXPECT_EQ(out, std::string(kDeclaration) + "<REP_GET_REPOSITORIES>" + element + "</REP_GET_REPOSITORIES>");
-    }
-    // Text that is not UTF-8 cannot be written.
-    XmlDocument doc;
-    ASSERT_EQ(StatusPtr(doc.startXml()), nullptr);
-    ASSERT_NE(doc.createDocument("", "REP_GET_REPOSITORIES"), nullptr);
-    EXPECT_EQ(IdentityXml(FixedIdentity("caf\xE9", {}, true)).writeXml(doc), msg::kXmlFailure);
-    EXPECT_EQ(IdentityXml(FixedIdentity("ann", {"\xFF"}, true)).writeXml(doc), msg::kXmlFailure);
+    EXPECT_EQ(written(ForeignIdentity("caf\xC3\xA9", "r")),
+              "<IDENTITY id=\"caf\xC3\xA9\" is_authenticated=\"true\"><ROLES><ROLE name=\"r\"/></ROLES></IDENTITY>");
+    EXPECT_EQ(written(ForeignIdentity("caf\xE9", "r")), std::to_string(msg::kXmlFailure));
+    EXPECT_EQ(written(ForeignIdentity("ann", "\xFF")), std::to_string(msg::kXmlFailure));
 }
 
 }  // namespace
