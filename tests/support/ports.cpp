@@ -5,30 +5,21 @@
 
 namespace zeltest {
 
-// Exclusive, so that on Winsock a later socket asking for address reuse cannot bind over it either.
-ClosedPort::ClosedPort() : socket(openTcpSocket())
-{
-    std::optional<std::uint16_t> port;
-    if (socket.valid() && setExclusiveAddress(socket) && bindTo(socket, kLoopback, 0)) {
-        port = localPort(socket);
-    }
-    if (!port) {
-        throw std::runtime_error("closed port: cannot bind: " + socketErrorText(lastSocketError()));
-    }
-    number = *port;
-}
+namespace {
 
-std::uint16_t releasedPort()
+std::uint16_t portOf(const Socket& socket)
 {
-    const Socket socket = openTcpSocket();
-    std::optional<std::uint16_t> port;
-    if (socket.valid() && bindTo(socket, kLoopback, 0)) {
-        port = localPort(socket);
-    }
+    const std::optional<std::uint16_t> port = socket.valid() ? localPort(socket) : std::nullopt;
     if (!port) {
-        throw std::runtime_error("released port: cannot bind: " + socketErrorText(lastSocketError()));
+        throw std::runtime_error("cannot bind a loopback port: " + socketErrorText(lastSocketError()));
     }
     return *port;
 }
+
+}  // namespace
+
+ClosedPort::ClosedPort() : socket(boundOnLoopback()), number(portOf(socket)) {}
+
+std::uint16_t releasedPort() { return portOf(boundOnLoopback()); }
 
 }  // namespace zeltest

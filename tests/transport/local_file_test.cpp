@@ -1,64 +1,56 @@
-// The local file of a transfer: opening for either direction, size, chunked reading and writing,
-// and the checksum read afresh from disk.
+// The local file of a transfer: opening for either direction, size, and the checksum read afresh
+// from disk.
 
 #include "transport/LocalFile.h"
 
 #include <cstdint>
 #include <filesystem>
 #include <fstream>
-#include <iterator>
 #include <optional>
 #include <string>
 
 #include <gtest/gtest.h>
 
 #include "support/environment.h"
-#include "support/helpers.h"
 #include "support/fake_server.h"
+#include "support/helpers.h"
 
 namespace zel {
 namespace {
 
 namespace fs = std::filesystem;
-
-// The fake server's bitwise CRC-32 checks the library's table-driven one.
-using zeltest::crc32;
-using zeltest::pattern;
 using zeltest::slurp;
 
 class LocalFileTest : public ::testing::Test {
 protected:
     std::string make(const std::string& name, const std::string& content) const
     {
-        const fs::path path = dir / name;
-        std::ofstream(path, std::ios::binary) << content;
-        return path.string();
+        zeltest::spew(dir / name, content);
+        return (dir / name).string();
     }
     const zeltest::TempDir scratch{"zel-localfile"};
     const fs::path dir{scratch.path()};
 };
 
-TEST_F(LocalFileTest, OpenFailsForAMissingFileOrAnUnwritablePath)
+TEST_F(LocalFileTest, EachModeOpensOnlyWhatItCanAndRefusesTheOtherDirection)
 {
     EXPECT_FALSE(LocalFile((dir / "absent").string(), LocalFile::Mode::Read).isOpen());
-    EXPECT_FALSE(LocalFile((dir / "no" / "such" / "dir" / "f").string(), LocalFile::Mode::Write).isOpen());
+    EXPECT_FALSE(LocalFile((dir / "no" / "dir" / "f").string(), LocalFile::Mode::Write).isOpen());
     EXPECT_FALSE(fs::exists(dir / "absent"));
-}
 
-TEST_F(LocalFileTest, WriteModeCreatesOrEmptiesTheFile)
-{
-    const std::string path = make("f", "old content");
-    LocalFile file(path, LocalFile::Mode::Write);
-    ASSERT_TRUE(file.isOpen());
-    EXPECT_EQ(fs::file_size(path), 0u);
-    EXPECT_TRUE(file.write("new", 3));
-    EXPECT_TRUE(file.close());
-    EXPECT_FALSE(file.isOpen());
-    EXPECT_EQ(slurp(path), "new");
+    LocalFile reader(make("r", "abc"), LocalFile::Mode::Read);
+    EXPECT_FALSE(reader.write("x", 1));
+    EXPECT_EQ(slurp(reader.path()), "abc");
 
-    LocalFile fresh((dir / "created").string(), LocalFile::Mode::Write);
-    EXPECT_TRUE(fresh.isOpen());
-    EXPECT_TRUE(fs::exists(dir / "created"));
+    LocalFile writer(make("w", "old content"), LocalFile::Mode::Write);
+    ASSERT_TRUE(writer.isOpen());
+    EXPECT_EQ(fs::file_size(dir / "w"), 0u);
+    char byte;
+    EXPECT_EQ(writer.read(&byte, 1), std::nullopt);
+    EXPECT_TRUE(writer.write("new", 3));
+    EXPECT_TRUE(writer.close());
+    EXPECT_FALSE(writer.isOpen());
+    EXPECT_EQ(slurp(dir / "w"), "new");
 }
 
 TEST_F(LocalFileTest, SizeOfAFileBeyondFourGibibytes)
@@ -70,57 +62,30 @@ TEST_F(LocalFileTest, SizeOfAFileBeyondFourGibibytes)
     if (error) {
         GTEST_SKIP() << "no sparse files here: " << error.message();
     }
-    LocalFile file(path, LocalFile::Mode::Read);
-    EXPECT_EQ(file.size(), std::optional<std::uint64_t>(size));
+    EXPECT_EQ(LocalFile(path, LocalFile::Mode::Read).size(), std::optional<std::uint64_t>(size));
 }
 
-TEST_F(LocalFileTest, EachDirectionRefusesTheOther)
+// The fake server's bitwise CRC-32 checks the library's table-driven one.
+TEST_F(LocalFileTest, ChecksumIsTheStandardCrc32ReadAfreshThroughThePath)
 {
-    LocalFile reader(make("r", "abc"), LocalFile::Mode::Read);
-    EXPECT_FALSE(reader.write("x", 1));
-    EXPECT_EQ(slurp(reader.path()), "abc");
-
-    LocalFile writer((dir / "w").string(), LocalFile::Mode::Write);
-    char byte;
-    EXPECT_EQ(writer.read(&byte, 1), std::nullopt);
-}
-
-TEST_F(LocalFileTest, ChecksumMatchesTheStandardCrc32)
-{
-    struct Case {
-        const char* name;
-        std::string content;
-        std::uint32_t crc;
-    };
-    const Case cases[] = {
-        {"empty", "", 0},
-        {"check value", "123456789", 0xCBF43926u},
-        {"one byte", "a", 0xE8B7BE43u},
-    };
-    for (const Case& c : cases) {
-        LocalFile file(make(c.name, c.content), LocalFile::Mode::Read);
-        EXPECT_EQ(file.crc32(), std::optional<std::uint32_t>(c.crc)) << c.name;
-    }
+    EXPECT_EQ(LocalFile(make("empty", ""), LocalFile::Mode::Read).crc32(), std::optional<std::uint32_t>(0));
+    EXPECT_EQ(LocalFile(make("check", "123456789"), LocalFile::Mode::Read).crc32(),
+              std::optional<std::uint32_t>(0xCBF43926u));
     // Longer than any block size the checksum pass could use, and not a multiple of one.
-    const std::string big = pattern(1234567);
-    LocalFile file(make("big", big), LocalFile::Mode::Read);
-    EXPECT_EQ(file.crc32(), std::optional<std::uint32_t>(crc32(big)));
-}
+    const std::string big = zeltest::pattern(1234567);
+    EXPECT_EQ(LocalFile(make("big", big), LocalFile::Mode::Read).crc32(), zeltest::crc32(big));
 
-TEST_F(LocalFileTest, ChecksumReadsTheFileAfreshThroughItsPath)
-{
     const std::string path = make("f", "first");
     LocalFile file(path, LocalFile::Mode::Read);
     char buffer[2];
     ASSERT_EQ(file.read(buffer, 2), std::optional<std::size_t>(2));
     std::ofstream(path, std::ios::binary | std::ios::app) << "-and-more";
-    EXPECT_EQ(file.crc32(), std::optional<std::uint32_t>(crc32("first-and-more")));
+    EXPECT_EQ(file.crc32(), std::optional<std::uint32_t>(zeltest::crc32("first-and-more")));
     // The open stream is not disturbed by the checksum pass.
     ASSERT_EQ(file.read(buffer, 2), std::optional<std::size_t>(2));
     EXPECT_EQ(std::string(buffer, 2), "rs");
-
-    // Windows refuses to remove a file that is open, so the stream goes first; the checksum still
-    // goes by the path, and finds nothing there.
+    // Windows refuses to remove an open file, so the stream goes first; the checksum still goes by
+    // the path, and finds nothing there.
     ASSERT_TRUE(file.close());
     ASSERT_TRUE(fs::remove(path));
     EXPECT_EQ(file.crc32(), std::nullopt);

@@ -25,9 +25,7 @@ TEST(WireFrame, PrefixIsBigEndianLengthFollowedByThePayload)
     };
     const Case cases[] = {
         {"", "\0\0\0\0"s},
-        {"abc", "\0\0\0\x03"s},
         {"a\0b"s, "\0\0\0\x03"s},
-        {std::string(255, 'x'), "\0\0\0\xFF"s},
         {std::string(256, 'x'), "\0\0\x01\x00"s},
         {std::string(70000, 'x'), "\0\x01\x11\x70"s},
     };
@@ -45,12 +43,9 @@ TEST(WireFrame, DecodesEveryBitOfThePrefix)
         std::uint32_t length;
     };
     const Case cases[] = {
-        {{0, 0, 0, 0}, 0},
-        {{0, 0, 0, 0x46}, 70},
         {{0x01, 0x02, 0x03, 0x04}, 0x01020304u},
         {{0x80, 0, 0, 0}, 0x80000000u},
         {{0xFF, 0xFF, 0xFF, 0xFF}, 0xFFFFFFFFu},
-        {{0, 0x01, 0x11, 0x70}, 70000},
     };
     for (const Case& c : cases) {
         EXPECT_EQ(decodeLength(c.prefix), c.length);
@@ -66,17 +61,14 @@ TEST(WireReply, SplitsIntoStatusWordAndBody)
     };
     const Case cases[] = {
         {"plain", "SUCCESS\0<R/>"s, Reply{"SUCCESS", "<R/>"}},
-        {"error", "ERROR\0oops"s, Reply{"ERROR", "oops"}},
         {"any word", "MAYBE\0x"s, Reply{"MAYBE", "x"}},
         {"leading NULs skipped", "\0\0SUCCESS\0a"s, Reply{"SUCCESS", "a"}},
         {"body keeps its NULs", "SUCCESS\0a\0b\0"s, Reply{"SUCCESS", "a\0b\0"s}},
         {"body starting with NUL kept verbatim", "SUCCESS\0\0x"s, Reply{"SUCCESS", "\0x"s}},
-        {"blank body counts", "ERROR\0 "s, Reply{"ERROR", " "}},
         {"no NUL", "SUCCESS"s, std::nullopt},
         {"nothing after the NUL", "SUCCESS\0"s, std::nullopt},
         {"only NULs after the word", "SUCCESS\0\0\0"s, std::nullopt},
         {"empty payload", ""s, std::nullopt},
-        {"only a NUL", "\0"s, std::nullopt},
     };
     for (const Case& c : cases) {
         const std::optional<Reply> reply = splitReply(c.payload);
@@ -88,15 +80,11 @@ TEST(WireReply, SplitsIntoStatusWordAndBody)
     }
 }
 
-TEST(WireFileHeader, Encodes)
+TEST(WireFileHeader, EncodesAndParses)
 {
-    EXPECT_EQ(encodeFileHeader({0, 0}), "fileLength=0\0fileCRC=0"s);
     EXPECT_EQ(encodeFileHeader({12, 3421780262u}), "fileLength=12\0fileCRC=3421780262"s);
-    EXPECT_EQ(encodeFileHeader({0xFFFFFFFFu, 0xFFFFFFFFu}), "fileLength=4294967295\0fileCRC=4294967295"s);
-}
+    EXPECT_EQ(encodeFileHeader({0xFFFFFFFFu, 0}), "fileLength=4294967295\0fileCRC=0"s);
 
-TEST(WireFileHeader, Parses)
-{
     struct Case {
         const char* name;
         std::string payload;
@@ -106,7 +94,6 @@ TEST(WireFileHeader, Parses)
     };
     const Case cases[] = {
         {"decimal", "fileLength=12\0fileCRC=34"s, HeaderParse::Header, 12, 34},
-        {"zero", "fileLength=0\0fileCRC=0"s, HeaderParse::Header, 0, 0},
         {"largest", "fileLength=4294967295\0fileCRC=4294967295"s, HeaderParse::Header, 0xFFFFFFFFu, 0xFFFFFFFFu},
         {"hexadecimal", "fileLength=0x1F\0fileCRC=0XfF"s, HeaderParse::Header, 31, 255},
         {"leading zero is not octal", "fileLength=010\0fileCRC=1"s, HeaderParse::Header, 10, 1},
@@ -116,9 +103,7 @@ TEST(WireFileHeader, Parses)
         {"prefixes cut by length", "XXXXXXXXXXX5\0YYYYYYYY6"s, HeaderParse::Header, 5, 6},
         {"leading NULs skipped", "\0\0fileLength=3\0fileCRC=4"s, HeaderParse::Header, 3, 4},
         {"length overflows", "fileLength=4294967296\0fileCRC=1"s, HeaderParse::Unusable},
-        {"crc overflows", "fileLength=1\0fileCRC=0x100000000"s, HeaderParse::Unusable},
         {"empty length", "fileLength=\0fileCRC=1"s, HeaderParse::Unusable},
-        {"blank length", "fileLength=  \0fileCRC=1"s, HeaderParse::Unusable},
         {"empty crc", "fileLength=1\0fileCRC="s, HeaderParse::Unusable},
         {"trailing text", "fileLength=12abc\0fileCRC=1"s, HeaderParse::Unusable},
         {"real fraction", "fileLength=7.5\0fileCRC=1"s, HeaderParse::Unusable},
@@ -127,10 +112,8 @@ TEST(WireFileHeader, Parses)
         {"crc part shorter than its prefix", "fileLength=1\0CRC=1"s, HeaderParse::Unusable},
         {"more fields behind the crc", "fileLength=1\0fileCRC=1\0junk"s, HeaderParse::Unusable},
         {"a plain reply", "SUCCESS\0false"s, HeaderParse::Unusable},
-        {"an error reply", "ERROR\0no such file"s, HeaderParse::Unusable},
         {"no NUL", "fileLength=12"s, HeaderParse::NotTwoParts},
         {"nothing after the NUL", "fileLength=12\0"s, HeaderParse::NotTwoParts},
-        {"empty", ""s, HeaderParse::NotTwoParts},
     };
     for (const Case& c : cases) {
         const FileHeaderReading reading = parseFileHeader(c.payload);
@@ -152,15 +135,12 @@ TEST(WireServerError, ClassifiesByPrefixAtTheVeryStart)
     const Case cases[] = {
         {"Authentication Error: bad password", ServerErrorKind::Authentication, "bad password"},
         {"Authorization Error: no rights", ServerErrorKind::Authorization, "no rights"},
-        {"Authentication Error: ", ServerErrorKind::Authentication, ""},
         {"Authorization Error: Authentication Error: x", ServerErrorKind::Authorization, "Authentication Error: x"},
         {"Failed. Authentication Error: x", ServerErrorKind::Plain, "Failed. Authentication Error: x"},
         {" Authorization Error: x", ServerErrorKind::Plain, " Authorization Error: x"},
         {"authorization error: x", ServerErrorKind::Plain, "authorization error: x"},
         {"Authorization Error:x", ServerErrorKind::Plain, "Authorization Error:x"},
-        {"Authentication Error", ServerErrorKind::Plain, "Authentication Error"},
         {"disk full", ServerErrorKind::Plain, "disk full"},
-        {"", ServerErrorKind::Plain, ""},
         {"a\0b"s, ServerErrorKind::Plain, "a\0b"s},
     };
     for (const Case& c : cases) {
@@ -182,12 +162,10 @@ TEST(WireAcknowledgement, OnlyTheExactReadyReplyLetsATransferGoOn)
         {"\0SUCCESS\0ready_to_transfer"s, AckOutcome::Ready, ""},
         {"SUCCESS\0ready_to_transfer "s, AckOutcome::Refused, "ready_to_transfer "},
         {"SUCCESS\0ready_to_transfer\0"s, AckOutcome::Refused, "ready_to_transfer\0"s},
-        {"SUCCESS\0false"s, AckOutcome::Refused, "false"},
         {"success\0ready_to_transfer"s, AckOutcome::Refused, "ready_to_transfer"},
         {"ERROR\0Authorization Error: no"s, AckOutcome::Refused, "Authorization Error: no"},
         {"SUCCESS"s, AckOutcome::NotTwoParts, ""},
         {"SUCCESS\0"s, AckOutcome::NotTwoParts, ""},
-        {""s, AckOutcome::NotTwoParts, ""},
     };
     for (const Case& c : cases) {
         const AckReading ack = readAcknowledgement(c.payload);
