@@ -3,7 +3,6 @@
 #include "transport/TcpSocket.h"
 
 #include <chrono>
-#include <cstring>
 #include <memory>
 #include <string>
 #include <thread>
@@ -169,27 +168,6 @@ TEST(TcpSocket, PortHeldByAnotherListenerGivesBindFailedAndKeepsTheStartUp)
     EXPECT_EQ(same, port);
     // The failed listener never gives its start-up count back.
     EXPECT_EQ(TcpSocket::socketLibraryUsers(), usersBefore + 1);
-}
-
-TEST(TcpSocket, LocalAddressIsWrittenOnlyWhenItFits)
-{
-    std::uint16_t port = 0;
-    TcpSocket socket(port);
-    char text[64];
-    std::memset(text, 'x', sizeof text);
-    socket.localHostAddress(text, sizeof text);
-    const std::string address = text;
-    ASSERT_TRUE(zeltest::parseDottedAddress(address).has_value()) << address;
-    std::memset(text, 'x', sizeof text);
-    socket.localHostAddress(text, static_cast<std::int32_t>(address.size() + 1));
-    EXPECT_EQ(std::string(text), address);
-    socket.localHostAddress(text, static_cast<std::int32_t>(address.size()));
-    EXPECT_EQ(text[0], '\0');
-    text[0] = 'x';
-    socket.localHostAddress(text, 0);
-    socket.localHostAddress(text, -3);
-    socket.localHostAddress(nullptr, 64);
-    EXPECT_EQ(text[0], 'x');
 }
 
 TEST(TcpSocket, SocketsStartTheLibraryOnceAndCleanUpAfterTheLast)

@@ -36,22 +36,6 @@ TEST(WireFrame, PrefixIsBigEndianLengthFollowedByThePayload)
     }
 }
 
-TEST(WireFrame, DecodesEveryBitOfThePrefix)
-{
-    struct Case {
-        unsigned char prefix[4];
-        std::uint32_t length;
-    };
-    const Case cases[] = {
-        {{0x01, 0x02, 0x03, 0x04}, 0x01020304u},
-        {{0x80, 0, 0, 0}, 0x80000000u},
-        {{0xFF, 0xFF, 0xFF, 0xFF}, 0xFFFFFFFFu},
-    };
-    for (const Case& c : cases) {
-        EXPECT_EQ(decodeLength(c.prefix), c.length);
-    }
-}
-
 TEST(WireReply, SplitsIntoStatusWordAndBody)
 {
     struct Case {
