@@ -2,18 +2,13 @@
 
 #include <atomic>
 #include <chrono>
-#include <random>
 #include <stdexcept>
 
 #if defined(_WIN32)
 #include <windows.h>
+#endif
 
 #include <cstdlib>
-#include <process.h>
-#else
-#include <cstdlib>
-#include <unistd.h>
-#endif
 
 namespace zeltest {
 
@@ -56,27 +51,22 @@ ScopedEnv::ScopedEnv(const char* name, std::optional<std::string> value) : name_
 
 ScopedEnv::~ScopedEnv() { setEnv(name_.c_str(), old_); }
 
+// Named by the clock and a counter; a folder that exists already (another process chose the same
+// name) is not taken, since create_directory answers false for it.
 std::filesystem::path makeTempDir(const std::string& prefix)
 {
     namespace fs = std::filesystem;
     static std::atomic<unsigned> counter{0};
-#if defined(_WIN32)
-    const auto pid = static_cast<unsigned long>(::_getpid());
-#else
-    const auto pid = static_cast<unsigned long>(::getpid());
-#endif
-    std::mt19937_64 random(static_cast<std::uint64_t>(std::chrono::steady_clock::now().time_since_epoch().count()));
-    const fs::path base = fs::temp_directory_path();
+    const auto stamp = std::chrono::steady_clock::now().time_since_epoch().count();
     for (int attempt = 0; attempt < 100; ++attempt) {
-        const fs::path candidate = base / (prefix + "-" + std::to_string(pid) + "-" + std::to_string(counter++) + "-" +
-                                           std::to_string(random() % 1000000));
+        const fs::path candidate =
+            fs::temp_directory_path() / (prefix + "-" + std::to_string(stamp) + "-" + std::to_string(counter++));
         std::error_code error;
-        // create_directory answers false, without an error, when the folder was there already.
         if (fs::create_directory(candidate, error)) {
             return candidate;
         }
     }
-    throw std::runtime_error("cannot create a temporary folder under " + base.string());
+    throw std::runtime_error("cannot create a temporary folder under " + fs::temp_directory_path().string());
 }
 
 TempDir::TempDir(const std::string& prefix) : path_(makeTempDir(prefix)) {}

@@ -1,24 +1,13 @@
 #pragma once
-// A scriptable server on loopback for the wire tests of the channel and of every manager.
+// A scriptable server on loopback for the wire tests. It frames, encodes and decodes with its own
+// code and includes nothing from the library, so that a misunderstanding of the protocol cannot hide
+// by being shared between the library and its tests.
 //
-// It speaks the framing (4-byte big-endian length, then the payload) with its own socket code and
-// its own encoder and decoder, and includes nothing from the library, so that a misunderstanding of
-// the protocol cannot hide by being shared between the library and its tests.
-//
-//     zeltest::FakeServer server;
-//     server.exchange(zeltest::request("SERVER_SESSION_INIT", {{"clientID", ""}, {"userID", "ann"}}),
-//                     zeltest::reply("SUCCESS", sessionDocument));
-//     server.start();
-//     ... let the code under test connect to 127.0.0.1:server.port() ...
-//     EXPECT_TRUE(server.verify());      // waits for the script, ends the run, reports the first mismatch
-//
-// The steps run in order on one thread. The first step that needs a connection accepts the first
-// one; later connections are taken only by acceptNext(). Every wait is bounded (5 s a step), so a
-// broken test fails instead of hanging. On the first failure the script stops and every connection
-// is closed at once, which releases a client blocked in a read. After the last step the connection
-// stays open until finish() (at most 10 s), so the client can go on using it. Bytes the client sent
-// that no step read fail the run when the connection closes, and so does a connection that the
-// script never accepted.
+// The steps run in order on one thread; the first step that needs a connection accepts the first
+// one, later ones only acceptNext(). Every wait is bounded (5 s a step). On the first failure the
+// script stops and every connection closes at once, releasing a client blocked in a read. After the
+// last step the connection stays open until finish() (at most 10 s). Bytes the client sent that no
+// step read fail the run, and so does a connection that the script never accepted.
 
 #include <condition_variable>
 #include <cstddef>
@@ -56,10 +45,7 @@ Bytes frame(std::string_view payload);
 // CRC-32 as zip and zlib compute it.
 std::uint32_t crc32(std::string_view data);
 
-// The payload split at every NUL (an empty payload gives one empty field).
-std::vector<Bytes> fields(std::string_view payload);
 struct ParsedRequest {
-    Bytes version;  // the text after "APIVERSION="
     Bytes keyword;
     Values values;  // every "name=value" after the keyword, in order
 };

@@ -169,27 +169,3 @@ TEST(TcpSocket, PortHeldByAnotherListenerGivesBindFailedAndKeepsTheStartUp)
     // The failed listener never gives its start-up count back.
     EXPECT_EQ(TcpSocket::socketLibraryUsers(), usersBefore + 1);
 }
-
-TEST(TcpSocket, SocketsStartTheLibraryOnceAndCleanUpAfterTheLast)
-{
-    const std::uint32_t users = TcpSocket::socketLibraryUsers();
-    const std::uint32_t startups = TcpSocket::socketLibraryStartups();
-    const std::uint32_t cleanups = TcpSocket::socketLibraryCleanups();
-    // Only a process with no live socket starts and cleans up; otherwise the counts must not move.
-    const std::uint32_t firstUse = users == 0 ? 1 : 0;
-    {
-        std::uint16_t port1 = 0;
-        std::uint16_t port2 = 0;
-        TcpSocket first(port1);
-        TcpSocket second(port2);
-        EXPECT_EQ(TcpSocket::socketLibraryUsers(), users + 2);
-        EXPECT_EQ(TcpSocket::socketLibraryStartups(), startups + firstUse);
-        first.close();
-        first.close();
-        EXPECT_EQ(TcpSocket::socketLibraryUsers(), users + 1);
-        EXPECT_EQ(TcpSocket::socketLibraryCleanups(), cleanups);
-    }
-    EXPECT_EQ(TcpSocket::socketLibraryUsers(), users);
-    EXPECT_EQ(TcpSocket::socketLibraryCleanups(), cleanups + firstUse);
-    EXPECT_EQ(TcpSocket::socketLibraryStartups(), startups + firstUse);
-}

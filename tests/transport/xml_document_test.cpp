@@ -76,25 +76,18 @@ TEST_F(XmlDocumentTest, RefusedNamesTextAndChildrenLeaveTheTreeUnchanged)
     EXPECT_EQ(written(), kDeclaration + "<R><C/></R>");
 }
 
-TEST_F(XmlDocumentTest, FailedSerialisationLeavesTheOutputAlone)
+// A document that was released writes nothing and takes no new element until a new one is made.
+TEST_F(XmlDocumentTest, ReleasedDocumentWritesNothing)
 {
-    XmlElement* root = doc.createDocument("", "R");
-    ASSERT_TRUE(root != nullptr && root->setAttribute("a", "bell\x07"));
-    std::string out = "untouched";
-    StatusPtr failure(doc.serialize(out));
-    ASSERT_NE(failure, nullptr);
-    EXPECT_EQ(failure->getMessageNumber(), msg::kSerializeFailed);
-    EXPECT_NE(std::string(failure->getMessage()).find("illegal XML character"), std::string::npos)
-        << failure->getMessage();
-
+    ASSERT_NE(doc.createDocument("", "R"), nullptr);
     doc.releaseDocument();
     EXPECT_EQ(doc.documentElement(), nullptr);
     EXPECT_EQ(doc.createElement("C"), nullptr);
-    failure.reset(doc.serialize(out));
+    std::string out = "untouched";
+    const StatusPtr failure(doc.serialize(out));
     ASSERT_NE(failure, nullptr);
     EXPECT_EQ(failure->getMessageNumber(), msg::kSerializeFailed);
     EXPECT_EQ(out, "untouched");
-
     ASSERT_NE(doc.createDocument("", "NEXT"), nullptr);
     EXPECT_EQ(written(), kDeclaration + "<NEXT/>");
 }
