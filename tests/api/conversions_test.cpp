@@ -1,15 +1,20 @@
-// Number and truth-value texts from the wire: what each reader accepts, what it keeps when text
-// follows the number, and where it overflows.
+// Texts from the wire: what each number and truth-value reader accepts, what it keeps when text
+// follows the number and where it overflows; and how a reply is cut into status word and body.
 
 #include <gtest/gtest.h>
 
 #include <cstdint>
 #include <optional>
 #include <string>
+#include <vector>
 
 #include "api/conversions.h"
+#include "api/text_split.h"
 
 namespace {
+
+using namespace std::string_literals;
+using Parts = std::vector<std::string>;
 
 template <class T>
 std::string shown(const zel::NumberReading<T>& r)
@@ -81,18 +86,21 @@ TEST(BooleanConversion, FirstLetterThenNumber)
     }
 }
 
-TEST(FloatConversion, OrdinaryDecimalNotationOnly)
+// How the transport cuts a reply: the status word, then the body verbatim.
+TEST(SplitOnce, StatusWordThenTheBodyVerbatim)
 {
-    const struct {
-        std::string text;
-        std::optional<float> expected;
-    } cases[] = {
-        {" -2.25 ", -2.25f},    {"1e3", 1000.0f},        {".25", 0.25f},         {"", std::nullopt},
-        {"inf", std::nullopt},  {"nan", std::nullopt},   {"1.5x", std::nullopt}, {"+-1", std::nullopt},
-        {"1e39", std::nullopt}, {"0x1p3", std::nullopt}, {"1 2", std::nullopt},
+    const std::pair<std::string, Parts> cases[] = {
+        {"SUCCESS\0<R/>"s, {"SUCCESS", "<R/>"}},
+        {"\0\0SUCCESS\0a\0b"s, {"SUCCESS", "a\0b"s}},  // leading NULs skipped, the body keeps its NULs
+        {"SUCCESS\0\0body\0"s, {"SUCCESS", "\0body\0"s}},
+        {"SUCCESS\0"s, {"SUCCESS"}},
+        {"\0\0"s, {}},
     };
-    for (const auto& c : cases) {
-        EXPECT_EQ(zel::toFloat(c.text), c.expected) << c.text;
+    for (const auto& [text, expected] : cases) {
+        Parts out{"kept"};
+        EXPECT_EQ(zel::splitOnce(text, "\0"s, 2, out), expected.size()) << text;
+        out.erase(out.begin());
+        EXPECT_EQ(out, expected) << text;
     }
 }
 

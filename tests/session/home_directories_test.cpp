@@ -1,6 +1,6 @@
 // Home directory discovery. The tests link the library statically, so the "module" whose folder
 // is the fallback home is the test program, which the build places beside the catalogue. The
-// Windows-only lookups (registry, a loaded DLL) are in home_directories_windows_test.cpp.
+// Windows-only lookups (a loaded DLL) are in home_directories_windows_test.cpp.
 
 #include "session/home_directories.h"
 
@@ -37,21 +37,6 @@ TEST(HomeDirectories, LibraryHomeIsTheVariableWithASeparatorOrTheModuleFolder)
     }
     ScopedEnv empty("ZEL_SERVERAPI_HOME", "");
     EXPECT_EQ(zel::serverLibraryHomeDirectory(), zeltest::programFolder());
-}
-
-TEST(HomeDirectories, FrameworkHomeTakesTheOverrideOnceThenTheCallerThenZelHomeAndKeepsTheResult)
-{
-    ScopedEnv override("ZEL_HOME_OVERRIDE", native("/opt/override"));
-    ScopedEnv zelHome("ZEL_HOME", native("/opt/zelhome"));
-    EXPECT_EQ(zel::frameworkHomeDirectory(native("/opt/caller")), native("/opt/override/"));
-    EXPECT_EQ(env("ZEL_HOME_OVERRIDE"), std::optional<std::string>(""));
-    EXPECT_EQ(env("ZEL_HOME"), native("/opt/override/"));
-    EXPECT_EQ(zel::frameworkHomeDirectory(native("/opt/caller")), native("/opt/caller/"));
-    zeltest::setEnv("ZEL_HOME", native("/opt/zelhome"));
-    EXPECT_EQ(zel::frameworkHomeDirectory(), native("/opt/zelhome/"));
-    // A search that finds nothing new keeps the earlier result, even with ZEL_HOME gone.
-    zeltest::setEnv("ZEL_HOME", std::nullopt);
-    EXPECT_EQ(zel::frameworkHomeDirectory(), native("/opt/zelhome/"));
 }
 
 TEST(HomeDirectories, FrameworkHomeIsTheModuleFolderWhenNothingIsSet)

@@ -1,7 +1,6 @@
-// Home directory discovery as only Windows has it: the machine-wide registry behind the framework
-// home, backslash separators, and homes taken from the file names of loaded DLLs. The test program
-// links the library statically; a test that needs the library as a DLL loads zelserverapi.dll (or a
-// copy of it) beside that.
+// Home directory discovery as only Windows has it: backslash separators, and homes taken from the
+// file names of loaded DLLs. The test program links the library statically; a test that needs the
+// library as a DLL loads zelserverapi.dll (or a copy of it) beside that.
 
 #if defined(_WIN32)
 
@@ -11,7 +10,6 @@
 #include <gtest/gtest.h>
 #include <zelserverapi/ZELServerOwned.h>
 
-#include <cstdlib>
 #include <filesystem>
 #include <memory>
 #include <string>
@@ -66,32 +64,6 @@ std::string statusTextHere(unsigned number)
 {
     std::unique_ptr<IZELServerStatus> status(zel::makeStatus(number));
     return status ? status->getMessage() : std::string("(no status)");
-}
-
-// The values scripts/wine-prefix.sh writes into every test prefix.
-TEST(WindowsRegistry, TextValuesUnderTheMachineKeyAreReadAndAnythingElseIsEmpty)
-{
-    const std::pair<const char*, const char*> cases[] = {
-        {"SOFTWARE\\Corvane\\Quorlith", "C:\\zel\\product\\"},
-        {"SOFTWARE\\Corvane\\Quorlith\\BUILD\\18286", "C:\\zel\\build18286\\"},
-        {"SOFTWARE\\Corvane\\Quorlith\\Expandable", "C:\\zel\\expandable\\"},
-        {"SOFTWARE\\Corvane\\Quorlith\\Numbers", ""},  // not text
-        {"SOFTWARE\\Corvane\\Quorlith\\BUILD", ""},    // only a path to the build number
-        {"SOFTWARE\\Corvane\\Nothing", ""},
-    };
-    for (const auto& [key, text] : cases) {
-        EXPECT_EQ(zel::platform::readMachineRegistryString(key, "ZEL_HOME"), text) << key;
-    }
-    EXPECT_EQ(zel::platform::readMachineRegistryString("SOFTWARE\\Corvane\\Quorlith", "ZEL_HOME_MISSING"), "");
-}
-
-TEST(WindowsFrameworkHome, RegistryBuildKeyWhenNothingIsSet)
-{
-    ScopedEnv override("ZEL_HOME_OVERRIDE", nullptr);
-    ScopedEnv zelHome("ZEL_HOME", nullptr);
-    ASSERT_EQ(::GetModuleHandleA(zel::platform::kFrameworkModuleName), nullptr);
-    EXPECT_EQ(zel::frameworkHomeDirectory(), "C:\\zel\\build18286\\");
-    EXPECT_STREQ(std::getenv("ZEL_HOME"), "C:\\zel\\build18286\\");
 }
 
 TEST(WindowsSeparators, HomesEndInABackslashAndTheCatalogueIsLookedForBehindOne)
