@@ -231,26 +231,6 @@ TEST(JobRequestText, ParsesPathParametersAndDirectives)
               "request parameters: expected a TRANSFORMATION_REQUEST document, not 'OTHER'");
 }
 
-TEST(JobResultText, FormatsFinishedAndPendingJobs)
-{
-    JobRecord r;
-    r.id = 7;
-    r.keyword = "zeljob";
-    r.request = "R/w/w.zlw";
-    r.status = "QUEUED";
-    r.timeRequested = "2024-05-01T12:00:00Z";
-    EXPECT_EQ(formatResult(r), "id=7\0jobStatus=QUEUED\0requestKeyword=zeljob\0request=R/w/w.zlw"
-                               "\0timeRequested=2024-05-01T12:00:00Z"s);
-    r.status = "ZEL_FAILURE";
-    r.resultNumber = 1004;
-    r.resultMessage = "cannot start";
-    auto entries = zeltest::parseResult(formatResult(r));
-    EXPECT_EQ(entries["result"], "1004:cannot start");
-    EXPECT_EQ(entries["serviceSuccess"], "false");
-    EXPECT_EQ(entries["resultSuccess"], "false");
-    EXPECT_EQ(entries.count("requesterHost"), 0u);
-}
-
 TEST(ParseDecimal, BoundsHold)
 {
     struct Case {
