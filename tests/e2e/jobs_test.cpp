@@ -7,6 +7,8 @@
 namespace zeltest {
 namespace {
 
+using namespace std::string_literals;
+
 class Jobs : public EndToEnd {
 protected:
     void SetUp() override
@@ -117,15 +119,23 @@ TEST_F(Jobs, JobsRunFailWaitAndAreAborted)
     ASSERT_EQ(client.take(jobs->abortJob(later)), 0u) << "a job that has not started yet";
     EXPECT_NE(resultText(later).find("jobStatus=ABORTED"), std::string::npos);
 
+    // A result port directive of 0 lets the call listen on any port; the bound port goes out first and
+    // the caller's directive behind it, which the server must not take.
     greet.setPublishedParameter(client.text("WHO"), client.text("Port"));
+    greet.setDirective(client.text("requesterResultPort"), client.text("0"));
+    greet.setNotification(client.text("topic"), client.text("message"));
     ASSERT_EQ(client.take(jobs->transactJob(greet, *result)), 0u) << client.lastMessage();
     unsigned port = 0;
     EXPECT_EQ(result->getRequesterResultPort(port), 1u) << "the result came back through the port";
+    EXPECT_NE(port, 0u);
     ASSERT_EQ(result->getID(id), 1u);
-    EXPECT_NE(log(id).find("Hello Port"), std::string::npos);
-    IZELServerString& text = client.text();
-    EXPECT_EQ(client.take(jobs->transactJobString(zeljob, client.text("jobs/fail/fail.zlw"), *none, text)), 0u);
-    EXPECT_NE(std::string(text.c_str(), text.length()).find("jobStatus=JOB_FAILURE"), std::string::npos);
+    const std::string text = log(id);
+    for (const std::string& line :
+         {"Hello Port"s, "notification 'topic:message' not sent"s, "result sent to 127.0.0.1:" + std::to_string(port)})
+        EXPECT_NE(text.find(line), std::string::npos) << text;
+    IZELServerString& failed = client.text();
+    EXPECT_EQ(client.take(jobs->transactJobString(zeljob, client.text("jobs/fail/fail.zlw"), *none, failed)), 0u);
+    EXPECT_NE(std::string(failed.c_str(), failed.length()).find("jobStatus=JOB_FAILURE"), std::string::npos);
 }
 
 TEST_F(Jobs, EveryOperationCanBeRefused)

@@ -1,9 +1,6 @@
 // Jobs: the result text and log of finished jobs, refused submissions, processes that must not
-// outlive their job, the result port, owners, the job account of a root server, and a restart.
+// outlive their job, owners, the job account of a root server, and a restart.
 #include <gtest/gtest.h>
-#include <netinet/in.h>
-#include <poll.h>
-#include <sys/socket.h>
 #include <unistd.h>
 
 #include <filesystem>
@@ -126,39 +123,6 @@ TEST_F(Jobs, EndingAJobKillsEverythingItStarted)
         EXPECT_EQ(waitForEnd(id)["jobStatus"], abort ? "ABORTED" : "SUCCESS");
         EXPECT_TRUE(eventually([&] { return processGone(pid); })) << "left running: " << pid;
     }
-}
-
-TEST_F(Jobs, TransactDeliversTheResultToTheResultPort)
-{
-    int listener = ::socket(AF_INET, SOCK_STREAM | SOCK_CLOEXEC, 0);
-    sockaddr_in addr{};
-    addr.sin_family = AF_INET;
-    addr.sin_addr.s_addr = htonl(INADDR_LOOPBACK);
-    socklen_t len = sizeof addr;
-    ASSERT_EQ(::bind(listener, reinterpret_cast<sockaddr*>(&addr), len), 0);
-    ASSERT_EQ(::listen(listener, 1), 0);
-    ::getsockname(listener, reinterpret_cast<sockaddr*>(&addr), &len);
-    std::string port = std::to_string(ntohs(addr.sin_port));
-    // The bound port comes first; a caller's own directive of the same name follows and must not be
-    // the one used.
-    long id = submit("echo.zlw", {},
-                     {{"requesterResultPort", port},
-                      {"requesterHost", "127.0.0.1"},
-                      {"requesterResultPort", "1"},
-                      {"notificationMsg", "topic:message"}});
-    ASSERT_GT(id, 0) << lastReply_.body;
-    pollfd p{listener, POLLIN, 0};
-    ASSERT_EQ(::poll(&p, 1, 20000), 1);
-    TestClient delivered;
-    delivered.adopt(::accept(listener, nullptr, nullptr));
-    ::close(listener);
-    auto r = parseResult(delivered.readFrame(20000).value_or(""));
-    EXPECT_EQ(r["id"], std::to_string(id));
-    EXPECT_EQ(r["jobStatus"], "SUCCESS");
-    EXPECT_EQ(r["requesterResultPort"], port);
-    EXPECT_EQ(r["requesterHost"], "127.0.0.1");
-    EXPECT_TRUE(contains(log(id), "notification 'topic:message' not sent"));
-    EXPECT_TRUE(eventually([&] { return contains(log(id), "result sent to 127.0.0.1:" + port); }));
 }
 
 TEST_F(Jobs, JobsAnswerOnlyToTheirOwnerAndAdministrators)

@@ -39,12 +39,6 @@ public:
     ~TestClient();
 
     bool connect(std::uint16_t port);
-    // Takes over a connected socket (one the server made to the test).
-    void adopt(int fd)
-    {
-        close();
-        fd_ = fd;
-    }
     void close();
     bool sendRaw(const std::string& bytes);
     bool sendFrame(const std::string& payload) { return sendRaw(frame(payload)); }
