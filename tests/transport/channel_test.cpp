@@ -94,6 +94,14 @@ protected:
         ASSERT_TRUE(gives(openOn(*channel, server.port(), {}, options), 0));
     }
 
+    static StatusPtr withBody(IZELServerStatus* status, IZELServerResponse& response, std::string* body)
+    {
+        if (body != nullptr) {
+            response.getBody(*body);
+        }
+        return StatusPtr(status);
+    }
+
     StatusPtr plain(const std::string& keyword, const Values& values = {}, std::string* body = nullptr)
     {
         const RequestPtr request(channel->createRequest(keyword));
@@ -101,11 +109,7 @@ protected:
         for (const auto& [name, value] : values) {
             request->addValue(name, value);
         }
-        StatusPtr status(channel->sendRequest(*request, *response, kPlainRequest));
-        if (body != nullptr) {
-            response->getBody(*body);
-        }
-        return status;
+        return withBody(channel->sendRequest(*request, *response, kPlainRequest), *response, body);
     }
 
     StatusPtr transfer(const std::string& path, unsigned direction, ProgressLog* progress = nullptr,
@@ -113,11 +117,7 @@ protected:
     {
         const RequestPtr request(channel->createRequest("XFER"));
         const ResponsePtr response(channel->createResponse());
-        StatusPtr status(channel->transferFile(*request, *response, path, direction, progress));
-        if (body != nullptr) {
-            response->getBody(*body);
-        }
-        return status;
+        return withBody(channel->transferFile(*request, *response, path, direction, progress), *response, body);
     }
 
     StatusPtr resultPort(const Strings& directives, const Strings& notifications = {}, std::string* body = nullptr)
@@ -125,11 +125,7 @@ protected:
         const RequestPtr request(
             channel->createRequest("JOB", ZELServerStringArray(directives), ZELServerStringArray(notifications)));
         const ResponsePtr response(channel->createResponse());
-        StatusPtr status(channel->sendRequest(*request, *response, kResultPortRequest));
-        if (body != nullptr) {
-            response->getBody(*body);
-        }
-        return status;
+        return withBody(channel->sendRequest(*request, *response, kResultPortRequest), *response, body);
     }
 
     std::string file(const std::string& name, const std::string& content) const
@@ -564,13 +560,10 @@ TEST_F(ChannelTest, ResultPortCallersOutsideTheTrustedListAreSkipped)
             .connectBackFromAndSend("127.0.0.2", "from a stranger")
             .connectBackFromAndSend(c.from, "trusted")
             .start();
-        ZELServerTCPIPChannel caseChannel;
-        ASSERT_TRUE(gives(openOn(caseChannel, caseServer.port(), {}, {"TRUSTED_HOST_NAMES", c.trusted}), 0));
-        const RequestPtr request(caseChannel.createRequest("JOB", ZELServerStringArray(), ZELServerStringArray()));
-        const ResponsePtr response(caseChannel.createResponse());
-        EXPECT_TRUE(gives(StatusPtr(caseChannel.sendRequest(*request, *response, kResultPortRequest)), 0));
+        channel.reset(new ZELServerTCPIPChannel());
+        ASSERT_TRUE(gives(openOn(*channel, caseServer.port(), {}, {"TRUSTED_HOST_NAMES", c.trusted}), 0));
         std::string body;
-        response->getBody(body);
+        EXPECT_TRUE(gives(resultPort({}, {}, &body), 0));
         EXPECT_EQ(body, "trusted");
         EXPECT_TRUE(caseServer.verify());
     }
@@ -598,6 +591,24 @@ TEST_F(ChannelTest, ResultPortThatCannotBeOpenedSendsNothing)
     }
     EXPECT_TRUE(server.verify());
     EXPECT_EQ(server.frames().size(), 1u);
+}
+
+// ---- Time-outs --------------------------------------------------------------------------------------
+
+// A server that stops reading holds a send up only for IO_TIMEOUT, and a result port where only
+// untrusted callers come is given up after RESULT_PORT_TIMEOUT.
+TEST_F(ChannelTest, SendsAndTheResultPortWaitOnlyAsLongAsTheTimeOuts)
+{
+    server.exchange(zeltest::request("SERVER_SESSION_INIT", {{"clientID", ""}, {"userID", ""}, {"userPassword", ""}}),
+                    kSignedIn);
+    server.expectAnyFrame().sendFrame(reply("SUCCESS", "queued")).connectBackAndSend("from a stranger");
+    server.start();
+    ASSERT_TRUE(gives(openOn(*channel, server.port(), {"IO_TIMEOUT", "0.3", "RESULT_PORT_TIMEOUT", "0.3"},
+                             {"TRUSTED_HOST_NAMES", "10.255.255.1"}),
+                      0));
+    EXPECT_TRUE(gives(resultPort({}), kResultPortAcceptFailed));
+    // Far more than the socket buffers take while nobody reads.
+    EXPECT_TRUE(gives(plain("CMD", {{"big", std::string(64u << 20, 'b')}}), kSendFailed, SOCK_TIMED_OUT));
 }
 
 }  // namespace

@@ -25,31 +25,13 @@ TEST(FrameReader, ReadsExactlyOneFrameWhateverThePieces)
     };
     const Case cases[] = {
         {"empty frame", "\0\0\0\0"s, 10, State::Complete, 4, ""},
-        {"payload with NULs",
-         "\0\0\0\x03"
-         "a\0b"s,
-         10, State::Complete, 7, "a\0b"s},
-        {"bytes behind the frame stay",
-         "\0\0\0\x02"
-         "okNEXT"s,
-         10, State::Complete, 6, "ok"},
+        {"payload with NULs", "\0\0\0\003a\0b"s, 10, State::Complete, 7, "a\0b"s},
+        {"bytes behind the frame stay", "\0\0\0\002okNEXT"s, 10, State::Complete, 6, "ok"},
         {"prefix torn", "\0\0"s, 10, State::Prefix, 2, ""},
-        {"payload torn",
-         "\0\0\0\x05"
-         "abc"s,
-         10, State::Payload, 7, ""},
-        {"exactly the limit",
-         "\0\0\0\x03"
-         "abc"s,
-         3, State::Complete, 7, "abc"},
-        {"over the limit, content never taken",
-         "\0\0\0\x04"
-         "abcd"s,
-         3, State::TooLarge, 4, ""},
-        {"4 GiB announced",
-         "\xFF\xFF\xFF\xF0"
-         "SUCCESS"s,
-         kDefaultMaxReplyBytes, State::TooLarge, 4, ""},
+        {"payload torn", "\0\0\0\005abc"s, 10, State::Payload, 7, ""},
+        {"exactly the limit", "\0\0\0\003abc"s, 3, State::Complete, 7, "abc"},
+        {"over the limit, content never taken", "\0\0\0\004abcd"s, 3, State::TooLarge, 4, ""},
+        {"4 GiB announced", "\377\377\377\360SUCCESS"s, kDefaultMaxReplyBytes, State::TooLarge, 4, ""},
     };
     for (const Case& c : cases) {
         SCOPED_TRACE(c.name);
