@@ -81,14 +81,12 @@ TEST(TcpSocket, SendToAClosedPeerFailsWithoutASignal)
     EXPECT_TRUE(server.verify());
 }
 
-TEST(TcpSocket, ClientRecordsHostAndPortOnlyWhenConnected)
+TEST(TcpSocket, ClientConnectsByNameOrReportsWhyNot)
 {
     FakeServer server;
     server.expectPeerClose().start();
     TcpSocket client("localhost", server.port());
     EXPECT_EQ(client.errorCode, 0);
-    EXPECT_STREQ(client.getHostName(), "localhost");
-    EXPECT_EQ(client.getPort(), server.port());
     EXPECT_EQ(client.getPeerAddress(), nullptr);
     client.close();
     EXPECT_TRUE(server.verify());
@@ -96,8 +94,6 @@ TEST(TcpSocket, ClientRecordsHostAndPortOnlyWhenConnected)
     const zeltest::ClosedPort closed;
     TcpSocket refused("127.0.0.1", closed.port());
     EXPECT_EQ(refused.errorCode, zel::SOCK_CONNECT_FAILED);
-    EXPECT_EQ(refused.getHostName(), nullptr);
-    EXPECT_EQ(refused.getPort(), 0);
     EXPECT_FALSE(refused.probeConnection());
     char byte = 0;
     EXPECT_EQ(refused.receiveExact(&byte, 0), 0);
@@ -110,8 +106,6 @@ TEST(TcpSocket, ListenerWritesTheChosenPortBackAndAcceptsPeerAfterPeer)
     TcpSocket listener(port);
     ASSERT_EQ(listener.errorCode, 0);
     ASSERT_NE(port, 0);
-    EXPECT_EQ(listener.getPort(), port);
-    EXPECT_EQ(listener.getHostName(), nullptr);
     TcpSocket first("127.0.0.1", port);
     TcpSocket second("127.0.0.1", port);
     ASSERT_EQ(listener.acceptPeer(), 0);
@@ -139,7 +133,6 @@ TEST(TcpSocket, FixedPortCanBeListenedOnAgainWhileTheOldConnectionLingers)
     }
     ASSERT_EQ(owner->errorCode, 0);
     const std::uint16_t requested = port;
-    EXPECT_EQ(owner->getPort(), requested);
     {
         TcpSocket client("127.0.0.1", port);
         ASSERT_EQ(owner->acceptPeer(), 0);
