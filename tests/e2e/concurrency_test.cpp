@@ -28,7 +28,7 @@ std::string work(std::uint16_t port, const std::string& dir, int n)
 
     const std::string workspace = "#!/bin/sh\n# @parameter MARK | TEXT | none\necho \"mark $MARK\"\n";
     const std::string itemFile = dir + "/" + tag + ".zlw";
-    writeFile(itemFile, workspace);
+    spew(itemFile, workspace);
     auto repository = client.repository("crowd");
     IZELServerString& item = client.text(tag + ".zlw");
     check(client.take(repository->addItem(item, client.text(itemFile))) == 0, "addItem");
@@ -37,7 +37,7 @@ std::string work(std::uint16_t port, const std::string& dir, int n)
     if (!area)
         return failures + tag + ": no area\n";
     const std::string content(1000 + n * 997, static_cast<char>('a' + n));
-    writeFile(dir + "/" + tag + ".dat", content);
+    spew(dir + "/" + tag + ".dat", content);
     IZELServerPath* folder = area->createPath(client.text("/" + tag));
     IZELServerPath* file = area->createPath(client.text("/" + tag), client.text("data.bin"));
     // Every status starts the catalogue when no other status holds it and tears it down with the
@@ -65,17 +65,17 @@ std::string work(std::uint16_t port, const std::string& dir, int n)
         const std::string log = dir + "/" + tag + ".log";
         check(client.outcome([&](unsigned& f) { return jobs->getLogFile(id, client.text(log), f); }) == 1,
               "getLogFile");
-        check(readAll(log).find("mark " + tag + "\n") != std::string::npos, "log holds the mark");
+        check(slurp(log).find("mark " + tag + "\n") != std::string::npos, "log holds the mark");
     }
     refusedUpload();
 
     check(client.outcome([&](unsigned& f) { return repository->getItem(item, client.text(itemFile + ".back"), f); }) ==
               1,
           "getItem");
-    check(readAll(itemFile + ".back") == workspace, "item content");
+    check(slurp(itemFile + ".back") == workspace, "item content");
     IZELServerString& back = client.text(dir + "/" + tag + ".back");
     check(client.outcome([&](unsigned& f) { return area->download(*file, back, f, nullptr); }) == 1, "download");
-    check(readAll(dir + "/" + tag + ".back") == content, "shared file content");
+    check(slurp(dir + "/" + tag + ".back") == content, "shared file content");
 
     area->releaseObject(folder);
     area->releaseObject(file);

@@ -18,6 +18,7 @@
 #include <zelserverapi/interfaces.h>
 #include <zelserverapi/zelserverapi.h>
 
+#include "support/helpers.h"
 #include "support/local_server.h"
 
 namespace zeltest {
@@ -29,19 +30,6 @@ inline const char* kE2eConfig = "[user ann]\npassword = pw-ann\nroles = admin\n"
                                 "[role outsider]\nrights = tokens\n"
                                 "[user zed]\npassword = pw-zed\nroles = outsider\n"
                                 "[sharedresource DATA]\npath = shared\n";
-
-inline std::string readAll(const std::string& path)
-{
-    std::ifstream in(path, std::ios::binary);
-    std::ostringstream text;
-    text << in.rdbuf();
-    return text.str();
-}
-
-inline void writeFile(const std::string& path, const std::string& content)
-{
-    std::ofstream(path, std::ios::binary) << content;
-}
 
 // The status number of a request the server answered with an error, and of an argument the library
 // refuses before sending.
@@ -232,7 +220,7 @@ protected:
     unsigned addItem(Client& client, IZELServerRepository& repository, const std::string& name,
                      const std::string& content)
     {
-        writeFile(local(name), content);
+        spew(local(name), content);
         return client.take(repository.addItem(client.text(name), client.text(local(name))));
     }
 

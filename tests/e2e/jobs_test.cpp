@@ -37,7 +37,7 @@ protected:
     {
         EXPECT_EQ(client.outcome([&](unsigned& f) { return jobs->getLogFile(id, client.text(local("job.log")), f); }),
                   1);
-        return readAll(local("job.log"));
+        return slurp(local("job.log"));
     }
 
     // The job's status code and status number as its result has them now.
@@ -148,7 +148,7 @@ TEST_F(Jobs, EveryOperationCanBeRefused)
     IZELServerString& absent = client.text("jobs/absent/absent.zlw");
     IZELServerString& text = client.text("untouched");
     auto info = client.own(client.session().createLogFileInfo());
-    writeFile(local("kept.log"), "kept");
+    spew(local("kept.log"), "kept");
     client.run({
         {"an unknown service", [&](unsigned& f) { return jobs->submitJob(unknownService, f); }, kDenied},
         {"a missing workspace", [&](unsigned& f) { return jobs->submitJob(missing, f); }, kDenied},
@@ -166,7 +166,7 @@ TEST_F(Jobs, EveryOperationCanBeRefused)
         {"its log info", [&](unsigned& f) { return jobs->getLogFileInfo(987654, *info, f); }, kDenied},
         {"its log, keeping the destination",
          checking([&](unsigned& f) { return jobs->getLogFile(987654, client.text(local("kept.log")), f); },
-                  [&] { return readAll(local("kept.log")) == "kept"; }),
+                  [&] { return slurp(local("kept.log")) == "kept"; }),
          kDenied},
     });
 }

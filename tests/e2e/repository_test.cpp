@@ -31,7 +31,7 @@ protected:
     // A check that the local file `name` holds `content`.
     std::function<bool()> holds(const std::string& name, const std::string& content)
     {
-        return [this, name, content] { return readAll(local(name)) == content; };
+        return [this, name, content] { return slurp(local(name)) == content; };
     }
     // A check of the title or the description of a view, read through `get` when it runs.
     template <typename View>
@@ -144,12 +144,12 @@ TEST_F(Repositories, TheManagerAndItsRepositories)
 TEST_F(Repositories, ItemsAndResources)
 {
     const std::string v2 = "#!/bin/sh\n# @title Roads 2\ntrue\n";
-    writeFile(local("v2.zlw"), v2);
-    writeFile(local("bad.zlw"), "#!/bin/sh\n# @colour red\ntrue\n");
-    writeFile(local("empty"), "");
-    writeFile(local("r1"), "first");
-    writeFile(local("r2"), "second!");
-    writeFile(local("kept"), "kept");
+    spew(local("v2.zlw"), v2);
+    spew(local("bad.zlw"), "#!/bin/sh\n# @colour red\ntrue\n");
+    spew(local("empty"), "");
+    spew(local("r1"), "first");
+    spew(local("r2"), "second!");
+    spew(local("kept"), "kept");
     IZELServerString& roads = t("roads.zlw");
     IZELServerString& r = t("r.txt");
     client.run({

@@ -18,8 +18,8 @@ protected:
         ASSERT_EQ(client.signIn(server->port(), "ann", "pw-ann"), 0u) << client.lastMessage();
         area = client.area("DATA");
         ASSERT_NE(area, nullptr);
-        writeFile(local("src.txt"), "twelve bytes");
-        writeFile(local("kept.txt"), "kept");
+        spew(local("src.txt"), "twelve bytes");
+        spew(local("kept.txt"), "kept");
     }
 
     void TearDown() override
@@ -48,7 +48,7 @@ protected:
     {
         return checking(
             [this, &from, name](unsigned& f) { return area->download(from, client.text(local(name)), f, nullptr); },
-            [this, name, content] { return readAll(local(name)) == content; });
+            [this, name, content] { return slurp(local(name)) == content; });
     }
 
     std::string onDisk(const std::string& relative) const { return local("shared/" + relative); }
@@ -120,7 +120,7 @@ TEST_F(SharedResources, EveryFileOperationSucceedsAndIsRefused)
 TEST_F(SharedResources, PathsLeavingTheResourceAreRefused)
 {
     std::filesystem::create_directories(local("outside"));
-    writeFile(local("outside/secret.txt"), "secret");
+    spew(local("outside/secret.txt"), "secret");
     ASSERT_EQ(::symlink(local("outside").c_str(), onDisk("escape").c_str()), 0);
     for (const auto& [directory, name] : std::vector<std::pair<std::string, std::string>>{
              {"/..", "outside/secret.txt"}, {"\\\\host\\share", "x"}, {"C:", "x"}, {"/escape", "secret.txt"}}) {
@@ -134,7 +134,7 @@ TEST_F(SharedResources, PathsLeavingTheResourceAreRefused)
             {"download", download(target, "stolen.txt", ""), kDenied},
         });
     }
-    EXPECT_EQ(readAll(local("outside/secret.txt")), "secret");
+    EXPECT_EQ(slurp(local("outside/secret.txt")), "secret");
     EXPECT_FALSE(std::filesystem::exists(onDisk("stolen.txt")));
 }
 

@@ -155,8 +155,8 @@ TEST_F(JsonSchema, EveryCommandAnswersWithTheDocumentedKeysAndTheServersValues)
     run("item rm", {"item", "rm", "demo", "roads.zlw"}, R"({"done":"removed"})");
     run("repo delete", {"repo", "delete", "demo"}, R"({"done":"deleted"})");
     for (const auto& [file, content] : {std::pair{"back.txt", "some text"}, {"c.txt", "some text"}})
-        EXPECT_EQ(readFile(local(file)), content) << file;
-    EXPECT_EQ(readFile(local("back.zlw")), readFile(local("roads.zlw")));
+        EXPECT_EQ(slurp(local(file)), content) << file;
+    EXPECT_EQ(slurp(local("back.zlw")), slurp(local("roads.zlw")));
 
     const std::vector<Documented> documented = documentedKeys();
     ASSERT_GT(documented.size(), answers.size()) << "the table of docs/zelctl.md was not found";

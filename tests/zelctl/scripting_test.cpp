@@ -101,8 +101,8 @@ TEST_F(Scripting, ExitStatusesOutputAndErrorLines)
         if (c.err)
             EXPECT_TRUE(std::regex_match(run.err, std::regex(c.err))) << line << ": " << run.err;
     }
-    EXPECT_EQ(readFile(local("back.zlw")), kGreeter);
-    EXPECT_NE(readFile(local("job.log")).find("Hello World"), std::string::npos);
+    EXPECT_EQ(slurp(local("back.zlw")), kGreeter);
+    EXPECT_NE(slurp(local("job.log")).find("Hello World"), std::string::npos);
 }
 
 TEST_F(Scripting, SettingsComeFromTheEnvironmentAndFlagsWin)

@@ -14,6 +14,7 @@
 
 #include <sys/wait.h>
 
+#include "support/helpers.h"
 #include "support/local_server.h"
 
 namespace zeltest {
@@ -34,14 +35,6 @@ struct Outcome {
     std::string err;
     nlohmann::json json() const { return nlohmann::json::parse(out); }
 };
-
-inline std::string readFile(const std::string& path)
-{
-    std::ifstream in(path, std::ios::binary);
-    std::ostringstream text;
-    text << in.rdbuf();
-    return text.str();
-}
 
 inline std::string quoted(const std::string& text)
 {
@@ -76,8 +69,8 @@ protected:
         const int wait = std::system(command.c_str());
         Outcome run;
         run.status = WIFEXITED(wait) ? WEXITSTATUS(wait) : -1;
-        run.out = readFile(local("zelctl.out"));
-        run.err = readFile(local("zelctl.err"));
+        run.out = slurp(local("zelctl.out"));
+        run.err = slurp(local("zelctl.err"));
         return run;
     }
 
