@@ -102,7 +102,7 @@ TEST_F(JsonSchema, EveryCommandAnswersWithTheDocumentedKeysAndTheServersValues)
            "# @destination GPKG | out | out.gpkg\n# @featuretype line\necho \"Hello $MODE\"\n";
     std::ofstream(local("a.txt")) << "some text";
     auto jobOf = [](const nlohmann::ordered_json& answer) { return std::to_string(answer.value("job", 0u)); };
-    run("ping", {"ping"}, R"({"host":"127.0.0.1","up":true})");
+    run("ping", {"ping"}, (R"({"host":"127.0.0.1","up":true,"port":)" + std::to_string(server->port()) + "}").c_str());
     run("whoami", {"whoami"}, R"({"account":"ann","authenticated":true,"roles":["admin"]})");
     run("prop", {"prop", "USER_NAME"}, R"({"property":"USER_NAME","value":"ann"})");
     run("repo create", {"repo", "create", "demo", "--description", "Demo items"}, R"({"done":"created"})");

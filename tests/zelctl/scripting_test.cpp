@@ -1,5 +1,5 @@
 // What scripts and people rely on: exit statuses, the text output, error lines that say what happened,
-// settings from the environment, and ping and --version without signing in.
+// settings from the environment, and --version without signing in.
 
 #include <regex>
 
@@ -163,11 +163,8 @@ TEST_F(Scripting, FailuresToConnectOrSignInSayWhy)
     }
 }
 
-TEST_F(Scripting, PingAndVersionNeedNoSignIn)
+TEST_F(Scripting, VersionNeedsNoSignIn)
 {
-    const Outcome ping = raw({"ping", "--json"});
-    ASSERT_EQ(ping.status, 0) << ping.err;
-    EXPECT_EQ(ping.json(), nlohmann::json::parse(R"({"host":"127.0.0.1","port":)" + port() + R"(,"up":true})"));
     const Outcome version = raw({"--version"}, "", false);
     EXPECT_EQ(version.status, 0);
     EXPECT_TRUE(std::regex_match(version.out, std::regex("zelctl [0-9.]+ \\(zelserverapi [0-9.]+\\)\n")))
