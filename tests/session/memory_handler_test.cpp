@@ -13,9 +13,8 @@ namespace {
 
 // Writes "<severity>:<message>" to standard error. With `failWhileWriting` set it runs out of memory
 // itself while writing, the way a host's log can when the whole process is short.
-class StderrSink : public IZELLogSink {
-public:
-    explicit StderrSink(bool failWhileWriting) : failWhileWriting_(failWhileWriting) {}
+struct StderrSink : IZELLogSink {
+    explicit StderrSink(bool failWhileWriting) : failWhileWriting(failWhileWriting) {}
     void setSeverityThreshold(int) override {}
     int getSeverityThreshold() const override { return 0; }
     void flush() override {}
@@ -23,14 +22,12 @@ public:
     {
         std::fprintf(stderr, "%d:%s\n", severity, message);
         std::fflush(stderr);
-        if (failWhileWriting_) {
+        if (failWhileWriting) {
             zel::heap::failNextAllocations(1);
             zel::heap::allocate(64);
         }
     }
-
-private:
-    bool failWhileWriting_;
+    bool failWhileWriting;
 };
 
 TEST(MemoryHandler, TheFirstExhaustionIsReportedOnceAndEndsTheProcessWithOne)
