@@ -1,6 +1,9 @@
 #include "api/ZELServerString.h"
 
 #include <cstring>
+#include <stdexcept>
+
+#include "api/exception_guard.h"
 
 namespace zel {
 
@@ -16,12 +19,14 @@ ZELServerString& ZELServerString::operator=(const ZELServerString& other)
 
 const char* ZELServerString::assign(const char* text)
 {
-    if (text == nullptr) {
-        text_.clear();
-    } else {
-        text_.assign(text);
-    }
-    return text;
+    return guarded([&] {
+        if (text == nullptr) {
+            text_.clear();
+        } else {
+            text_.assign(text);
+        }
+        return text;
+    });
 }
 
 bool ZELServerString::equals(const char* text) const
@@ -32,12 +37,14 @@ bool ZELServerString::equals(const char* text) const
 
 void ZELServerString::set(const char* data, unsigned length)
 {
-    if (data == nullptr) {
-        text_.clear();
-    } else {
-        // std::string copes with `data` pointing into the current content.
-        text_.assign(data, length);
-    }
+    guarded([&] {
+        if (data == nullptr) {
+            text_.clear();
+        } else {
+            // std::string copes with `data` pointing into the current content.
+            text_.assign(data, length);
+        }
+    });
 }
 
 std::string toStdString(const IZELServerString& text)
@@ -49,6 +56,11 @@ std::string toStdString(const IZELServerString& text)
 void copyText(std::string_view text, IZELServerString& out)
 {
     out.set(text.data(), static_cast<unsigned>(text.size()));
+    // A string that could not take the text (memory exhausted inside its own set) must not pass
+    // for the whole text: the operation handing it over fails instead.
+    if (out.length() != text.size()) {
+        throw std::runtime_error("The text could not be handed over.");
+    }
 }
 
 }  // namespace zel

@@ -43,7 +43,8 @@ private:
 std::string toStdString(const IZELServerString& text);
 
 // Replaces the content of any implementation of the interface with `text`, embedded NULs included:
-// how every text getter and every text out-value of the library hands its text over.
+// how every text getter and every text out-value of the library hands its text over. Throws when
+// `out` did not take the whole text.
 void copyText(std::string_view text, IZELServerString& out);
 
 }  // namespace zel

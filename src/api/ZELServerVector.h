@@ -4,11 +4,14 @@
 // vector destroys what it still holds when it is destroyed; a borrowing one (BorrowedVector) lists
 // objects owned elsewhere and never destroys an element, not even through clearAndDestroy.
 
+#include <algorithm>
+#include <cstddef>
 #include <type_traits>
 #include <vector>
 
 #include <zelserverapi/IZELServerVector.h>
 
+#include "api/exception_guard.h"
 #include "api/heap.h"
 
 namespace zel {
@@ -38,22 +41,21 @@ public:
     ZELServerVector& operator=(const ZELServerVector&) = delete;
     ~ZELServerVector() override { clearAndDestroy(); }
 
-    void append(I* item) override
-    {
-        if (item != nullptr) {
-            items_.push_back(item);
-        }
-    }
+    void append(I* item) override { insertAt(entries(), item); }
 
     void insertAt(unsigned index, I* item) override
     {
         if (item == nullptr) {
             return;
         }
-        if (index >= items_.size()) {
-            items_.push_back(item);
-        } else {
-            items_.insert(items_.begin() + index, item);
+        const bool stored = guarded([&] {
+            items_.insert(items_.begin() + std::min<std::size_t>(index, items_.size()), item);
+            return true;
+        });
+        // The caller handed ownership over with the call: an element that cannot be stored is
+        // destroyed rather than leaked.
+        if (!stored && kElements == Elements::kOwned) {
+            delete item;
         }
     }
 

@@ -1,13 +1,24 @@
 #pragma once
-// Every operation a client calls runs its work through one of these, so that no exception crosses
-// the interface: std::bad_alloc goes to the heap's out-of-memory routine (which normally ends the
-// process, as for the library's own allocations), and should that routine return, or the exception
-// be of another kind, the operation fails the way it fails for any other reason.
+// The one way every slot of the public interface keeps exceptions inside the library: its work runs
+// through guarded(), so that no exception crosses the interface. std::bad_alloc goes to the heap's
+// out-of-memory routine (which normally ends the process, as for the library's own allocations);
+// should that routine return, or the exception be of another kind, the slot fails the way it fails
+// for any other reason:
+//   - a slot that returns a status returns the status of the exception (393625 with its text);
+//   - any other slot returns its type's empty value (null, 0, false) or, returning nothing, nothing.
 //
 //     IZELServerStatus* Session::disconnect()
 //     {
-//         return guardStatus([&] { return channel_ ? channel_->close() : nullptr; });
+//         return guarded([&] { return channel_ ? channel_->close() : nullptr; });
 //     }
+//     void Item::getName(IZELServerString& out) const
+//     {
+//         guarded([&] { copyText(fields_.name, out); });
+//     }
+//
+// A slot that only reads a number or a pointer it holds cannot throw and is written without it.
+
+#include <type_traits>
 
 #include <zelserverapi/IZELServerStatus.h>
 
@@ -18,35 +29,20 @@ namespace zel {
 IZELServerStatus* statusOfCurrentException() noexcept;
 
 template <class Work>
-IZELServerStatus* guardStatus(Work&& work) noexcept
+auto guarded(Work&& work) noexcept -> decltype(work())
 {
+    using Result = decltype(work());
     try {
         return work();
     } catch (...) {
-        return statusOfCurrentException();
-    }
-}
-
-// For operations without a status: `fallback` is what the caller receives on failure.
-template <class Result, class Work>
-Result guardValue(Result fallback, Work&& work) noexcept
-{
-    try {
-        return work();
-    } catch (...) {
-        delete statusOfCurrentException();
-        return fallback;
-    }
-}
-
-// For operations that return nothing.
-template <class Work>
-void guardVoid(Work&& work) noexcept
-{
-    try {
-        work();
-    } catch (...) {
-        delete statusOfCurrentException();
+        if constexpr (std::is_same_v<Result, IZELServerStatus*>) {
+            return statusOfCurrentException();
+        } else {
+            delete statusOfCurrentException();
+            if constexpr (!std::is_void_v<Result>) {
+                return Result{};
+            }
+        }
     }
 }
 

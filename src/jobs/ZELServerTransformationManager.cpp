@@ -7,6 +7,7 @@
 
 #include <zelserverapi/ZELServerStringDict.h>
 
+#include "api/exception_guard.h"
 #include "api/StringDict.h"
 #include "api/ZELServerString.h"
 #include "api/ZELServerStringArray.h"
@@ -94,13 +95,16 @@ ZELServerBaseTransformationManager::~ZELServerBaseTransformationManager() { chan
 IZELServerStatus* ZELServerBaseTransformationManager::transactJob(const IZELServerTransformationRequest& request,
                                                                   IZELServerTransformationResult& result)
 {
-    const RequestParts parts(request);
-    ZELServerString resultText;
-    IZELServerStatus* status = transact(parts.keyword, parts.text, parts.directives, parts.notifications, resultText);
-    if (status == nullptr) {
-        result.parse(resultText);
-    }
-    return status;
+    return guarded([&] {
+        const RequestParts parts(request);
+        ZELServerString resultText;
+        IZELServerStatus* status =
+            transact(parts.keyword, parts.text, parts.directives, parts.notifications, resultText);
+        if (status == nullptr) {
+            result.parse(resultText);
+        }
+        return status;
+    });
 }
 
 IZELServerStatus* ZELServerBaseTransformationManager::transactJobString(const IZELServerString& keyword,
@@ -108,7 +112,7 @@ IZELServerStatus* ZELServerBaseTransformationManager::transactJobString(const IZ
                                                                         const IZELServerStringArray& directives,
                                                                         IZELServerString& resultText)
 {
-    return transact(keyword, requestText, directives, ZELServerStringArray(), resultText);
+    return guarded([&] { return transact(keyword, requestText, directives, ZELServerStringArray(), resultText); });
 }
 
 IZELServerStatus* ZELServerBaseTransformationManager::transact(const IZELServerString& keyword,
@@ -156,8 +160,10 @@ IZELServerStatus* ZELServerTransformationManager::transactJobString(const IZELSe
 IZELServerStatus* ZELServerTransformationManager::submitJob(const IZELServerTransformationRequest& request,
                                                             unsigned& jobId)
 {
-    const RequestParts parts(request);
-    return submit(parts.keyword, parts.text, parts.directives, &parts.notifications, jobId);
+    return guarded([&] {
+        const RequestParts parts(request);
+        return submit(parts.keyword, parts.text, parts.directives, &parts.notifications, jobId);
+    });
 }
 
 IZELServerStatus* ZELServerTransformationManager::submitJobString(const IZELServerString& keyword,
@@ -165,7 +171,7 @@ IZELServerStatus* ZELServerTransformationManager::submitJobString(const IZELServ
                                                                   const IZELServerStringArray& directives,
                                                                   unsigned& jobId)
 {
-    return submit(keyword, requestText, directives, nullptr, jobId);
+    return guarded([&] { return submit(keyword, requestText, directives, nullptr, jobId); });
 }
 
 IZELServerStatus* ZELServerTransformationManager::submit(const IZELServerString& keyword,
@@ -201,13 +207,15 @@ IZELServerStatus* ZELServerTransformationManager::submit(const IZELServerString&
 IZELServerStatus* ZELServerTransformationManager::scheduleJob(const IZELServerTransformationRequest& request,
                                                               unsigned secondsFromNow, unsigned& jobId)
 {
-    ZELServerString keyword;
-    ZELServerString text;
-    ZELServerStringArray directives;
-    request.getKeyword(keyword);
-    request.getRequestText(text);
-    request.getDirectives(directives);
-    return scheduleJobString(keyword, text, secondsFromNow, directives, jobId);
+    return guarded([&] {
+        ZELServerString keyword;
+        ZELServerString text;
+        ZELServerStringArray directives;
+        request.getKeyword(keyword);
+        request.getRequestText(text);
+        request.getDirectives(directives);
+        return scheduleJobString(keyword, text, secondsFromNow, directives, jobId);
+    });
 }
 
 IZELServerStatus* ZELServerTransformationManager::scheduleJobString(const IZELServerString& keyword,
@@ -216,18 +224,21 @@ IZELServerStatus* ZELServerTransformationManager::scheduleJobString(const IZELSe
                                                                     const IZELServerStringArray& directives,
                                                                     unsigned& jobId)
 {
-    ZELServerStringDict merged = toStringDict(directives);
-    merged.insert("secondsFromNow", decimalText(secondsFromNow));
-    ZELServerStringArray scheduled;
-    appendPairs(merged, scheduled);
-    return submitJobString(keyword, requestText, scheduled, jobId);
+    return guarded([&] {
+        ZELServerStringDict merged = toStringDict(directives);
+        merged.insert("secondsFromNow", decimalText(secondsFromNow));
+        ZELServerStringArray scheduled;
+        appendPairs(merged, scheduled);
+        return submitJobString(keyword, requestText, scheduled, jobId);
+    });
 }
 
 // ---- Abort and results ----------------------------------------------------------------------------
 
 IZELServerStatus* ZELServerTransformationManager::abortJob(unsigned jobId)
 {
-    return CheckedCommand(channel(), "ABORT_JOB_REQUEST").add("jobID", jobIdText(jobId)).send();
+    return guarded(
+        [&] { return CheckedCommand(channel(), "ABORT_JOB_REQUEST").add("jobID", jobIdText(jobId)).send(); });
 }
 
 // `found` is left as the caller had it when the command fails: a caller that polls for a result
@@ -235,62 +246,71 @@ IZELServerStatus* ZELServerTransformationManager::abortJob(unsigned jobId)
 IZELServerStatus* ZELServerTransformationManager::getJobResultString(unsigned jobId, unsigned& found,
                                                                      IZELServerString& resultText)
 {
-    return CheckedCommand(channel(), "GET_JOB_RESULT_STRING")
-        .add("jobID", jobIdText(jobId))
-        .run(
-            found,
-            [&](Command& command) -> IZELServerStatus* {
-                if (IZELServerStatus* status = command.send()) {
-                    return status;
-                }
-                // The server answers "null" for a job it has no result for; any other text, also an
-                // empty one, is the result.
-                const std::string body = command.body();
-                found = body == "null" ? 0 : 1;
-                if (found == 1) {
-                    copyText(body, resultText);
-                }
-                return nullptr;
-            },
-            OnFailure::kKeep);
+    return guarded([&]() -> IZELServerStatus* {
+        return CheckedCommand(channel(), "GET_JOB_RESULT_STRING")
+            .add("jobID", jobIdText(jobId))
+            .run(
+                found,
+                [&](Command& command) -> IZELServerStatus* {
+                    if (IZELServerStatus* status = command.send()) {
+                        return status;
+                    }
+                    // The server answers "null" for a job it has no result for; any other text, also an
+                    // empty one, is the result.
+                    const std::string body = command.body();
+                    found = body == "null" ? 0 : 1;
+                    if (found == 1) {
+                        copyText(body, resultText);
+                    }
+                    return nullptr;
+                },
+                OnFailure::kKeep);
+    });
 }
 
 IZELServerStatus* ZELServerTransformationManager::getJobResult(unsigned jobId, unsigned& found,
                                                                IZELServerTransformationResult& result)
 {
-    ZELServerString text;
-    IZELServerStatus* status = getJobResultString(jobId, found, text);
-    if (status == nullptr) {
-        result.parse(text);
-    }
-    return status;
+    return guarded([&] {
+        ZELServerString text;
+        IZELServerStatus* status = getJobResultString(jobId, found, text);
+        if (status == nullptr) {
+            result.parse(text);
+        }
+        return status;
+    });
 }
 
 // ---- Log files ------------------------------------------------------------------------------------
 
 IZELServerStatus* ZELServerTransformationManager::logFileExists(unsigned jobId, unsigned& exists)
 {
-    return CheckedCommand(channel(), "LOG_FILEEXISTS").add("jobID", jobIdText(jobId)).askFlag(exists);
+    return guarded(
+        [&] { return CheckedCommand(channel(), "LOG_FILEEXISTS").add("jobID", jobIdText(jobId)).askFlag(exists); });
 }
 
 // A reply the reader cannot use is no failure of the operation: `found` stays 0.
 IZELServerStatus* ZELServerTransformationManager::getLogFileInfo(unsigned jobId, IZELServerLogFileInfo& info,
                                                                  unsigned& found)
 {
-    return CheckedCommand(channel(), "LOG_GET_FILEINFO")
-        .add("jobID", jobIdText(jobId))
-        .askObject(found, [&info](const IZELServerResponse& response) { return response.readLogFileInfo(info); });
+    return guarded([&]() -> IZELServerStatus* {
+        return CheckedCommand(channel(), "LOG_GET_FILEINFO")
+            .add("jobID", jobIdText(jobId))
+            .askObject(found, [&info](const IZELServerResponse& response) { return response.readLogFileInfo(info); });
+    });
 }
 
 IZELServerStatus* ZELServerTransformationManager::getLogFile(unsigned jobId, const IZELServerString& localPath,
                                                              unsigned& success)
 {
-    const std::string job = jobIdText(jobId);
-    // The client never asks the server to check the log's checksum.
-    return CheckedCommand(channel(), "LOG_GET_FILE")
-        .add("jobID", job)
-        .add("logFileCRCCheckingEnabled", "false")
-        .download({toStdString(localPath), "job " + job}, success, nullptr);
+    return guarded([&] {
+        const std::string job = jobIdText(jobId);
+        // The client never asks the server to check the log's checksum.
+        return CheckedCommand(channel(), "LOG_GET_FILE")
+            .add("jobID", job)
+            .add("logFileCRCCheckingEnabled", "false")
+            .download({toStdString(localPath), "job " + job}, success, nullptr);
+    });
 }
 
 }  // namespace zel

@@ -3,6 +3,7 @@
 #include <algorithm>
 #include <utility>
 
+#include "api/exception_guard.h"
 #include "api/StringDict.h"
 #include "api/ZELServerString.h"
 #include "api/text_encoding.h"
@@ -79,106 +80,117 @@ ZELServerTransformationRequest::~ZELServerTransformationRequest() = default;
 
 void ZELServerTransformationRequest::setKeyword(const IZELServerString& keyword)
 {
-    keyword_ = toStdString(keyword);
-    dirty_ = true;
+    guarded([&] {
+        keyword_ = toStdString(keyword);
+        dirty_ = true;
+    });
 }
 
-void ZELServerTransformationRequest::getKeyword(IZELServerString& out) const { copyText(keyword_, out); }
+void ZELServerTransformationRequest::getKeyword(IZELServerString& out) const
+{
+    guarded([&] { copyText(keyword_, out); });
+}
 
 void ZELServerTransformationRequest::setPublishedParameter(const IZELServerString& name, const IZELServerString& value)
 {
-    setOne(publishedParameters_, name, value);
-    dirty_ = true;
+    guarded([&] {
+        setOne(publishedParameters_, name, value);
+        dirty_ = true;
+    });
 }
 
 void ZELServerTransformationRequest::setPublishedParameters(const IZELServerStringArray& pairs)
 {
-    insertPairs(pairs, publishedParameters_);
-    dirty_ = true;
+    guarded([&] {
+        insertPairs(pairs, publishedParameters_);
+        dirty_ = true;
+    });
 }
 
 unsigned ZELServerTransformationRequest::getPublishedParameter(const IZELServerString& name,
                                                                IZELServerString& value) const
 {
-    return getOne(publishedParameters_, name, value);
+    return guarded([&] { return getOne(publishedParameters_, name, value); });
 }
 
 void ZELServerTransformationRequest::getPublishedParameters(IZELServerStringArray& pairs) const
 {
-    appendPairs(publishedParameters_, pairs);
+    guarded([&] { appendPairs(publishedParameters_, pairs); });
 }
 
 void ZELServerTransformationRequest::setDirective(const IZELServerString& name, const IZELServerString& value)
 {
-    setOne(directives_, name, value);
+    guarded([&] { setOne(directives_, name, value); });
 }
 
 void ZELServerTransformationRequest::setDirectives(const IZELServerStringArray& pairs)
 {
-    insertPairs(pairs, directives_);
+    guarded([&] { insertPairs(pairs, directives_); });
 }
 
 unsigned ZELServerTransformationRequest::getDirective(const IZELServerString& name, IZELServerString& value) const
 {
-    return getOne(directives_, name, value);
+    return guarded([&] { return getOne(directives_, name, value); });
 }
 
 void ZELServerTransformationRequest::getDirectives(IZELServerStringArray& pairs) const
 {
-    appendPairs(directives_, pairs);
+    guarded([&] { appendPairs(directives_, pairs); });
 }
 
 // Embedded directives belong to the request text, yet setting them leaves the composed text alone:
 // callers rely on setting the keyword again to have them written, so dirty is deliberately kept.
 void ZELServerTransformationRequest::setEmbeddedDirective(const IZELServerString& name, const IZELServerString& value)
 {
-    setOne(embeddedDirectives_, name, value);
+    guarded([&] { setOne(embeddedDirectives_, name, value); });
 }
 
 void ZELServerTransformationRequest::setEmbeddedDirectives(const IZELServerStringArray& pairs)
 {
-    insertPairs(pairs, embeddedDirectives_);
+    guarded([&] { insertPairs(pairs, embeddedDirectives_); });
 }
 
 unsigned ZELServerTransformationRequest::getEmbeddedDirective(const IZELServerString& name,
                                                               IZELServerString& value) const
 {
-    return getOne(embeddedDirectives_, name, value);
+    return guarded([&] { return getOne(embeddedDirectives_, name, value); });
 }
 
 void ZELServerTransformationRequest::getEmbeddedDirectives(IZELServerStringArray& pairs) const
 {
-    appendPairs(embeddedDirectives_, pairs);
+    guarded([&] { appendPairs(embeddedDirectives_, pairs); });
 }
 
 void ZELServerTransformationRequest::setNotification(const IZELServerString& topic, const IZELServerString& message)
 {
-    setOne(notifications_, topic, message);
+    guarded([&] { setOne(notifications_, topic, message); });
 }
 
 void ZELServerTransformationRequest::setNotifications(const IZELServerStringArray& pairs)
 {
-    insertPairs(pairs, notifications_);
+    guarded([&] { insertPairs(pairs, notifications_); });
 }
 
 unsigned ZELServerTransformationRequest::getNotification(const IZELServerString& topic, IZELServerString& message) const
 {
-    return getOne(notifications_, topic, message);
+    return guarded([&] { return getOne(notifications_, topic, message); });
 }
 
 void ZELServerTransformationRequest::getNotifications(IZELServerStringArray& pairs) const
 {
-    appendPairs(notifications_, pairs);
+    guarded([&] { appendPairs(notifications_, pairs); });
 }
 
 // ---- Request text ---------------------------------------------------------------------------------
 
 void ZELServerTransformationRequest::getRequestText(IZELServerString& out) const
 {
-    if (dirty_ && !compose()) {
-        return;
-    }
-    copyText(requestText_, out);
+    guarded([&] {
+        if (dirty_ && !compose()) {
+            return;
+        }
+        copyText(requestText_, out);
+    });
 }
 
 bool ZELServerTransformationRequest::compose() const

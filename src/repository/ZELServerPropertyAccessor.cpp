@@ -2,6 +2,7 @@
 
 #include <utility>
 
+#include "api/exception_guard.h"
 #include "api/ZELServerString.h"
 #include "api/ZELServerStringArray.h"
 #include "api/ZELServerVector.h"
@@ -86,26 +87,39 @@ ZELServerProperty::ZELServerProperty(const ZELServerProperty& other)
       attributes_(other.attributes_)
 {}
 
-void ZELServerProperty::getCategory(IZELServerString& out) const { copyText(category_, out); }
-void ZELServerProperty::getName(IZELServerString& out) const { copyText(name_, out); }
-void ZELServerProperty::getValue(IZELServerString& out) const { copyText(value_, out); }
+void ZELServerProperty::getCategory(IZELServerString& out) const
+{
+    guarded([&] { copyText(category_, out); });
+}
+void ZELServerProperty::getName(IZELServerString& out) const
+{
+    guarded([&] { copyText(name_, out); });
+}
+void ZELServerProperty::getValue(IZELServerString& out) const
+{
+    guarded([&] { copyText(value_, out); });
+}
 
 bool ZELServerProperty::getAttribute(const IZELServerString& name, IZELServerString& value) const
 {
-    const auto found = attributes_.find(toStdString(name));
-    if (found == attributes_.end()) {
-        return false;
-    }
-    copyText(found->second, value);
-    return true;
+    return guarded([&]() -> bool {
+        const auto found = attributes_.find(toStdString(name));
+        if (found == attributes_.end()) {
+            return false;
+        }
+        copyText(found->second, value);
+        return true;
+    });
 }
 
 void ZELServerProperty::getAttributes(IZELServerStringArray& pairs) const
 {
-    for (const auto& [name, value] : attributes_) {
-        pairs.append(ZELServerString(name));
-        pairs.append(ZELServerString(value));
-    }
+    guarded([&] {
+        for (const auto& [name, value] : attributes_) {
+            pairs.append(ZELServerString(name));
+            pairs.append(ZELServerString(value));
+        }
+    });
 }
 
 void ZELServerProperty::setAttributes(const Attributes& attributes)
@@ -126,89 +140,105 @@ ZELServerPropertyAccessor::findCategory(const IZELServerString& category) const
 
 void ZELServerPropertyAccessor::getCategoryNames(IZELServerStringArray& names) const
 {
-    for (const auto& entry : categories_) {
-        names.append(ZELServerString(entry.first));
-    }
+    guarded([&] {
+        for (const auto& entry : categories_) {
+            names.append(ZELServerString(entry.first));
+        }
+    });
 }
 
 void ZELServerPropertyAccessor::getPropertyNames(const IZELServerString& category, IZELServerStringArray& names) const
 {
-    if (const Category* properties = findCategory(category)) {
-        for (const auto& entry : *properties) {
-            names.append(ZELServerString(entry.first));
+    guarded([&] {
+        if (const Category* properties = findCategory(category)) {
+            for (const auto& entry : *properties) {
+                names.append(ZELServerString(entry.first));
+            }
         }
-    }
+    });
 }
 
 bool ZELServerPropertyAccessor::getPropertyPairs(const IZELServerString& category, IZELServerStringArray& pairs) const
 {
-    const Category* properties = findCategory(category);
-    if (properties == nullptr) {
-        return false;
-    }
-    for (const auto& [name, property] : *properties) {
-        pairs.append(ZELServerString(name));
-        pairs.append(ZELServerString(property.value()));
-    }
-    return true;
+    return guarded([&]() -> bool {
+        const Category* properties = findCategory(category);
+        if (properties == nullptr) {
+            return false;
+        }
+        for (const auto& [name, property] : *properties) {
+            pairs.append(ZELServerString(name));
+            pairs.append(ZELServerString(property.value()));
+        }
+        return true;
+    });
 }
 
 bool ZELServerPropertyAccessor::getPropertyValue(const IZELServerString& category, const IZELServerString& name,
                                                  IZELServerString& value) const
 {
-    value.set("", 0);
-    const IZELServerProperty* property = getProperty(category, name);
-    if (property == nullptr) {
-        return false;
-    }
-    property->getValue(value);
-    return true;
+    return guarded([&]() -> bool {
+        value.set("", 0);
+        const IZELServerProperty* property = getProperty(category, name);
+        if (property == nullptr) {
+            return false;
+        }
+        property->getValue(value);
+        return true;
+    });
 }
 
 void ZELServerPropertyAccessor::setProperty(const IZELServerString& category, const IZELServerString& name,
                                             const IZELServerString& value)
 {
-    const std::string categoryText = toStdString(category);
-    const std::string nameText = toStdString(name);
-    Category& properties = categories_[categoryText];
-    const auto found = properties.find(nameText);
-    if (found != properties.end()) {
-        found->second.setValue(toStdString(value));
-    } else {
-        properties.emplace(nameText, ZELServerProperty(categoryText, nameText, toStdString(value)));
-    }
+    guarded([&] {
+        const std::string categoryText = toStdString(category);
+        const std::string nameText = toStdString(name);
+        Category& properties = categories_[categoryText];
+        const auto found = properties.find(nameText);
+        if (found != properties.end()) {
+            found->second.setValue(toStdString(value));
+        } else {
+            properties.emplace(nameText, ZELServerProperty(categoryText, nameText, toStdString(value)));
+        }
+    });
 }
 
 bool ZELServerPropertyAccessor::removeCategory(const IZELServerString& category)
 {
-    return categories_.erase(toStdString(category)) != 0;
+    return guarded([&] { return categories_.erase(toStdString(category)) != 0; });
 }
 
 bool ZELServerPropertyAccessor::removeProperty(const IZELServerString& category, const IZELServerString& name)
 {
-    const auto found = categories_.find(toStdString(category));
-    return found != categories_.end() && found->second.erase(toStdString(name)) != 0;
+    return guarded([&] {
+        const auto found = categories_.find(toStdString(category));
+        return found != categories_.end() && found->second.erase(toStdString(name)) != 0;
+    });
 }
 
 void ZELServerPropertyAccessor::getProperties(const IZELServerString& category,
                                               IZELServerVector<IZELServerProperty>& properties) const
 {
-    if (const Category* found = findCategory(category)) {
-        for (const auto& entry : *found) {
-            properties.append(new ZELServerProperty(entry.second));
+    guarded([&] {
+        if (const Category* found = findCategory(category)) {
+            for (const auto& entry : *found) {
+                properties.append(new ZELServerProperty(entry.second));
+            }
         }
-    }
+    });
 }
 
 const IZELServerProperty* ZELServerPropertyAccessor::getProperty(const IZELServerString& category,
                                                                  const IZELServerString& name) const
 {
-    const Category* properties = findCategory(category);
-    if (properties == nullptr) {
-        return nullptr;
-    }
-    const auto found = properties->find(toStdString(name));
-    return found == properties->end() ? nullptr : &found->second;
+    return guarded([&]() -> const IZELServerProperty* {
+        const Category* properties = findCategory(category);
+        if (properties == nullptr) {
+            return nullptr;
+        }
+        const auto found = properties->find(toStdString(name));
+        return found == properties->end() ? nullptr : &found->second;
+    });
 }
 
 void ZELServerPropertyAccessor::readProperties(const std::vector<XmlElement*>& elements)

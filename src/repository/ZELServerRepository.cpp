@@ -2,6 +2,7 @@
 
 #include <optional>
 
+#include "api/exception_guard.h"
 #include "api/ZELServerString.h"
 #include "api/ZELServerStringArray.h"
 #include "api/message_numbers.h"
@@ -63,8 +64,14 @@ ZELServerRepository::ZELServerRepository(IZELServerChannel* channel, const IZELS
     fields_.description = toStdString(description);
 }
 
-void ZELServerRepository::getName(IZELServerString& out) const { copyText(fields_.name, out); }
-void ZELServerRepository::getDescription(IZELServerString& out) const { copyText(fields_.description, out); }
+void ZELServerRepository::getName(IZELServerString& out) const
+{
+    guarded([&] { copyText(fields_.name, out); });
+}
+void ZELServerRepository::getDescription(IZELServerString& out) const
+{
+    guarded([&] { copyText(fields_.description, out); });
+}
 
 bool ZELServerRepository::readFrom(const XmlElement& element)
 {
@@ -83,48 +90,54 @@ CheckedCommand ZELServerRepository::on(const char* keyword, Where where) const
 
 IZELServerStatus* ZELServerRepository::itemExists(const IZELServerString& itemName, unsigned& exists)
 {
-    return on("REP_ITEMEXISTS")
-        .require(itemName)
-        .check(allowedName(itemName))
-        .add("itemName", itemName)
-        .askFlag(exists);
+    return guarded([&] {
+        return on("REP_ITEMEXISTS")
+            .require(itemName)
+            .check(allowedName(itemName))
+            .add("itemName", itemName)
+            .askFlag(exists);
+    });
 }
 
 IZELServerStatus* ZELServerRepository::getItem(const IZELServerString& itemName,
                                                const IZELServerString& destinationPath, unsigned& received,
                                                IZELServerProgressListener* listener)
 {
-    const std::string item = toStdString(itemName);
-    return on("REP_GET_ITEM")
-        .require(itemName)
-        .require(destinationPath)
-        .check(allowedName(itemName))
-        .add("itemName", item)
-        .add("itemFileCRCCheckingEnabled", kNoCrcCheck)
-        .download({toStdString(destinationPath), item, true}, received, listener);
+    return guarded([&] {
+        const std::string item = toStdString(itemName);
+        return on("REP_GET_ITEM")
+            .require(itemName)
+            .require(destinationPath)
+            .check(allowedName(itemName))
+            .add("itemName", item)
+            .add("itemFileCRCCheckingEnabled", kNoCrcCheck)
+            .download({toStdString(destinationPath), item, true}, received, listener);
+    });
 }
 
 IZELServerStatus* ZELServerRepository::getItem(const IZELServerString& itemName,
                                                const IZELServerString& destinationPath, unsigned& received)
 {
-    return getItem(itemName, destinationPath, received, nullptr);
+    return guarded([&] { return getItem(itemName, destinationPath, received, nullptr); });
 }
 
 IZELServerStatus* ZELServerRepository::addItem(const IZELServerString& itemName, const IZELServerString& sourcePath,
                                                IZELServerProgressListener* listener)
 {
-    return on("REP_ADD_ITEM")
-        .require(itemName)
-        .require(sourcePath)
-        .check(allowedName(itemName))
-        .add("itemName", itemName)
-        .add("itemFileCRCCheckingEnabled", kNoCrcCheck)
-        .upload(sourcePath, listener);
+    return guarded([&] {
+        return on("REP_ADD_ITEM")
+            .require(itemName)
+            .require(sourcePath)
+            .check(allowedName(itemName))
+            .add("itemName", itemName)
+            .add("itemFileCRCCheckingEnabled", kNoCrcCheck)
+            .upload(sourcePath, listener);
+    });
 }
 
 IZELServerStatus* ZELServerRepository::addItem(const IZELServerString& itemName, const IZELServerString& sourcePath)
 {
-    return addItem(itemName, sourcePath, nullptr);
+    return guarded([&] { return addItem(itemName, sourcePath, nullptr); });
 }
 
 // Only emptiness is checked here, unlike addItem: an item already on the server is replaced under
@@ -132,26 +145,30 @@ IZELServerStatus* ZELServerRepository::addItem(const IZELServerString& itemName,
 IZELServerStatus* ZELServerRepository::updateItem(const IZELServerString& itemName, const IZELServerString& sourcePath,
                                                   IZELServerProgressListener* listener)
 {
-    return on("REP_UPDATE_ITEM")
-        .require(itemName)
-        .require(sourcePath)
-        .add("itemName", itemName)
-        .add("itemFileCRCCheckingEnabled", kNoCrcCheck)
-        .upload(sourcePath, listener);
+    return guarded([&] {
+        return on("REP_UPDATE_ITEM")
+            .require(itemName)
+            .require(sourcePath)
+            .add("itemName", itemName)
+            .add("itemFileCRCCheckingEnabled", kNoCrcCheck)
+            .upload(sourcePath, listener);
+    });
 }
 
 IZELServerStatus* ZELServerRepository::updateItem(const IZELServerString& itemName, const IZELServerString& sourcePath)
 {
-    return updateItem(itemName, sourcePath, nullptr);
+    return guarded([&] { return updateItem(itemName, sourcePath, nullptr); });
 }
 
 IZELServerStatus* ZELServerRepository::removeItem(const IZELServerString& itemName, unsigned& removed)
 {
-    return on("REP_REMOVE_ITEM")
-        .require(itemName)
-        .check(allowedName(itemName))
-        .add("itemName", itemName)
-        .askFlag(removed);
+    return guarded([&] {
+        return on("REP_REMOVE_ITEM")
+            .require(itemName)
+            .check(allowedName(itemName))
+            .add("itemName", itemName)
+            .askFlag(removed);
+    });
 }
 
 // ---- Item resources ---------------------------------------------------------------------------------
@@ -159,14 +176,16 @@ IZELServerStatus* ZELServerRepository::removeItem(const IZELServerString& itemNa
 IZELServerStatus* ZELServerRepository::itemResourceExists(const IZELServerString& itemName,
                                                           const IZELServerString& resourceName, unsigned& exists)
 {
-    return on("REP_ITEMRESOURCEEXISTS")
-        .require(itemName)
-        .require(resourceName)
-        .check(allowedName(itemName))
-        .check(allowedName(resourceName))
-        .add("itemName", itemName)
-        .add("resourceName", resourceName)
-        .askFlag(exists);
+    return guarded([&] {
+        return on("REP_ITEMRESOURCEEXISTS")
+            .require(itemName)
+            .require(resourceName)
+            .check(allowedName(itemName))
+            .check(allowedName(resourceName))
+            .add("itemName", itemName)
+            .add("resourceName", resourceName)
+            .askFlag(exists);
+    });
 }
 
 IZELServerStatus* ZELServerRepository::getItemResource(const IZELServerString& itemName,
@@ -174,24 +193,26 @@ IZELServerStatus* ZELServerRepository::getItemResource(const IZELServerString& i
                                                        const IZELServerString& destinationPath, unsigned& received,
                                                        IZELServerProgressListener* listener)
 {
-    // Unlike an item, an empty resource is a resource.
-    return on("REP_GET_ITEMRESOURCE")
-        .require(itemName)
-        .require(resourceName)
-        .require(destinationPath)
-        .check(allowedName(itemName))
-        .check(allowedName(resourceName))
-        .add("itemName", itemName)
-        .add("resourceName", resourceName)
-        .add("resourceFileCRCCheckingEnabled", kNoCrcCheck)
-        .download({toStdString(destinationPath), toStdString(resourceName)}, received, listener);
+    return guarded([&] {
+        // Unlike an item, an empty resource is a resource.
+        return on("REP_GET_ITEMRESOURCE")
+            .require(itemName)
+            .require(resourceName)
+            .require(destinationPath)
+            .check(allowedName(itemName))
+            .check(allowedName(resourceName))
+            .add("itemName", itemName)
+            .add("resourceName", resourceName)
+            .add("resourceFileCRCCheckingEnabled", kNoCrcCheck)
+            .download({toStdString(destinationPath), toStdString(resourceName)}, received, listener);
+    });
 }
 
 IZELServerStatus* ZELServerRepository::getItemResource(const IZELServerString& itemName,
                                                        const IZELServerString& resourceName,
                                                        const IZELServerString& destinationPath, unsigned& received)
 {
-    return getItemResource(itemName, resourceName, destinationPath, received, nullptr);
+    return guarded([&] { return getItemResource(itemName, resourceName, destinationPath, received, nullptr); });
 }
 
 // Only the item name is checked: the resource name goes to the server as given.
@@ -199,11 +220,13 @@ IZELServerStatus* ZELServerRepository::getItemResourceView(const IZELServerStrin
                                                            const IZELServerString& resourceName,
                                                            IZELServerResource& resource, unsigned& found)
 {
-    return on("REP_GET_ITEMRESOURCEVIEW")
-        .require(itemName)
-        .add("itemName", itemName)
-        .add("resourceName", resourceName)
-        .askObject(found, [&](const IZELServerResponse& response) { return response.readResource(resource); });
+    return guarded([&]() -> IZELServerStatus* {
+        return on("REP_GET_ITEMRESOURCEVIEW")
+            .require(itemName)
+            .add("itemName", itemName)
+            .add("resourceName", resourceName)
+            .askObject(found, [&](const IZELServerResponse& response) { return response.readResource(resource); });
+    });
 }
 
 // Adding and replacing a resource differ only in their keyword.
@@ -230,14 +253,15 @@ IZELServerStatus* ZELServerRepository::addItemResource(const IZELServerString& i
                                                        const IZELServerString& sourcePath,
                                                        IZELServerProgressListener* listener)
 {
-    return sendItemResource("REP_ADD_ITEMRESOURCE", itemName, resourceName, sourcePath, listener);
+    return guarded(
+        [&] { return sendItemResource("REP_ADD_ITEMRESOURCE", itemName, resourceName, sourcePath, listener); });
 }
 
 IZELServerStatus* ZELServerRepository::addItemResource(const IZELServerString& itemName,
                                                        const IZELServerString& resourceName,
                                                        const IZELServerString& sourcePath)
 {
-    return addItemResource(itemName, resourceName, sourcePath, nullptr);
+    return guarded([&] { return addItemResource(itemName, resourceName, sourcePath, nullptr); });
 }
 
 IZELServerStatus* ZELServerRepository::updateItemResource(const IZELServerString& itemName,
@@ -245,27 +269,30 @@ IZELServerStatus* ZELServerRepository::updateItemResource(const IZELServerString
                                                           const IZELServerString& sourcePath,
                                                           IZELServerProgressListener* listener)
 {
-    return sendItemResource("REP_UPDATE_ITEMRESOURCE", itemName, resourceName, sourcePath, listener);
+    return guarded(
+        [&] { return sendItemResource("REP_UPDATE_ITEMRESOURCE", itemName, resourceName, sourcePath, listener); });
 }
 
 IZELServerStatus* ZELServerRepository::updateItemResource(const IZELServerString& itemName,
                                                           const IZELServerString& resourceName,
                                                           const IZELServerString& sourcePath)
 {
-    return updateItemResource(itemName, resourceName, sourcePath, nullptr);
+    return guarded([&] { return updateItemResource(itemName, resourceName, sourcePath, nullptr); });
 }
 
 IZELServerStatus* ZELServerRepository::removeItemResource(const IZELServerString& itemName,
                                                           const IZELServerString& resourceName, unsigned& removed)
 {
-    return on("REP_REMOVE_ITEMRESOURCE")
-        .require(itemName)
-        .require(resourceName)
-        .check(allowedName(itemName))
-        .check(allowedName(resourceName))
-        .add("itemName", itemName)
-        .add("resourceName", resourceName)
-        .askFlag(removed);
+    return guarded([&] {
+        return on("REP_REMOVE_ITEMRESOURCE")
+            .require(itemName)
+            .require(resourceName)
+            .check(allowedName(itemName))
+            .check(allowedName(resourceName))
+            .add("itemName", itemName)
+            .add("resourceName", resourceName)
+            .askFlag(removed);
+    });
 }
 
 // ---- Views ------------------------------------------------------------------------------------------
@@ -274,72 +301,88 @@ IZELServerStatus*
 ZELServerRepository::getWorkspaceSummariesView(const ZELServerStringDict* directives,
                                                IZELServerVector<IZELServerWorkspaceSummary>& summaries)
 {
-    const ZELServerStringArray filter = enableFilterList(directives);
-    return on("REP_GET_WORKSPACESUMMARIESVIEW")
-        .require(filter.entries() >= 2)
-        .addList("directives", filter)
-        .askList([&](const IZELServerResponse& response) {
-            return readWorkspaceSummariesReply(bodyOf(response), summaries);
-        });
+    return guarded([&]() -> IZELServerStatus* {
+        const ZELServerStringArray filter = enableFilterList(directives);
+        return on("REP_GET_WORKSPACESUMMARIESVIEW")
+            .require(filter.entries() >= 2)
+            .addList("directives", filter)
+            .askList([&](const IZELServerResponse& response) {
+                return readWorkspaceSummariesReply(bodyOf(response), summaries);
+            });
+    });
 }
 
 IZELServerStatus* ZELServerRepository::getWorkspacesView(const ZELServerStringDict* directives,
                                                          IZELServerVector<IZELServerWorkspace>& workspaces)
 {
-    const ZELServerStringArray filter = enableFilterList(directives);
-    return on("REP_GET_WORKSPACESVIEW")
-        .require(filter.entries() >= 2)
-        .addList("directives", filter)
-        .askList([&](const IZELServerResponse& response) { return response.readWorkspaces(workspaces); });
+    return guarded([&]() -> IZELServerStatus* {
+        const ZELServerStringArray filter = enableFilterList(directives);
+        return on("REP_GET_WORKSPACESVIEW")
+            .require(filter.entries() >= 2)
+            .addList("directives", filter)
+            .askList([&](const IZELServerResponse& response) { return response.readWorkspaces(workspaces); });
+    });
 }
 
 IZELServerStatus* ZELServerRepository::getWorkspaceView(const IZELServerString& workspaceName,
                                                         IZELServerWorkspace& workspace, unsigned& found)
 {
-    return on("REP_GET_WORKSPACEVIEW")
-        .require(workspaceName)
-        .add("workspaceName", workspaceName)
-        .askObject(found, [&](const IZELServerResponse& response) { return response.readWorkspace(workspace); });
+    return guarded([&]() -> IZELServerStatus* {
+        return on("REP_GET_WORKSPACEVIEW")
+            .require(workspaceName)
+            .add("workspaceName", workspaceName)
+            .askObject(found, [&](const IZELServerResponse& response) { return response.readWorkspace(workspace); });
+    });
 }
 
 // The directives of this view and the three below are not read: the server lists everything.
 IZELServerStatus* ZELServerRepository::getCustomFormatsView(const ZELServerStringDict* /*directives*/,
                                                             IZELServerVector<IZELServerCustomFormat>& customFormats)
 {
-    return on("REP_GET_CUSTOMFORMATSVIEW")
-        .addList("directives", allObjects())
-        .askList([&](const IZELServerResponse& response) { return response.readCustomFormats(customFormats); });
+    return guarded([&]() -> IZELServerStatus* {
+        return on("REP_GET_CUSTOMFORMATSVIEW")
+            .addList("directives", allObjects())
+            .askList([&](const IZELServerResponse& response) { return response.readCustomFormats(customFormats); });
+    });
 }
 
 IZELServerStatus* ZELServerRepository::getCustomFormatView(const IZELServerString& customFormatName,
                                                            IZELServerCustomFormat& customFormat, unsigned& found)
 {
-    return on("REP_GET_CUSTOMFORMATVIEW")
-        .require(customFormatName)
-        .add("customFormatName", customFormatName)
-        .askObject(found, [&](const IZELServerResponse& response) { return response.readCustomFormat(customFormat); });
+    return guarded([&]() -> IZELServerStatus* {
+        return on("REP_GET_CUSTOMFORMATVIEW")
+            .require(customFormatName)
+            .add("customFormatName", customFormatName)
+            .askObject(found,
+                       [&](const IZELServerResponse& response) { return response.readCustomFormat(customFormat); });
+    });
 }
 
 IZELServerStatus*
 ZELServerRepository::getCustomTransformersView(const ZELServerStringDict* /*directives*/,
                                                IZELServerVector<IZELServerCustomTransformer>& customTransformers)
 {
-    return on("REP_GET_CUSTOMTRANSFORMERSVIEW")
-        .addList("directives", allObjects())
-        .askList(
-            [&](const IZELServerResponse& response) { return response.readCustomTransformers(customTransformers); });
+    return guarded([&]() -> IZELServerStatus* {
+        return on("REP_GET_CUSTOMTRANSFORMERSVIEW")
+            .addList("directives", allObjects())
+            .askList([&](const IZELServerResponse& response) {
+                return response.readCustomTransformers(customTransformers);
+            });
+    });
 }
 
 IZELServerStatus* ZELServerRepository::getCustomTransformerView(const IZELServerString& customTransformerName,
                                                                 IZELServerCustomTransformer& customTransformer,
                                                                 unsigned& found)
 {
-    return on("REP_GET_CUSTOMTRANSFORMERVIEW")
-        .require(customTransformerName)
-        .add("customTransformerName", customTransformerName)
-        .askObject(found, [&](const IZELServerResponse& response) {
-            return response.readCustomTransformer(customTransformer);
-        });
+    return guarded([&]() -> IZELServerStatus* {
+        return on("REP_GET_CUSTOMTRANSFORMERVIEW")
+            .require(customTransformerName)
+            .add("customTransformerName", customTransformerName)
+            .askObject(found, [&](const IZELServerResponse& response) {
+                return response.readCustomTransformer(customTransformer);
+            });
+    });
 }
 
 // Nothing is checked here, not even the item name, which goes to the server as given.
@@ -347,27 +390,33 @@ IZELServerStatus* ZELServerRepository::getItemResourcesView(const IZELServerStri
                                                             const ZELServerStringDict* /*directives*/,
                                                             IZELServerVector<IZELServerResource>& resources)
 {
-    return on("REP_GET_ITEMRESOURCESVIEW")
-        .add("itemName", itemName)
-        .addList("directives", allObjects())
-        .askList([&](const IZELServerResponse& response) { return response.readResources(resources); });
+    return guarded([&]() -> IZELServerStatus* {
+        return on("REP_GET_ITEMRESOURCESVIEW")
+            .add("itemName", itemName)
+            .addList("directives", allObjects())
+            .askList([&](const IZELServerResponse& response) { return response.readResources(resources); });
+    });
 }
 
 IZELServerStatus* ZELServerRepository::getTemplatesView(const ZELServerStringDict* /*directives*/,
                                                         IZELServerVector<IZELServerTemplate>& templates)
 {
-    return on("REP_GET_TEMPLATESVIEW")
-        .addList("directives", allObjects())
-        .askList([&](const IZELServerResponse& response) { return response.readTemplates(templates); });
+    return guarded([&]() -> IZELServerStatus* {
+        return on("REP_GET_TEMPLATESVIEW")
+            .addList("directives", allObjects())
+            .askList([&](const IZELServerResponse& response) { return response.readTemplates(templates); });
+    });
 }
 
 IZELServerStatus* ZELServerRepository::getTemplateView(const IZELServerString& templateName, IZELServerTemplate& templ,
                                                        unsigned& found)
 {
-    return on("REP_GET_TEMPLATEVIEW")
-        .require(templateName)
-        .add("templateName", templateName)
-        .askObject(found, [&](const IZELServerResponse& response) { return response.readTemplate(templ); });
+    return guarded([&]() -> IZELServerStatus* {
+        return on("REP_GET_TEMPLATEVIEW")
+            .require(templateName)
+            .add("templateName", templateName)
+            .askObject(found, [&](const IZELServerResponse& response) { return response.readTemplate(templ); });
+    });
 }
 
 // ---- Workspace registrations ------------------------------------------------------------------------
@@ -376,48 +425,56 @@ IZELServerStatus*
 ZELServerRepository::getWorkspaceServices(const ZELServerStringDict* directives,
                                           IZELServerVector<IZELServerWorkspaceService>& workspaceServices)
 {
-    const std::optional<ZELServerStringArray> filter = registrationFilterOf(directives);
-    IZELServerChannel* channel = channel_;
-    return on("REP_GET_WORKSPACESERVICES")
-        .require(filter.has_value())
-        .addList("directives", filter.value_or(ZELServerStringArray()))
-        .askList([&](const IZELServerResponse& response) {
-            return readWorkspaceServicesReply(bodyOf(response), channel, workspaceServices);
-        });
+    return guarded([&]() -> IZELServerStatus* {
+        const std::optional<ZELServerStringArray> filter = registrationFilterOf(directives);
+        IZELServerChannel* channel = channel_;
+        return on("REP_GET_WORKSPACESERVICES")
+            .require(filter.has_value())
+            .addList("directives", filter.value_or(ZELServerStringArray()))
+            .askList([&](const IZELServerResponse& response) {
+                return readWorkspaceServicesReply(bodyOf(response), channel, workspaceServices);
+            });
+    });
 }
 
 IZELServerStatus* ZELServerRepository::workspaceServiceExists(const IZELServerString& workspaceName,
                                                               const IZELServerString& serviceName, unsigned& exists)
 {
-    return on("REP_WORKSPACESERVICEEXISTS")
-        .require(workspaceName)
-        .require(serviceName)
-        .add("workspaceName", workspaceName)
-        .add("serviceName", serviceName)
-        .askFlag(exists);
+    return guarded([&] {
+        return on("REP_WORKSPACESERVICEEXISTS")
+            .require(workspaceName)
+            .require(serviceName)
+            .add("workspaceName", workspaceName)
+            .add("serviceName", serviceName)
+            .askFlag(exists);
+    });
 }
 
 IZELServerStatus* ZELServerRepository::registerWorkspaceService(const IZELServerString& workspaceName,
                                                                 const IZELServerString& serviceName)
 {
-    return on("REP_REGISTER_WORKSPACESERVICE")
-        .require(workspaceName)
-        .require(serviceName)
-        .add("workspaceName", workspaceName)
-        .add("serviceName", serviceName)
-        .send();
+    return guarded([&] {
+        return on("REP_REGISTER_WORKSPACESERVICE")
+            .require(workspaceName)
+            .require(serviceName)
+            .add("workspaceName", workspaceName)
+            .add("serviceName", serviceName)
+            .send();
+    });
 }
 
 IZELServerStatus* ZELServerRepository::deregisterWorkspaceService(const IZELServerString& workspaceName,
                                                                   const IZELServerString& serviceName,
                                                                   unsigned& deregistered)
 {
-    return on("REP_DEREGISTER_WORKSPACESERVICE")
-        .require(workspaceName)
-        .require(serviceName)
-        .add("workspaceName", workspaceName)
-        .add("serviceName", serviceName)
-        .askFlag(deregistered);
+    return guarded([&] {
+        return on("REP_DEREGISTER_WORKSPACESERVICE")
+            .require(workspaceName)
+            .require(serviceName)
+            .add("workspaceName", workspaceName)
+            .add("serviceName", serviceName)
+            .askFlag(deregistered);
+    });
 }
 
 }  // namespace zel

@@ -2,6 +2,7 @@
 
 #include <utility>
 
+#include "api/exception_guard.h"
 #include "api/ZELServerString.h"
 #include "api/message_numbers.h"
 #include "transport/attribute_binding.h"
@@ -45,22 +46,37 @@ ZELServerService::ZELServerService(IZELServerChannel* channel, std::string name,
     fields_.templateRegistration = templateRegistration;
 }
 
-void ZELServerService::getName(IZELServerString& out) const { copyText(fields_.name, out); }
-void ZELServerService::setName(const IZELServerString& name) { fields_.name = toStdString(name); }
-void ZELServerService::getDisplayName(IZELServerString& out) const { copyText(fields_.displayName, out); }
+void ZELServerService::getName(IZELServerString& out) const
+{
+    guarded([&] { copyText(fields_.name, out); });
+}
+void ZELServerService::setName(const IZELServerString& name)
+{
+    guarded([&] { fields_.name = toStdString(name); });
+}
+void ZELServerService::getDisplayName(IZELServerString& out) const
+{
+    guarded([&] { copyText(fields_.displayName, out); });
+}
 void ZELServerService::setDisplayName(const IZELServerString& displayName)
 {
-    fields_.displayName = toStdString(displayName);
+    guarded([&] { fields_.displayName = toStdString(displayName); });
 }
-void ZELServerService::getDescription(IZELServerString& out) const { copyText(fields_.description, out); }
+void ZELServerService::getDescription(IZELServerString& out) const
+{
+    guarded([&] { copyText(fields_.description, out); });
+}
 void ZELServerService::setDescription(const IZELServerString& description)
 {
-    fields_.description = toStdString(description);
+    guarded([&] { fields_.description = toStdString(description); });
 }
-void ZELServerService::getUrlPattern(IZELServerString& out) const { copyText(fields_.urlPattern, out); }
+void ZELServerService::getUrlPattern(IZELServerString& out) const
+{
+    guarded([&] { copyText(fields_.urlPattern, out); });
+}
 void ZELServerService::setUrlPattern(const IZELServerString& urlPattern)
 {
-    fields_.urlPattern = toStdString(urlPattern);
+    guarded([&] { fields_.urlPattern = toStdString(urlPattern); });
 }
 
 bool ServiceFields::*ZELServerService::registrationField(unsigned itemType)
@@ -94,60 +110,70 @@ void ZELServerService::setRegistrationAllowed(unsigned itemType, unsigned allowe
 
 IZELServerStatus* ZELServerService::updatePropertyAccessor(const IZELServerPropertyAccessor& accessor)
 {
-    const PropertyAccessorXml properties(accessor);
-    return CheckedCommand(channel_, "REP_UPDATE_SERVICEPROPERTYACCESSOR")
-        .add("serviceID", fields_.id)
-        .addXml("propertyAccessorObject", properties, "REP_UPDATE_SERVICEPROPERTYACCESSOR")
-        .send();
+    return guarded([&] {
+        const PropertyAccessorXml properties(accessor);
+        return CheckedCommand(channel_, "REP_UPDATE_SERVICEPROPERTYACCESSOR")
+            .add("serviceID", fields_.id)
+            .addXml("propertyAccessorObject", properties, "REP_UPDATE_SERVICEPROPERTYACCESSOR")
+            .send();
+    });
 }
 
 IZELServerStatus* ZELServerService::itemRegistered(const IZELServerString& repositoryName,
                                                    const IZELServerString& itemName, unsigned& registered)
 {
-    return CheckedCommand(channel_, "REP_ITEMREGISTERED")
-        .add("serviceName", fields_.name)
-        .add("repositoryName", repositoryName)
-        .add("itemName", itemName)
-        .askFlag(registered);
+    return guarded([&] {
+        return CheckedCommand(channel_, "REP_ITEMREGISTERED")
+            .add("serviceName", fields_.name)
+            .add("repositoryName", repositoryName)
+            .add("itemName", itemName)
+            .askFlag(registered);
+    });
 }
 
 IZELServerStatus* ZELServerService::registerItem(const IZELServerString& repositoryName,
                                                  const IZELServerString& itemName)
 {
-    // Refused here rather than by the server: an item kind the service does not take, and any name
-    // without one of the four endings, never reaches the wire.
-    return CheckedCommand(channel_, "REP_REGISTERITEM")
-        .require(itemName)
-        .check(isRegistrationAllowed(itemTypeOf(toStdString(itemName))) == 1, msg::kRegistrationRefused)
-        .add("serviceName", fields_.name)
-        .add("repositoryName", repositoryName)
-        .add("itemName", itemName)
-        .send();
+    return guarded([&] {
+        // Refused here rather than by the server: an item kind the service does not take, and any name
+        // without one of the four endings, never reaches the wire.
+        return CheckedCommand(channel_, "REP_REGISTERITEM")
+            .require(itemName)
+            .check(isRegistrationAllowed(itemTypeOf(toStdString(itemName))) == 1, msg::kRegistrationRefused)
+            .add("serviceName", fields_.name)
+            .add("repositoryName", repositoryName)
+            .add("itemName", itemName)
+            .send();
+    });
 }
 
 IZELServerStatus* ZELServerService::deregisterItem(const IZELServerString& repositoryName,
                                                    const IZELServerString& itemName, unsigned& deregistered)
 {
-    return CheckedCommand(channel_, "REP_DEREGISTERITEM")
-        .add("serviceName", fields_.name)
-        .add("repositoryName", repositoryName)
-        .add("itemName", itemName)
-        .askFlag(deregistered);
+    return guarded([&] {
+        return CheckedCommand(channel_, "REP_DEREGISTERITEM")
+            .add("serviceName", fields_.name)
+            .add("repositoryName", repositoryName)
+            .add("itemName", itemName)
+            .askFlag(deregistered);
+    });
 }
 
 IZELServerStatus* ZELServerService::getRegisteredItems(const ZELServerStringDict* directives,
                                                        IZELServerVector<IZELServerItem>& items)
 {
-    CheckedCommand command(channel_, "REP_GET_REGISTEREDITEMS");
-    command.add("serviceName", fields_.name);
-    if (const std::string* itemType = directives != nullptr ? directives->find("ITEM_TYPE") : nullptr) {
-        command.add("itemType", *itemType);
-    }
-    // The response has no item list reader; the items are read from the body here.
-    return command.askList([&items](const IZELServerResponse& response) {
-        std::string body;
-        response.getBody(body);
-        return readItemsReply(body, items);
+    return guarded([&]() -> IZELServerStatus* {
+        CheckedCommand command(channel_, "REP_GET_REGISTEREDITEMS");
+        command.add("serviceName", fields_.name);
+        if (const std::string* itemType = directives != nullptr ? directives->find("ITEM_TYPE") : nullptr) {
+            command.add("itemType", *itemType);
+        }
+        // The response has no item list reader; the items are read from the body here.
+        return command.askList([&items](const IZELServerResponse& response) {
+            std::string body;
+            response.getBody(body);
+            return readItemsReply(body, items);
+        });
     });
 }
 

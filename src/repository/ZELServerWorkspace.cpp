@@ -3,6 +3,7 @@
 #include <memory>
 #include <vector>
 
+#include "api/exception_guard.h"
 #include "transport/attribute_binding.h"
 #include "repository/repository_checks.h"
 #include "api/ZELServerString.h"
@@ -69,12 +70,21 @@ IZELServerStatus* sendProperties(IZELServerChannel* channel, const char* keyword
 
 // ---- Feature type -----------------------------------------------------------------------------------
 
-void ZELServerFeatureType::getName(IZELServerString& out) const { copyText(fields_.name, out); }
-void ZELServerFeatureType::getDescription(IZELServerString& out) const { copyText(fields_.description, out); }
+void ZELServerFeatureType::getName(IZELServerString& out) const
+{
+    guarded([&] { copyText(fields_.name, out); });
+}
+void ZELServerFeatureType::getDescription(IZELServerString& out) const
+{
+    guarded([&] { copyText(fields_.description, out); });
+}
 
 IZELServerStatus* ZELServerFeatureType::updatePropertyAccessor(const IZELServerPropertyAccessor& accessor)
 {
-    return sendProperties(channel_, "REP_UPDATE_FEATURETYPEPROPERTYACCESSOR", "featureTypeID", fields_.id, accessor);
+    return guarded([&] {
+        return sendProperties(channel_, "REP_UPDATE_FEATURETYPEPROPERTYACCESSOR", "featureTypeID", fields_.id,
+                              accessor);
+    });
 }
 
 bool ZELServerFeatureType::readFrom(const XmlElement& element)
@@ -87,13 +97,24 @@ bool ZELServerFeatureType::readFrom(const XmlElement& element)
 
 // ---- Dataset ----------------------------------------------------------------------------------------
 
-void ZELServerDataset::getName(IZELServerString& out) const { copyText(fields_.name, out); }
-void ZELServerDataset::getFormat(IZELServerString& out) const { copyText(fields_.format, out); }
-void ZELServerDataset::getLocation(IZELServerString& out) const { copyText(fields_.location, out); }
+void ZELServerDataset::getName(IZELServerString& out) const
+{
+    guarded([&] { copyText(fields_.name, out); });
+}
+void ZELServerDataset::getFormat(IZELServerString& out) const
+{
+    guarded([&] { copyText(fields_.format, out); });
+}
+void ZELServerDataset::getLocation(IZELServerString& out) const
+{
+    guarded([&] { copyText(fields_.location, out); });
+}
 
 IZELServerStatus* ZELServerDataset::updatePropertyAccessor(const IZELServerPropertyAccessor& accessor)
 {
-    return sendProperties(channel_, "REP_UPDATE_DATASETPROPERTYACCESSOR", "datasetID", fields_.id, accessor);
+    return guarded([&] {
+        return sendProperties(channel_, "REP_UPDATE_DATASETPROPERTYACCESSOR", "datasetID", fields_.id, accessor);
+    });
 }
 
 bool ZELServerDataset::readFrom(const XmlElement& element)
@@ -108,13 +129,24 @@ bool ZELServerDataset::readFrom(const XmlElement& element)
 
 // ---- Workspace --------------------------------------------------------------------------------------
 
-void ZELServerWorkspace::getName(IZELServerString& out) const { copyText(fields_.name, out); }
-void ZELServerWorkspace::getTitle(IZELServerString& out) const { copyText(fields_.title, out); }
-void ZELServerWorkspace::getDescription(IZELServerString& out) const { copyText(fields_.description, out); }
+void ZELServerWorkspace::getName(IZELServerString& out) const
+{
+    guarded([&] { copyText(fields_.name, out); });
+}
+void ZELServerWorkspace::getTitle(IZELServerString& out) const
+{
+    guarded([&] { copyText(fields_.title, out); });
+}
+void ZELServerWorkspace::getDescription(IZELServerString& out) const
+{
+    guarded([&] { copyText(fields_.description, out); });
+}
 
 IZELServerStatus* ZELServerWorkspace::updatePropertyAccessor(const IZELServerPropertyAccessor& accessor)
 {
-    return sendProperties(channel_, "REP_UPDATE_WORKSPACEPROPERTYACCESSOR", "workspaceID", fields_.id, accessor);
+    return guarded([&] {
+        return sendProperties(channel_, "REP_UPDATE_WORKSPACEPROPERTYACCESSOR", "workspaceID", fields_.id, accessor);
+    });
 }
 
 bool ZELServerWorkspace::readDatasets(const XmlElement& element)

@@ -1,5 +1,6 @@
 #include "security/ZELServerIdentity.h"
 
+#include "api/exception_guard.h"
 #include "api/ZELServerString.h"
 #include "api/conversions.h"
 #include "api/message_numbers.h"
@@ -58,22 +59,29 @@ std::optional<std::string> writeDocument(const IZELServerIdentity& identity, con
 
 }  // namespace
 
-void ZELServerIdentity::getId(IZELServerString& out) const { copyText(fields_.id, out); }
+void ZELServerIdentity::getId(IZELServerString& out) const
+{
+    guarded([&] { copyText(fields_.id, out); });
+}
 
 void ZELServerIdentity::getRoles(IZELServerStringArray& out) const
 {
-    for (const std::string& role : roles_.items()) {
-        out.append(ZELServerString(role));
-    }
+    guarded([&] {
+        for (const std::string& role : roles_.items()) {
+            out.append(ZELServerString(role));
+        }
+    });
 }
 
 void ZELServerIdentity::readFromXml(const xercesc_3_2::DOMElement& element)
 {
-    // The navigation helpers work on wrappers; these live only for this reading.
-    ZELServerDOMNodeList wrappers;
-    if (const XmlElement* wrapped = wrappers.wrap(const_cast<xercesc::DOMElement*>(&element))) {
-        readElement(*wrapped);
-    }
+    guarded([&] {
+        // The navigation helpers work on wrappers; these live only for this reading.
+        ZELServerDOMNodeList wrappers;
+        if (const XmlElement* wrapped = wrappers.wrap(const_cast<xercesc::DOMElement*>(&element))) {
+            readElement(*wrapped);
+        }
+    });
 }
 
 void ZELServerIdentity::readElement(const XmlElement& element)
@@ -101,8 +109,10 @@ const std::string* ZELServerIdentity::documentFor(const std::string& rootName) c
 
 void ZELServerSingleSignOnIdentity::takeAuthData(IZELServerString& out)
 {
-    copyText(signOn_.authData, out);
-    signOn_.authData.clear();
+    guarded([&] {
+        copyText(signOn_.authData, out);
+        signOn_.authData.clear();
+    });
 }
 
 void ZELServerSingleSignOnIdentity::readElement(const XmlElement& element)

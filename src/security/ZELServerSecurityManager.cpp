@@ -1,5 +1,6 @@
 #include "security/ZELServerSecurityManager.h"
 
+#include "api/exception_guard.h"
 #include "api/ZELServerString.h"
 #include "security/ZELServerUserToken.h"
 #include "transport/checked_command.h"
@@ -39,17 +40,21 @@ IZELServerStatus* ZELServerSecurityManager::askFlag(const char* keyword, const I
 
 IZELServerStatus* ZELServerSecurityManager::userTokenExists(const IZELServerString& accountName, bool& exists)
 {
-    return askFlag("SEC_USERTOKEN_EXISTS", accountName, exists);
+    return guarded([&] { return askFlag("SEC_USERTOKEN_EXISTS", accountName, exists); });
 }
 
 IZELServerUserToken* ZELServerSecurityManager::createUserToken(const IZELServerString& token,
                                                                const IZELServerString& clientAddress,
                                                                long long expirationTimeout)
 {
-    return new ZELServerUserToken(toStdString(token), toStdString(clientAddress), expirationTimeout);
+    return guarded(
+        [&] { return new ZELServerUserToken(toStdString(token), toStdString(clientAddress), expirationTimeout); });
 }
 
-IZELServerUserToken* ZELServerSecurityManager::createUserToken() { return new ZELServerUserToken(); }
+IZELServerUserToken* ZELServerSecurityManager::createUserToken()
+{
+    return guarded([&] { return new ZELServerUserToken(); });
+}
 
 void ZELServerSecurityManager::destroyUserToken(IZELServerUserToken** token)
 {
@@ -63,36 +68,38 @@ void ZELServerSecurityManager::destroyUserToken(IZELServerUserToken** token)
 IZELServerStatus* ZELServerSecurityManager::getUserToken(const IZELServerString& accountName,
                                                          IZELServerUserToken& token, bool& found)
 {
-    // An account without a token is answered with a document that holds none: that is an answer,
-    // not a failure, whatever the reader says about it.
-    return askTruth(found, [&](unsigned& answer) {
-        return on("SEC_GET_USERTOKEN", accountName)
-            .askObject(
-                answer, [&token](const IZELServerResponse& response) { return response.readUserToken(token); },
-                OnFailure::kKeep);
+    return guarded([&]() -> IZELServerStatus* {
+        // An account without a token is answered with a document that holds none: that is an answer,
+        // not a failure, whatever the reader says about it.
+        return askTruth(found, [&](unsigned& answer) {
+            return on("SEC_GET_USERTOKEN", accountName)
+                .askObject(
+                    answer, [&token](const IZELServerResponse& response) { return response.readUserToken(token); },
+                    OnFailure::kKeep);
+        });
     });
 }
 
 IZELServerStatus* ZELServerSecurityManager::addUserToken(const IZELServerString& accountName,
                                                          const IZELServerUserToken& token)
 {
-    return on("SEC_ADD_USERTOKEN", accountName).addUserToken(kTokenObject, token).send();
+    return guarded([&] { return on("SEC_ADD_USERTOKEN", accountName).addUserToken(kTokenObject, token).send(); });
 }
 
 IZELServerStatus* ZELServerSecurityManager::updateUserToken(const IZELServerString& accountName,
                                                             const IZELServerUserToken& token)
 {
-    return on("SEC_UPDATE_USERTOKEN", accountName).addUserToken(kTokenObject, token).send();
+    return guarded([&] { return on("SEC_UPDATE_USERTOKEN", accountName).addUserToken(kTokenObject, token).send(); });
 }
 
 IZELServerStatus* ZELServerSecurityManager::removeUserToken(const IZELServerString& accountName, bool& removed)
 {
-    return askFlag("SEC_REMOVE_USERTOKEN", accountName, removed);
+    return guarded([&] { return askFlag("SEC_REMOVE_USERTOKEN", accountName, removed); });
 }
 
 IZELServerStatus* ZELServerSecurityManager::userTokenExpired(const IZELServerString& accountName, bool& expired)
 {
-    return askFlag("SEC_USERTOKEN_EXPIRED", accountName, expired);
+    return guarded([&] { return askFlag("SEC_USERTOKEN_EXPIRED", accountName, expired); });
 }
 
 }  // namespace zel

@@ -2,6 +2,7 @@
 
 #include <utility>
 
+#include "api/exception_guard.h"
 #include "api/ZELServerString.h"
 #include "transport/attribute_binding.h"
 #include "transport/object_reader.h"
@@ -30,9 +31,15 @@ ZELServerUserToken::ZELServerUserToken(std::string token, std::string clientAddr
     fields_.expirationTimeout = expirationTimeout;
 }
 
-void ZELServerUserToken::getToken(IZELServerString& out) const { copyText(fields_.token, out); }
+void ZELServerUserToken::getToken(IZELServerString& out) const
+{
+    guarded([&] { copyText(fields_.token, out); });
+}
 
-void ZELServerUserToken::getClientAddress(IZELServerString& out) const { copyText(fields_.clientAddress, out); }
+void ZELServerUserToken::getClientAddress(IZELServerString& out) const
+{
+    guarded([&] { copyText(fields_.clientAddress, out); });
+}
 
 bool ZELServerUserToken::readFrom(const XmlElement& element)
 {

@@ -3,6 +3,7 @@
 #include <charconv>
 #include <cstdint>
 
+#include "api/exception_guard.h"
 #include "api/ZELServerString.h"
 
 namespace zel {
@@ -100,22 +101,39 @@ void ZELServerConnectionInfo::takeAddress(const IZELServerString& address)
     port_ = parsed.port;
 }
 
-void ZELServerConnectionInfo::getHost(IZELServerString& out) const { copyText(host_, out); }
-void ZELServerConnectionInfo::getUserName(IZELServerString& out) const { copyText(userName_, out); }
-void ZELServerConnectionInfo::getPassword(IZELServerString& out) const { copyText(password_, out); }
-void ZELServerConnectionInfo::getAddress(IZELServerString& out) const { copyText(address_, out); }
-void ZELServerConnectionInfo::getAuxiliaryText(IZELServerString& out) const { copyText(auxiliaryText_, out); }
+void ZELServerConnectionInfo::getHost(IZELServerString& out) const
+{
+    guarded([&] { copyText(host_, out); });
+}
+void ZELServerConnectionInfo::getUserName(IZELServerString& out) const
+{
+    guarded([&] { copyText(userName_, out); });
+}
+void ZELServerConnectionInfo::getPassword(IZELServerString& out) const
+{
+    guarded([&] { copyText(password_, out); });
+}
+void ZELServerConnectionInfo::getAddress(IZELServerString& out) const
+{
+    guarded([&] { copyText(address_, out); });
+}
+void ZELServerConnectionInfo::getAuxiliaryText(IZELServerString& out) const
+{
+    guarded([&] { copyText(auxiliaryText_, out); });
+}
 
 bool ZELServerConnectionInfo::getProperty(const IZELServerString& key, IZELServerString& out) const
 {
-    // The key is taken as far as its first NUL, like every key the session's callers pass.
-    const char* keyText = key.c_str();
-    const std::string* value = properties_.find(keyText != nullptr ? keyText : "");
-    if (value == nullptr) {
-        return false;
-    }
-    copyText(*value, out);
-    return true;
+    return guarded([&]() -> bool {
+        // The key is taken as far as its first NUL, like every key the session's callers pass.
+        const char* keyText = key.c_str();
+        const std::string* value = properties_.find(keyText != nullptr ? keyText : "");
+        if (value == nullptr) {
+            return false;
+        }
+        copyText(*value, out);
+        return true;
+    });
 }
 
 }  // namespace zel

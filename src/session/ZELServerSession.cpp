@@ -29,13 +29,6 @@ void destroyObject(T** object)
     *object = nullptr;
 }
 
-// Every factory operation: null when the object cannot be made, whatever the reason.
-template <class Make>
-auto made(Make make) noexcept
-{
-    return guardValue(static_cast<decltype(make())>(nullptr), make);
-}
-
 }  // namespace
 
 ZELServerSession::ZELServerSession()
@@ -60,7 +53,7 @@ void ZELServerSession::teardown()
 IZELServerStatus* ZELServerSession::init(const IZELServerConnectionInfo& info,
                                          const IZELServerStringArray* handshakeOptions)
 {
-    return guardStatus([&] { return connect(info, handshakeOptions); });
+    return guarded([&] { return connect(info, handshakeOptions); });
 }
 
 IZELServerStatus* ZELServerSession::connect(const IZELServerConnectionInfo& info,
@@ -97,34 +90,34 @@ void ZELServerSession::makeManagers()
 IZELServerConnectionInfo* ZELServerSession::createConnectionInfo(const IZELServerString& address,
                                                                  const IZELServerStringArray& properties)
 {
-    return made([&] { return new ZELServerConnectionInfo(address, properties); });
+    return guarded([&] { return new ZELServerConnectionInfo(address, properties); });
 }
 
 IZELServerConnectionInfo* ZELServerSession::createConnectionInfo(const IZELServerString& address,
                                                                  const IZELServerString& userName,
                                                                  const IZELServerString& password)
 {
-    return made([&] { return new ZELServerConnectionInfo(address, userName, password); });
+    return guarded([&] { return new ZELServerConnectionInfo(address, userName, password); });
 }
 
 IZELServerConnectionInfo* ZELServerSession::createConnectionInfo(const IZELServerString& host, unsigned short port,
                                                                  const IZELServerStringArray& properties)
 {
-    return made([&] { return new ZELServerConnectionInfo(host, port, properties); });
+    return guarded([&] { return new ZELServerConnectionInfo(host, port, properties); });
 }
 
 IZELServerConnectionInfo* ZELServerSession::createConnectionInfo(const IZELServerString& host, unsigned short port,
                                                                  const IZELServerString& userName,
                                                                  const IZELServerString& password)
 {
-    return made([&] { return new ZELServerConnectionInfo(host, port, userName, password); });
+    return guarded([&] { return new ZELServerConnectionInfo(host, port, userName, password); });
 }
 
 void ZELServerSession::destroyConnectionInfo(IZELServerConnectionInfo** info) { destroyObject(info); }
 
 IZELServerStatus* ZELServerSession::disconnect()
 {
-    return guardStatus([&] { return channel_ ? channel_->close() : nullptr; });
+    return guarded([&] { return channel_ ? channel_->close() : nullptr; });
 }
 
 IZELServerTransformationManager* ZELServerSession::getTransformationManager() { return transformationManager_.get(); }
@@ -134,18 +127,18 @@ IZELServerMountPointManager* ZELServerSession::getMountPointManager() { return m
 
 IZELServerString* ZELServerSession::createString()
 {
-    return made([&] { return new ZELServerString(); });
+    return guarded([&] { return new ZELServerString(); });
 }
 void ZELServerSession::destroyString(IZELServerString** string) { destroyObject(string); }
 IZELServerStringArray* ZELServerSession::createStringArray()
 {
-    return made([&] { return new ZELServerStringArray(); });
+    return guarded([&] { return new ZELServerStringArray(); });
 }
 void ZELServerSession::destroyStringArray(IZELServerStringArray** array) { destroyObject(array); }
 
 IZELServerStatus* ZELServerSession::getSessionProperty(const IZELServerString& name, IZELServerString& value)
 {
-    return guardStatus([&] {
+    return guarded([&] {
         return CheckedCommand(channel_.get(), "SERVER_SESSION_GET_PROP").add("sessionPropName", name).askText(value);
     });
 }
@@ -161,18 +154,18 @@ IZELServerTransformationRequest* ZELServerSession::createTransformationRequest(c
                                                                                const IZELServerString& repository,
                                                                                const IZELServerWorkspace& workspace)
 {
-    return made([&] { return makeTransformationRequest(keyword, repository, workspace); });
+    return guarded([&] { return makeTransformationRequest(keyword, repository, workspace); });
 }
 IZELServerTransformationRequest* ZELServerSession::createTransformationRequest(const IZELServerString& keyword,
                                                                                const IZELServerString& repository,
                                                                                const IZELServerString& workspace)
 {
-    return made([&] { return makeTransformationRequest(keyword, repository, workspace); });
+    return guarded([&] { return makeTransformationRequest(keyword, repository, workspace); });
 }
 IZELServerTransformationRequest* ZELServerSession::createTransformationRequest(const IZELServerString& keyword,
                                                                                const IZELServerString& workspacePath)
 {
-    return made([&] { return makeTransformationRequest(keyword, workspacePath); });
+    return guarded([&] { return makeTransformationRequest(keyword, workspacePath); });
 }
 void ZELServerSession::destroyTransformationRequest(IZELServerTransformationRequest** request)
 {
@@ -181,11 +174,11 @@ void ZELServerSession::destroyTransformationRequest(IZELServerTransformationRequ
 
 IZELServerTransformationResult* ZELServerSession::createTransformationResult(const IZELServerString& resultText)
 {
-    return made([&] { return makeTransformationResult(resultText); });
+    return guarded([&] { return makeTransformationResult(resultText); });
 }
 IZELServerTransformationResult* ZELServerSession::createTransformationResult()
 {
-    return made([&] { return makeTransformationResult(); });
+    return guarded([&] { return makeTransformationResult(); });
 }
 void ZELServerSession::destroyTransformationResult(IZELServerTransformationResult** result) { destroyObject(result); }
 
@@ -193,38 +186,38 @@ IZELServerService* ZELServerSession::createService(const IZELServerString& name,
                                                    const IZELServerString& description,
                                                    const IZELServerString& urlPattern)
 {
-    return made([&] { return makeService(channel_.get(), name, displayName, description, urlPattern); });
+    return guarded([&] { return makeService(channel_.get(), name, displayName, description, urlPattern); });
 }
 IZELServerService* ZELServerSession::createService()
 {
-    return made([&] { return makeService(channel_.get()); });
+    return guarded([&] { return makeService(channel_.get()); });
 }
 void ZELServerSession::destroyService(IZELServerService** service) { destroyObject(service); }
 IZELServerVector<IZELServerService>* ZELServerSession::createServiceVector()
 {
-    return made([&] { return makeServiceVector(); });
+    return guarded([&] { return makeServiceVector(); });
 }
 void ZELServerSession::destroyServiceVector(IZELServerVector<IZELServerService>** vector) { destroyObject(vector); }
 
 IZELServerWorkspace* ZELServerSession::createWorkspace()
 {
-    return made([&] { return makeWorkspace(channel_.get()); });
+    return guarded([&] { return makeWorkspace(channel_.get()); });
 }
 void ZELServerSession::destroyWorkspace(IZELServerWorkspace** workspace) { destroyObject(workspace); }
 IZELServerVector<IZELServerWorkspace>* ZELServerSession::createWorkspaceVector()
 {
-    return made([&] { return makeWorkspaceVector(); });
+    return guarded([&] { return makeWorkspaceVector(); });
 }
 void ZELServerSession::destroyWorkspaceVector(IZELServerVector<IZELServerWorkspace>** vector) { destroyObject(vector); }
 
 IZELServerRepository* ZELServerSession::createRepository()
 {
-    return made([&] { return makeRepository(channel_.get()); });
+    return guarded([&] { return makeRepository(channel_.get()); });
 }
 void ZELServerSession::destroyRepository(IZELServerRepository** repository) { destroyObject(repository); }
 IZELServerVector<IZELServerRepository>* ZELServerSession::createRepositoryVector()
 {
-    return made([&] { return makeRepositoryVector(); });
+    return guarded([&] { return makeRepositoryVector(); });
 }
 void ZELServerSession::destroyRepositoryVector(IZELServerVector<IZELServerRepository>** vector)
 {
@@ -233,12 +226,12 @@ void ZELServerSession::destroyRepositoryVector(IZELServerVector<IZELServerReposi
 
 IZELServerWorkspaceSummary* ZELServerSession::createWorkspaceSummary()
 {
-    return made([&] { return makeWorkspaceSummary(); });
+    return guarded([&] { return makeWorkspaceSummary(); });
 }
 void ZELServerSession::destroyWorkspaceSummary(IZELServerWorkspaceSummary** summary) { destroyObject(summary); }
 IZELServerVector<IZELServerWorkspaceSummary>* ZELServerSession::createWorkspaceSummaryVector()
 {
-    return made([&] { return makeWorkspaceSummaryVector(); });
+    return guarded([&] { return makeWorkspaceSummaryVector(); });
 }
 void ZELServerSession::destroyWorkspaceSummaryVector(IZELServerVector<IZELServerWorkspaceSummary>** vector)
 {
@@ -247,7 +240,7 @@ void ZELServerSession::destroyWorkspaceSummaryVector(IZELServerVector<IZELServer
 
 IZELServerWorkspaceService* ZELServerSession::createWorkspaceService()
 {
-    return made([&] { return makeWorkspaceService(channel_.get()); });
+    return guarded([&] { return makeWorkspaceService(channel_.get()); });
 }
 void ZELServerSession::destroyWorkspaceService(IZELServerWorkspaceService** workspaceService)
 {
@@ -255,7 +248,7 @@ void ZELServerSession::destroyWorkspaceService(IZELServerWorkspaceService** work
 }
 IZELServerVector<IZELServerWorkspaceService>* ZELServerSession::createWorkspaceServiceVector()
 {
-    return made([&] { return makeWorkspaceServiceVector(); });
+    return guarded([&] { return makeWorkspaceServiceVector(); });
 }
 void ZELServerSession::destroyWorkspaceServiceVector(IZELServerVector<IZELServerWorkspaceService>** vector)
 {
@@ -264,12 +257,12 @@ void ZELServerSession::destroyWorkspaceServiceVector(IZELServerVector<IZELServer
 
 IZELServerCustomFormat* ZELServerSession::createCustomFormat()
 {
-    return made([&] { return makeCustomFormat(); });
+    return guarded([&] { return makeCustomFormat(); });
 }
 void ZELServerSession::destroyCustomFormat(IZELServerCustomFormat** customFormat) { destroyObject(customFormat); }
 IZELServerVector<IZELServerCustomFormat>* ZELServerSession::createCustomFormatVector()
 {
-    return made([&] { return makeCustomFormatVector(); });
+    return guarded([&] { return makeCustomFormatVector(); });
 }
 void ZELServerSession::destroyCustomFormatVector(IZELServerVector<IZELServerCustomFormat>** vector)
 {
@@ -278,7 +271,7 @@ void ZELServerSession::destroyCustomFormatVector(IZELServerVector<IZELServerCust
 
 IZELServerCustomTransformer* ZELServerSession::createCustomTransformer()
 {
-    return made([&] { return makeCustomTransformer(); });
+    return guarded([&] { return makeCustomTransformer(); });
 }
 void ZELServerSession::destroyCustomTransformer(IZELServerCustomTransformer** customTransformer)
 {
@@ -286,7 +279,7 @@ void ZELServerSession::destroyCustomTransformer(IZELServerCustomTransformer** cu
 }
 IZELServerVector<IZELServerCustomTransformer>* ZELServerSession::createCustomTransformerVector()
 {
-    return made([&] { return makeCustomTransformerVector(); });
+    return guarded([&] { return makeCustomTransformerVector(); });
 }
 void ZELServerSession::destroyCustomTransformerVector(IZELServerVector<IZELServerCustomTransformer>** vector)
 {
@@ -295,57 +288,57 @@ void ZELServerSession::destroyCustomTransformerVector(IZELServerVector<IZELServe
 
 IZELServerResource* ZELServerSession::createResource()
 {
-    return made([&] { return makeResource(); });
+    return guarded([&] { return makeResource(); });
 }
 void ZELServerSession::destroyResource(IZELServerResource** resource) { destroyObject(resource); }
 IZELServerVector<IZELServerResource>* ZELServerSession::createResourceVector()
 {
-    return made([&] { return makeResourceVector(); });
+    return guarded([&] { return makeResourceVector(); });
 }
 void ZELServerSession::destroyResourceVector(IZELServerVector<IZELServerResource>** vector) { destroyObject(vector); }
 
 IZELServerPropertyAccessor* ZELServerSession::createPropertyAccessor()
 {
-    return made([&] { return makePropertyAccessor(); });
+    return guarded([&] { return makePropertyAccessor(); });
 }
 void ZELServerSession::destroyPropertyAccessor(IZELServerPropertyAccessor** accessor) { destroyObject(accessor); }
 IZELServerVector<IZELServerProperty>* ZELServerSession::createPropertyVector()
 {
-    return made([&] { return makePropertyVector(); });
+    return guarded([&] { return makePropertyVector(); });
 }
 void ZELServerSession::destroyPropertyVector(IZELServerVector<IZELServerProperty>** vector) { destroyObject(vector); }
 
 IZELServerLogFileInfo* ZELServerSession::createLogFileInfo()
 {
-    return made([&] { return makeLogFileInfo(); });
+    return guarded([&] { return makeLogFileInfo(); });
 }
 void ZELServerSession::destroyLogFileInfo(IZELServerLogFileInfo** info) { destroyObject(info); }
 
 IZELServerTemplate* ZELServerSession::createTemplate()
 {
-    return made([&] { return makeTemplate(); });
+    return guarded([&] { return makeTemplate(); });
 }
 void ZELServerSession::destroyTemplate(IZELServerTemplate** templ) { destroyObject(templ); }
 IZELServerVector<IZELServerTemplate>* ZELServerSession::createTemplateVector()
 {
-    return made([&] { return makeTemplateVector(); });
+    return guarded([&] { return makeTemplateVector(); });
 }
 void ZELServerSession::destroyTemplateVector(IZELServerVector<IZELServerTemplate>** vector) { destroyObject(vector); }
 
 IZELServerVector<IZELServerItem>* ZELServerSession::createItemVector()
 {
-    return made([&] { return makeItemVector(); });
+    return guarded([&] { return makeItemVector(); });
 }
 void ZELServerSession::destroyItemVector(IZELServerVector<IZELServerItem>** vector) { destroyObject(vector); }
 
 IZELServerMountPoint* ZELServerSession::createMountPoint()
 {
-    return made([&] { return makeMountPoint(channel_.get()); });
+    return guarded([&] { return makeMountPoint(channel_.get()); });
 }
 void ZELServerSession::destroyMountPoint(IZELServerMountPoint** mountPoint) { destroyObject(mountPoint); }
 IZELServerVector<IZELServerMountPoint>* ZELServerSession::createMountPointVector()
 {
-    return made([&] { return makeMountPointVector(); });
+    return guarded([&] { return makeMountPointVector(); });
 }
 void ZELServerSession::destroyMountPointVector(IZELServerVector<IZELServerMountPoint>** vector)
 {
@@ -354,12 +347,12 @@ void ZELServerSession::destroyMountPointVector(IZELServerVector<IZELServerMountP
 
 IZELServerFileInfo* ZELServerSession::createFileInfo()
 {
-    return made([&] { return makeFileInfo(); });
+    return guarded([&] { return makeFileInfo(); });
 }
 void ZELServerSession::destroyFileInfo(IZELServerFileInfo** info) { destroyObject(info); }
 IZELServerVector<IZELServerFileInfo>* ZELServerSession::createFileInfoVector()
 {
-    return made([&] { return makeFileInfoVector(); });
+    return guarded([&] { return makeFileInfoVector(); });
 }
 void ZELServerSession::destroyFileInfoVector(IZELServerVector<IZELServerFileInfo>** vector) { destroyObject(vector); }
 

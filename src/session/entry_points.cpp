@@ -11,8 +11,7 @@ extern "C" {
 ZEL_API IZELServerSession* ZEL_createServerSession(IZELServerSession** session)
 {
     // The session is allocated through the library heap, whose `new` yields null on exhaustion.
-    IZELServerSession* created =
-        zel::guardValue<IZELServerSession*>(nullptr, [] { return new zel::ZELServerSession(); });
+    IZELServerSession* created = zel::guarded([]() -> IZELServerSession* { return new zel::ZELServerSession(); });
     if (session != nullptr)
         *session = created;
     return created;

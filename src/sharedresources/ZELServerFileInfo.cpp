@@ -1,5 +1,6 @@
 #include "sharedresources/ZELServerFileInfo.h"
 
+#include "api/exception_guard.h"
 #include "api/ZELServerString.h"
 #include "transport/attribute_binding.h"
 #include "transport/xml_navigation.h"
@@ -16,7 +17,10 @@ constexpr AttributeBinding<FileInfoFields> kFileInfoAttributes[] = {
 
 }  // namespace
 
-void ZELServerFileInfo::getDate(IZELServerString& out) const { copyText(fields_.date, out); }
+void ZELServerFileInfo::getDate(IZELServerString& out) const
+{
+    guarded([&] { copyText(fields_.date, out); });
+}
 
 bool ZELServerFileInfo::readFrom(const XmlElement& element)
 {

@@ -7,6 +7,7 @@
 
 #include <xercesc/dom/DOMElement.hpp>
 
+#include "api/exception_guard.h"
 #include "api/ZELServerString.h"
 #include "api/ZELServerVector.h"
 #include "api/conversions.h"
@@ -47,11 +48,20 @@ bool canBeRead(const std::string& path)
 
 }  // namespace
 
-void ZELServerMountPoint::getName(IZELServerString& out) const { copyText(fields_.name, out); }
+void ZELServerMountPoint::getName(IZELServerString& out) const
+{
+    guarded([&] { copyText(fields_.name, out); });
+}
 
-void ZELServerMountPoint::getDisplayName(IZELServerString& out) const { copyText(fields_.displayName, out); }
+void ZELServerMountPoint::getDisplayName(IZELServerString& out) const
+{
+    guarded([&] { copyText(fields_.displayName, out); });
+}
 
-void ZELServerMountPoint::getDescription(IZELServerString& out) const { copyText(fields_.description, out); }
+void ZELServerMountPoint::getDescription(IZELServerString& out) const
+{
+    guarded([&] { copyText(fields_.description, out); });
+}
 
 CheckedCommand ZELServerMountPoint::on(const char* keyword, Where where) const
 {
@@ -62,52 +72,60 @@ CheckedCommand ZELServerMountPoint::on(const char* keyword, Where where) const
 
 IZELServerStatus* ZELServerMountPoint::exists(const IZELServerPath& path, unsigned& present)
 {
-    return on("SR_EXISTS").addPath(kPathValue, path).askFlag(present);
+    return guarded([&] { return on("SR_EXISTS").addPath(kPathValue, path).askFlag(present); });
 }
 
 IZELServerStatus* ZELServerMountPoint::download(const IZELServerPath& source, const IZELServerString& localTarget,
                                                 unsigned& received, IZELServerProgressListener* listener)
 {
-    ZELServerString sourcePath;
-    source.getAbsolutePath(sourcePath);
-    return on("SR_DOWNLOAD")
-        .addPath(kSourcePath, source)
-        .add(kCrcChecking, "true")
-        .download({toStdString(localTarget), sourcePath.str()}, received, listener);
+    return guarded([&] {
+        ZELServerString sourcePath;
+        source.getAbsolutePath(sourcePath);
+        return on("SR_DOWNLOAD")
+            .addPath(kSourcePath, source)
+            .add(kCrcChecking, "true")
+            .download({toStdString(localTarget), sourcePath.str()}, received, listener);
+    });
 }
 
 IZELServerStatus* ZELServerMountPoint::upload(const IZELServerString& localSource, const IZELServerPath& destination,
                                               IZELServerProgressListener* listener)
 {
-    const std::string source = toStdString(localSource);
-    return on("SR_UPLOAD")
-        .check(canBeRead(source), msg::kInvalidArgument, {"src", source})
-        .addPath(kDestinationPath, destination)
-        .add(kCrcChecking, "true")
-        .upload(localSource, listener);
+    return guarded([&] {
+        const std::string source = toStdString(localSource);
+        return on("SR_UPLOAD")
+            .check(canBeRead(source), msg::kInvalidArgument, {"src", source})
+            .addPath(kDestinationPath, destination)
+            .add(kCrcChecking, "true")
+            .upload(localSource, listener);
+    });
 }
 
 IZELServerStatus* ZELServerMountPoint::copy(const IZELServerPath& source, const IZELServerPath& destination)
 {
-    return on("SR_COPY").addPath(kSourcePath, source).addPath(kDestinationPath, destination).send();
+    return guarded(
+        [&] { return on("SR_COPY").addPath(kSourcePath, source).addPath(kDestinationPath, destination).send(); });
 }
 
 IZELServerStatus* ZELServerMountPoint::move(const IZELServerPath& source, const IZELServerPath& destination)
 {
-    return on("SR_MOVE").addPath(kSourcePath, source).addPath(kDestinationPath, destination).send();
+    return guarded(
+        [&] { return on("SR_MOVE").addPath(kSourcePath, source).addPath(kDestinationPath, destination).send(); });
 }
 
 IZELServerStatus* ZELServerMountPoint::getFileInfo(const IZELServerPath& path, unsigned flags, IZELServerFileInfo& info)
 {
-    return on("SR_GET")
-        .check(flags == 0, msg::kInvalidArgument, {"flags", decimalText(flags)})
-        .addPath(kPathValue, path)
-        .askParsed([&info](const IZELServerResponse& response) { return response.readFileInfo(info); });
+    return guarded([&]() -> IZELServerStatus* {
+        return on("SR_GET")
+            .check(flags == 0, msg::kInvalidArgument, {"flags", decimalText(flags)})
+            .addPath(kPathValue, path)
+            .askParsed([&info](const IZELServerResponse& response) { return response.readFileInfo(info); });
+    });
 }
 
 IZELServerStatus* ZELServerMountPoint::getFileInfo(const IZELServerPath& path, IZELServerFileInfo& info)
 {
-    return getFileInfo(path, 0, info);
+    return guarded([&] { return getFileInfo(path, 0, info); });
 }
 
 IZELServerStatus* ZELServerMountPoint::listOnce(const IZELServerPath& path,
@@ -121,7 +139,7 @@ IZELServerStatus* ZELServerMountPoint::listOnce(const IZELServerPath& path,
 IZELServerStatus* ZELServerMountPoint::list(const IZELServerPath& path, unsigned depth,
                                             IZELServerVector<IZELServerFileInfo>& entries)
 {
-    return listWithin(path, depth, entries, kMaxListedEntries);
+    return guarded([&] { return listWithin(path, depth, entries, kMaxListedEntries); });
 }
 
 IZELServerStatus* ZELServerMountPoint::listWithin(const IZELServerPath& path, unsigned depth,
@@ -178,38 +196,40 @@ IZELServerStatus* ZELServerMountPoint::listWithin(const IZELServerPath& path, un
 
 IZELServerStatus* ZELServerMountPoint::list(const IZELServerPath& path, IZELServerVector<IZELServerFileInfo>& entries)
 {
-    return list(path, 0, entries);
+    return guarded([&] { return list(path, 0, entries); });
 }
 
 IZELServerStatus* ZELServerMountPoint::makeDirectory(const IZELServerPath& path)
 {
-    return on("SR_MAKE").addPath(kPathValue, path).send();
+    return guarded([&] { return on("SR_MAKE").addPath(kPathValue, path).send(); });
 }
 
 IZELServerStatus* ZELServerMountPoint::remove(const IZELServerPath& path, unsigned& removed)
 {
-    return on("SR_DELETE").addPath(kPathValue, path).askFlag(removed);
+    return guarded([&] { return on("SR_DELETE").addPath(kPathValue, path).askFlag(removed); });
 }
 
 IZELServerPath* ZELServerMountPoint::createPath(const IZELServerString& absolutePath)
 {
-    return ZELServerPath::fromWholePath(toStdString(absolutePath));
+    return guarded([&] { return ZELServerPath::fromWholePath(toStdString(absolutePath)); });
 }
 
 IZELServerPath* ZELServerMountPoint::createPath(const IZELServerString& directoryPath, const IZELServerString& name)
 {
-    return ZELServerPath::fromParts(toStdString(directoryPath), toStdString(name));
+    return guarded([&] { return ZELServerPath::fromParts(toStdString(directoryPath), toStdString(name)); });
 }
 
 void ZELServerMountPoint::releaseObject(IZELServerPath* path) { delete path; }
 
 void ZELServerMountPoint::readFromXML(const xercesc_3_2::DOMElement& element)
 {
-    // The navigation helpers work on wrappers; these live only for this reading.
-    ZELServerDOMNodeList wrappers;
-    if (const XmlElement* wrapped = wrappers.wrap(const_cast<xercesc::DOMElement*>(&element))) {
-        readFrom(*wrapped);
-    }
+    guarded([&] {
+        // The navigation helpers work on wrappers; these live only for this reading.
+        ZELServerDOMNodeList wrappers;
+        if (const XmlElement* wrapped = wrappers.wrap(const_cast<xercesc::DOMElement*>(&element))) {
+            readFrom(*wrapped);
+        }
+    });
 }
 
 void ZELServerMountPoint::readFrom(const XmlElement& element)

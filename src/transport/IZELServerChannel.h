@@ -42,7 +42,11 @@ public:
                                              const IZELServerStringArray& notifications) = 0;
     virtual IZELServerRequest* createRequest(const std::string& keyword) = 0;
     virtual IZELServerResponse* createResponse() = 0;
-    // Direction kUpload sends the local file with the command, kDownload receives one into it.
+    // Direction kUpload sends the local file with the command. Direction kDownload receives the file
+    // into a temporary file beside `localPath` (receiveIntoTemporary in command.h), which replaces
+    // `localPath` only when a whole file came and the exchange succeeded: a failed one leaves
+    // `localPath` as it was. The final answer is not read here (a reply without a file succeeds with
+    // the answer in the response and `localPath` untouched).
     virtual IZELServerStatus* transferFile(IZELServerRequest& request, IZELServerResponse& response,
                                            const std::string& localPath, unsigned direction,
                                            IZELServerProgressListener* progress) = 0;

@@ -25,6 +25,7 @@
 #include "transport/TcpSocket.h"
 #include "transport/ZELServerResponse.h"
 #include "transport/ZELServerTCPIPRequest.h"
+#include "transport/command.h"
 #include "transport/frame_reader.h"
 #include "transport/wire_format.h"
 
@@ -422,11 +423,18 @@ IZELServerStatus* ZELServerTCPIPChannel::transferFile(IZELServerRequest& request
         return exchange(request, response, &file, nullptr, progress);
     }
     if (direction == kDownload) {
-        LocalFile file(localPath, LocalFile::Mode::Write);
-        if (!file.isOpen()) {
+        // The one download path; the channel does not read the final answer, so a file that came
+        // complete replaces the destination whatever the server said after it.
+        std::optional<TemporaryFile> temporary;
+        std::uint64_t arrived = kNoFileArrived;
+        if (IZELServerStatus* status =
+                receiveIntoTemporary(*this, request, response, localPath, progress, temporary, arrived)) {
+            return status;
+        }
+        if (arrived != kNoFileArrived && !temporary->moveTo(localPath)) {
             return makeStatus(msg::kLocalFileWrite, localPath);
         }
-        return exchange(request, response, nullptr, &file, progress);
+        return nullptr;
     }
     return channelError(kInvalidDirection);
 }
@@ -497,9 +505,8 @@ IZELServerStatus* ZELServerTCPIPChannel::sendAndReceive(std::string_view request
     if (!frame) {
         return sendFailed(SOCK_SEND_FAILED);
     }
-    if (IZELServerStatus* status = sendBytes(*socket_, *frame)) {
-        return status;
-    }
+    // The buffer comes before the command goes out: without it the file could not be moved, and the
+    // server would already be sending it.
     if (transfer.upload != nullptr || transfer.download != nullptr) {
         transfer.chunk.reset(new (std::nothrow) char[wire::kChunkSize]);
         if (!transfer.chunk) {
@@ -507,6 +514,21 @@ IZELServerStatus* ZELServerTCPIPChannel::sendAndReceive(std::string_view request
                                               : makeStatus(msg::kLocalFileWrite, transfer.download->path());
         }
     }
+    if (IZELServerStatus* status = sendBytes(*socket_, *frame)) {
+        return status;
+    }
+    // The server is answering from here on: an exception (memory exhausted) that ends the exchange
+    // before the whole answer is read leaves the connection out of step, so it is given up.
+    try {
+        return receiveAnswer(transfer, reply);
+    } catch (...) {
+        socket_.reset();
+        throw;
+    }
+}
+
+IZELServerStatus* ZELServerTCPIPChannel::receiveAnswer(Transfer& transfer, std::string& reply)
+{
     if (transfer.upload != nullptr) {
         if (IZELServerStatus* status = uploadFile(transfer)) {
             return status;

@@ -70,6 +70,7 @@ private:
     void ensureIdentity();
     IZELServerStatus* resultPortExchange(IZELServerRequest& request, IZELServerResponse& response);
     IZELServerStatus* sendAndReceive(std::string_view requestText, Transfer& transfer, std::string& reply);
+    IZELServerStatus* receiveAnswer(Transfer& transfer, std::string& reply);
     IZELServerStatus* uploadFile(Transfer& transfer);
     IZELServerStatus* downloadFile(Transfer& transfer, bool& noFile);
     void dropIfOutOfStep(TcpSocket& socket, bool outOfStep);

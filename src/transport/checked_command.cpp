@@ -3,7 +3,6 @@
 #include <utility>
 
 #include "api/ZELServerString.h"
-#include "api/exception_guard.h"
 #include "api/message_numbers.h"
 #include "api/status.h"
 
@@ -128,20 +127,16 @@ IZELServerStatus* CheckedCommand::run(const Exchange& exchange)
     if (channel_ == nullptr) {
         return makeStatus(msg::kNotConnected, where_);
     }
-    // Every manager operation ends here, so this is where an exception from the exchange or from
-    // reading the reply stops before it can leave the library.
-    return guardStatus([&]() -> IZELServerStatus* {
-        Command command(*channel_, keyword_);
-        // A command without its request (memory exhausted) takes no values; its exchange reports that.
-        if (command.ready()) {
-            for (const Value& value : values_) {
-                if (IZELServerStatus* refused = value(command)) {
-                    return refused;
-                }
+    Command command(*channel_, keyword_);
+    // A command without its request (memory exhausted) takes no values; its exchange reports that.
+    if (command.ready()) {
+        for (const Value& value : values_) {
+            if (IZELServerStatus* refused = value(command)) {
+                return refused;
             }
         }
-        return exchange(command);
-    });
+    }
+    return exchange(command);
 }
 
 IZELServerStatus* CheckedCommand::run(unsigned& flag, const Exchange& exchange, OnFailure onFailure)

@@ -3,6 +3,7 @@
 #include <filesystem>
 #include <optional>
 #include <system_error>
+#include <utility>
 
 #include "api/message_numbers.h"
 #include "api/status.h"
@@ -82,28 +83,48 @@ IZELServerStatus* Command::transfer(const std::string& localPath, unsigned direc
     return channel_.transferFile(*request_, *response_, localPath, direction, progress);
 }
 
+IZELServerStatus* receiveIntoTemporary(IZELServerChannel& channel, IZELServerRequest& request,
+                                       IZELServerResponse& response, const std::string& destination,
+                                       IZELServerProgressListener* progress, std::optional<TemporaryFile>& temporary,
+                                       std::uint64_t& arrived)
+{
+    arrived = kNoFileArrived;
+    // A folder could never be replaced by the file; found out before anything is sent.
+    std::error_code ignored;
+    if (!std::filesystem::is_directory(destination, ignored)) {
+        if (std::optional<TemporaryFile> made = TemporaryFile::createBeside(destination)) {
+            temporary.emplace(std::move(*made));
+        }
+    }
+    if (!temporary) {
+        return makeStatus(msg::kLocalFileWrite,
+                          destination.empty() ? TemporaryFile::directoryFor(destination) : destination);
+    }
+    // Declared after the temporary file, so it is closed before that file can be deleted.
+    LocalFile file(temporary->path(), temporary->takeWriter());
+    if (IZELServerStatus* status = channel.exchange(request, response, nullptr, &file, progress)) {
+        return status;
+    }
+    // The channel closes the file once the announced content is in: one still open got nothing.
+    if (!file.isOpen()) {
+        arrived = file.written();
+    }
+    return nullptr;
+}
+
 IZELServerStatus* Command::receive(const DownloadTarget& target, unsigned& received,
                                    IZELServerProgressListener* progress)
 {
     if (!ready()) {
         return notReady();
     }
-    // A folder could never be replaced by the file; found out before anything is sent.
-    std::error_code ignored;
-    std::optional<TemporaryFile> temporary = std::filesystem::is_directory(target.destination, ignored)
-                                                 ? std::nullopt
-                                                 : TemporaryFile::createBeside(target.destination);
-    if (!temporary) {
-        const std::string& named = target.destination;
-        return makeStatus(msg::kLocalFileWrite, named.empty() ? TemporaryFile::directoryFor(named) : named);
-    }
-    // Declared after the temporary file, so it is closed before that file is deleted.
-    LocalFile file(temporary->path(), temporary->takeWriter());
-    if (IZELServerStatus* status = channel_.exchange(*request_, *response_, nullptr, &file, progress)) {
+    std::optional<TemporaryFile> temporary;
+    std::uint64_t arrived = kNoFileArrived;
+    if (IZELServerStatus* status =
+            receiveIntoTemporary(channel_, *request_, *response_, target.destination, progress, temporary, arrived)) {
         return status;
     }
-    // The channel closes the file once the announced content is in: one still open got nothing.
-    if (file.isOpen() || (target.emptyIsMissing && file.written() == 0)) {
+    if (arrived == kNoFileArrived || (target.emptyIsMissing && arrived == 0)) {
         return makeStatus(msg::kEmptyDownload, target.source);
     }
     const std::string answer = body();

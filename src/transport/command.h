@@ -10,6 +10,8 @@
 // A Command that could not make its request or response (memory exhausted) adds nothing, and its
 // send() and transfer() return a status without touching the connection.
 
+#include <cstdint>
+#include <optional>
 #include <string>
 
 #include <zelserverapi/IZELServerProgressListener.h>
@@ -20,6 +22,7 @@
 #include "transport/IZELServerChannel.h"
 #include "transport/IZELServerRequest.h"
 #include "transport/IZELServerResponse.h"
+#include "transport/temporary_file.h"
 
 namespace zel {
 
@@ -29,6 +32,21 @@ struct DownloadTarget {
     std::string source;           // what the server was asked for (393638 names it)
     bool emptyIsMissing = false;  // a file of no bytes counts as no file
 };
+
+// What receiveIntoTemporary reports when the server sent no file.
+inline constexpr std::uint64_t kNoFileArrived = ~std::uint64_t{0};
+
+// The first half of every download, shared by Command::receive and the channel's transferFile: one
+// exchange whose file is received into a new temporary file beside `destination` (see
+// TemporaryFile::createBeside), which `temporary` holds afterwards; the caller decides whether it
+// replaces the destination. `arrived` is the number of bytes of a file that came complete, or
+// kNoFileArrived. 393624 (the destination, or the folder for temporary files when it is empty)
+// when the temporary file cannot be made or the destination is a folder, with nothing sent;
+// otherwise the exchange's status.
+IZELServerStatus* receiveIntoTemporary(IZELServerChannel& channel, IZELServerRequest& request,
+                                       IZELServerResponse& response, const std::string& destination,
+                                       IZELServerProgressListener* progress, std::optional<TemporaryFile>& temporary,
+                                       std::uint64_t& arrived);
 
 class Command {
 public:

@@ -82,6 +82,11 @@ std::FILE* TemporaryFile::takeWriter() { return std::exchange(writer_, nullptr);
 bool TemporaryFile::moveTo(const std::string& destination)
 {
     std::error_code error;
+    // A device or a pipe keeps its place: renaming over it would remove it, not write to it.
+    const fs::file_status existing = fs::status(destination, error);
+    if (fs::exists(existing) && !fs::is_regular_file(existing)) {
+        return false;
+    }
     fs::rename(path_, destination, error);
     if (error) {
         return false;

@@ -37,7 +37,8 @@ public:
     // systems flush the whole file to disk when it is closed.
     std::FILE* takeWriter();
 
-    // Renames the file onto `destination`, replacing a file there. True when done; the file is then
+    // Renames the file onto `destination`, replacing a file there; anything there that is not a
+    // regular file (a folder, a device, a pipe) is never replaced. True when done; the file is then
     // no longer this object's. On false it stays this object's (and is deleted with it).
     bool moveTo(const std::string& destination);
     // Leaves the file where it is when this object goes.

@@ -33,7 +33,8 @@ bool XmlElement::setAttribute(std::string_view name, std::string_view value)
     try {
         node_->setAttribute(xmlName.get(), xmlValue.get());
         return true;
-    } catch (...) {  // a DOM exception for an illegal name, or the library out of memory
+    } catch (...) {  // a DOM exception for an illegal name
+        rethrowIfOutOfMemory();
         return false;
     }
 }
@@ -52,6 +53,7 @@ bool XmlElement::appendChild(XmlElement* child)
         node_->appendChild(child->node_);
         return true;
     } catch (...) {  // wrong document, or the child is an ancestor
+        rethrowIfOutOfMemory();
         return false;
     }
 }
@@ -66,6 +68,7 @@ bool XmlElement::appendText(std::string_view text)
         node_->appendChild(node_->getOwnerDocument()->createTextNode(xmlText.get()));
         return true;
     } catch (...) {
+        rethrowIfOutOfMemory();
         return false;
     }
 }
@@ -81,7 +84,7 @@ void ZELServerDOMNodeList::clear() noexcept
     byNode_.clear();
 }
 
-XmlElement* ZELServerDOMNodeList::wrap(xercesc::DOMElement* node) noexcept
+XmlElement* ZELServerDOMNodeList::wrap(xercesc::DOMElement* node)
 {
     if (node == nullptr) {
         return nullptr;
@@ -89,21 +92,14 @@ XmlElement* ZELServerDOMNodeList::wrap(xercesc::DOMElement* node) noexcept
     if (auto found = byNode_.find(node); found != byNode_.end()) {
         return found->second;
     }
-    auto* wrapper = new XmlElement(node, *this);
-    if (wrapper == nullptr) {
+    std::unique_ptr<XmlElement> wrapper(new XmlElement(node, *this));
+    if (!wrapper) {
         return nullptr;
     }
-    try {
-        wrappers_.push_back(wrapper);
-        byNode_.emplace(node, wrapper);
-    } catch (const std::bad_alloc&) {
-        if (!wrappers_.empty() && wrappers_.back() == wrapper) {
-            wrappers_.pop_back();
-        }
-        delete wrapper;
-        return nullptr;
-    }
-    return wrapper;
+    wrappers_.push_back(wrapper.get());
+    XmlElement* kept = wrapper.release();
+    byNode_.emplace(node, kept);
+    return kept;
 }
 
 namespace {
@@ -166,6 +162,7 @@ XmlElement* XmlDocument::createDocument(std::string_view namespaceUri, std::stri
         document_ = implementation_->createDocument(namespaceUri.empty() ? nullptr : xmlNamespace.get(), xmlRoot.get(),
                                                     nullptr);
     } catch (...) {
+        rethrowIfOutOfMemory();
         document_ = nullptr;
     }
     return documentElement();
@@ -183,6 +180,7 @@ XmlElement* XmlDocument::createElement(std::string_view name)
     try {
         return elements_.wrap(document_->createElement(xmlName.get()));
     } catch (...) {
+        rethrowIfOutOfMemory();
         return nullptr;
     }
 }

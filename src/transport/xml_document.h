@@ -67,8 +67,9 @@ public:
     ZELServerDOMNodeList& operator=(const ZELServerDOMNodeList&) = delete;
 
     // The wrapper of `node`, owned by this list; a node wrapped before gets the same wrapper again.
-    // Null for a null node or when memory is exhausted.
-    XmlElement* wrap(xercesc::DOMElement* node) noexcept;
+    // Null for a null node, or when the library's heap is exhausted (and its routine returned); memory
+    // running out elsewhere throws std::bad_alloc, so that no element of a reply is silently left out.
+    XmlElement* wrap(xercesc::DOMElement* node);
 
     std::size_t size() const noexcept { return wrappers_.size(); }
 

@@ -2,6 +2,7 @@
 
 #include <exception>
 #include <mutex>
+#include <new>
 #include <string>
 #include <utility>
 
@@ -130,12 +131,23 @@ void XmlPlatformRef::reset() noexcept
     }
 }
 
-std::string currentXmlExceptionMessage()
+void rethrowIfOutOfMemory()
 {
     try {
         throw;
     } catch (const xercesc::OutOfMemoryException&) {
-        return "Out of memory";
+        throw std::bad_alloc();
+    } catch (const std::bad_alloc&) {
+        throw;
+    } catch (...) {
+    }
+}
+
+std::string currentXmlExceptionMessage()
+{
+    rethrowIfOutOfMemory();
+    try {
+        throw;
     } catch (const xercesc::XMLException& e) {
         return toUtf8(e.getMessage());
     } catch (const xercesc::DOMException& e) {  // DOMLSException too

@@ -55,7 +55,12 @@ private:
     bool held_ = false;
 };
 
-// Call only inside a catch block. Gives the library's own message (DOM, parse, transcoding, I/O or
+// Call only inside a catch block. Memory running out, in the XML library or in ours, is no fault of
+// the document: it leaves as std::bad_alloc, for the guard of the operation to report; any other
+// exception returns.
+void rethrowIfOutOfMemory();
+
+// Call only inside a catch block; rethrows memory exhaustion as rethrowIfOutOfMemory does. Gives the library's own message (DOM, parse, transcoding, I/O or
 // out-of-memory exceptions), the what() of a standard exception, or a fixed text for anything else.
 std::string currentXmlExceptionMessage();
 

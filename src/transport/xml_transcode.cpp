@@ -5,6 +5,8 @@
 #include <xercesc/util/PlatformUtils.hpp>
 #include <xercesc/util/TransService.hpp>
 
+#include "transport/xml_platform.h"
+
 namespace zel {
 namespace {
 
@@ -23,7 +25,7 @@ bool isAscii(std::string_view text)
 
 }  // namespace
 
-XmlText::XmlText(std::string_view utf8) noexcept
+XmlText::XmlText(std::string_view utf8)
 {
     // XML cannot hold a NUL, and the library's text would silently end at it.
     if (utf8.find('\0') != std::string_view::npos) {
@@ -42,6 +44,7 @@ XmlText::XmlText(std::string_view utf8) noexcept
                                              xercesc::XMLPlatformUtils::fgMemoryManager);
         text_ = transcoded.adopt();
     } catch (...) {
+        rethrowIfOutOfMemory();
         text_ = nullptr;
     }
 }
@@ -68,6 +71,7 @@ std::string toUtf8(const XMLCh* text)
         xercesc::TranscodeToStr transcoded(text, kUtf8, xercesc::XMLPlatformUtils::fgMemoryManager);
         return std::string(reinterpret_cast<const char*>(transcoded.str()), transcoded.length());
     } catch (...) {
+        rethrowIfOutOfMemory();
         return {};
     }
 }

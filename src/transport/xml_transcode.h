@@ -11,10 +11,11 @@
 namespace zel {
 
 // The XML library's text of one UTF-8 byte string, released when this object goes. Text that is not
-// valid UTF-8, or that holds a NUL, gives no result (valid() is false, get() is null).
+// valid UTF-8, or that holds a NUL, gives no result (valid() is false, get() is null); memory running
+// out throws std::bad_alloc.
 class XmlText {
 public:
-    explicit XmlText(std::string_view utf8) noexcept;
+    explicit XmlText(std::string_view utf8);
     ~XmlText();
     XmlText(const XmlText&) = delete;
     XmlText& operator=(const XmlText&) = delete;
