@@ -18,6 +18,9 @@
 //   "MAX_REPLY_BYTES"      the largest frame accepted from the server, 1 to 4294967295 bytes
 //                          (default 67108864, enough for a list of about 300,000 entries); a larger
 //                          one is refused with 393604 before its content is read
+// Whatever the properties say, an XML reply is refused with 393620 before it is parsed when it has a
+// document type declaration, an element with more than 64 attributes, or elements nested more than
+// 64 deep.
 // A time-out gives the status of the step that waited with getCode() 392012. After a time-out in
 // the middle of an exchange, or a refused frame, the connection is given up: later commands return
 // 393622 until init connects again.

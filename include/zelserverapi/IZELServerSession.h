@@ -8,6 +8,12 @@
 // not null, and always store null there. Vectors are made empty and destroy their elements with them.
 // Objects described as bound to the connection must not be used after the session that made them was
 // initialised again or destroyed. A session is used by one thread at a time.
+//
+// No exception leaves an operation of the session or of any object it makes. Memory running out goes
+// to the out-of-memory routine (DllSetMemoryErrorHandler); should it return, or the failure be of
+// another kind, an operation with a status returns 393625 with the failure's text, and one without
+// returns null, 0 or false (or nothing). A failure in the middle of the server's answer closes the
+// connection: later commands return 393622 until init connects again.
 
 #include "IZELServerConnectionInfo.h"
 #include "IZELServerIdentity.h"

@@ -5,7 +5,8 @@
 template <class I>
 class IZELServerVector {
 public:
-    // Appends the item and takes ownership of it; a null item is ignored.
+    // Appends the item and takes ownership of it; a null item is ignored. An item that cannot be
+    // stored (memory exhausted) is destroyed.
     virtual void append(I* item) = 0;
     // Inserts before position `index`; an index past the end appends. A null item is ignored.
     virtual void insertAt(unsigned index, I* item) = 0;
