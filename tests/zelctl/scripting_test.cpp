@@ -163,6 +163,24 @@ TEST_F(Scripting, FailuresToConnectOrSignInSayWhy)
     }
 }
 
+// On a terminal (here the one `script` makes) an upload draws its progress in units that grow with
+// the size, whole bytes and tenths of the larger units; --quiet draws none.
+TEST_F(Scripting, TransfersDrawProgressOnATerminal)
+{
+    spew(local("big.bin"), std::string(300000, 'x'));
+    auto onTerminal = [&](const std::string& flag) {
+        const std::string zelctl = quoted(ZEL_TEST_ZELCTL) + " --port " + port() + " --user ann --password pw-ann " +
+                                   flag + " sr put DATA " + quoted(local("big.bin")) + " /big.bin";
+        const std::string command = "script -qec " + quoted(zelctl) + " /dev/null > " + quoted(local("tty.out"));
+        EXPECT_EQ(std::system(command.c_str()), 0) << command;
+        return slurp(local("tty.out"));
+    };
+    const std::string drawn = onTerminal("--json");
+    EXPECT_NE(drawn.find("0 B of 293.0 KiB"), std::string::npos) << drawn;
+    EXPECT_NE(drawn.find("100% 293.0 KiB of 293.0 KiB"), std::string::npos) << drawn;
+    EXPECT_EQ(onTerminal("--quiet").find("KiB"), std::string::npos);
+}
+
 TEST_F(Scripting, VersionNeedsNoSignIn)
 {
     const Outcome version = raw({"--version"}, "", false);

@@ -70,6 +70,11 @@ TEST_F(Jobs, FinishedJobsReportTheirOutcomeAndLeaveALog)
     EXPECT_EQ(r["serviceSuccess"], "true");
     EXPECT_EQ(r["resultSuccess"], "false");
     EXPECT_TRUE(contains(log(failing), "broken\n"));
+
+    // A result port nobody listens on: the job still ends, and its log says where the result went.
+    long lost = submit("echo.zlw", {}, {{"requesterResultPort", "1"}, {"requesterHost", "127.0.0.1"}});
+    ASSERT_EQ(waitForEnd(lost)["jobStatus"], "SUCCESS");
+    EXPECT_TRUE(eventually([&] { return contains(log(lost), "result not delivered"); }));
 }
 
 TEST_F(Jobs, RefusedRequests)
