@@ -8,7 +8,7 @@ public:
     // Appends the item and takes ownership of it; a null item is ignored. An item that cannot be
     // stored (memory exhausted) is destroyed.
     virtual void append(I* item) = 0;
-    // Inserts before position `index`; an index past the end appends. A null item is ignored.
+    // Inserts before position `index`; an index past the end appends. Ownership as for append.
     virtual void insertAt(unsigned index, I* item) = 0;
     // The stored pointer at `index`. An index at or past entries() gives a reference to a shared
     // slot that holds null (reset on every such call): writing through it changes no element.
