@@ -53,7 +53,6 @@ TEST(TransformationRequest, WorkspacePathDropsFourCharactersForTheFolderInEveryF
         std::string path;
     } cases[] = {
         {"Samples", "harbour.zlw", "Samples/harbour/harbour.zlw"},
-        {"R", "noextension", "R/noexten/noextension"},
         {"R", "abc", "R//abc"},  // shorter names lose everything they have, and nothing before them
         {"", "w.zlw", "/w/w.zlw"},
     };
@@ -118,12 +117,9 @@ TEST(TransformationRequest, OnlyKeywordAndPublishedParametersMakeTheTextBeCompos
          true},
         {"parameter list", [](Request& r, const ZELServerStringArray& p) { r.setPublishedParameters(p); }, true},
         {"directive", [](Request& r, const ZELServerStringArray&) { r.setDirective(str("D"), str("1")); }, false},
-        {"directive list", [](Request& r, const ZELServerStringArray& p) { r.setDirectives(p); }, false},
         {"embedded directive",
          [](Request& r, const ZELServerStringArray&) { r.setEmbeddedDirective(str("E"), str("1")); }, false},
-        {"embedded list", [](Request& r, const ZELServerStringArray& p) { r.setEmbeddedDirectives(p); }, false},
         {"notification", [](Request& r, const ZELServerStringArray&) { r.setNotification(str("T"), str("m")); }, false},
-        {"notification list", [](Request& r, const ZELServerStringArray& p) { r.setNotifications(p); }, false},
     };
     for (const auto& c : cases) {
         Request request(str("S"), str("p"));

@@ -1,9 +1,9 @@
-// The job result object: typed getters over the parsed properties, the found flags and what they
-// leave in the out arguments.
+// The job result object: what each getter finds in a result text, and what it leaves in its out
+// value when it finds nothing. One row per getter and text.
 
 #include "jobs/ZELServerTransformationResult.h"
 
-#include <memory>
+#include <functional>
 #include <string>
 #include <vector>
 
@@ -11,8 +11,7 @@
 
 #include "api/ZELServerString.h"
 #include "api/ZELServerStringArray.h"
-#include "api/heap.h"
-#include "jobs/jobs_factories.h"
+#include "support/wire_table.h"
 
 using namespace std::string_literals;
 
@@ -20,234 +19,131 @@ namespace zel {
 namespace {
 
 using Result = ZELServerTransformationResult;
-constexpr unsigned kUntouched = 0xDEADBEEFu;
+using Read = std::function<std::string(const Result&)>;
 
-std::unique_ptr<Result> parsed(const std::string& text)
+// "found value"; the value starts as 77 (a number) or "before" (a text) so that one left alone shows.
+Read number(unsigned (Result::*get)(unsigned&) const)
 {
-    auto result = std::make_unique<Result>();
-    result->parse(ZELServerString(text));
-    return result;
+    return [get](const Result& result) {
+        unsigned value = 77;
+        const unsigned found = (result.*get)(value);
+        return std::to_string(found) + " " + std::to_string(value);
+    };
 }
-
-// ---- Numbers
-
-TEST(TransformationResult, UnsignedGettersConvertLikeTheServerWritesNumbers)
+Read text(unsigned (Result::*get)(IZELServerString&) const)
 {
-    using Getter = unsigned (Result::*)(unsigned&) const;
-    const Getter id = &Result::getID;
-    const Getter port = &Result::getRequesterResultPort;  // refuses a minus sign
+    return [get](const Result& result) {
+        ZELServerString value("before");
+        const unsigned found = (result.*get)(value);
+        return std::to_string(found) + " " + value.str();
+    };
+}
+Read generic(unsigned (Result::*get)(const std::string&, std::string&) const, const char* name)
+{
+    return [get, name](const Result& result) {
+        std::string value = "before";
+        const unsigned found = (result.*get)(name, value);
+        return std::to_string(found) + " " + value;
+    };
+}
+template <class Value>
+Read byName(unsigned (Result::*get)(const IZELServerString&, Value&) const, const char* name)
+{
+    return [get, name](const Result& result) {
+        Value value{77};
+        const unsigned found = (result.*get)(ZELServerString(name), value);
+        return std::to_string(found) + " " + std::to_string(value);
+    };
+}
+Read strings(void (Result::*get)(IZELServerStringArray&) const)
+{
+    return [get](const Result& result) {
+        ZELServerStringArray all(std::vector<std::string>{"kept"});
+        (result.*get)(all);
+        return zeltest::joined(all.entries(), [&](std::size_t i) { return all.items()[i]; });
+    };
+}
+// Job status, then whether it is a success.
+const Read kJobStatus = [](const Result& result) {
+    return number(&Result::getJobStatus)(result) + " " + std::to_string(result.isSuccess());
+};
+// The generic boolean, then the two success getters, which answer the value itself.
+const Read kSuccesses = [](const Result& result) {
+    return byName<unsigned>(&Result::getBoolProperty, "resultSuccess")(result) + " " +
+           std::to_string(result.getResultSuccess()) + std::to_string(result.getServiceSuccess());
+};
+
+TEST(TransformationResult, EveryGetterReadsItsOwnEntry)
+{
+    const std::string all = "result=0:ok\0serviceMsg=a=b\0timeRequested=1\0timeStarted=2\0timeFinished=3\0"
+                            "requesterHost=10.0.0.1\0request=R/w/w.zlw -XML_PARAMETER x\0requestKeyword=svc\0"
+                            "description=nightly\0priority=3"s;
+    const std::string pieces = "x=1\0priority=1\0result=12:Done|a=b|priority=9"s;
     const struct {
-        Getter get;
         std::string text;
-        unsigned found;
-        unsigned value;  // kUntouched when the out value must stay as it was
-    } cases[] = {
-        {id, "id=17", 1, 17},
-        {id, "id=-1", 1, 4294967295u},  // a minus wraps like the server's reader
-        // other text behind the number: stored, not found
-        {id, "id=12abc", 0, 12},
-        {port, "requesterResultPort=80x", 0, 80},
-        {id, "id=4294967296", 0, kUntouched},
-        {id, "other=1", 0, kUntouched},
-        {id, "result=id=5", 0, kUntouched},  // a result piece is not the job's id
-        {port, "requesterResultPort=7071", 1, 7071},
-        {port, "requesterResultPort=-1", 0, kUntouched},
+        Read read;
+        std::string expected;
+    } rows[] = {
+        {"id=17", number(&Result::getID), "1 17"},
+        {"id=-1", number(&Result::getID), "1 4294967295"},  // a minus wraps like the server's reader
+        {"id=12abc", number(&Result::getID), "0 12"},       // text behind the number: stored, not found
+        {"id=4294967296", number(&Result::getID), "0 77"},
+        {"result=id=5", number(&Result::getID), "0 77"},  // a result piece is not the job's id
+        {"requesterResultPort=-1", number(&Result::getRequesterResultPort), "0 77"},
+        {all, number(&Result::getPriority), "1 3"},
+        {"result=42:Finished|x=y", number(&Result::getStatusNumber), "1 42"},
+        {"result=42:Finished|x=y", text(&Result::getStatusMessage), "1 Finished"},
+        {all, text(&Result::getResult), "1 0:ok"},
+        {all, text(&Result::getServiceMessage), "1 a=b"},
+        {all, text(&Result::getTimeRequested), "1 1"},
+        {all, text(&Result::getTimeStarted), "1 2"},
+        {all, text(&Result::getTimeFinished), "1 3"},
+        {all, text(&Result::getRequesterHost), "1 10.0.0.1"},
+        {all, text(&Result::getRequest), "1 R/w/w.zlw -XML_PARAMETER x"},
+        {all, text(&Result::getRequestKeyword), "1 svc"},
+        {all, text(&Result::getDescription), "1 nightly"},
+        {"", text(&Result::getRequest), "0 before"},
+        {"description=null", text(&Result::getDescription), "0 null"},  // not a description, still handed out
+        {"jobStatus=SUCCESS\0id=17"s, kJobStatus, "1 7 1"},
+        {"jobStatus=QUEUED", kJobStatus, "1 1 0"},
+        {"jobStatus=success", kJobStatus, "0 77 0"},
+        {"resultSuccess=true\0serviceSuccess=Yes"s, kSuccesses, "1 1 11"},
+        {"resultSuccess=No\0serviceSuccess=0.0"s, kSuccesses, "1 0 00"},
+        {"resultSuccess=abc\0serviceSuccess=abc"s, kSuccesses, "0 77 00"},
+        {"id=1", kSuccesses, "0 77 00"},
+        // Generic names are found with and without the prefix; "result" pieces shadow text entries.
+        {pieces, generic(&Result::findProperty, "x"), "1 1"},
+        {pieces, generic(&Result::findProperty, "y"), "0 before"},
+        {pieces, generic(&Result::lookupProperty, "a"), "1 b"},
+        {pieces, byName<unsigned>(&Result::getUIntProperty, "priority"), "1 9"},
+        {pieces, number(&Result::getPriority), "1 1"},
+        {"n=0x20", byName<unsigned>(&Result::getUIntProperty, "n"), "1 32"},
+        {"f=-2e3", byName<float>(&Result::getFloatProperty, "f"), "1 -2000.000000"},
+        {"f=1.5x", byName<float>(&Result::getFloatProperty, "f"), "0 77.000000"},
+        {"zeta=1\0*odd=2\0result=3:M|a=b"s, strings(&Result::getPropertyNames),
+         "kept,odd,result,zeta,StatusMessage,StatusNumber,a,"},
+        {"zeta=1\0result=3:M"s, strings(&Result::getProperties),
+         "kept,result,3:M,zeta,1,StatusMessage,M,StatusNumber,3,"},
     };
-    for (const auto& c : cases) {
-        const auto result = parsed(c.text);
-        unsigned value = kUntouched;
-        EXPECT_EQ(((*result).*c.get)(value), c.found) << c.text;
-        EXPECT_EQ(value, c.value) << c.text;
+    for (const auto& row : rows) {
+        Result result;
+        result.parse(ZELServerString(row.text));
+        EXPECT_EQ(row.read(result), row.expected) << row.text;
     }
 }
 
-TEST(TransformationResult, PriorityStatusNumberAndMessageUseTheirOwnNames)
-{
-    const auto result = parsed("priority=3\0result=42:Finished|x=y"s);
-    unsigned priority = kUntouched;
-    unsigned number = kUntouched;
-    EXPECT_EQ(result->getPriority(priority), 1u);
-    EXPECT_EQ(priority, 3u);
-    EXPECT_EQ(result->getStatusNumber(number), 1u);
-    EXPECT_EQ(number, 42u);
-    ZELServerString message;
-    EXPECT_EQ(result->getStatusMessage(message), 1u);
-    EXPECT_EQ(message.str(), "Finished");
-}
-
-// ---- Job status and booleans
-
-TEST(TransformationResult, JobStatusComparesTheWholeWordExactly)
-{
-    const struct {
-        std::string text;
-        unsigned found;
-        unsigned code;
-        unsigned success;
-    } cases[] = {
-        {"jobStatus=SUCCESS\0id=17"s, 1, 7, 1},
-        {"jobStatus=QUEUED", 1, 1, 0},
-        {"jobStatus=success", 0, kUntouched, 0},
-        {"id=1", 0, kUntouched, 0},
-    };
-    for (const auto& c : cases) {
-        const auto result = parsed(c.text);
-        unsigned code = kUntouched;
-        EXPECT_EQ(result->getJobStatus(code), c.found) << c.text;
-        EXPECT_EQ(code, c.code) << c.text;
-        EXPECT_EQ(result->isSuccess(), c.success) << c.text;
-    }
-}
-
-TEST(TransformationResult, BooleansReadFirstLetterOrNumber)
-{
-    const struct {
-        std::string value;
-        unsigned found;
-        unsigned flag;
-    } cases[] = {
-        {"true", 1, 1}, {"No", 1, 0}, {"2.5", 1, 1}, {"0.0", 1, 0}, {"abc", 0, 0}, {"", 0, 0},
-    };
-    for (const auto& c : cases) {
-        const auto result = parsed("resultSuccess=" + c.value + "\0serviceSuccess="s + c.value);
-        unsigned flag = kUntouched;
-        EXPECT_EQ(result->getBoolProperty(std::string("resultSuccess"), flag), c.found) << c.value;
-        EXPECT_EQ(flag, c.found ? c.flag : kUntouched) << c.value;
-        // The two success getters answer the value itself, and 0 for what does not convert.
-        EXPECT_EQ(result->getResultSuccess(), c.flag) << c.value;
-        EXPECT_EQ(result->getServiceSuccess(), c.flag) << c.value;
-    }
-    const auto missing = parsed("id=1");
-    EXPECT_EQ(missing->getResultSuccess(), 0u);
-    EXPECT_EQ(missing->getServiceSuccess(), 0u);
-}
-
-// ---- Texts
-
-TEST(TransformationResult, TextGettersReadTheirProperty)
-{
-    const auto result =
-        parsed("result=0:ok\0serviceMsg=a=b\0timeRequested=20240102\0timeStarted=20240103\0timeFinished=20240104\0"
-               "requesterHost=10.0.0.1\0request=R/w/w.zlw -XML_PARAMETER x\0requestKeyword=svc\0description=nightly"s);
-    const struct {
-        const char* what;
-        unsigned (Result::*get)(IZELServerString&) const;
-        const char* expected;
-    } getters[] = {
-        {"result", &Result::getResult, "0:ok"},
-        {"serviceMsg", &Result::getServiceMessage, "a=b"},
-        {"timeRequested", &Result::getTimeRequested, "20240102"},
-        {"timeStarted", &Result::getTimeStarted, "20240103"},
-        {"timeFinished", &Result::getTimeFinished, "20240104"},
-        {"requesterHost", &Result::getRequesterHost, "10.0.0.1"},
-        {"request", &Result::getRequest, "R/w/w.zlw -XML_PARAMETER x"},
-        {"requestKeyword", &Result::getRequestKeyword, "svc"},
-        {"description", &Result::getDescription, "nightly"},
-    };
-    const auto empty = parsed("");
-    for (const auto& getter : getters) {
-        ZELServerString out;
-        EXPECT_EQ(((*result).*getter.get)(out), 1u) << getter.what;
-        EXPECT_EQ(out.str(), getter.expected) << getter.what;
-        ZELServerString untouched("before");
-        EXPECT_EQ(((*empty).*getter.get)(untouched), 0u) << getter.what;
-        EXPECT_EQ(untouched.str(), "before") << getter.what;
-    }
-    // A description of "null" is not found, but still written.
-    ZELServerString out("before");
-    EXPECT_EQ(parsed("description=null")->getDescription(out), 0u);
-    EXPECT_EQ(out.str(), "null");
-}
-
-// ---- Generic lookup
-
-TEST(TransformationResult, GenericNamesAreFoundWithAndWithoutPrefixAndPiecesShadowTextEntries)
-{
-    const auto result = parsed("x=1\0priority=1\0result=12:Done|a=b|priority=9"s);
-    std::string value;
-    EXPECT_EQ(result->findProperty("x", value), 1u);
-    EXPECT_EQ(value, "1");
-    EXPECT_EQ(result->findProperty("*x", value), 1u);
-    EXPECT_EQ(result->lookupProperty("a", value), 1u);
-    EXPECT_EQ(value, "b");
-    value = "before";
-    EXPECT_EQ(result->findProperty("y", value), 0u);
-    EXPECT_EQ(value, "before");
-    ZELServerString out;
-    EXPECT_EQ(result->getStringProperty(ZELServerString("a"), out), 1u);
-    EXPECT_EQ(out.str(), "b");
-
-    // A "result" piece is stored without the prefix and is looked up first; the typed getter for the
-    // text's own entry still reads the prefixed one.
-    unsigned generic = 0;
-    unsigned typed = 0;
-    EXPECT_EQ(result->getUIntProperty(ZELServerString("priority"), generic), 1u);
-    EXPECT_EQ(generic, 9u);
-    EXPECT_EQ(result->getPriority(typed), 1u);
-    EXPECT_EQ(typed, 1u);
-}
-
-TEST(TransformationResult, GenericNumbersFloatsAndBooleansByInterfaceName)
-{
-    const auto result = parsed("n=0x20\0b=no"s);
-    unsigned n = 0;
-    unsigned b = kUntouched;
-    EXPECT_EQ(result->getUIntProperty(ZELServerString("n"), n), 1u);
-    EXPECT_EQ(n, 32u);
-    EXPECT_EQ(result->getBoolProperty(ZELServerString("b"), b), 1u);
-    EXPECT_EQ(b, 0u);
-    unsigned anyBase = kUntouched;
-    EXPECT_EQ(result->getUIntPropertyAnyBase("n", anyBase), 1u);
-    EXPECT_EQ(anyBase, 32u);
-
-    const struct {
-        std::string value;
-        unsigned found;
-        float expected;
-    } floats[] = {
-        {"-2e3", 1, -2000.0f},
-        {" 0.25 ", 1, 0.25f},
-        {"", 0, 0.0f},
-        {"1.5x", 0, 0.0f},
-    };
-    for (const auto& c : floats) {
-        float value = -99.0f;
-        EXPECT_EQ(parsed("f=" + c.value)->getFloatProperty(ZELServerString("f"), value), c.found) << c.value;
-        EXPECT_FLOAT_EQ(value, c.found ? c.expected : -99.0f) << c.value;
-    }
-}
-
-// ---- All properties, parsing again
-
-TEST(TransformationResult, NamesAndPairsComeWithoutPrefixInNameOrder)
-{
-    const auto result = parsed("zeta=1\0*odd=2\0result=3:M|a=b"s);
-    ZELServerStringArray names(std::vector<std::string>{"kept"});
-    result->getPropertyNames(names);
-    EXPECT_EQ(names.items(),
-              (std::vector<std::string>{"kept", "odd", "result", "zeta", "StatusMessage", "StatusNumber", "a"}));
-
-    ZELServerStringArray pairs;
-    result->getProperties(pairs);
-    EXPECT_EQ(pairs.items(), (std::vector<std::string>{"odd", "2", "result", "3:M|a=b", "zeta", "1", "StatusMessage",
-                                                       "M", "StatusNumber", "3", "a", "b"}));
-}
-
-TEST(TransformationResult, FreshIsEmptyAndParseAgainAddsAndOverwritesButNeverRemoves)
+TEST(TransformationResult, ParsingAgainAddsAndOverwritesButNeverRemoves)
 {
     Result result;
     ZELServerString text("before");
     result.getText(text);
     EXPECT_EQ(text.str(), "");
-    EXPECT_TRUE(result.properties().empty());
     EXPECT_EQ(result.isSuccess(), 0u);
-
     result.parse(ZELServerString("a=1\0b=2"s));
     result.parse(ZELServerString("b=3\0c=4"s));
     result.getText(text);
     EXPECT_EQ(text.str(), "b=3\0c=4"s);
     EXPECT_EQ(result.properties(), (ResultProperties{{"*a", "1"}, {"*b", "3"}, {"*c", "4"}}));
-
     result.parse(ZELServerString(""));
     result.getText(text);
     EXPECT_EQ(text.str(), "");

@@ -133,6 +133,7 @@ TEST(WorkspaceReading, EveryPartLandsInItsPlace)
 TEST(WorkspaceReading, ReadingAgainReplacesEverythingAndFailuresAreReported)
 {
     ZELServerWorkspace workspace(nullptr);
+    EXPECT_FALSE(workspace.isEnabled() || ZELServerWorkspaceSummary().isEnabled()) << "fresh objects are disabled";
     ASSERT_EQ(readWorkspaceReply(kWorkspaceDocument, nullptr, workspace), 0);
     ASSERT_EQ(readWorkspaceReply(R"(<X><WORKSPACE_DEFINITIONS name="w2"><DATASET name="D"><FEATURE_TYPE name="f"/>)"
                                  R"(</DATASET></WORKSPACE_DEFINITIONS></X>)",
@@ -181,25 +182,25 @@ TEST(ItemReading, SummariesItemsAndStoredFilesReadTheirAttributes)
     }
     ZELServerItem item;
     ASSERT_EQ(readItemReply(R"(<R><ITEM name="roads.zlw" repository_name="Samples" description="one&#10;two" )"
-                            R"(filesize="12abc" requirements="Needs &lt;LIBX&gt;" buildnumber="24117"/></R>)",
+                            R"(requirements="Needs &lt;LIBX&gt;" buildnumber="24117"/></R>)",
                             item),
               0);
     EXPECT_EQ(text<IZELServerItem>(item, &IZELServerItem::getRepositoryName), "Samples");
     EXPECT_EQ(text<IZELServerItem>(item, &IZELServerItem::getDescription), "one\ntwo");
     EXPECT_EQ(text<IZELServerItem>(item, &IZELServerItem::getRequirements), "Needs <LIBX>");
-    EXPECT_EQ(item.getFileSize(), 0) << "a number with text behind it reads as zero";
     EXPECT_EQ(item.getBuildNumber(), 24117);
-
-    const std::string body = R"(<R><CUSTOMFORMAT name="f.zds" title="F" filesize="5000000000"/>)"
-                             R"(<CUSTOMTRANSFORMER name="t.zlx" title="ignored" description="xf"/></R>)";
+    // A 32-bit size holds what fits, a 64-bit one more; what does not convert or fit reads as zero.
+    const std::pair<const char*, long long> sizes[] = {
+        {"2147483647", 2147483647}, {"-2147483648", -2147483648LL}, {"2147483648", 0}, {"12abc", 0}};
+    for (const auto& [size, expected] : sizes) {
+        ASSERT_EQ(readItemReply(std::string("<R><ITEM filesize=\"") + size + "\"/></R>", item), 0);
+        EXPECT_EQ(item.getFileSize(), expected) << size;
+    }
     ZELServerCustomFormat format;
-    ZELServerCustomTransformer transformer;
-    ASSERT_EQ(readCustomFormatReply(body, format), 0);
-    ASSERT_EQ(readCustomTransformerReply(body, transformer), 0);
+    ASSERT_EQ(readCustomFormatReply(R"(<R><CUSTOMFORMAT name="f.zds" title="F" filesize="5000000000"/></R>)", format),
+              0);
     EXPECT_EQ(text<IZELServerCustomFormat>(format, &IZELServerCustomFormat::getTitle), "F");
     EXPECT_EQ(format.getFileSize(), 5000000000LL);
-    EXPECT_EQ(text<IZELServerCustomTransformer>(transformer, &IZELServerCustomTransformer::getTitle), "");
-    EXPECT_EQ(text<IZELServerCustomTransformer>(transformer, &IZELServerCustomTransformer::getDescription), "xf");
 }
 
 TEST(ServiceSettings, RegistrationFlagsApplyPerItemTypeOnly)

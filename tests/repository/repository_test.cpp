@@ -41,16 +41,6 @@ ZELServerStringDict dict(const std::vector<std::pair<std::string, std::string>>&
     return made;
 }
 
-template <class I>
-std::string names(IZELServerVector<I>& vector)
-{
-    return joined(vector.entries(), [&](unsigned i) {
-        ZELServerString name;
-        vector.element(i)->getName(name);
-        return name.str();
-    });
-}
-
 class RepositoryWire : public WireTableTest {
 protected:
     // A command of the repository "Samples": its name first, then the command's own values.
@@ -67,11 +57,6 @@ protected:
                                  {"propertyAccessorObject",
                                   xmlDocument(keyword, R"(<PROPERTY category="run" name="priority" value="high"/>)")}});
     }
-    unsigned& fresh()
-    {
-        flag = 7;
-        return flag;
-    }
     std::string file(const std::string& name, const std::string& content) const
     {
         spew(scratch.path() / name, content);
@@ -81,7 +66,6 @@ protected:
     ZELServerRepositoryManager manager{channel.get()};
     ZELServerRepository repository{channel.get(), S("Samples"), S("sample workspaces")};
     ZELServerService service{channel.get(), "download", "Data Download", "", "", false, true, false, false, false};
-    unsigned flag = 7;
     ProgressLog progress;
     const TempDir scratch{"zel-repo"};
 };
@@ -118,8 +102,6 @@ TEST_F(RepositoryWire, ItemsResourcesAndTheirTransfers)
         {"update item lets any name through", on("REP_UPDATE_ITEM", {{"itemName", "dir/a.zlw"}, crcOff[0]}), readyAck(),
          [&] { return outcome(repository.updateItem(S("dir/a.zlw"), S(item))); }, 0, "",
          uploadOf("workspace bytes\n", ok("true"))},
-        {"update item of a missing file", none, none,
-         [&] { return outcome(repository.updateItem(S("roads.zlw"), S(missing))); }, msg::kLocalFileRead, ""},
         {"add resource", on("REP_ADD_ITEMRESOURCE", resourceOf("a.zlw", "up.csv")), readyAck(),
          [&] {
              return outcome(repository.addItemResource(S("a.zlw"), S("up.csv"), S(resource), &progress), [&] {
@@ -133,9 +115,6 @@ TEST_F(RepositoryWire, ItemsResourcesAndTheirTransfers)
         {"a resource named as its item", none, none,
          [&] { return outcome(repository.addItemResource(S("a.zlw"), S("a.zlw"), S(missing))); },
          msg::kResourceNamedAsItem, ""},
-        {"replacing a resource named as its item", none, none,
-         [&] { return outcome(repository.updateItemResource(S("a.zlw"), S("a.zlw"), S(missing))); },
-         msg::kResourceNamedAsItem, ""},
         {"the character check comes first", none, none,
          [&] { return outcome(repository.addItemResource(S("a%"), S("a%"), S(missing))); }, msg::kForbiddenCharacter,
          ""},
@@ -145,9 +124,6 @@ TEST_F(RepositoryWire, ItemsResourcesAndTheirTransfers)
         {"get resource", on("REP_GET_ITEMRESOURCE", resourceOf("a.zlw", "up.csv")), fileHeader(0, crc32("")),
          [&] { return outcome(repository.getItemResource(S("a.zlw"), S("up.csv"), S(destination), fresh()), flag); }, 0,
          "1 ", downloadOf("", ok("true"))},
-        {"get resource into a missing folder", none, none,
-         [&] { return outcome(repository.getItemResource(S("a"), S("r"), S(missing + "/no/r"), fresh()), flag); },
-         msg::kLocalFileWrite, "0 "},
         {"get item", on("REP_GET_ITEM", {{"itemName", "roads.zlw"}, crcOff[0]}), fileHeader(big.size(), crc32(big)),
          [&] { return outcome(repository.getItem(S("roads.zlw"), S(destination), fresh()), flag, downloaded); }, 0,
          "1 wwwwwwwwwwwwwwwwwwww ", downloadOf(big, ok("true"))},
@@ -177,9 +153,7 @@ TEST_F(RepositoryWire, ViewsFiltersAndRegistrations)
     ZELServerResource resource;
     const ZELServerStringDict disabled = dict({{"ENABLE_FILTER", "DISABLED"}});
     const auto summariesWith = [&](const ZELServerStringDict* filter) {
-        return [&, filter] {
-            return outcome(repository.getWorkspaceSummariesView(filter, summaries), [&] { return names(summaries); });
-        };
+        return [&, filter] { return outcome(repository.getWorkspaceSummariesView(filter, summaries), summaries); };
     };
     const Bytes twoSummaries = ok(R"(<R><WORKSPACE_SUMMARY name="s1"/><WORKSPACE_SUMMARY name="s2"/></R>)");
     const ZELServerStringDict all = dict({{"ENABLE_FILTER", "ALL"}});
@@ -200,37 +174,26 @@ TEST_F(RepositoryWire, ViewsFiltersAndRegistrations)
          summariesWith(&enabled), 0, "s1,s2, "},
         {"DISABLED", on("REP_GET_WORKSPACESVIEW", {{"enableFilter", "Disabled"}}),
          ok(R"(<R><WORKSPACE_DEFINITIONS name="w"/></R>)"),
-         [&] {
-             return outcome(repository.getWorkspacesView(&disabled, workspaces), [&] { return names(workspaces); });
-         },
-         0, "w, "},
+         [&] { return outcome(repository.getWorkspacesView(&disabled, workspaces), workspaces); }, 0, "w, "},
         {"list views ignore their directives", on("REP_GET_CUSTOMFORMATSVIEW", {{"enableFilter", "All"}}),
          ok(R"(<R><CUSTOMFORMAT name="f.zds"/></R>)"),
-         [&] { return outcome(repository.getCustomFormatsView(&disabled, formats), [&] { return names(formats); }); },
-         0, "f.zds, "},
+         [&] { return outcome(repository.getCustomFormatsView(&disabled, formats), formats); }, 0, "f.zds, "},
         {"custom transformers", on("REP_GET_CUSTOMTRANSFORMERSVIEW", {{"enableFilter", "All"}}),
          ok(R"(<R><CUSTOMTRANSFORMER name="t1.zlx"/><CUSTOMTRANSFORMER name="t2.zlx"/></R>)"),
-         [&] {
-             return outcome(repository.getCustomTransformersView(&disabled, transformers),
-                            [&] { return names(transformers); });
-         },
-         0, "t1.zlx,t2.zlx, "},
+         [&] { return outcome(repository.getCustomTransformersView(&disabled, transformers), transformers); }, 0,
+         "t1.zlx,t2.zlx, "},
         {"templates", on("REP_GET_TEMPLATESVIEW", {{"enableFilter", "All"}}), ok(R"(<R><TEMPLATE name="p"/></R>)"),
-         [&] { return outcome(repository.getTemplatesView(&disabled, templates), [&] { return names(templates); }); },
-         0, "p, "},
+         [&] { return outcome(repository.getTemplatesView(&disabled, templates), templates); }, 0, "p, "},
         {"item resources, even of no item",
          on("REP_GET_ITEMRESOURCESVIEW", {{"itemName", ""}, {"enableFilter", "All"}}),
          ok(R"(<R><RESOURCE name="r1"/><RESOURCE name="r2"/></R>)"),
-         [&] {
-             return outcome(repository.getItemResourcesView(S(""), &disabled, resources),
-                            [&] { return names(resources); });
-         },
-         0, "r1,r2, "},
+         [&] { return outcome(repository.getItemResourcesView(S(""), &disabled, resources), resources); }, 0,
+         "r1,r2, "},
         {"workspace view", on("REP_GET_WORKSPACEVIEW", {{"workspaceName", "roads.zlw"}}),
          ok(R"(<R><WORKSPACE_DEFINITIONS name="roads.zlw"><DATASET name="A" is_source="true"/></WORKSPACE_DEFINITIONS></R>)"),
          [&] {
              return outcome(repository.getWorkspaceView(S("roads.zlw"), workspace, fresh()), flag,
-                            [&] { return names(workspace.getSourceDatasets()); });
+                            workspace.getSourceDatasets());
          },
          0, "1 A, "},
         {"custom format view", on("REP_GET_CUSTOMFORMATVIEW", {{"customFormatName", "f.zds"}}),
@@ -318,7 +281,7 @@ TEST_F(RepositoryWire, ManagerAndServiceCommands)
     const ZELServerStringDict otherKey = dict({{"item_type", "1"}});
     const Values registration = {{"serviceName", "download"}, {"repositoryName", "Samples"}, {"itemName", "a.zlw"}};
     const auto servicesWith = [&](const ZELServerStringDict* filter) {
-        return [&, filter] { return outcome(manager.getServices(filter, services), [&] { return names(services); }); };
+        return [&, filter] { return outcome(manager.getServices(filter, services), services); };
     };
     const auto description = [&](const IZELServerRepository& repository) {
         ZELServerString text;
@@ -342,8 +305,6 @@ TEST_F(RepositoryWire, ManagerAndServiceCommands)
              return outcome(manager.getService(S("download"), found, fresh()), flag, [&] { return found.serviceId(); });
          },
          0, "1 7 "},
-        {"unknown service", command("REP_GET_SERVICE", {{"serviceName", "x"}}), ok("<R/>"),
-         [&] { return outcome(manager.getService(S("x"), found, fresh()), flag); }, 0, "0 "},
         {"services", command("REP_GET_SERVICES", {{"enableFilter", "All"}}),
          ok(R"(<R><SERVICE name="download"/><SERVICE name="s2"/></R>)"), servicesWith(nullptr), 0, "download,s2, "},
         {"services filter is exact", none, none, servicesWith(&lowerCase), msg::kRequiredValueMissing, "download,s2, "},
@@ -368,9 +329,8 @@ TEST_F(RepositoryWire, ManagerAndServiceCommands)
         {"repositories at any depth", command("REP_GET_REPOSITORIES", {{"enableFilter", "All"}}),
          ok(R"(<R><REPOSITORY name="Samples" description="d1"/><X><REPOSITORY name="Other"/></X></R>)"),
          [&] {
-             return outcome(
-                 manager.getRepositories(nullptr, repositories), [&] { return names(repositories); },
-                 [&] { return description(*repositories.element(0)); });
+             return outcome(manager.getRepositories(nullptr, repositories), repositories,
+                            [&] { return description(*repositories.element(0)); });
          },
          0, "Samples,Other, d1 "},
         {"a listed repository works on the manager's connection",
@@ -383,8 +343,6 @@ TEST_F(RepositoryWire, ManagerAndServiceCommands)
                             [&] { return description(made); });
          },
          0, "1 sample workspaces "},
-        {"unknown repository", command("REP_GET_REPOSITORY", {{"repositoryName", "Nothing"}}), ok("<R/>"),
-         [&] { return outcome(manager.getRepository(S("Nothing"), made, fresh()), flag); }, 0, "0 "},
         {"a repository read works on the manager's connection",
          command("REP_ITEMEXISTS", {{"repositoryName", "Samples"}, {"itemName", "x.zlw"}}), ok("false"),
          [&] { return outcome(made.itemExists(S("x.zlw"), fresh()), flag); }, 0, "0 "},
@@ -396,15 +354,11 @@ TEST_F(RepositoryWire, ManagerAndServiceCommands)
          [&] { return outcome(manager.getGlobalItems(&allItems, globalItems), categories); }, 0, "Other,Samples, "},
         {"global items not XML", command("REP_GLOBAL_GET_ALL_ITEMS", {{"enableFilter", "All"}}), ok("not xml"),
          [&] { return outcome(manager.getGlobalItems(&allItems, globalItems)); }, msg::kXmlFailure, ""},
-        {"global items refused", command("REP_GLOBAL_GET_ALL_ITEMS", {{"enableFilter", "All"}}), reply("ERROR", "busy"),
-         [&] { return outcome(manager.getGlobalItems(&allItems, globalItems)); }, msg::kServerError, ""},
         // A service's own commands.
         {"register a kind the service takes", command("REP_REGISTERITEM", registration), ok("true"),
          [&] { return outcome(service.registerItem(S("Samples"), S("a.zlw"))); }, 0, ""},
         {"a kind the service does not take", none, none,
          [&] { return outcome(service.registerItem(S("Samples"), S("report.zlwt"))); }, msg::kRegistrationRefused, ""},
-        {"endings are case sensitive", none, none,
-         [&] { return outcome(service.registerItem(S("Samples"), S("A.ZLW"))); }, msg::kRegistrationRefused, ""},
         {"no name", none, none, [&] { return outcome(service.registerItem(S("Samples"), S(""))); },
          msg::kRequiredValueMissing, ""},
         {"deregister", command("REP_DEREGISTERITEM", registration), ok("false"),

@@ -1,7 +1,6 @@
-// Paths, file descriptions and shared resources as objects: how paths are made, and what the
-// "FILEINFO" and "SHAREDRESOURCE" readers make of reply bodies, including after a failure.
+// Paths and file descriptions as objects: how paths are made, and what the "FILEINFO" reader makes of
+// reply bodies, including after a failure.
 
-#include <cstdint>
 #include <memory>
 #include <string>
 #include <vector>
@@ -9,12 +8,10 @@
 #include <gtest/gtest.h>
 
 #include "api/ZELServerString.h"
-#include "api/ZELServerVector.h"
 #include "api/message_numbers.h"
 #include "sharedresources/ZELServerFileInfo.h"
 #include "sharedresources/ZELServerMountPoint.h"
 #include "sharedresources/shared_resource_readers.h"
-#include "transport/IZELServerChannel.h"
 
 namespace zel {
 namespace {
@@ -35,30 +32,12 @@ std::string textsOf(const IZELServerFileInfo& info)
     return (info.isDirectory() ? "dir " : "file ") + std::to_string(info.getSize()) + " " + textsOf(info.getPath());
 }
 
-std::string textsOf(const IZELServerMountPoint& mountPoint)
-{
-    ZELServerString name("stale");
-    ZELServerString displayName("stale");
-    ZELServerString description("stale");
-    mountPoint.getName(name);
-    mountPoint.getDisplayName(displayName);
-    mountPoint.getDescription(description);
-    return name.str() + "|" + displayName.str() + "|" + description.str();
-}
-
-// A channel the readers can bind objects to; nothing is ever sent through it.
-IZELServerChannel* fakeChannel(int n)
-{
-    return reinterpret_cast<IZELServerChannel*>(static_cast<std::uintptr_t>(0x1000 * n));
-}
-
 TEST(Path, AWholePathSplitsAtTheLastSlashAndPartsJoinWithOneSlash)
 {
     ZELServerMountPoint area(nullptr);
     const std::pair<const char*, const char*> wholes[] = {
         {"in/2024/data.csv", "data.csv|in/2024|in/2024/data.csv"},
         {"data.csv", "data.csv||/data.csv"},
-        {"/in/data.csv", "data.csv|/in|/in/data.csv"},
         {"a//b", "b|a/|a/b"},
         {"in\\data.csv", "in\\data.csv||/in\\data.csv"},
     };
@@ -68,7 +47,6 @@ TEST(Path, AWholePathSplitsAtTheLastSlashAndPartsJoinWithOneSlash)
     }
     const std::pair<std::pair<const char*, const char*>, const char*> parts[] = {
         {{"in//", "//data.csv"}, "//data.csv|in//|in/data.csv"},
-        {{"", "data.csv"}, "data.csv||/data.csv"},
         {{"in", ""}, "|in|in/"},
     };
     for (const auto& [given, expected] : parts) {
@@ -104,35 +82,6 @@ TEST(FileInfoReader, ReadsTheFirstDescriptionAndAFailureLeavesTheLastOneRead)
         EXPECT_EQ(readFileInfoReply(row.body, info), row.result) << row.body;
         EXPECT_EQ(textsOf(info), row.after) << row.body;
     }
-}
-
-TEST(FileInfoReader, AListReplacesItsContentInDocumentOrderUnlessTheReplyIsNoDocument)
-{
-    ZELServerVector<IZELServerFileInfo, ZELServerFileInfo> infos;
-    infos.append(new ZELServerFileInfo());
-    EXPECT_EQ(readFileInfosReply("not xml", infos), static_cast<int>(msg::kXmlFailure));
-    EXPECT_EQ(infos.entries(), 1u);
-    ASSERT_EQ(readFileInfosReply(R"(<L><FILEINFO filetype="DIR" name="a"/><FILEINFO filetype="FILE" size="3" )"
-                                 R"(name="b"/></L>)",
-                                 infos),
-              0);
-    ASSERT_EQ(infos.entries(), 2u);
-    EXPECT_EQ(textsOf(*infos.at(0)) + "," + textsOf(*infos.at(1)), "dir 0 a||,file 3 b||");
-    ASSERT_EQ(readFileInfosReply("<SR_LIST/>", infos), 0) << "an empty directory is a listing too";
-    EXPECT_EQ(infos.entries(), 0u);
-}
-
-TEST(SharedResourceReader, FillsAndBindsTheMountPointOrLeavesItAlone)
-{
-    ZELServerMountPoint mountPoint(fakeChannel(1));
-    ASSERT_EQ(readMountPointReply(R"(<L><SHAREDRESOURCE name="DATA" displayname="In &amp; out" )"
-                                  R"(description="Files the jobs read"/></L>)",
-                                  fakeChannel(2), mountPoint),
-              0);
-    EXPECT_EQ(readMountPointReply("<L/>", fakeChannel(3), mountPoint), static_cast<int>(msg::kUnreadableReply));
-    EXPECT_EQ(readMountPointReply("", fakeChannel(3), mountPoint), static_cast<int>(msg::kXmlFailure));
-    EXPECT_EQ(textsOf(mountPoint), "DATA|In & out|Files the jobs read");
-    EXPECT_EQ(mountPoint.channel(), fakeChannel(2));
 }
 
 }  // namespace

@@ -5,9 +5,12 @@
 // on one connection, so a row also shows that the session stays usable after the rows before it.
 
 #include <functional>
+#include <ostream>
 #include <string>
 #include <type_traits>
 #include <vector>
+
+#include <zelserverapi/IZELServerVector.h>
 
 #include "support/signed_in_channel.h"
 
@@ -25,27 +28,6 @@ inline std::ostream& operator<<(std::ostream& out, const Outcome& outcome)
     return out << outcome.number << " [" << outcome.outs << "]";
 }
 
-inline std::string outText(unsigned value) { return std::to_string(value); }
-inline std::string outText(const std::string& value) { return value; }
-inline std::string outText(const IZELServerString& value) { return std::string(value.data(), value.length()); }
-// A reader of something the call filled, run after the call.
-template <class Read>
-    requires std::is_invocable_r_v<std::string, const Read&>
-std::string outText(const Read& read)
-{
-    return read();
-}
-
-// Takes the status; the out values are read after the call, as they are bound by reference.
-template <class... Outs>
-Outcome outcome(IZELServerStatus* raw, const Outs&... outs)
-{
-    const StatusPtr status(raw);
-    Outcome result{status ? status->getMessageNumber() : 0, {}};
-    ((result.outs += outText(outs) + " "), ...);
-    return result;
-}
-
 // The texts of `count` things, each followed by a comma.
 template <class Text>
 std::string joined(std::size_t count, const Text& textOf)
@@ -55,6 +37,43 @@ std::string joined(std::size_t count, const Text& textOf)
         all += textOf(i) + ",";
     }
     return all;
+}
+
+inline std::string outText(unsigned value) { return std::to_string(value); }
+inline std::string outText(const std::string& value) { return value; }
+inline std::string outText(const IZELServerString& value) { return std::string(value.data(), value.length()); }
+// The names of the objects of a list the call filled.
+template <class I>
+std::string outText(IZELServerVector<I>& vector)
+{
+    return joined(vector.entries(), [&](std::size_t i) {
+        zel::ZELServerString name;
+        vector.element(static_cast<unsigned>(i))->getName(name);
+        return name.str();
+    });
+}
+// The progress calls in order.
+inline std::string outText(const ProgressLog& progress)
+{
+    return joined(progress.calls.size(), [&](std::size_t i) { return progress.calls[i]; });
+}
+// A reader of something the call filled, run after the call.
+template <class Read>
+    requires std::is_invocable_r_v<std::string, const Read&>
+std::string outText(const Read& read)
+{
+    return read();
+}
+
+// Takes the status; the out values are read after the call, as they are bound by reference (so pass
+// the objects the call fills, or readers of them, never values computed from them).
+template <class... Outs>
+Outcome outcome(IZELServerStatus* raw, Outs&&... outs)
+{
+    const StatusPtr status(raw);
+    Outcome result{status ? status->getMessageNumber() : 0, {}};
+    ((result.outs += outText(outs) + " "), ...);
+    return result;
 }
 
 // The steps after the command of an upload: the file header, the raw content, then `answer`.
@@ -89,6 +108,14 @@ class WireTableTest : public SignedInChannelTest {
 protected:
     // Request and answer of a row that must send nothing.
     static inline const Bytes none{};
+
+    // The out flag of a call, set to 7 first so that a call that leaves it alone shows.
+    unsigned& fresh()
+    {
+        flag = 7;
+        return flag;
+    }
+    unsigned flag = 7;
 
     void run(const std::vector<WireRow>& rows)
     {
