@@ -103,6 +103,13 @@ TEST_F(Scripting, ExitStatusesOutputAndErrorLines)
     }
     EXPECT_EQ(slurp(local("back.zlw")), kGreeter);
     EXPECT_NE(slurp(local("job.log")).find("Hello World"), std::string::npos);
+    // Waiting asks the server a few times a second, not in a busy loop (the table waits some seconds).
+    const std::string log = slurp(local("server.log"));
+    std::size_t polls = 0;
+    for (std::size_t at = log.find("command=GET_JOB_RESULT_STRING"); at != std::string::npos;
+         at = log.find("command=GET_JOB_RESULT_STRING", at + 1))
+        ++polls;
+    EXPECT_LT(polls, 100u);
 }
 
 TEST_F(Scripting, SettingsComeFromTheEnvironmentAndFlagsWin)
