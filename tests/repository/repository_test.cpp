@@ -92,8 +92,6 @@ TEST_F(RepositoryWire, ItemsResourcesAndTheirTransfers)
          reply("ERROR", "Authorization Error: no rights"),
          [&] { return outcome(repository.itemResourceExists(S("a.zlw"), S("r"), fresh()), flag); }, msg::kServerError,
          "0 "},
-        {"resource removed", on("REP_REMOVE_ITEMRESOURCE", {{"itemName", "a.zlw"}, {"resourceName", "r"}}), ok("true"),
-         [&] { return outcome(repository.removeItemResource(S("a.zlw"), S("r"), fresh()), flag); }, 0, "1 "},
         {"add item", on("REP_ADD_ITEM", {{"itemName", "roads.zlw"}, crcOff[0]}), readyAck(),
          [&] { return outcome(repository.addItem(S("roads.zlw"), S(item))); }, 0, "",
          uploadOf("workspace bytes\n", ok("true"))},
@@ -109,9 +107,6 @@ TEST_F(RepositoryWire, ItemsResourcesAndTheirTransfers)
              });
          },
          0, "total 10,start,at 0,finish, ", uploadOf("0123456789", ok("true"))},
-        {"update resource", on("REP_UPDATE_ITEMRESOURCE", resourceOf("roads.zlw", "codes.csv")), readyAck(),
-         [&] { return outcome(repository.updateItemResource(S("roads.zlw"), S("codes.csv"), S(resource))); }, 0, "",
-         uploadOf("0123456789", ok("true"))},
         {"a resource named as its item", none, none,
          [&] { return outcome(repository.addItemResource(S("a.zlw"), S("a.zlw"), S(missing))); },
          msg::kResourceNamedAsItem, ""},
@@ -142,12 +137,9 @@ TEST_F(RepositoryWire, ViewsFiltersAndRegistrations)
     ZELServerVector<IZELServerWorkspaceSummary, ZELServerWorkspaceSummary> summaries;
     ZELServerVector<IZELServerWorkspace, ZELServerWorkspace> workspaces;
     ZELServerVector<IZELServerCustomFormat, ZELServerCustomFormat> formats;
-    ZELServerVector<IZELServerCustomTransformer, ZELServerCustomTransformer> transformers;
-    ZELServerVector<IZELServerTemplate, ZELServerTemplate> templates;
     ZELServerVector<IZELServerResource, ZELServerResource> resources;
     ZELServerVector<IZELServerWorkspaceService, ZELServerWorkspaceService> registrations;
     ZELServerWorkspace workspace(nullptr);
-    ZELServerCustomFormat format;
     ZELServerCustomTransformer transformer;
     ZELServerTemplate templ;
     ZELServerResource resource;
@@ -156,10 +148,8 @@ TEST_F(RepositoryWire, ViewsFiltersAndRegistrations)
         return [&, filter] { return outcome(repository.getWorkspaceSummariesView(filter, summaries), summaries); };
     };
     const Bytes twoSummaries = ok(R"(<R><WORKSPACE_SUMMARY name="s1"/><WORKSPACE_SUMMARY name="s2"/></R>)");
-    const ZELServerStringDict all = dict({{"ENABLE_FILTER", "ALL"}});
     const ZELServerStringDict enabled = dict({{"ENABLE_FILTER", "ENABLED"}});
     const ZELServerStringDict onlyWorkspace = dict({{"WORKSPACE_NAME", "roads.zlw"}});
-    const ZELServerStringDict disabledOf = dict({{"ENABLE_FILTER", "DISABLED"}, {"WORKSPACE_NAME", "w"}});
     const auto registrationText = [&] {
         ZELServerString name;
         registrations.element(0)->getService().getName(name);
@@ -168,8 +158,6 @@ TEST_F(RepositoryWire, ViewsFiltersAndRegistrations)
     run({
         {"no filter asks for all", on("REP_GET_WORKSPACESUMMARIESVIEW", {{"enableFilter", "All"}}), twoSummaries,
          summariesWith(nullptr), 0, "s1,s2, "},
-        {"ALL", on("REP_GET_WORKSPACESUMMARIESVIEW", {{"enableFilter", "All"}}), twoSummaries, summariesWith(&all), 0,
-         "s1,s2, "},
         {"ENABLED", on("REP_GET_WORKSPACESUMMARIESVIEW", {{"enableFilter", "Enabled"}}), twoSummaries,
          summariesWith(&enabled), 0, "s1,s2, "},
         {"DISABLED", on("REP_GET_WORKSPACESVIEW", {{"enableFilter", "Disabled"}}),
@@ -178,12 +166,6 @@ TEST_F(RepositoryWire, ViewsFiltersAndRegistrations)
         {"list views ignore their directives", on("REP_GET_CUSTOMFORMATSVIEW", {{"enableFilter", "All"}}),
          ok(R"(<R><CUSTOMFORMAT name="f.zds"/></R>)"),
          [&] { return outcome(repository.getCustomFormatsView(&disabled, formats), formats); }, 0, "f.zds, "},
-        {"custom transformers", on("REP_GET_CUSTOMTRANSFORMERSVIEW", {{"enableFilter", "All"}}),
-         ok(R"(<R><CUSTOMTRANSFORMER name="t1.zlx"/><CUSTOMTRANSFORMER name="t2.zlx"/></R>)"),
-         [&] { return outcome(repository.getCustomTransformersView(&disabled, transformers), transformers); }, 0,
-         "t1.zlx,t2.zlx, "},
-        {"templates", on("REP_GET_TEMPLATESVIEW", {{"enableFilter", "All"}}), ok(R"(<R><TEMPLATE name="p"/></R>)"),
-         [&] { return outcome(repository.getTemplatesView(&disabled, templates), templates); }, 0, "p, "},
         {"item resources, even of no item",
          on("REP_GET_ITEMRESOURCESVIEW", {{"itemName", ""}, {"enableFilter", "All"}}),
          ok(R"(<R><RESOURCE name="r1"/><RESOURCE name="r2"/></R>)"),
@@ -196,23 +178,9 @@ TEST_F(RepositoryWire, ViewsFiltersAndRegistrations)
                             workspace.getSourceDatasets());
          },
          0, "1 A, "},
-        {"custom format view", on("REP_GET_CUSTOMFORMATVIEW", {{"customFormatName", "f.zds"}}),
-         ok(R"(<R><CUSTOMFORMAT name="f.zds" filesize="12"/></R>)"),
-         [&] {
-             return outcome(repository.getCustomFormatView(S("f.zds"), format, fresh()), flag,
-                            [&] { return std::to_string(format.getFileSize()); });
-         },
-         0, "1 12 "},
         {"custom transformer view", on("REP_GET_CUSTOMTRANSFORMERVIEW", {{"customTransformerName", "t.zlx"}}),
          ok(R"(<R><CUSTOMTRANSFORMER name="t.zlx"/></R>)"),
          [&] { return outcome(repository.getCustomTransformerView(S("t.zlx"), transformer, fresh()), flag); }, 0, "1 "},
-        {"resource view", on("REP_GET_ITEMRESOURCEVIEW", {{"itemName", "a.zlw"}, {"resourceName", "r.csv"}}),
-         ok(R"(<R><RESOURCE name="r.csv" filesize="5"/></R>)"),
-         [&] {
-             return outcome(repository.getItemResourceView(S("a.zlw"), S("r.csv"), resource, fresh()), flag,
-                            [&] { return std::to_string(resource.getFileSize()); });
-         },
-         0, "1 5 "},
         {"resource view of no resource", on("REP_GET_ITEMRESOURCEVIEW", {{"itemName", "a.zlw"}, {"resourceName", ""}}),
          ok("<R/>"),
          [&] { return outcome(repository.getItemResourceView(S("a.zlw"), S(""), resource, fresh()), flag); }, 0, "0 "},
@@ -224,15 +192,6 @@ TEST_F(RepositoryWire, ViewsFiltersAndRegistrations)
             R"(<SERVICE name="download"/></WORKSPACE_SERVICE></R>)"),
          [&] { return outcome(repository.getWorkspaceServices(&onlyWorkspace, registrations), registrationText); }, 0,
          "download 1 "},
-        {"registrations filtered",
-         on("REP_GET_WORKSPACESERVICES", {{"enableFilter", "Disabled"}, {"workspaceName", "w"}}), ok("<R/>"),
-         [&] {
-             return outcome(repository.getWorkspaceServices(&disabledOf, registrations),
-                            [&] { return std::to_string(registrations.entries()); });
-         },
-         0, "0 "},
-        {"all registrations", on("REP_GET_WORKSPACESERVICES", {{"enableFilter", "All"}}), ok("<R/>"),
-         [&] { return outcome(repository.getWorkspaceServices(nullptr, registrations)); }, 0, ""},
         {"registration exists checks no characters",
          on("REP_WORKSPACESERVICEEXISTS", {{"workspaceName", "a/b"}, {"serviceName", "c:d"}}), ok("false"),
          [&] { return outcome(repository.workspaceServiceExists(S("a/b"), S("c:d"), fresh()), flag); }, 0, "0 "},
@@ -297,8 +256,6 @@ TEST_F(RepositoryWire, ManagerAndServiceCommands)
     run({
         {"service exists checks no characters", command("REP_SERVICEEXISTS", {{"serviceName", "a/b"}}), ok("true"),
          [&] { return outcome(manager.serviceExists(S("a/b"), fresh()), flag); }, 0, "1 "},
-        {"remove service", command("REP_REMOVE_SERVICE", {{"serviceName", "download"}}), ok("true"),
-         [&] { return outcome(manager.removeService(S("download"), fresh()), flag); }, 0, "1 "},
         {"get service", command("REP_GET_SERVICE", {{"serviceName", "download"}}),
          ok(R"(<R><SERVICE service_id="7" name="download"/></R>)"),
          [&] {
@@ -379,8 +336,6 @@ TEST_F(RepositoryWire, ManagerAndServiceCommands)
         // The property-accessor updates of the four kinds of owner, each document named after its command.
         {"service not saved yet", accessorUpdate("REP_UPDATE_SERVICEPROPERTYACCESSOR", "serviceID", "-1"), ok("true"),
          [&] { return outcome(service.updatePropertyAccessor(accessor)); }, 0, ""},
-        {"service", accessorUpdate("REP_UPDATE_SERVICEPROPERTYACCESSOR", "serviceID", "7"), ok("true"),
-         [&] { return outcome(stored.updatePropertyAccessor(accessor)); }, 0, ""},
         {"workspace", accessorUpdate("REP_UPDATE_WORKSPACEPROPERTYACCESSOR", "workspaceID", "ws-17"), ok("true"),
          [&] { return outcome(workspace.updatePropertyAccessor(accessor)); }, 0, ""},
         {"dataset", accessorUpdate("REP_UPDATE_DATASETPROPERTYACCESSOR", "datasetID", "d-a"), ok("true"),
@@ -454,12 +409,6 @@ TEST(RepositoryChecks, EmptyOrForbiddenNamesAreRefusedBeforeAnythingIsSent)
     }
     ZELServerRepositoryManager manager(&channel);
     unsigned flag = 7;
-    for (const char forbidden : kForbidden) {
-        const std::string name = "a"s + forbidden;
-        EXPECT_EQ(numberOf(manager.getRepository(S(name), repository, flag)), msg::kForbiddenCharacter) << name;
-        EXPECT_EQ(numberOf(manager.addRepository(S(name), S("d"))), msg::kForbiddenCharacter) << name;
-        EXPECT_EQ(numberOf(manager.removeRepository(S(name), flag)), msg::kForbiddenCharacter) << name;
-    }
     ZELServerWorkspace workspace(nullptr);
     ZELServerResource resource;
     ZELServerVector<IZELServerWorkspace, ZELServerWorkspace> workspaces;
@@ -470,13 +419,9 @@ TEST(RepositoryChecks, EmptyOrForbiddenNamesAreRefusedBeforeAnythingIsSent)
     const ZELServerStringDict none = dict({{"OTHER", "x"}});
     for (IZELServerStatus* status : {
              manager.repositoryExists(S(""), flag),
-             manager.getRepository(S(""), repository, flag),
-             manager.addRepository(S(""), S("d")),
-             manager.removeRepository(S(""), flag),
              manager.serviceExists(S(""), flag),
              manager.getServices(&none, services),
              repository.registerWorkspaceService(S(""), S("svc")),
-             repository.deregisterWorkspaceService(S("w"), S(""), flag),
              repository.getWorkspaceView(S(""), workspace, flag),
              repository.getItemResourceView(S(""), S("r.csv"), resource, flag),
              repository.getWorkspacesView(&unknown, workspaces),
@@ -485,6 +430,11 @@ TEST(RepositoryChecks, EmptyOrForbiddenNamesAreRefusedBeforeAnythingIsSent)
              repository.getWorkspaceServices(&unknown, registrations),
          }) {
         EXPECT_EQ(numberOf(status), msg::kRequiredValueMissing);
+    }
+    for (IZELServerStatus* status :
+         {manager.getRepository(S("a/b"), repository, flag), manager.addRepository(S("a:b"), S("d")),
+          manager.removeRepository(S("a%"), flag)}) {
+        EXPECT_EQ(numberOf(status), msg::kForbiddenCharacter);
     }
     // Past the checks, the unopened channel answers; the flag is cleared.
     EXPECT_EQ(numberOf(repository.itemExists(S("a.zlw"), flag)), msg::kNotConnected);
