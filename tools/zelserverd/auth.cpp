@@ -180,11 +180,24 @@ Principal Authenticator::principalFor(const UserConfig& user) const
     return Principal{user.name, user.roles, rightsOfRoles(config_, user.roles), false, {}};
 }
 
+namespace {
+
+// A stored hash of no one's password: an unknown account costs the same slow hash as a known one.
+const std::string& decoyHash()
+{
+    static const std::string hash = hashPassword(randomHex(16));
+    return hash;
+}
+
+}  // namespace
+
 SignInOutcome Authenticator::withPassword(const std::string& name, const std::string& password) const
 {
     const UserConfig* user = config_.findUser(name);
-    // Unknown user and wrong password read the same, so the reply does not confirm account names.
-    if (!user || !passwordMatches(user->password, password))
+    // Unknown user and wrong password read the same, and take as long, so neither the reply nor its
+    // timing confirms account names.
+    const std::string& stored = user ? user->password : decoyHash();
+    if (!passwordMatches(stored, password) || !user)
         return {std::nullopt, "invalid user name or password"};
     return {principalFor(*user), {}};
 }
