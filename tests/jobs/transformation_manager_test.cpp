@@ -119,12 +119,6 @@ TEST_F(TransformationManagerWire, EveryCommandOnTheWire)
                             flag);
          },
          0, "8 "},
-        {"schedule of a request sends no notifications",
-         command("JOB_REQUEST", {{"keyword", "svc"},
-                                 {"request", emptyRequestText("R/w/w.zlw")},
-                                 {"priority", "5"},
-                                 {"secondsFromNow", "4294967295"}}),
-         reply("SUCCESS", "9"), [&] { return outcome(manager.scheduleJob(job, 4294967295u, fresh()), flag); }, 0, "9 "},
         {"transact trims the keyword and takes the result from the result port", none, none,
          [&] {
              return outcome(manager.transactJobString(str(" svc "), str("  a b  "), list({"d", "1"}), text), text);
@@ -161,18 +155,6 @@ TEST_F(TransformationManagerWire, EveryCommandOnTheWire)
          reply("SUCCESS", "id=12\0result=3:Waiting"s),
          [&] { return outcome(manager.getJobResult(12, fresh(), result), flag, [&] { return resultText(); }); }, 0,
          "1 id=12\0result=3:Waiting "s},
-        {"no result parses an empty text that keeps the properties",
-         command("GET_JOB_RESULT_STRING", {{"jobID", "13"}}), reply("SUCCESS", "null"),
-         [&] {
-             unsigned id = 0;
-             return outcome(
-                 manager.getJobResult(13, fresh(), result), flag, [&] { return resultText(); },
-                 [&] {
-                     const unsigned has = result.getID(id);
-                     return std::to_string(has) + "=" + std::to_string(id);
-                 });
-         },
-         0, "0  1=12 "},
         {"log exists", command("LOG_FILEEXISTS", {{"jobID", "-2"}}), reply("SUCCESS", "true"),
          [&] { return outcome(manager.logFileExists(4294967294u, fresh()), flag); }, 0, "1 "},
         {"log exists refused", command("LOG_FILEEXISTS", {{"jobID", "2"}}), reply("ERROR", "down"),
