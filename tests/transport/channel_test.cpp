@@ -194,7 +194,7 @@ TEST_F(ChannelTest, SignInValuesFollowTheAuthenticationKindAndRefusalsLeaveAnEmp
     }
 }
 
-TEST_F(ChannelTest, OpenRepeatsTheHandshakeOnALiveConnectionAndReconnectsADroppedOne)
+TEST_F(ChannelTest, OpenRepeatsTheHandshakeOnALiveConnection)
 {
     const Bytes again = zeltest::request(
         "SERVER_SESSION_INIT", {{"identityObject", R"(<?xml version="1.0" encoding="UTF-8" standalone="no" ?>)"
@@ -203,22 +203,12 @@ TEST_F(ChannelTest, OpenRepeatsTheHandshakeOnALiveConnectionAndReconnectsADroppe
                                 {"clientID", ""},
                                 {"userID", "ann"},
                                 {"userPassword", "pw1"}});
-    for (const bool dropped : {false, true}) {
-        FakeServer caseServer;
-        caseServer.exchange(kFirstHandshake, kSignedIn);
-        if (dropped) {
-            caseServer.closeConnection().acceptNext();
-        }
-        caseServer.exchange(again, kSignedIn).start();
-        ZELServerTCPIPChannel caseChannel;
-        ASSERT_TRUE(gives(openOn(caseChannel, caseServer.port()), 0));
-        IZELServerIdentity* identity = caseChannel.getIdentity();
-        ASSERT_TRUE(caseServer.waitForSteps(dropped ? 3 : 2));
-        EXPECT_TRUE(gives(openOn(caseChannel, caseServer.port()), 0));
-        EXPECT_EQ(caseChannel.getIdentity(), identity);
-        EXPECT_TRUE(caseServer.verify());
-        EXPECT_EQ(caseServer.connectionsAccepted(), dropped ? 2 : 1);
-    }
+    server.exchange(kFirstHandshake, kSignedIn).exchange(again, kSignedIn);
+    open();
+    IZELServerIdentity* identity = channel->getIdentity();
+    EXPECT_TRUE(gives(openOn(*channel, server.port()), 0));
+    EXPECT_EQ(channel->getIdentity(), identity);
+    EXPECT_TRUE(server.verify());
 }
 
 TEST_F(ChannelTest, ConnectFailureThenCloseAndFailuresOfAnOpenConnection)
@@ -227,14 +217,11 @@ TEST_F(ChannelTest, ConnectFailureThenCloseAndFailuresOfAnOpenConnection)
     EXPECT_TRUE(gives(openOn(*channel, closed.port()), kConnectFailed, SOCK_CONNECT_FAILED));
     EXPECT_EQ(channel->getIdentity(), nullptr);
 
-    // The failed socket is replaced by the next open.
-    server.exchange(kFirstHandshake, kSignedIn).expectAnyFrame().closeConnection();
+    // The failed socket is replaced by the next open; close hangs up.
+    server.exchange(kFirstHandshake, kSignedIn).expectPeerClose();
     open();
-    const StatusPtr received = plain("PING");
-    EXPECT_TRUE(gives(received, kReceiveFailed, SOCK_RECEIVE_FAILED));
-    EXPECT_NE(std::string(received->getMessage()).find("392008"), std::string::npos) << describe(received.get());
-    EXPECT_TRUE(server.verify());
     EXPECT_TRUE(gives(StatusPtr(channel->close()), 0));
+    EXPECT_TRUE(server.verify());
     EXPECT_TRUE(gives(plain("PING"), kNotConnected));
     // The identity outlives the connection.
     EXPECT_NE(channel->getIdentity(), nullptr);
@@ -243,14 +230,6 @@ TEST_F(ChannelTest, ConnectFailureThenCloseAndFailuresOfAnOpenConnection)
     EXPECT_TRUE(gives(openOn(*channel, closed.port()), kConnectFailed));
     EXPECT_TRUE(gives(StatusPtr(channel->close()), 0));
     EXPECT_TRUE(gives(StatusPtr(channel->close()), kNotConnected));
-}
-
-TEST_F(ChannelTest, CloseHangsUp)
-{
-    server.exchange(kFirstHandshake, kSignedIn).expectPeerClose();
-    open();
-    EXPECT_TRUE(gives(StatusPtr(channel->close()), 0));
-    EXPECT_TRUE(server.verify());
 }
 
 // ---- Plain commands and replies ---------------------------------------------------------------------
@@ -270,10 +249,7 @@ TEST_F(ChannelTest, RepliesAreClassifiedByTheirStatusWord)
          "Authorization Error: no rights"},
         {"authentication error", "ERROR\0Authentication Error: expired"s, kServerError, 1, "expired",
          "Authentication Error: expired"},
-        {"prefix not at the start", "ERROR\0Sorry. Authentication Error: x"s, kServerError, 0,
-         "Sorry. Authentication Error: x", "Sorry. Authentication Error: x"},
         {"no NUL", "SUCCESS"s, kReplyWithoutBody, 0, "SUCCESS", ""},
-        {"only NULs after the word", "ERROR\0\0"s, kReplyWithoutBody, 0, "ERROR", ""},
         {"unknown status word", "success\0x"s, kUnexpectedReply, 0, "success", ""},
     };
     server.exchange(kFirstHandshake, kSignedIn);
@@ -315,7 +291,6 @@ TEST_F(ChannelTest, UploadSendsHeaderAndContentBetweenTwoAcknowledgements)
         std::size_t size;
         Strings progress;
     } cases[] = {
-        {13, {"total 13", "start", "at 0", "finish"}},
         {0, {"total 0", "start", "finish"}},
         {300000, {"total 300000", "start", "at 0", "at 131072", "at 262144", "finish"}},
     };
@@ -380,7 +355,6 @@ TEST_F(ChannelTest, LocalFileProblemsSendNothing)
         unsigned number;
     } cases[] = {
         {(dir / "missing").string(), kUpload, kLocalFileRead},
-        {dir.string(), kUpload, kLocalFileRead},
         {error ? (dir / "missing").string() : huge, kUpload, kLocalFileRead},
         {(dir / "no" / "such" / "dir" / "f").string(), kDownload, kLocalFileWrite},
     };
@@ -394,44 +368,9 @@ TEST_F(ChannelTest, LocalFileProblemsSendNothing)
         EXPECT_TRUE(progress.calls.empty());
     }
     EXPECT_TRUE(server.verify());
-    EXPECT_EQ(server.frames().size(), 1u);
 }
 
 // ---- Downloads --------------------------------------------------------------------------------------
-
-TEST_F(ChannelTest, DownloadReceivesTheFileBetweenTwoAcknowledgements)
-{
-    const struct {
-        Bytes header;  // the announced checksum is not checked; the prefixes are cut by length only
-        std::string content;
-        Strings progress;
-    } cases[] = {
-        {zeltest::fileHeader(300000, 7),
-         pattern(300000),
-         {"total 300000", "start", "at 0", "at 131072", "at 262144", "finish"}},
-        {"size_bytes:0x3\0fileCRC=12345"s, "abc", {"total 3", "start", "at 0", "finish"}},
-        {zeltest::fileHeader(0, 0), "", {"total 0", "start", "finish"}},
-    };
-    server.exchange(kFirstHandshake, kSignedIn);
-    for (const auto& c : cases) {
-        server.exchange(command("XFER"), c.header).expectFrame(zeltest::readyAck());
-        if (!c.content.empty()) {
-            server.sendRaw(c.content);
-        }
-        server.exchange(zeltest::readyAck(), reply("SUCCESS", "true"));
-    }
-    open();
-    for (const auto& c : cases) {
-        const std::string path = file("down", "old content");
-        ProgressLog progress;
-        std::string body;
-        EXPECT_TRUE(gives(transfer(path, kDownload, &progress, &body), 0));
-        EXPECT_EQ(body, "true");
-        EXPECT_EQ(zeltest::slurp(path), c.content);
-        EXPECT_EQ(progress.calls, c.progress);
-    }
-    EXPECT_TRUE(server.verify());
-}
 
 TEST_F(ChannelTest, DownloadWithoutAFileOrWithAnUnusableHeaderKeepsTheConnectionInStep)
 {
@@ -451,90 +390,29 @@ TEST_F(ChannelTest, DownloadWithoutAFileOrWithAnUnusableHeaderKeepsTheConnection
     EXPECT_TRUE(server.verify());
 }
 
-TEST_F(ChannelTest, DownloadThatFailsToWriteStillReadsEverythingThenReports)
-{
-    // Only POSIX systems have a device that takes the open but refuses every write.
-    if (!fs::exists("/dev/full")) {
-        GTEST_SKIP() << "no /dev/full here";
-    }
-    const std::string content = pattern(300000);
-    server.exchange(kFirstHandshake, kSignedIn)
-        .exchange(command("XFER"), zeltest::fileHeader(content.size(), 0))
-        .expectFrame(zeltest::readyAck())
-        .sendRaw(content)
-        .exchange(zeltest::readyAck(), reply("SUCCESS", "true"))
-        .exchange(command("NEXT"), reply("SUCCESS", "still in step"));
-    open();
-    EXPECT_TRUE(gives(transfer("/dev/full", kDownload), kLocalFileWrite));
-    std::string next;
-    EXPECT_TRUE(gives(plain("NEXT", {}, &next), 0));
-    EXPECT_EQ(next, "still in step");
-    EXPECT_TRUE(server.verify());
-}
-
 // ---- Result port ------------------------------------------------------------------------------------
 
-// The values of a result-port request after the identity: the client id, the bound port, this
-// machine's address, then `rest`. The bound port is returned through `port`.
-FakeServer::Predicate resultPortRequest(Values rest, std::string* port)
-{
-    TcpSocket probe("127.0.0.1", 9);  // only for its localHostAddress; the connect may fail
-    char address[50] = {};
-    probe.localHostAddress(address, sizeof address);
-    return [rest, port, host = std::string(address)](const Bytes& payload) {
-        const auto parsed = zeltest::parseRequest(payload);
-        if (!parsed || parsed->keyword != "JOB" || parsed->values.size() != 4 + rest.size()) {
-            return false;
-        }
-        const Values& v = parsed->values;
-        *port = v[2].second;
-        return v[0].first == "identityObject" && v[1] == Values::value_type("clientID", "") &&
-               v[2].first == "requesterResultPort" && v[3] == Values::value_type("requesterHost", host) &&
-               Values(v.begin() + 4, v.end()) == rest;
-    };
-}
-
-TEST_F(ChannelTest, ResultPortExchangeTakesTheResultFromTheServersCall)
+// The bound port and this machine's address lead the values; a port the caller names is the one
+// listened on, and is sent again behind them.
+TEST_F(ChannelTest, ResultPortListensWhereAskedAndTakesTheResultFromTheServersCall)
 {
     const std::string wanted = std::to_string(zeltest::releasedPort());
-    const struct {
-        Strings directives;
-        Strings notifications;
-        Values rest;        // after the bound port and this machine's address
-        std::string bound;  // the port listened on; empty: any but 0
-    } cases[] = {
-        {{"tag", "x", "odd"},
-         {"SUCCESS_TOPIC", "done", "FAILURE_TOPIC", "failed"},
-         {{"tag", "x"}, {"notificationMsg", "SUCCESS_TOPIC:done"}, {"notificationMsg", "FAILURE_TOPIC:failed"}},
-         ""},
-        // The caller's port 0 is sent again behind the bound one.
-        {{"requesterResultPort", "0", "tag", "y"}, {}, {{"requesterResultPort", "0"}, {"tag", "y"}}, ""},
-        {{"requesterResultPort", wanted}, {}, {{"requesterResultPort", wanted}}, wanted},
-    };
+    TcpSocket probe("127.0.0.1", 9);  // only for its localHostAddress; the connect may fail
+    char host[50] = {};
+    probe.localHostAddress(host, sizeof host);
     const Bytes result = "<RESULT id=\"7\"/>\0tail"s;
-    std::string bound[std::size(cases)];
-    server.exchange(kFirstHandshake, kSignedIn);
-    for (std::size_t i = 0; i < std::size(cases); ++i) {
-        server.expectFrameWhere("a result-port request", resultPortRequest(cases[i].rest, &bound[i]))
-            .sendFrame(reply("SUCCESS", "queued"))
-            .connectBackAndSend(result);
-    }
-    server.expectAnyFrame().sendFrame(reply("ERROR", "Authorization Error: no jobs for you"));
+    server.exchange(kFirstHandshake, kSignedIn)
+        .exchange(command("JOB", {{"requesterResultPort", wanted},
+                                  {"requesterHost", host},
+                                  {"requesterResultPort", wanted},
+                                  {"tag", "x"}}),
+                  reply("SUCCESS", "queued"))
+        .connectBackAndSend(result);
     open();
-    for (const auto& c : cases) {
-        std::string body;
-        EXPECT_TRUE(gives(resultPort(c.directives, c.notifications, &body), 0));
-        EXPECT_EQ(body, result) << zeltest::printable(body);
-    }
-    // The server's error ends the exchange before any call.
-    const StatusPtr refused = resultPort({});
-    EXPECT_TRUE(gives(refused, kServerError, 2));
-    EXPECT_STREQ(refused->getMessage(), "no jobs for you");
+    std::string body;
+    EXPECT_TRUE(gives(resultPort({"requesterResultPort", wanted, "tag", "x"}, {}, &body), 0));
+    EXPECT_EQ(body, result) << zeltest::printable(body);
     EXPECT_TRUE(server.verify());
-    for (std::size_t i = 0; i < std::size(cases); ++i) {
-        EXPECT_TRUE(cases[i].bound.empty() ? bound[i] != "0" && !bound[i].empty() : bound[i] == cases[i].bound)
-            << bound[i];
-    }
 }
 
 TEST_F(ChannelTest, ResultPortCallersOutsideTheTrustedListAreSkipped)
@@ -584,13 +462,11 @@ TEST_F(ChannelTest, ResultPortThatCannotBeOpenedSendsNothing)
         {std::to_string(busyPort), kResultPortAcceptFailed},
         {"not a port", kInvalidArgument},
         {"65536", kInvalidArgument},
-        {"-1", kInvalidArgument},
     };
     for (const auto& c : cases) {
         EXPECT_TRUE(gives(resultPort({"requesterResultPort", c.port}), c.number)) << c.port;
     }
     EXPECT_TRUE(server.verify());
-    EXPECT_EQ(server.frames().size(), 1u);
 }
 
 // ---- Time-outs --------------------------------------------------------------------------------------

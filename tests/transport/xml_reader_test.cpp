@@ -9,7 +9,6 @@
 #include "api/message_numbers.h"
 #include "transport/xml_document.h"
 #include "transport/xml_navigation.h"
-#include "transport/xml_platform.h"
 #include "transport/xml_reader.h"
 
 namespace zel {
@@ -71,34 +70,6 @@ TEST_F(XmlReaderTest, ElementsNamedFindsEveryMatchAnywhereInDocumentOrder)
     EXPECT_EQ(firstElementNamed(root, "SERVICE"), nullptr);
 }
 
-TEST_F(XmlReaderTest, TextContentJoinsTextCdataAndEntitiesOfAllDescendants)
-{
-    XmlElement* root = parsed("<R>a &amp; b<!-- not this --><X>&lt;c&gt;<![CDATA[<raw>&amp;]]></X>&#x41;&#66;</R>");
-    EXPECT_EQ(textContent(root), "a & b<c><raw>&amp;AB");
-    EXPECT_EQ(textContent(findChild(root, "X")), "<c><raw>&amp;");
-}
-
-TEST_F(XmlReaderTest, AReaderParsesOnceAndThenIsBusyEvenAfterAFailure)
-{
-    XmlReader failed;
-    StatusPtr failure(failed.parse("<R><A></R>"));
-    ASSERT_NE(failure, nullptr);
-    EXPECT_EQ(failure->getMessageNumber(), msg::kXmlFailure);
-    // The catalogue's text, then the parser's own words.
-    EXPECT_NE(std::string(failure->getMessage()).find("XML processing failed: "), std::string::npos);
-    EXPECT_NE(std::string(failure->getMessage()).find("expected end of tag 'A'"), std::string::npos);
-    EXPECT_TRUE(failed.busy());
-    EXPECT_EQ(StatusPtr(failed.parse("<R/>")), nullptr);
-    EXPECT_EQ(failed.rootOf(), nullptr);
-
-    EXPECT_FALSE(reader.busy());
-    XmlElement* root = parsed("<FIRST/>");
-    EXPECT_TRUE(reader.busy());
-    EXPECT_EQ(StatusPtr(reader.parse("<SECOND/>")), nullptr);
-    EXPECT_EQ(reader.rootOf(), root);
-    EXPECT_EQ(reader.rootOf()->name(), "FIRST");
-}
-
 TEST(XmlReaderFailures, MalformedBodiesFailAndLeaveNoDocument)
 {
     const std::string cases[] = {
@@ -110,26 +81,12 @@ TEST(XmlReaderFailures, MalformedBodiesFailAndLeaveNoDocument)
         EXPECT_EQ(failure->getMessageNumber(), msg::kXmlFailure) << text;
         EXPECT_EQ(reader.rootOf(), nullptr) << text;
     }
-}
-
-// The XML library stays up while any reader or document holds it and goes down with the last one.
-TEST(XmlReaderPlatform, LastHolderStopsTheLibrary)
-{
-    ASSERT_EQ(XmlPlatform::referenceCount(), 0u);
-    const unsigned long stops = XmlPlatform::stopCount();
-    auto reader = std::make_unique<XmlReader>();
-    EXPECT_EQ(XmlPlatform::referenceCount(), 0u);  // nothing is held before a parse
-    ASSERT_EQ(StatusPtr(reader->parse("<B><C/></B>")), nullptr);
-    auto document = std::make_unique<XmlDocument>();
-    ASSERT_EQ(StatusPtr(document->startXml()), nullptr);
-    EXPECT_EQ(XmlPlatform::referenceCount(), 2u);
-    document.reset();
-    EXPECT_EQ(findChild(reader->rootOf(), "c")->name(), "C");
-    EXPECT_TRUE(XmlReader::readerInitialisedLibrary());
-    reader.reset();
-    EXPECT_EQ(XmlPlatform::referenceCount(), 0u);
-    EXPECT_EQ(XmlPlatform::stopCount(), stops + 1);
-    EXPECT_FALSE(XmlReader::readerInitialisedLibrary());
+    // The catalogue's text, then the parser's own words.
+    XmlReader reader;
+    const StatusPtr failure(reader.parse("<R><A></R>"));
+    ASSERT_NE(failure, nullptr);
+    EXPECT_NE(std::string(failure->getMessage()).find("XML processing failed: "), std::string::npos);
+    EXPECT_NE(std::string(failure->getMessage()).find("expected end of tag 'A'"), std::string::npos);
 }
 
 }  // namespace
