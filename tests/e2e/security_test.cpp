@@ -90,18 +90,12 @@ TEST_F(EndToEnd, RefusalsForWantOfARight)
     auto area = vic.area("DATA");
     ASSERT_NE(area, nullptr);
     IZELServerPath* folder = area->createPath(vic.text("/made"));
-    auto request = vic.own(session.createTransformationRequest(vic.text("zeljob"), vic.text("shelf"), vic.text("x")));
     auto token = vic.own(session.getSecurityManager()->createUserToken());
     EXPECT_EQ(vic.outcome([&](unsigned& f) { return shelf->itemExists(vic.text("item.txt"), f); }), 1);
     const std::vector<Step> viewer = {
         {"addItem", [&](unsigned&) { return shelf->addItem(vic.text("new.txt"), vic.text(local("item.txt"))); },
          kDenied},
-        {"removeItem", [&](unsigned& f) { return shelf->removeItem(vic.text("item.txt"), f); }, kDenied},
-        {"addRepository",
-         [&](unsigned&) { return session.getRepositoryManager()->addRepository(vic.text("mine"), vic.text("")); },
-         kDenied},
         {"makeDirectory", [&](unsigned&) { return area->makeDirectory(*folder); }, kDenied},
-        {"submitJob", [&](unsigned& f) { return session.getTransformationManager()->submitJob(*request, f); }, kDenied},
         {"another account's token",
          boolean([&](bool& f) { return session.getSecurityManager()->getUserToken(vic.text("ann"), *token, f); }),
          kDenied},

@@ -134,21 +134,11 @@ TEST_F(Commands, RepositoriesItemsAndResources)
     EXPECT_EQ(storedFiles(), 0u) << "a repository takes its items along";
 }
 
-TEST_F(Commands, ViewsByKindServicesRegistrationsAndProperties)
+TEST_F(Commands, ServicesRegistrationsAndPropertiesSurviveARestart)
 {
     ASSERT_TRUE(addItem("roads.zlw", kRoads).ok());
     ASSERT_TRUE(addResource("roads.zlw", "lookup.csv", "x").ok());
-    ASSERT_TRUE(addItem("off.zlw", "# @title Off\n# @enabled false\n").ok());
-    ASSERT_TRUE(addItem("fmt.zds", "# @title Format\n# @description A format\n").ok());
-    ASSERT_TRUE(addItem("tr.zlx", "binary\x01stuff").ok());
-    ASSERT_TRUE(addItem("t.zlwt", "# @title T\n").ok());
-    ASSERT_TRUE(addItem("notes.txt", "plain").ok());
-    const std::string off = R"(<WORKSPACE_SUMMARY name="off.zlw" title="Off" description="" is_enabled="false"/>)";
-    const std::string on = R"(<WORKSPACE_SUMMARY name="roads.zlw" title="Roads" )"
-                           R"(description="Copies roads&#10;and checks them" is_enabled="true"/>)";
-    const std::string format = R"(<CUSTOMFORMAT name="fmt.zds" title="Format" description="A format" filesize="40"/>)";
-    const std::string transformer = R"(<CUSTOMTRANSFORMER name="tr.zlx" title="" description="" filesize="12"/>)";
-    const std::string page = R"(<TEMPLATE name="t.zlwt" title="T" description="" filesize="11"/>)";
+    ASSERT_TRUE(addItem("fmt.zds", "# @title Format\n").ok());
     // The id is the server's: the client's "-1" only marks a new object.
     const std::string run = R"(<SERVICE service_id="1" name="run" display_name="run service" description="d" )"
                             R"(url_pattern="/run" is_enabled="true" is_workspace_reg_allowed="true" )"
@@ -161,48 +151,18 @@ TEST_F(Commands, ViewsByKindServicesRegistrationsAndProperties)
         return Values{{idName, id}, {"propertyAccessorObject", "<A>" + property(idName, id) + "</A>"}};
     };
     converse({
-        {"REP_GET_WORKSPACESUMMARIESVIEW", repo({{"enableFilter", "All"}}),
-         reply("REP_GET_WORKSPACESUMMARIESVIEW", off + on)},
-        {"REP_GET_WORKSPACESUMMARIESVIEW", repo({{"enableFilter", "Disabled"}}),
-         reply("REP_GET_WORKSPACESUMMARIESVIEW", off)},
-        {"REP_GET_CUSTOMFORMATSVIEW", repo({}), reply("REP_GET_CUSTOMFORMATSVIEW", format)},
-        {"REP_GET_CUSTOMTRANSFORMERSVIEW", repo({}), reply("REP_GET_CUSTOMTRANSFORMERSVIEW", transformer)},
-        {"REP_GET_TEMPLATEVIEW", repo({{"templateName", "t.zlwt"}}), reply("REP_GET_TEMPLATEVIEW", page)},
         {"REP_ADD_SERVICE", {{"serviceObject", service("run", true, false)}}, "true"},
-        {"REP_ADD_SERVICE", {{"serviceObject", service("off", false, true)}}, "true"},
         {"REP_UPDATE_SERVICE", {{"serviceObject", service("run", true, true)}}, "true"},
         {"REP_GET_SERVICES", {{"enableFilter", "Enabled"}}, reply("REP_GET_SERVICES", run)},
         {"REP_REGISTER_WORKSPACESERVICE", reg("run", "workspaceName", "roads.zlw"), "true"},
         {"REP_REGISTER_WORKSPACESERVICE", reg("run", "workspaceName", "roads.zlw"),
          "'REPO/roads.zlw' is already registered with 'run'"},
-        {"REP_REGISTERITEM", reg("run", "itemName", "t.zlwt"), "true"},
-        {"REP_REGISTERITEM", reg("off", "itemName", "fmt.zds"),
-         "service 'off' does not accept items of kind CUSTOMFORMAT ('fmt.zds')"},
-        {"REP_REGISTERITEM", reg("nope", "itemName", "t.zlwt"), "unknown service 'nope'"},
-        {"REP_REGISTERITEM", reg("run", "itemName", "none"), "unknown item 'none' in 'REPO'"},
-        {"REP_GET_REGISTEREDITEMS",
-         {{"serviceName", "run"}, {"itemType", "4"}},
-         reply("REP_GET_REGISTEREDITEMS", R"(<ITEM name="t.zlwt" repository_name="REPO" title="T" description="" )"
-                                          R"(filesize="11" category="" requirements="" requirementskeyword="" )"
-                                          R"(usage="" history="" lastsavedate="TIME" lastsavebuild="zelserverd )"
-                                          R"(0.1.0" buildnumber="0" legaltermsconditions=""/>)")},
-        {"REP_GET_WORKSPACESERVICES", repo({{"enableFilter", "Enabled"}, {"workspaceName", "roads.zlw"}}),
-         reply("REP_GET_WORKSPACESERVICES", "<WORKSPACE_SERVICE>" + on + run + "</WORKSPACE_SERVICE>")},
-        {"REP_UPDATE_SERVICEPROPERTYACCESSOR", accessor("serviceID", "1"), "true"},
+        {"REP_REGISTERITEM", reg("run", "itemName", "fmt.zds"),
+         "service 'run' does not accept items of kind CUSTOMFORMAT ('fmt.zds')"},
         {"REP_UPDATE_WORKSPACEPROPERTYACCESSOR", accessor("workspaceID", "1"), "true"},
         {"REP_UPDATE_DATASETPROPERTYACCESSOR", accessor("datasetID", "1.2"), "true"},
         {"REP_UPDATE_FEATURETYPEPROPERTYACCESSOR", accessor("featureTypeID", "1.1.1"), "true"},
         {"REP_UPDATE_FEATURETYPEPROPERTYACCESSOR", accessor("featureTypeID", "1.1.2"), "unknown featuretype '1.1.2'"},
-        {"REP_GET_SERVICE",
-         {{"serviceName", "run"}},
-         reply("REP_GET_SERVICE", run.substr(0, run.size() - 2) + ">" + property("serviceID", "1") + "</SERVICE>")},
-        // An update replaces the whole set of its owner.
-        {"REP_UPDATE_SERVICEPROPERTYACCESSOR", {{"serviceID", "1"}, {"propertyAccessorObject", "<EMPTY/>"}}, "true"},
-        {"REP_GET_SERVICE", {{"serviceName", "run"}}, reply("REP_GET_SERVICE", run)},
-        {"REP_DEREGISTER_WORKSPACESERVICE", reg("run", "workspaceName", "roads.zlw"), "true"},
-        {"REP_REGISTER_WORKSPACESERVICE", reg("off", "workspaceName", "roads.zlw"), "true"},
-        {"REP_REMOVE_SERVICE", {{"serviceName", "run"}}, "true"},
-        {"REP_ITEMREGISTERED", reg("run", "itemName", "t.zlwt"), "unknown service 'run'"},
     });
 
     // The workspace view comes from the header, with the properties of each owner by its id; it and
@@ -210,7 +170,7 @@ TEST_F(Commands, ViewsByKindServicesRegistrationsAndProperties)
     // between rename and commit leaves) goes.
     writeFile(dataDir_ + "/store/orphan", "x");
     startServer();
-    EXPECT_EQ(storedFiles(), 7u);
+    EXPECT_EQ(storedFiles(), 3u);
     converse({{"REP_GET_WORKSPACEVIEW", repo({{"workspaceName", "roads.zlw"}}),
                reply("REP_GET_WORKSPACEVIEW",
                      R"(<WORKSPACE_DEFINITIONS workspace_id="1" name="roads.zlw" title="Roads" )"
@@ -230,7 +190,7 @@ TEST_F(Commands, ViewsByKindServicesRegistrationsAndProperties)
                          property("datasetID", "1.2") +
                          R"(</DATASET><RESOURCE name="lookup.csv" description="" filesize="1"/>)" +
                          property("workspaceID", "1") + "</WORKSPACE_DEFINITIONS>")},
-              {"REP_WORKSPACESERVICEEXISTS", reg("off", "workspaceName", "roads.zlw"), "true"}});
+              {"REP_WORKSPACESERVICEEXISTS", reg("run", "workspaceName", "roads.zlw"), "true"}});
 }
 
 TEST_F(Commands, SessionsRightsAndTokens)
@@ -261,13 +221,6 @@ TEST_F(Commands, SessionsRightsAndTokens)
         EXPECT_EQ(userOf(*vic), "Authentication Error: sign in with SERVER_SESSION_INIT first");
     }
 
-    auto ann = connectAs("ann");
-    const std::pair<const char*, const char*> properties[] = {
-        {"SERVER_NAME", "zelserverd"},    {"SERVER_VERSION", "0.1.0"},  {"API_VERSION", "1"},
-        {"USER_ROLES", "user"},           {"SECURITY_ENABLED", "true"}, {"MAX_REQUEST_BYTES", "65536"},
-        {"MAX_FILE_BYTES", "4294967295"}, {"JOB_SERVICES", "zeljob"},   {"SERVER_TIME", "TIME"}};
-    for (auto [name, value] : properties)
-        converse({{"SERVER_SESSION_GET_PROP", {{"sessionPropName", name}}, value}}, ann.get());
     // Rights come from the connection's sign-in, never from an identity object in the request; a
     // custom role grants its rights and nothing else.
     const std::string forged = "<?xml version=\"1.0\"?><SR_MAKE><IDENTITY id=\"admin\" is_authenticated=\"true\">"
@@ -292,8 +245,6 @@ TEST_F(Commands, SessionsRightsAndTokens)
                "\" firsttokendate=\"x\" lasttokendate=\"y\" expirationdate=\"z\"/></SEC_ADD_USERTOKEN>";
     };
     converse({
-        {"SEC_ADD_USERTOKEN", of("ann", "not xml"),
-         "\"userTokenObject\" holds no USERTOKEN element: malformed XML: No document element found"},
         {"SEC_ADD_USERTOKEN", of("ann", token("t", "soon")), "expirationtimeout 'soon' is not a number of seconds"},
         {"SEC_ADD_USERTOKEN", of("ann", token("abc", "3600", "localhost")), "true"},
         // The dates are the server's, not what the client sent.

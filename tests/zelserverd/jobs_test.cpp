@@ -77,35 +77,6 @@ TEST_F(Jobs, FinishedJobsReportTheirOutcomeAndLeaveALog)
     EXPECT_TRUE(eventually([&] { return contains(log(lost), "result not delivered"); }));
 }
 
-TEST_F(Jobs, RefusedRequests)
-{
-    const std::pair<Values, std::string> cases[] = {
-        {{{"keyword", "zeljob"}, {"request", "REPO/echo.zlw"}},
-         "workspace path 'REPO/echo.zlw' is not REPOSITORY/NAME/NAME.zlw (NAME being the workspace "
-         "name less its extension)"},
-        {{{"keyword", "zeljob"}, {"request", "REPO/echo/echo.zlw -XML_PARAMETER <A>"}},
-         "request parameters: malformed XML: Start-end tags mismatch"},
-        {{{"keyword", "zeljob"}}, "missing value \"request\""},
-        {{{"keyword", "zeljob"}, {"request", requestText("echo.zlw")}, {"requesterHost", "x"}},
-         "requesterResultPort and requesterHost go together"},
-        {{{"keyword", "zeljob"}, {"request", requestText("echo.zlw")}, {"secondsFromNow", "-5"}},
-         "bad secondsFromNow '-5'"},
-    };
-    for (const auto& [values, error] : cases)
-        EXPECT_EQ(admin_->command("JOB_REQUEST", values).body, error);
-    EXPECT_EQ(connectAs("vic")->command("JOB_REQUEST", {{"keyword", "zeljob"}, {"request", "x"}}).body,
-              "Authorization Error: user 'vic' may not run JOB_REQUEST");
-    // 4294967295 travels as -1.
-    const std::pair<const char*, std::string> unknown[] = {
-        {"-1", "null"}, {"x", "bad job id 'x'"}, {"4294967296", "bad job id '4294967296'"}};
-    for (const auto& [id, reply] : unknown)
-        EXPECT_EQ(onJob("GET_JOB_RESULT_STRING", id).body, reply) << id;
-    // The keyword is looked up without the blanks that submissions keep around it.
-    WireReply spaced = admin_->command("JOB_REQUEST", {{"keyword", " zeljob "}, {"request", requestText("echo.zlw")}});
-    ASSERT_TRUE(spaced.ok()) << spaced.body;
-    EXPECT_EQ(waitForEnd(std::stol(spaced.body))["jobStatus"], "SUCCESS");
-}
-
 // Whether the job ends by itself or is aborted, nothing it started keeps running, not even a process
 // in a session of its own.
 TEST_F(Jobs, EndingAJobKillsEverythingItStarted)
