@@ -2,12 +2,12 @@
 // result port, or wait for their start time; their results and logs as the library reads them, and
 // every operation of the transformation manager refused.
 
+#include <algorithm>
+
 #include "e2e/e2e_fixture.h"
 
 namespace zeltest {
 namespace {
-
-using namespace std::string_literals;
 
 class Jobs : public EndToEnd {
 protected:
@@ -129,10 +129,16 @@ TEST_F(Jobs, JobsRunFailWaitAndAreAborted)
     EXPECT_EQ(result->getRequesterResultPort(port), 1u) << "the result came back through the port";
     EXPECT_NE(port, 0u);
     ASSERT_EQ(result->getID(id), 1u);
-    const std::string text = log(id);
-    for (const std::string& line :
-         {"Hello Port"s, "notification 'topic:message' not sent"s, "result sent to 127.0.0.1:" + std::to_string(port)})
-        EXPECT_NE(text.find(line), std::string::npos) << text;
+    // The server finishes the log after it has sent the result.
+    std::string text;
+    auto logged = [&](const std::string& line) { return text.find(line) != std::string::npos; };
+    const std::string lines[] = {"Hello Port", "notification 'topic:message' not sent",
+                                 "result sent to 127.0.0.1:" + std::to_string(port)};
+    for (int attempt = 0; attempt < 100 && !std::all_of(std::begin(lines), std::end(lines), logged); ++attempt) {
+        std::this_thread::sleep_for(std::chrono::milliseconds(50));
+        text = log(id);
+    }
+    EXPECT_TRUE(std::all_of(std::begin(lines), std::end(lines), logged)) << text;
     IZELServerString& failed = client.text();
     EXPECT_EQ(client.take(jobs->transactJobString(zeljob, client.text("jobs/fail/fail.zlw"), *none, failed)), 0u);
     EXPECT_NE(std::string(failed.c_str(), failed.length()).find("jobStatus=JOB_FAILURE"), std::string::npos);
