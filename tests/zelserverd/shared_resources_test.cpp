@@ -1,10 +1,8 @@
-// Shared resources: no command reaches outside the area, whatever the path or the links in it; and the
-// path resolver on its own.
+// Shared resources: no command reaches outside the area, whatever the path or the links in it.
 #include <gtest/gtest.h>
 
 #include <filesystem>
 
-#include "shared_resources.h"
 #include "support/server_fixture.h"
 
 namespace zeltest {
@@ -99,40 +97,6 @@ TEST_F(Shared, PathsCannotLeaveTheArea)
     EXPECT_EQ(withoutTimes(onPath("SR_LIST", "").body),
               document("<SR_LIST>" + fileInfo("DIR", "0", "inner", "") + fileInfo("DIR", "0", "inner-link", "") +
                        "</SR_LIST>"));
-}
-
-TEST(SharedPaths, NormaliseMapAndCheckLinksWhereverTheyStand)
-{
-    const std::string root = makeTempDir();
-    fs::create_directories(root + "/area/sub");
-    fs::create_directories(root + "/out");
-    fs::create_directory_symlink(root + "/out", root + "/area/sub/out");
-    fs::create_directory_symlink("..", root + "/area/sub/up");
-    fs::create_directory_symlink(".", root + "/area/sub/self");
-    std::string error;
-    zelserverd::SharedArea area(zelserverd::SharedResourceConfig{"A", root + "/area", "A", ""}, error);
-    ASSERT_EQ(error, "");
-    const std::string real = fs::canonical(root + "/area").string();
-    const std::pair<const char*, const char*> cases[] = {
-        {"", ""},
-        {".", ""},
-        {"sub//./file.txt", "sub/file.txt"},
-        {"sub\\x\\y", "sub/x/y"},
-        {"missing/deeper/still", "missing/deeper/still"},
-        {"a..b/..c", "a..b/..c"},
-        {"/sub/file.txt", "sub/file.txt"},
-        {"/", ""},
-        {"sub/up/sub/up/up", "sub/up/sub/up/up"},
-        {"sub/self/self/x", "sub/self/self/x"},
-    };
-    for (const auto& [client, relative] : cases) {
-        zelserverd::AreaPath path;
-        ASSERT_EQ(area.resolve(client, path), "") << client;
-        EXPECT_EQ(path.full, std::string(relative).empty() ? real : real + "/" + relative) << client;
-    }
-    zelserverd::AreaPath path;
-    EXPECT_EQ(area.resolve("sub/out/new/file", path), "symbolic link 'sub/out' points outside shared resource 'A'");
-    removeTree(root);
 }
 
 }  // namespace
