@@ -6,6 +6,7 @@
 
 #include <algorithm>
 #include <cstddef>
+#include <stdexcept>
 #include <type_traits>
 #include <vector>
 
@@ -93,6 +94,20 @@ public:
 private:
     std::vector<I*> items_;
 };
+
+// Appends through the interface, for the library's own filling of a vector (a reply read into the
+// caller's vector, a listing): when the vector could not store the element (it has then destroyed an
+// owned one), the operation fails by an exception, rather than going on with a list that silently
+// lacks an element, or with an element that is gone. A null item is ignored, as by append.
+template <class I>
+void appendOrThrow(IZELServerVector<I>& vector, I* item)
+{
+    const unsigned before = vector.entries();
+    vector.append(item);
+    if (item != nullptr && vector.entries() == before) {
+        throw std::runtime_error("An element could not be stored.");
+    }
+}
 
 // A vector of objects that belong to another vector: a workspace's source and destination feature
 // types, which belong to their datasets.

@@ -39,12 +39,10 @@ std::optional<ZELServerStringArray> registrationFilterOf(const ZELServerStringDi
             return std::nullopt;
         }
     }
-    ZELServerStringArray pairs({"enableFilter", filter});
     if (const std::string* workspace = directives->find("WORKSPACE_NAME")) {
-        pairs.append("workspaceName");
-        pairs.append(*workspace);
+        return ZELServerStringArray({"enableFilter", filter, "workspaceName", *workspace});
     }
-    return pairs;
+    return ZELServerStringArray({"enableFilter", filter});
 }
 
 std::string bodyOf(const IZELServerResponse& response)

@@ -49,7 +49,7 @@ void appendFeatureTypes(IZELServerVector<IZELServerDataset>& datasets, IZELServe
     for (unsigned i = 0; i < datasets.entries(); ++i) {
         IZELServerVector<IZELServerFeatureType>& featureTypes = datasets.element(i)->getFeatureTypes();
         for (unsigned j = 0; j < featureTypes.entries(); ++j) {
-            out.append(featureTypes.element(j));
+            appendOrThrow(out, featureTypes.element(j));
         }
     }
 }
@@ -168,7 +168,7 @@ bool ZELServerWorkspace::readDatasets(const XmlElement& element)
     while (!datasets.empty()) {
         ZELServerDataset* dataset = datasets.back().release();
         datasets.pop_back();
-        (dataset->isSource() ? sourceDatasets_ : destinationDatasets_).append(dataset);
+        appendOrThrow<IZELServerDataset>(dataset->isSource() ? sourceDatasets_ : destinationDatasets_, dataset);
     }
     appendFeatureTypes(sourceDatasets_, sourceFeatureTypes_);
     appendFeatureTypes(destinationDatasets_, destinationFeatureTypes_);

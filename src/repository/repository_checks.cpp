@@ -40,12 +40,8 @@ std::string enableFilterFor(const ZELServerStringDict& directives)
 
 ZELServerStringArray enableFilterList(const ZELServerStringDict* directives)
 {
-    ZELServerStringArray pairs({"enableFilter"});
     const std::string filter = directives == nullptr ? "All" : enableFilterFor(*directives);
-    if (!filter.empty()) {
-        pairs.append(filter);
-    }
-    return pairs;
+    return filter.empty() ? ZELServerStringArray({"enableFilter"}) : ZELServerStringArray({"enableFilter", filter});
 }
 
 }  // namespace zel

@@ -170,7 +170,7 @@ IZELServerStatus* ZELServerMountPoint::listWithin(const IZELServerPath& path, un
         }
         IZELServerFileInfo* entry = std::exchange(top.listing->element(top.next++), nullptr);
         const unsigned level = top.level;
-        entries.append(entry);
+        appendOrThrow(entries, entry);
         if (entry == nullptr || !entry->isDirectory() || level >= depth) {
             continue;
         }
@@ -184,7 +184,7 @@ IZELServerStatus* ZELServerMountPoint::listWithin(const IZELServerPath& path, un
             // What was listed before stays, without the unlisted directories' own entries.
             for (auto frame = open.rbegin(); frame != open.rend(); ++frame) {
                 while (frame->next < frame->listing->entries()) {
-                    entries.append(std::exchange(frame->listing->element(frame->next++), nullptr));
+                    appendOrThrow(entries, std::exchange(frame->listing->element(frame->next++), nullptr));
                 }
             }
             return status;

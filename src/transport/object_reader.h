@@ -14,6 +14,7 @@
 
 #include <zelserverapi/IZELServerVector.h>
 
+#include "api/ZELServerVector.h"
 #include "api/message_numbers.h"
 #include "transport/xml_document.h"
 #include "transport/xml_navigation.h"
@@ -73,7 +74,7 @@ int readObjectList(std::string_view body, std::string_view tag, IZELServerVector
             if (object == nullptr || !fill(*object, *element)) {
                 return false;
             }
-            out.append(object.release());
+            appendOrThrow<Interface>(out, object.release());
         }
         return true;
     });

@@ -98,6 +98,9 @@ struct Objects {
         session.destroyRepositoryVector(&repositories);
         session.destroyRepository(&repository);
         session.destroyWorkspace(&made);
+        area->releaseObject(root);
+        session.destroyMountPoint(&area);
+        session.destroyFileInfoVector(&entries);
     }
 
     IZELServerSession& session;
@@ -111,6 +114,9 @@ struct Objects {
     IZELServerVector<IZELServerRepository>* repositories = session.createRepositoryVector();
     IZELServerRepository* repository = session.createRepository();
     IZELServerWorkspace* made = nullptr;
+    IZELServerMountPoint* area = session.createMountPoint();
+    IZELServerPath* root = area->createPath(*text);
+    IZELServerVector<IZELServerFileInfo>* entries = session.createFileInfoVector();
     unsigned flag = 0;
     std::string destination;
 };
@@ -182,6 +188,13 @@ const Kind kKinds[] = {
          return o.session.getTransformationManager()->submitJobString(*o.text, *o.text, *o.list, o.flag);
      },
      [](Objects& o) { return std::to_string(o.flag); }, "17"},
+    {"listing with depth",  // the same answer at each level, so a retry reads it whatever the failure took
+     [](FakeServer& s) {
+         const Bytes folder = reply("SUCCESS", R"(<L><FILEINFO filetype="DIR"><PATH name="in"/></FILEINFO></L>)");
+         s.expectAnyFrame().sendFrame(folder).expectAnyFrame().sendFrame(folder);
+     },
+     [](Objects& o) { return o.area->list(*o.root, 1, *o.entries); },
+     [](Objects& o) { return std::to_string(o.entries->entries()); }, "2"},
     {"download",
      [](FakeServer& s) {
          s.expectAnyFrame()
