@@ -144,6 +144,23 @@ TEST_F(Jobs, JobsRunFailWaitAndAreAborted)
     EXPECT_NE(std::string(failed.c_str(), failed.length()).find("jobStatus=JOB_FAILURE"), std::string::npos);
 }
 
+// With a limit on the wait for the result port, a job that outlasts it gives a time-out.
+TEST_F(Jobs, AResultThatDoesNotComeInTimeIsATimeOut)
+{
+    IZELServerSecurityManager* security = client.session().getSecurityManager();
+    auto token = client.own(security->createUserToken(client.text("ann-token"), client.text(""), 0));
+    ASSERT_EQ(client.take(security->addUserToken(client.text("ann"), *token)), 0u) << client.lastMessage();
+    Client impatient;
+    ASSERT_EQ(impatient.signInWith(server->port(), {"USER_TOKEN", "ann-token", "RESULT_PORT_TIMEOUT", "1"}), 0u)
+        << impatient.lastMessage();
+    IZELServerSession& session = impatient.session();
+    auto sleeping = impatient.own(session.createTransformationRequest(impatient.text("zeljob"), impatient.text("jobs"),
+                                                                      impatient.text("sleep.zlw")));
+    auto late = impatient.own(session.createTransformationResult());
+    EXPECT_EQ(impatient.take(session.getTransformationManager()->transactJob(*sleeping, *late)), 393618u);
+    EXPECT_EQ(impatient.lastCode(), 392012u) << impatient.lastMessage();
+}
+
 TEST_F(Jobs, EveryOperationCanBeRefused)
 {
     IZELServerTransformationRequest& unknownService = request("greet.zlw", "nojob");
