@@ -12,6 +12,9 @@
 
 namespace zeltest {
 
+namespace {
+
+// The variable's value as the library sees it; nullopt when it is not defined.
 std::optional<std::string> getEnv(const char* name)
 {
 #if defined(_WIN32)
@@ -44,6 +47,8 @@ void setEnv(const char* name, const std::optional<std::string>& value)
 #endif
 }
 
+}  // namespace
+
 ScopedEnv::ScopedEnv(const char* name, std::optional<std::string> value) : name_(name), old_(getEnv(name))
 {
     setEnv(name, value);
@@ -53,23 +58,20 @@ ScopedEnv::~ScopedEnv() { setEnv(name_.c_str(), old_); }
 
 // Named by the clock and a counter; a folder that exists already (another process chose the same
 // name) is not taken, since create_directory answers false for it.
-std::filesystem::path makeTempDir(const std::string& prefix)
+TempDir::TempDir(const std::string& prefix)
 {
     namespace fs = std::filesystem;
     static std::atomic<unsigned> counter{0};
     const auto stamp = std::chrono::steady_clock::now().time_since_epoch().count();
     for (int attempt = 0; attempt < 100; ++attempt) {
-        const fs::path candidate =
-            fs::temp_directory_path() / (prefix + "-" + std::to_string(stamp) + "-" + std::to_string(counter++));
+        path_ = fs::temp_directory_path() / (prefix + "-" + std::to_string(stamp) + "-" + std::to_string(counter++));
         std::error_code error;
-        if (fs::create_directory(candidate, error)) {
-            return candidate;
+        if (fs::create_directory(path_, error)) {
+            return;
         }
     }
     throw std::runtime_error("cannot create a temporary folder under " + fs::temp_directory_path().string());
 }
-
-TempDir::TempDir(const std::string& prefix) : path_(makeTempDir(prefix)) {}
 
 TempDir::~TempDir()
 {

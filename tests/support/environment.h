@@ -25,11 +25,6 @@ private:
     std::optional<std::string> old_;
 };
 
-// The variable's value as the library sees it; nullopt when it is not defined.
-std::optional<std::string> getEnv(const char* name);
-// Sets (nullopt: removes) a variable for the rest of the process.
-void setEnv(const char* name, const std::optional<std::string>& value);
-
 // A fresh, empty folder under the system's temporary folder, removed with everything in it when the
 // object goes. `prefix` starts the folder's name, so a leftover tells which test made it.
 class TempDir {
@@ -45,8 +40,5 @@ public:
 private:
     std::filesystem::path path_;
 };
-
-// Creates a fresh folder as TempDir does, but leaves its removal to the caller.
-std::filesystem::path makeTempDir(const std::string& prefix);
 
 }  // namespace zeltest

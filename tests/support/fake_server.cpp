@@ -1,6 +1,5 @@
 #include "support/fake_server.h"
 
-#include <algorithm>
 #include <chrono>
 #include <cstdio>
 #include <cstdlib>
@@ -10,18 +9,12 @@ namespace zeltest {
 
 namespace {
 
-using Clock = std::chrono::steady_clock;
 using std::chrono::milliseconds;
 
 constexpr milliseconds kStepTimeout{5000};
 constexpr milliseconds kHoldTimeout{10000};
 // Far above any command the library sends; a larger prefix means the stream is out of step.
 constexpr std::uint32_t kMaxFrameLength = 64u << 20;
-
-milliseconds leftUntil(Clock::time_point deadline)
-{
-    return std::max(std::chrono::ceil<milliseconds>(deadline - Clock::now()), milliseconds(0));
-}
 
 // Reads whatever is waiting without blocking: the bytes that no step consumed.
 Bytes drainWaiting(const Socket& socket)
@@ -136,11 +129,9 @@ public:
         connection = acceptFrom(server.listener);
         // Winsock hands a listener's non-blocking mode on to the accepted socket.
         if (!connection.valid() || !setNonBlocking(connection, false) || !setSendTimeout(connection, kStepTimeout)) {
-            return failed("accept failed: " + socketErrorText(lastSocketError()));
+            return failed("accept failed");
         }
         everAccepted = true;
-        const std::lock_guard<std::mutex> lock(server.mutex);
-        ++server.accepted;
         return true;
     }
 
@@ -155,12 +146,10 @@ public:
 
     bool read(Bytes& out, std::size_t count, const std::string& what)
     {
-        const Clock::time_point deadline = Clock::now() + kStepTimeout;
         out.assign(count, '\0');
         for (std::size_t done = 0; done < count;) {
-            const long got = waitReadable(connection, leftUntil(deadline))
-                                 ? receiveSome(connection, out.data() + done, count - done)
-                                 : -1;
+            const long got =
+                waitReadable(connection, kStepTimeout) ? receiveSome(connection, out.data() + done, count - done) : -1;
             if (got <= 0) {
                 out.resize(done);
                 return failed(std::string(got == 0 ? "the client closed the connection" : "timed out or failed") +
@@ -186,8 +175,7 @@ public:
             return failed("the length prefix announces " + std::to_string(length) + " bytes");
         }
         const bool complete = read(payload, length, "the payload");
-        const std::lock_guard<std::mutex> lock(server.mutex);
-        server.receivedFrames.push_back(payload);
+        lastFrame = payload;
         return complete;
     }
 
@@ -196,7 +184,7 @@ public:
         for (std::size_t done = 0; done < bytes.size();) {
             const long sent = sendSome(connection, bytes.data() + done, bytes.size() - done);
             if (sent <= 0) {
-                return failed("could not send: " + socketErrorText(lastSocketError()));
+                return failed("could not send");
             }
             done += static_cast<std::size_t>(sent);
         }
@@ -227,22 +215,21 @@ public:
 
     bool connectBack(const std::string& portName, const std::string& source, const Bytes& payload)
     {
-        const std::vector<Bytes> received = server.frames();
-        const Bytes last = received.empty() ? Bytes() : received.back();
         unsigned long port = 0;
-        if (const std::optional<ParsedRequest> parsed = parseRequest(last)) {
+        if (const std::optional<ParsedRequest> parsed = parseRequest(lastFrame)) {
             for (const auto& [name, value] : parsed->values) {
                 port = port == 0 && name == portName ? std::strtoul(value.c_str(), nullptr, 10) : port;
             }
         }
         if (port == 0 || port > 65535) {
-            return failed("the last frame received names no port \"" + portName + "\": \"" + printable(last) + "\"");
+            return failed("the last frame received names no port \"" + portName + "\": \"" + printable(lastFrame) +
+                          "\"");
         }
         Socket peer = openTcpSocket();
         const std::optional<std::uint32_t> from = parseDottedAddress(source.empty() ? "0.0.0.0" : source);
         if (!from || !bindTo(peer, *from, 0) || !connectTo(peer, kLoopback, static_cast<std::uint16_t>(port)) ||
             !setSendTimeout(peer, kStepTimeout)) {
-            return failed("cannot connect: " + socketErrorText(lastSocketError()));
+            return failed("cannot connect back");
         }
         std::swap(peer, connection);
         const bool sent = send(frame(payload));
@@ -264,6 +251,7 @@ public:
     FakeServer& server;
     std::size_t index;
     Socket connection;
+    Bytes lastFrame;  // the payload of the last frame received, for connect-backs
     bool everAccepted = false;
     std::vector<Socket> callbacks;
 };
@@ -276,16 +264,13 @@ FakeServer::FakeServer() : listener(listenOnLoopback(16))
     const bool usable = listener.valid() && setNonBlocking(listener, true);
     const std::optional<std::uint16_t> port = usable ? localPort(listener) : std::nullopt;
     if (!port) {
-        throw std::runtime_error("fake server: cannot listen: " + socketErrorText(lastSocketError()));
+        throw std::runtime_error("fake server: cannot listen");
     }
     listenPort = *port;
 }
 
 FakeServer& FakeServer::add(std::string what, std::function<bool(Run&)> act)
 {
-    if (worker.joinable() || finished) {
-        throw std::logic_error("fake server: steps must be added before start()");
-    }
     steps.push_back({std::move(what), std::move(act)});
     return *this;
 }
@@ -376,15 +361,10 @@ FakeServer& FakeServer::exchange(Bytes expected, Bytes answer)
 
 void FakeServer::start()
 {
-    if (worker.joinable() || finished) {
-        throw std::logic_error("fake server: start() called twice");
-    }
     worker = std::thread([this] {
         Run run(*this, 0);
-        for (; run.index < steps.size() && steps[run.index].act(run); ++run.index) {
-            const std::lock_guard<std::mutex> lock(mutex);
-            ++stepsDone;
-            changed.notify_all();
+        while (run.index < steps.size() && steps[run.index].act(run)) {
+            ++run.index;
         }
         std::unique_lock<std::mutex> lock(mutex);
         scriptDone = true;
@@ -399,11 +379,11 @@ void FakeServer::start()
     });
 }
 
-bool FakeServer::waitForSteps(std::size_t count)
+bool FakeServer::waitForScript()
 {
     std::unique_lock<std::mutex> lock(mutex);
-    changed.wait(lock, [&] { return stepsDone >= count || scriptDone || !worker.joinable(); });
-    return stepsDone >= count;
+    changed.wait(lock, [&] { return scriptDone || !worker.joinable(); });
+    return firstFailure.empty();
 }
 
 bool FakeServer::finish()
@@ -447,17 +427,10 @@ void FakeServer::fail(std::string message)
     }
 }
 
-template <typename T>
-T FakeServer::locked(T FakeServer::*member) const
+std::string FakeServer::failure() const
 {
     const std::lock_guard<std::mutex> lock(mutex);
-    return this->*member;
+    return firstFailure;
 }
-
-std::string FakeServer::failure() const { return locked(&FakeServer::firstFailure); }
-
-std::vector<Bytes> FakeServer::frames() const { return locked(&FakeServer::receivedFrames); }
-
-int FakeServer::connectionsAccepted() const { return locked(&FakeServer::accepted); }
 
 }  // namespace zeltest

@@ -96,9 +96,7 @@ public:
     // Starts the thread that runs the script; once, after the steps.
     void start();
     // Waits until every step has run or one failed; the connection stays open. Returns passed().
-    bool waitForScript() { return waitForSteps(steps.size()) && passed(); }
-    // Waits until the first `count` steps have run (or the script ended early); whether they all ran.
-    bool waitForSteps(std::size_t count);
+    bool waitForScript();
     // Waits for the script, closes every connection, joins the thread and checks for unaccepted
     // connections. Safe to call more than once. Returns passed().
     bool finish();
@@ -108,9 +106,6 @@ public:
     bool passed() const { return failure().empty(); }
     // Description of the first failure; empty when none.
     std::string failure() const;
-    // Every frame payload received, in order, matched or not, across all connections.
-    std::vector<Bytes> frames() const;
-    int connectionsAccepted() const;
 
 private:
     class Run;
@@ -122,8 +117,6 @@ private:
 
     FakeServer& add(std::string what, std::function<bool(Run&)> act);
     void fail(std::string message);
-    template <typename T>
-    T locked(T FakeServer::*member) const;
 
     Socket listener;
     std::uint16_t listenPort = 0;
@@ -135,10 +128,7 @@ private:
     std::condition_variable changed;
     bool scriptDone = false;
     bool releaseRequested = false;
-    std::size_t stepsDone = 0;
     std::string firstFailure;
-    std::vector<Bytes> receivedFrames;
-    int accepted = 0;
 };
 
 }  // namespace zeltest

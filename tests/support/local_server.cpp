@@ -65,12 +65,6 @@ LocalServer::LocalServer(const std::string& executable, const std::string& confi
     start(executable);
 }
 
-LocalServer::LocalServer(const std::string& executable, const ReuseDirectory& reuse)
-    : directory_(reuse.directory), ownsDirectory_(false)
-{
-    start(executable);
-}
-
 void LocalServer::start(const std::string& executable)
 {
     int out[2];
@@ -137,8 +131,7 @@ int LocalServer::stop()
 LocalServer::~LocalServer()
 {
     stop();
-    // ZEL_E2E_KEEP keeps the data directory and the server's log for a look after a failure.
-    if (ownsDirectory_ && !directory_.empty() && std::getenv("ZEL_E2E_KEEP") == nullptr) {
+    if (!directory_.empty()) {
         std::error_code ignored;
         std::filesystem::remove_all(directory_, ignored);
     }

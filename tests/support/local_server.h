@@ -15,12 +15,6 @@ class LocalServer {
 public:
     // `configText` is written to a file in a new temporary directory; the data directory lies beside it.
     LocalServer(const std::string& executable, const std::string& configText);
-    // Starts the server again on the directory of an earlier one (stopped first): its configuration
-    // and data are kept, and this object leaves the directory in place when it goes.
-    struct ReuseDirectory {
-        std::string directory;
-    };
-    LocalServer(const std::string& executable, const ReuseDirectory& reuse);
     ~LocalServer();
     LocalServer(const LocalServer&) = delete;
     LocalServer& operator=(const LocalServer&) = delete;
@@ -41,7 +35,6 @@ private:
     std::string directory_;
     std::string failure_;
     pid_t pid_ = -1;
-    bool ownsDirectory_ = true;
     std::uint16_t port_ = 0;
 };
 

@@ -7,8 +7,8 @@
 namespace zeltest {
 
 // The names of the functions and data that `library` exports: the defined dynamic symbols of a
-// shared object, the export directory of a DLL. A library that cannot be read gives an empty set
-// and a test failure that says why.
+// shared object (a Windows DLL's exports are checked by the zel_dll_exports test). A library that
+// cannot be read gives an empty set and a test failure that says why.
 std::set<std::string> exportedSymbols(const std::string& library);
 
 }  // namespace zeltest

@@ -2,12 +2,12 @@
 
 #include <algorithm>
 #include <climits>
+#include <stdexcept>
 
 #if defined(_WIN32)
 #include <winsock2.h>
 #include <windows.h>
 
-#include <atomic>
 #include <mutex>
 #else
 #include <arpa/inet.h>
@@ -19,7 +19,6 @@
 #include <unistd.h>
 
 #include <cerrno>
-#include <cstring>
 #endif
 
 namespace zeltest {
@@ -47,10 +46,6 @@ sockaddr_in endpoint(std::uint32_t address, std::uint16_t port)
 
 int clampedCount(std::size_t count) { return static_cast<int>(std::min<std::size_t>(count, INT_MAX)); }
 
-#if defined(_WIN32)
-std::atomic<bool> started{false};
-#endif
-
 }  // namespace
 
 void Socket::reset(SocketHandle replacement)
@@ -67,12 +62,6 @@ void Socket::reset(SocketHandle replacement)
 
 #if defined(_WIN32)
 
-int lastSocketError() { return ::WSAGetLastError(); }
-
-std::string socketErrorText(int error) { return "Winsock error " + std::to_string(error); }
-
-bool socketsStarted() { return started.load(); }
-
 // Never cleaned up: sockets of the fake servers may still be closing when the process ends, and the
 // library's own start-ups and clean-ups must not be able to take Winsock away from them.
 Socket openTcpSocket()
@@ -80,7 +69,7 @@ Socket openTcpSocket()
     static std::once_flag once;
     std::call_once(once, [] {
         WSADATA data;
-        started = ::WSAStartup(MAKEWORD(2, 2), &data) == 0;
+        ::WSAStartup(MAKEWORD(2, 2), &data);
     });
     return Socket(static_cast<SocketHandle>(::socket(AF_INET, SOCK_STREAM, 0)));
 }
@@ -110,15 +99,6 @@ bool waitReadable(const Socket& socket, std::chrono::milliseconds timeout)
 }
 
 #else
-
-int lastSocketError() { return errno; }
-
-std::string socketErrorText(int error)
-{
-    return std::string(std::strerror(error)) + " (" + std::to_string(error) + ")";
-}
-
-bool socketsStarted() { return false; }
 
 Socket openTcpSocket() { return Socket(::socket(AF_INET, SOCK_STREAM, 0)); }
 
@@ -215,5 +195,22 @@ Socket listenOnLoopback(int backlog)
     Socket listener = boundOnLoopback();
     return ::listen(native(listener), backlog) == 0 ? std::move(listener) : Socket();
 }
+
+namespace {
+
+std::uint16_t portOf(const Socket& socket)
+{
+    const std::optional<std::uint16_t> port = socket.valid() ? localPort(socket) : std::nullopt;
+    if (!port) {
+        throw std::runtime_error("cannot bind a loopback port");
+    }
+    return *port;
+}
+
+}  // namespace
+
+ClosedPort::ClosedPort() : socket(boundOnLoopback()), number(portOf(socket)) {}
+
+std::uint16_t releasedPort() { return portOf(boundOnLoopback()); }
 
 }  // namespace zeltest

@@ -2,7 +2,7 @@
 // The test programs' own IPv4 sockets, the same on BSD sockets and Winsock. They use nothing from the
 // library, so the tests' end of every connection stays independent of the code under test. Addresses
 // and ports are in host order; calls block unless setNonBlocking was asked for, and report failure by
-// their result, with the reason in lastSocketError().
+// their result.
 
 #include <chrono>
 #include <cstddef>
@@ -45,13 +45,6 @@ private:
     SocketHandle handle = kNoSocket;
 };
 
-// errno or WSAGetLastError(), and the system's text for it.
-int lastSocketError();
-std::string socketErrorText(int error);
-
-// Whether these sockets have started Winsock in this process (never cleaned up); false on POSIX.
-bool socketsStarted();
-
 // A blocking IPv4 stream socket; invalid on failure.
 Socket openTcpSocket();
 bool setNonBlocking(const Socket& socket, bool enabled);
@@ -73,5 +66,24 @@ std::optional<std::uint32_t> parseDottedAddress(const std::string& text);
 Socket boundOnLoopback();
 // The same, listening.
 Socket listenOnLoopback(int backlog);
+
+// A loopback port that refuses connections for as long as this object lives: it is bound but never
+// listened on, so no other socket (in this process or a test running beside it) can take it over,
+// as could happen with a port that was merely found free and released.
+class ClosedPort {
+public:
+    // Throws std::runtime_error when no port can be bound.
+    ClosedPort();
+    std::uint16_t port() const { return number; }
+
+private:
+    Socket socket;
+    std::uint16_t number = 0;
+};
+
+// A loopback port that nothing listens on right now: bound by the system, then released. Another
+// socket may take it before the caller uses it, so callers retry with a fresh one when that matters.
+// Throws std::runtime_error when no port can be bound.
+std::uint16_t releasedPort();
 
 }  // namespace zeltest

@@ -1,18 +1,14 @@
-// The local file of a transfer: each direction, and the checksum read afresh
-// from disk.
+// The local file of a transfer: each direction refuses the other one.
 
 #include "transport/LocalFile.h"
 
-#include <cstdint>
 #include <filesystem>
-#include <fstream>
 #include <optional>
 #include <string>
 
 #include <gtest/gtest.h>
 
 #include "support/environment.h"
-#include "support/fake_server.h"
 #include "support/helpers.h"
 
 namespace zel {
@@ -47,29 +43,6 @@ TEST_F(LocalFileTest, EachModeRefusesTheOtherDirectionAndWritingStartsEmpty)
     EXPECT_TRUE(writer.close());
     EXPECT_FALSE(writer.isOpen());
     EXPECT_EQ(slurp(dir / "w"), "new");
-}
-
-// The fake server's bitwise CRC-32 checks the library's table-driven one.
-TEST_F(LocalFileTest, ChecksumIsTheStandardCrc32ReadAfreshThroughThePath)
-{
-    // Longer than any block size the checksum pass could use, and not a multiple of one.
-    const std::string big = zeltest::pattern(1234567);
-    EXPECT_EQ(LocalFile(make("big", big), LocalFile::Mode::Read).crc32(), zeltest::crc32(big));
-
-    const std::string path = make("f", "first");
-    LocalFile file(path, LocalFile::Mode::Read);
-    char buffer[2];
-    ASSERT_EQ(file.read(buffer, 2), std::optional<std::size_t>(2));
-    std::ofstream(path, std::ios::binary | std::ios::app) << "-and-more";
-    EXPECT_EQ(file.crc32(), std::optional<std::uint32_t>(zeltest::crc32("first-and-more")));
-    // The open stream is not disturbed by the checksum pass.
-    ASSERT_EQ(file.read(buffer, 2), std::optional<std::size_t>(2));
-    EXPECT_EQ(std::string(buffer, 2), "rs");
-    // Windows refuses to remove an open file, so the stream goes first; the checksum still goes by
-    // the path, and finds nothing there.
-    ASSERT_TRUE(file.close());
-    ASSERT_TRUE(fs::remove(path));
-    EXPECT_EQ(file.crc32(), std::nullopt);
 }
 
 }  // namespace

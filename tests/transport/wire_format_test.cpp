@@ -91,9 +91,7 @@ TEST(WireServerError, ClassifiesByPrefixAtTheVeryStart)
     const Case cases[] = {
         {"Authentication Error: bad password", ServerErrorKind::Authentication, "bad password"},
         {"Authorization Error: no rights", ServerErrorKind::Authorization, "no rights"},
-        {"Authorization Error: Authentication Error: x", ServerErrorKind::Authorization, "Authentication Error: x"},
         {"Failed. Authentication Error: x", ServerErrorKind::Plain, "Failed. Authentication Error: x"},
-        {" Authorization Error: x", ServerErrorKind::Plain, " Authorization Error: x"},
         {"authorization error: x", ServerErrorKind::Plain, "authorization error: x"},
         {"Authorization Error:x", ServerErrorKind::Plain, "Authorization Error:x"},
         {"a\0b"s, ServerErrorKind::Plain, "a\0b"s},
@@ -114,7 +112,6 @@ TEST(WireAcknowledgement, OnlyTheExactReadyReplyLetsATransferGoOn)
     };
     const Case cases[] = {
         {"SUCCESS\0ready_to_transfer"s, AckOutcome::Ready, ""},
-        {"\0SUCCESS\0ready_to_transfer"s, AckOutcome::Ready, ""},
         {"SUCCESS\0ready_to_transfer "s, AckOutcome::Refused, "ready_to_transfer "},
         {"SUCCESS\0ready_to_transfer\0"s, AckOutcome::Refused, "ready_to_transfer\0"s},
         {"success\0ready_to_transfer"s, AckOutcome::Refused, "ready_to_transfer"},

@@ -3,7 +3,7 @@
 
 #include <regex>
 
-#include "support/ports.h"
+#include "support/sockets.h"
 #include "zelctl/zelctl_fixture.h"
 
 namespace zeltest {
