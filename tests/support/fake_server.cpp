@@ -367,8 +367,6 @@ void FakeServer::start()
             ++run.index;
         }
         std::unique_lock<std::mutex> lock(mutex);
-        scriptDone = true;
-        changed.notify_all();
         // After a failure the connections close at once, so that a blocked client sees the end.
         if (firstFailure.empty()) {
             changed.wait_for(lock, kHoldTimeout, [this] { return releaseRequested; });
@@ -377,13 +375,6 @@ void FakeServer::start()
         lock.unlock();
         run.end(clean);
     });
-}
-
-bool FakeServer::waitForScript()
-{
-    std::unique_lock<std::mutex> lock(mutex);
-    changed.wait(lock, [&] { return scriptDone || !worker.joinable(); });
-    return firstFailure.empty();
 }
 
 bool FakeServer::finish()

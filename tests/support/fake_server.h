@@ -95,8 +95,6 @@ public:
 
     // Starts the thread that runs the script; once, after the steps.
     void start();
-    // Waits until every step has run or one failed; the connection stays open. Returns passed().
-    bool waitForScript();
     // Waits for the script, closes every connection, joins the thread and checks for unaccepted
     // connections. Safe to call more than once. Returns passed().
     bool finish();
@@ -126,7 +124,6 @@ private:
 
     mutable std::mutex mutex;
     std::condition_variable changed;
-    bool scriptDone = false;
     bool releaseRequested = false;
     std::string firstFailure;
 };

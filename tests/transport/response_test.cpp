@@ -1,5 +1,4 @@
-// The response: booleans, the sign-in reply, and the object-reader machinery every object kind
-// plugs into.
+// The response: booleans and the sign-in reply.
 
 #include <memory>
 #include <string>
@@ -10,12 +9,9 @@
 
 #include "api/ZELServerString.h"
 #include "api/ZELServerStringArray.h"
-#include "api/ZELServerVector.h"
 #include "api/message_numbers.h"
 #include "security/ZELServerIdentity.h"
 #include "transport/ZELServerResponse.h"
-#include "transport/object_reader.h"
-#include "transport/xml_navigation.h"
 
 namespace zel {
 namespace {
@@ -24,7 +20,6 @@ using namespace std::string_literals;
 using Strings = std::vector<std::string>;
 
 constexpr int kNotXml = static_cast<int>(msg::kXmlFailure);
-constexpr int kNotReadable = static_cast<int>(msg::kUnreadableReply);
 
 TEST(Response, BodyIsKeptVerbatimAndOnlyExactlyTrueOrFalseIsABoolean)
 {
@@ -95,67 +90,6 @@ TEST(Response, SignInReplyFillsOrReplacesTheIdentityAndStoresTheSecuritySettings
             EXPECT_STREQ(settings.lookup(c.settings[i].c_str()), c.settings[i + 1].c_str());
         }
     }
-}
-
-// ---- Object-reader machinery ------------------------------------------------------------------------
-
-// A small object kind: "THING" elements with a "name"; a "bad" attribute makes its reader refuse.
-class IThing {
-public:
-    virtual ~IThing() = default;
-    virtual std::string name() const = 0;
-};
-
-class Thing final : public IThing, public HeapObject {
-public:
-    std::string name() const override { return name_; }
-    std::string name_;
-};
-
-bool fillThing(Thing& thing, const XmlElement& element)
-{
-    std::string ignored;
-    getAttribute(&element, "name", thing.name_);
-    return !getAttribute(&element, "bad", ignored);
-}
-
-using ThingVector = ZELServerVector<IThing, Thing>;
-
-Strings namesOf(ThingVector& things)
-{
-    Strings names;
-    for (unsigned i = 0; i < things.entries(); ++i) {
-        names.push_back(things.at(i)->name());
-    }
-    return names;
-}
-
-TEST(ObjectReader, ListHoldsEveryElementAtAnyDepthUntilOneIsRefused)
-{
-    const struct {
-        std::string body;
-        int result;
-        Strings names;
-    } cases[] = {
-        {R"(<THING name="root"><A><THING name="a"><THING name="a1"/></THING></A><thing/><THING name="b"/></THING>)",
-         0,
-         {"root", "a", "a1", "b"}},
-        {R"(<R><THING name="a"/><THING name="b" bad=""/><THING name="c"/></R>)", kNotReadable, {"a"}},
-        {"<R><THING></R>", kNotXml, {"earlier"}},
-    };
-    for (const auto& c : cases) {
-        ThingVector things;
-        things.append(new Thing());
-        static_cast<Thing*>(things.at(0))->name_ = "earlier";
-        EXPECT_EQ(readObjectList(
-                      c.body, "THING", things, [] { return new Thing(); }, fillThing),
-                  c.result);
-        EXPECT_EQ(namesOf(things), c.names);
-    }
-    ThingVector things;
-    EXPECT_EQ(readObjectList(
-                  "<R><THING/></R>", "THING", things, []() -> Thing* { return nullptr; }, fillThing),
-              kNotReadable);
 }
 
 }  // namespace

@@ -39,7 +39,6 @@ TEST(TcpSocket, SendToAClosedPeerFailsWithoutASignal)
     server.closeConnection().start();
     TcpSocket client("127.0.0.1", server.port());
     ASSERT_EQ(client.errorCode, 0);
-    ASSERT_TRUE(server.waitForScript());
     EXPECT_TRUE(becomesUnusable(client));
     // The first sends may still be taken into the buffer; the peer's reset fails the later ones.
     const std::string chunk(1024, 'c');

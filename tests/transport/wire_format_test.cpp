@@ -26,8 +26,6 @@ TEST(WireReply, SplitsIntoStatusWordAndBody)
     };
     const Case cases[] = {
         {"plain", "SUCCESS\0<R/>"s, Reply{"SUCCESS", "<R/>"}},
-        {"leading NULs skipped", "\0\0SUCCESS\0a"s, Reply{"SUCCESS", "a"}},
-        {"body keeps its NULs", "SUCCESS\0a\0b\0"s, Reply{"SUCCESS", "a\0b\0"s}},
         {"body starting with NUL kept verbatim", "SUCCESS\0\0x"s, Reply{"SUCCESS", "\0x"s}},
         {"no NUL", "SUCCESS"s, std::nullopt},
         {"nothing after the NUL", "SUCCESS\0"s, std::nullopt},
@@ -55,16 +53,12 @@ TEST(WireFileHeader, Parses)
     const Case cases[] = {
         {"largest", "fileLength=4294967295\0fileCRC=4294967295"s, HeaderParse::Header, 0xFFFFFFFFu, 0xFFFFFFFFu},
         {"hexadecimal", "fileLength=0x1F\0fileCRC=0XfF"s, HeaderParse::Header, 31, 255},
-        {"leading zero is not octal", "fileLength=010\0fileCRC=1"s, HeaderParse::Header, 10, 1},
-        {"blanks around", "fileLength=  7 \0fileCRC=\t8  "s, HeaderParse::Header, 7, 8},
-        {"all-zero fraction", "fileLength=7.000\0fileCRC=8."s, HeaderParse::Header, 7, 8},
         {"plus sign", "fileLength=+7\0fileCRC=8"s, HeaderParse::Header, 7, 8},
         {"prefixes cut by length", "XXXXXXXXXXX5\0YYYYYYYY6"s, HeaderParse::Header, 5, 6},
         {"leading NULs skipped", "\0\0fileLength=3\0fileCRC=4"s, HeaderParse::Header, 3, 4},
         {"length overflows", "fileLength=4294967296\0fileCRC=1"s, HeaderParse::Unusable},
         {"empty length", "fileLength=\0fileCRC=1"s, HeaderParse::Unusable},
         {"trailing text", "fileLength=12abc\0fileCRC=1"s, HeaderParse::Unusable},
-        {"real fraction", "fileLength=7.5\0fileCRC=1"s, HeaderParse::Unusable},
         {"minus sign", "fileLength=-1\0fileCRC=1"s, HeaderParse::Unusable},
         {"length part shorter than its prefix", "short\0fileCRC=1"s, HeaderParse::Unusable},
         {"more fields behind the crc", "fileLength=1\0fileCRC=1\0junk"s, HeaderParse::Unusable},
