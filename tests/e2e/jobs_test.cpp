@@ -1,6 +1,6 @@
 // Jobs end to end: workspaces that succeed, fail, sleep until aborted, run transacted through the
 // result port, or wait for their start time; their results and logs as the library reads them, and
-// every operation of the transformation manager refused.
+// what the server refuses.
 
 #include <algorithm>
 
@@ -144,31 +144,12 @@ TEST_F(Jobs, JobsRunFailWaitAndAreAborted)
     EXPECT_NE(std::string(failed.c_str(), failed.length()).find("jobStatus=JOB_FAILURE"), std::string::npos);
 }
 
-// With a limit on the wait for the result port, a job that outlasts it gives a time-out.
-TEST_F(Jobs, AResultThatDoesNotComeInTimeIsATimeOut)
-{
-    IZELServerSecurityManager* security = client.session().getSecurityManager();
-    auto token = client.own(security->createUserToken(client.text("ann-token"), client.text(""), 0));
-    ASSERT_EQ(client.take(security->addUserToken(client.text("ann"), *token)), 0u) << client.lastMessage();
-    Client impatient;
-    ASSERT_EQ(impatient.signInWith(server->port(), {"USER_TOKEN", "ann-token", "RESULT_PORT_TIMEOUT", "1"}), 0u)
-        << impatient.lastMessage();
-    IZELServerSession& session = impatient.session();
-    auto sleeping = impatient.own(session.createTransformationRequest(impatient.text("zeljob"), impatient.text("jobs"),
-                                                                      impatient.text("sleep.zlw")));
-    auto late = impatient.own(session.createTransformationResult());
-    EXPECT_EQ(impatient.take(session.getTransformationManager()->transactJob(*sleeping, *late)), 393618u);
-    EXPECT_EQ(impatient.lastCode(), 392012u) << impatient.lastMessage();
-}
-
 TEST_F(Jobs, EveryOperationCanBeRefused)
 {
     IZELServerTransformationRequest& unknownService = request("greet.zlw", "nojob");
     IZELServerTransformationRequest& missing = request("absent.zlw");
     IZELServerTransformationRequest& undeclared = request("greet.zlw");
     undeclared.setPublishedParameter(client.text("NOT_DECLARED"), client.text("x"));
-    IZELServerString& zeljob = client.text("zeljob");
-    IZELServerString& absent = client.text("jobs/absent/absent.zlw");
     IZELServerString& text = client.text("untouched");
     auto info = client.own(client.session().createLogFileInfo());
     spew(local("kept.log"), "kept");
@@ -176,12 +157,6 @@ TEST_F(Jobs, EveryOperationCanBeRefused)
         {"an unknown service", [&](unsigned& f) { return jobs->submitJob(unknownService, f); }, kDenied},
         {"a missing workspace", [&](unsigned& f) { return jobs->submitJob(missing, f); }, kDenied},
         {"an undeclared parameter", [&](unsigned& f) { return jobs->submitJob(undeclared, f); }, kDenied},
-        {"submitJobString", [&](unsigned& f) { return jobs->submitJobString(zeljob, absent, *none, f); }, kDenied},
-        {"scheduleJob", [&](unsigned& f) { return jobs->scheduleJob(missing, 1, f); }, kDenied},
-        {"scheduleJobString", [&](unsigned& f) { return jobs->scheduleJobString(zeljob, absent, 1, *none, f); },
-         kDenied},
-        {"transactJob", [&](unsigned&) { return jobs->transactJob(missing, *result); }, kDenied},
-        {"transactJobString", [&](unsigned&) { return jobs->transactJobString(zeljob, absent, *none, text); }, kDenied},
         {"abort an unknown job", [&](unsigned&) { return jobs->abortJob(987654); }, kDenied},
         {"the result of an unknown job", [&](unsigned& f) { return jobs->getJobResult(987654, f, *result); }, 0},
         {"its result text", [&](unsigned& f) { return jobs->getJobResultString(987654, f, text); }, 0},

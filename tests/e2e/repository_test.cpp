@@ -107,15 +107,8 @@ TEST_F(Repositories, TheManagerAndItsRepositories)
     IZELServerString& file = t(local("roads.zlw"));
     client.run({
         {"itemExists", [&](unsigned& f) { return gone.itemExists(item, f); }, kDenied},
-        {"getItem", [&](unsigned& f) { return gone.getItem(item, t(local("x")), f); }, kDenied},
         {"addItem", [&](unsigned&) { return gone.addItem(item, file); }, kDenied},
-        {"removeItemResource", [&](unsigned& f) { return gone.removeItemResource(item, t("r"), f); }, kDenied},
-        {"getItemResourcesView", [&](unsigned&) { return gone.getItemResourcesView(item, nullptr, *resources); },
-         kDenied},
         {"getWorkspaceView", [&](unsigned& f) { return gone.getWorkspaceView(item, *workspace, f); }, kDenied},
-        {"getTemplatesView", [&](unsigned&) { return gone.getTemplatesView(nullptr, *templates); }, kDenied},
-        {"workspaceServiceExists", [&](unsigned& f) { return gone.workspaceServiceExists(item, t("s"), f); }, kDenied},
-        {"registerWorkspaceService", [&](unsigned&) { return gone.registerWorkspaceService(item, t("s")); }, kDenied},
     });
 }
 
@@ -181,7 +174,6 @@ TEST_F(Repositories, ItemsAndResources)
 
 TEST_F(Repositories, ViewsDescribeTheItemsByKind)
 {
-    IZELServerSession& s = client.session();
     ZELServerStringDict enabled;
     enabled.insert("ENABLE_FILTER", "ENABLED");
     ZELServerStringDict wrong;

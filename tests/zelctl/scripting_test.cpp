@@ -14,6 +14,7 @@ protected:
     void SetUp() override
     {
         Zelctl::SetUp();
+        std::ofstream(local("greet.zlw")) << "# @parameter WHO | TEXT | nobody | Whom to greet\necho \"Hello $WHO\"\n";
         std::ofstream(local("fail.zlw")) << "#!/bin/sh\n# @title Fails\necho failing\nexit 3\n";
         ASSERT_EQ(ann({"repo", "create", "demo", "--description", "Demo items"}).status, 0);
         ASSERT_EQ(ann({"item", "put", "demo", local("greet.zlw")}).status, 0);
@@ -39,7 +40,6 @@ TEST_F(Scripting, ExitStatusesOutputAndErrorLines)
     const std::string delayed = job({"job", "schedule", "3600", "zeljob", "demo", "greet.zlw"});
     const std::string aborted = job({"job", "schedule", "3600", "zeljob", "demo", "greet.zlw"});
     ASSERT_EQ(ann({"job", "abort", aborted}).status, 0);
-    ASSERT_EQ(ann({"token", "set", "bob", "token-of-bob"}).status, 0);
     const char* any = nullptr;
     // A status from the library keeps its number; zelctl's own finding has none.
     const char* numbered = "error [1-9][0-9]*: [^\n]+\n";
@@ -74,7 +74,6 @@ TEST_F(Scripting, ExitStatusesOutputAndErrorLines)
         {{"repo", "list"}, 0, "REPOSITORY  DESCRIPTION\ndemo        Demo items\n", ""},
         {{"prop", "SERVER_NAME"}, 0, "zelserverd\n", ""},
         {{"whoami"}, 0, "account: ann\n", ""},
-        {{"--quiet", "item", "get", "demo", "greet.zlw", "-o", local("back.zlw")}, 0, "", ""},
         {{"repo", "show", "nope"}, 1, "", "error: no repository 'nope'\n"},
         {{"repo", "create", "demo"}, 1, "", numbered},
         {{"item", "put", "demo", local("greet.zlw")}, 1, "", numbered},
@@ -101,7 +100,6 @@ TEST_F(Scripting, ExitStatusesOutputAndErrorLines)
         if (c.err)
             EXPECT_TRUE(std::regex_match(run.err, std::regex(c.err))) << line << ": " << run.err;
     }
-    EXPECT_EQ(slurp(local("back.zlw")), kGreeter);
     EXPECT_NE(slurp(local("job.log")).find("Hello World"), std::string::npos);
     // Waiting asks the server a few times a second, not in a busy loop (the table waits some seconds).
     const std::string log = slurp(local("server.log"));

@@ -23,12 +23,6 @@ inline const char* kZelctlConfig = "[user ann]\npassword = pw-ann\nroles = admin
                                    "[user bob]\npassword = pw-bob\nroles = viewer\n"
                                    "[sharedresource DATA]\npath = shared\n";
 
-inline const char* kGreeter = "#!/bin/sh\n"
-                              "# @title Greeter\n"
-                              "# @description Says hello\n"
-                              "# @parameter WHO | TEXT | nobody | Whom to greet\n"
-                              "echo \"Hello $WHO\"\n";
-
 struct Outcome {
     int status = -1;
     std::string out;
@@ -50,7 +44,6 @@ protected:
     {
         server = std::make_unique<LocalServer>(ZEL_TEST_ZELSERVERD, kZelctlConfig);
         ASSERT_EQ(server->failure(), "");
-        std::ofstream(local("greet.zlw")) << kGreeter;
     }
 
     std::string local(const std::string& name) const { return server->directory() + "/" + name; }

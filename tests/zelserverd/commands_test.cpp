@@ -3,15 +3,12 @@
 // is refused through the library is the end-to-end suites' part.
 #include <gtest/gtest.h>
 
-#include <filesystem>
 #include <regex>
 
 #include "support/server_fixture.h"
 
 namespace zeltest {
 namespace {
-
-namespace fs = std::filesystem;
 
 const char* kRoads = R"(#!/bin/sh
 # A workspace that describes itself.

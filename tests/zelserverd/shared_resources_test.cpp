@@ -31,14 +31,9 @@ protected:
         return ann_->command(keyword,
                              {{"srName", "AREA"}, {"srSrcPath", pathDocument(from)}, {"srDestPath", pathDocument(to)}});
     }
-    WireReply upload(const std::string& path, const std::string& content,
-                     std::optional<std::uint32_t> crc = std::nullopt, bool check = true)
+    WireReply upload(const std::string& path, const std::string& content)
     {
-        return ann_->upload("SR_UPLOAD",
-                            {{"srName", "AREA"},
-                             {"srDestPath", pathDocument(path)},
-                             {"itemFileCRCCheckingEnabled", check ? "true" : "false"}},
-                            content, crc);
+        return ann_->upload("SR_UPLOAD", {{"srName", "AREA"}, {"srDestPath", pathDocument(path)}}, content);
     }
     Download download(const std::string& path)
     {

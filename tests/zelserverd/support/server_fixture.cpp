@@ -61,13 +61,6 @@ bool eventually(const std::function<bool()>& condition)
     return true;
 }
 
-bool processGone(const std::string& pid)
-{
-    const std::string text = readFile("/proc/" + pid + "/stat");
-    std::size_t paren = text.rfind(')');
-    return text.empty() || (paren != std::string::npos && text.substr(paren + 2, 1) == "Z");
-}
-
 std::string document(const std::string& elements) { return "<?xml version=\"1.0\"?>" + elements; }
 
 std::string withoutTimes(const std::string& text)
@@ -163,7 +156,7 @@ std::string ServerFixture::userOf(TestClient& client)
     return client.command("SERVER_SESSION_GET_PROP", {{"sessionPropName", "USER_NAME"}}).body;
 }
 
-std::map<std::string, std::string> parseResult(const std::string& text)
+static std::map<std::string, std::string> parseResult(const std::string& text)
 {
     std::map<std::string, std::string> entries;
     std::istringstream in(text);

@@ -33,12 +33,8 @@ bool eventually(const std::function<bool()>& condition);
 std::string document(const std::string& elements);
 // `text` with every time stamp of the server's form replaced by "TIME".
 std::string withoutTimes(const std::string& text);
-// A result text split into its name=value entries.
-std::map<std::string, std::string> parseResult(const std::string& text);
 // A "TRANSFORMATION_REQUEST" request text for REPO/NAME/NAME.zlw with published parameters.
 std::string requestText(const std::string& workspace, const Values& parameters = {});
-// Gone, or a zombie nobody has reaped yet: either way no longer running.
-bool processGone(const std::string& pid);
 
 class ServerFixture : public ::testing::Test {
 protected:
