@@ -87,10 +87,6 @@ TEST_F(RepositoryWire, ItemsResourcesAndTheirTransfers)
     run({
         {"only the exact truth word is true", on("REP_REMOVE_ITEM", {{"itemName", "a.zlw"}}), ok("True"),
          [&] { return outcome(repository.removeItem(S("a.zlw"), fresh()), flag); }, 0, "0 "},
-        {"a refusal clears the flag", on("REP_ITEMRESOURCEEXISTS", {{"itemName", "a.zlw"}, {"resourceName", "r"}}),
-         reply("ERROR", "Authorization Error: no rights"),
-         [&] { return outcome(repository.itemResourceExists(S("a.zlw"), S("r"), fresh()), flag); }, msg::kServerError,
-         "0 "},
         {"add item", on("REP_ADD_ITEM", {{"itemName", "roads.zlw"}, crcOff[0]}), readyAck(),
          [&] { return outcome(repository.addItem(S("roads.zlw"), S(item))); }, 0, "",
          uploadOf("workspace bytes\n", ok("true"))},

@@ -197,11 +197,6 @@ TEST_F(MountPointTest, EveryCommandOnTheWire)
                             [&] { return std::to_string(slurp(target) == big) + " " + outText(progress); });
          },
          0, "1 1 total 200013,start,at 0,at 131072,finish, ", downloadOf(big, reply("SUCCESS", "true"))},
-        {"download into a missing folder", none, none,
-         [&] {
-             return outcome(area.download(at("out/r.csv"), S((dir / "no" / "r").string()), fresh(), nullptr), flag);
-         },
-         msg::kLocalFileWrite, "0 "},
         {"download into no named target", download, fileHeader(5, crc32("hello")),
          [&] { return outcome(area.download(at("out/r.csv"), S(""), fresh(), nullptr), flag, leftTemporary); }, 0,
          "1 wb-tmp-XXXXXX.tmp=hello, ", downloadOf("hello", reply("SUCCESS", "true"))},
@@ -285,7 +280,6 @@ TEST(FileInfoReader, ReadsTheFirstDescriptionAndAFailureLeavesTheLastOneRead)
          R"(<PATH name="out" dirpath="jobs/7" abspath="jobs/7/out"/></FILEINFO></SR_GET>)",
          0, "dir 0 out|jobs/7|jobs/7/out"},
         {R"(<R><FILEINFO filetype="DIR" size="9" name="a" dirpath="in" abspath="in/a"/></R>)", 0, "dir 9 a|in|in/a"},
-        {"<SR_GET/>", static_cast<int>(msg::kUnreadableReply), "dir 9 a|in|in/a"},
         {"true", static_cast<int>(msg::kXmlFailure), "dir 9 a|in|in/a"},
         // Only the exact text "DIR" is a directory; the size is an unsigned number or zero.
         {R"(<R><FILEINFO filetype="dir" size="0x10"/></R>)", 0, "file 16 ||"},
