@@ -51,13 +51,6 @@ protected:
         return command(keyword, values);
     }
     static Bytes ok(const std::string& body) { return reply("SUCCESS", body); }
-    // The accessor document of an update command holding the one property the tests set.
-    static Bytes accessorUpdate(const std::string& keyword, const char* idName, const char* id)
-    {
-        return command(keyword, {{idName, id},
-                                 {"propertyAccessorObject",
-                                  xmlDocument(keyword, R"(<PROPERTY category="run" name="priority" value="high"/>)")}});
-    }
     std::string file(const std::string& name, const std::string& content) const
     {
         spew(scratch.path() / name, content);
@@ -240,9 +233,14 @@ TEST_F(RepositoryWire, ManagerAndServiceCommands)
          command("REP_GET_REGISTEREDITEMS", {{"serviceName", "download"}, {"itemType", "4"}}),
          ok(R"(<R><ITEM name="b.zlwt"/></R>)"),
          [&] { return outcome(service.getRegisteredItems(&templatesOnly, items)); }, 0, ""},
-        // The property-accessor updates of the four kinds of owner, each document named after its command.
-        {"service not saved yet", accessorUpdate("REP_UPDATE_SERVICEPROPERTYACCESSOR", "serviceID", "-1"), ok("true"),
-         [&] { return outcome(service.updatePropertyAccessor(accessor)); }, 0, ""},
+        // The property-accessor document is named after its command.
+        {"service not saved yet",
+         command(
+             "REP_UPDATE_SERVICEPROPERTYACCESSOR",
+             {{"serviceID", "-1"},
+              {"propertyAccessorObject", xmlDocument("REP_UPDATE_SERVICEPROPERTYACCESSOR",
+                                                     R"(<PROPERTY category="run" name="priority" value="high"/>)")}}),
+         ok("true"), [&] { return outcome(service.updatePropertyAccessor(accessor)); }, 0, ""},
     });
 }
 

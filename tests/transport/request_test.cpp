@@ -35,10 +35,6 @@ std::string textOf(const IZELServerRequest& request)
 TEST(Request, StartsWithKeywordThenTheIdentityDocumentWhenThereIsOneThenTheClientId)
 {
     const ZELServerIdentity fresh;
-    ZELServerTCPIPRequest none("REP_GET", nullptr, "");
-    EXPECT_EQ(textOf(none), "REP_GET\0clientID="s);
-    none.addValue("enableFilter", "All");
-    EXPECT_EQ(textOf(none), "REP_GET\0clientID=\0enableFilter=All"s);
     EXPECT_EQ(textOf(ZELServerTCPIPRequest("INIT", &fresh, "tool-7")),
               "INIT\0identityObject="s + kDeclaration +
                   R"(<INIT><IDENTITY id="" is_authenticated="false"><ROLES/></IDENTITY></INIT>)" +
