@@ -7,9 +7,7 @@
 
 #include <chrono>
 #include <functional>
-#include <fstream>
 #include <memory>
-#include <sstream>
 #include <string>
 #include <thread>
 #include <vector>

@@ -91,7 +91,6 @@ TEST_F(SharedResources, EveryFileOperationSucceedsAndIsRefused)
                   [&] { return !info->isDirectory() && info->getSize() == 12; }),
          kUntouched},
         {"describe a missing file", [&](unsigned&) { return area->getFileInfo(path("/none.txt"), *info); }, kDenied},
-        {"describe with flags", [&](unsigned&) { return area->getFileInfo(path("/a"), 1, *info); }, -393617},
         {"copy", [&](unsigned&) { return area->copy(path("/a/b/f.txt"), path("/a/g.txt")); }, kUntouched},
         {"copy a missing file", [&](unsigned&) { return area->copy(path("/none.txt"), path("/x.txt")); }, kDenied},
         {"copy a directory onto itself", [&](unsigned&) { return area->copy(path("/a"), path("/a")); }, kDenied},
