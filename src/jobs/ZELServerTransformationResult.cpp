@@ -19,6 +19,24 @@ std::string withoutPrefix(const std::string& key)
     return start == std::string::npos ? std::string() : key.substr(start);
 }
 
+// 1 with the converted property in `value`; 0, leaving `value` alone, when the property is missing or
+// does not convert.
+template <class Value, class Convert>
+unsigned convertProperty(const ZELServerTransformationResult& result, const std::string& name, Convert convert,
+                         Value& value)
+{
+    std::string found;
+    if (!result.findProperty(name, found)) {
+        return 0;
+    }
+    const auto converted = convert(found);
+    if (!converted) {
+        return 0;
+    }
+    value = *converted;
+    return 1;
+}
+
 }  // namespace
 
 // ---- Typed getters of the well-known properties ---------------------------------------------------
@@ -40,26 +58,13 @@ unsigned ZELServerTransformationResult::getID(unsigned& id) const
 
 unsigned ZELServerTransformationResult::getJobStatus(unsigned& code) const
 {
-    return guarded([&]() -> unsigned {
-        std::string word;
-        if (!findProperty(fromText("jobStatus"), word)) {
-            return 0;
-        }
-        const std::optional<unsigned> known = jobStatusCode(word);
-        if (!known) {
-            return 0;
-        }
-        code = *known;
-        return 1;
-    });
+    return guarded([&] { return convertProperty(*this, fromText("jobStatus"), jobStatusCode, code); });
 }
 
 unsigned ZELServerTransformationResult::isSuccess() const
 {
-    return guarded([&] {
-        unsigned code = 0;
-        return getJobStatus(code) != 0 && code == kJobStatusSuccess ? 1 : 0;
-    });
+    unsigned code = 0;
+    return getJobStatus(code) != 0 && code == kJobStatusSuccess ? 1 : 0;
 }
 
 unsigned ZELServerTransformationResult::getResultSuccess() const
@@ -190,7 +195,7 @@ unsigned ZELServerTransformationResult::getBoolProperty(const IZELServerString& 
 
 unsigned ZELServerTransformationResult::lookupProperty(const std::string& name, std::string& value) const
 {
-    return guarded([&] { return findProperty(name, value); });
+    return findProperty(name, value);
 }
 
 unsigned ZELServerTransformationResult::getStringProperty(const std::string& name, IZELServerString& value) const
@@ -207,18 +212,7 @@ unsigned ZELServerTransformationResult::getStringProperty(const std::string& nam
 
 unsigned ZELServerTransformationResult::getFloatProperty(const std::string& name, float& value) const
 {
-    return guarded([&]() -> unsigned {
-        std::string found;
-        if (!findProperty(name, found)) {
-            return 0;
-        }
-        const std::optional<float> number = toFloat(found);
-        if (!number) {
-            return 0;
-        }
-        value = *number;
-        return 1;
-    });
+    return guarded([&] { return convertProperty(*this, name, toFloat, value); });
 }
 
 unsigned ZELServerTransformationResult::getUIntPropertyAnyBase(const std::string& name, unsigned& value) const
@@ -253,18 +247,7 @@ unsigned ZELServerTransformationResult::getUIntProperty(const std::string& name,
 
 unsigned ZELServerTransformationResult::getBoolProperty(const std::string& name, unsigned& value) const
 {
-    return guarded([&]() -> unsigned {
-        std::string found;
-        if (!findProperty(name, found)) {
-            return 0;
-        }
-        const std::optional<bool> flag = toBoolean(found);
-        if (!flag) {
-            return 0;
-        }
-        value = *flag ? 1 : 0;
-        return 1;
-    });
+    return guarded([&] { return convertProperty(*this, name, toBoolean, value); });
 }
 
 unsigned ZELServerTransformationResult::findProperty(const std::string& name, std::string& value) const

@@ -116,7 +116,7 @@ IZELServerStatus* ZELServerRepository::getItem(const IZELServerString& itemName,
 IZELServerStatus* ZELServerRepository::getItem(const IZELServerString& itemName,
                                                const IZELServerString& destinationPath, unsigned& received)
 {
-    return guarded([&] { return getItem(itemName, destinationPath, received, nullptr); });
+    return getItem(itemName, destinationPath, received, nullptr);
 }
 
 IZELServerStatus* ZELServerRepository::addItem(const IZELServerString& itemName, const IZELServerString& sourcePath,
@@ -135,7 +135,7 @@ IZELServerStatus* ZELServerRepository::addItem(const IZELServerString& itemName,
 
 IZELServerStatus* ZELServerRepository::addItem(const IZELServerString& itemName, const IZELServerString& sourcePath)
 {
-    return guarded([&] { return addItem(itemName, sourcePath, nullptr); });
+    return addItem(itemName, sourcePath, nullptr);
 }
 
 // Only emptiness is checked here, unlike addItem: an item already on the server is replaced under
@@ -155,7 +155,7 @@ IZELServerStatus* ZELServerRepository::updateItem(const IZELServerString& itemNa
 
 IZELServerStatus* ZELServerRepository::updateItem(const IZELServerString& itemName, const IZELServerString& sourcePath)
 {
-    return guarded([&] { return updateItem(itemName, sourcePath, nullptr); });
+    return updateItem(itemName, sourcePath, nullptr);
 }
 
 IZELServerStatus* ZELServerRepository::removeItem(const IZELServerString& itemName, unsigned& removed)
@@ -210,7 +210,7 @@ IZELServerStatus* ZELServerRepository::getItemResource(const IZELServerString& i
                                                        const IZELServerString& resourceName,
                                                        const IZELServerString& destinationPath, unsigned& received)
 {
-    return guarded([&] { return getItemResource(itemName, resourceName, destinationPath, received, nullptr); });
+    return getItemResource(itemName, resourceName, destinationPath, received, nullptr);
 }
 
 // Only the item name is checked: the resource name goes to the server as given.
@@ -259,7 +259,7 @@ IZELServerStatus* ZELServerRepository::addItemResource(const IZELServerString& i
                                                        const IZELServerString& resourceName,
                                                        const IZELServerString& sourcePath)
 {
-    return guarded([&] { return addItemResource(itemName, resourceName, sourcePath, nullptr); });
+    return addItemResource(itemName, resourceName, sourcePath, nullptr);
 }
 
 IZELServerStatus* ZELServerRepository::updateItemResource(const IZELServerString& itemName,
@@ -275,7 +275,7 @@ IZELServerStatus* ZELServerRepository::updateItemResource(const IZELServerString
                                                           const IZELServerString& resourceName,
                                                           const IZELServerString& sourcePath)
 {
-    return guarded([&] { return updateItemResource(itemName, resourceName, sourcePath, nullptr); });
+    return updateItemResource(itemName, resourceName, sourcePath, nullptr);
 }
 
 IZELServerStatus* ZELServerRepository::removeItemResource(const IZELServerString& itemName,

@@ -125,7 +125,7 @@ IZELServerStatus* ZELServerMountPoint::getFileInfo(const IZELServerPath& path, u
 
 IZELServerStatus* ZELServerMountPoint::getFileInfo(const IZELServerPath& path, IZELServerFileInfo& info)
 {
-    return guarded([&] { return getFileInfo(path, 0, info); });
+    return getFileInfo(path, 0, info);
 }
 
 IZELServerStatus* ZELServerMountPoint::listOnce(const IZELServerPath& path,
@@ -196,7 +196,7 @@ IZELServerStatus* ZELServerMountPoint::listWithin(const IZELServerPath& path, un
 
 IZELServerStatus* ZELServerMountPoint::list(const IZELServerPath& path, IZELServerVector<IZELServerFileInfo>& entries)
 {
-    return guarded([&] { return list(path, 0, entries); });
+    return list(path, 0, entries);
 }
 
 IZELServerStatus* ZELServerMountPoint::makeDirectory(const IZELServerPath& path)
