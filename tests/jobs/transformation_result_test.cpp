@@ -11,9 +11,8 @@
 
 #include "api/ZELServerString.h"
 #include "api/ZELServerStringArray.h"
-#include "support/wire_table.h"
 #include "jobs/result_text.h"
-#include <optional>
+#include "support/wire_table.h"
 
 using namespace std::string_literals;
 
@@ -150,8 +149,7 @@ TEST(TransformationResult, ParsingAgainAddsAndOverwritesButNeverRemoves)
     EXPECT_EQ(result.properties().size(), 3u);
 }
 
-// The job result text: entries into properties, the split of "result", and the job status words.
-// Pure functions over bytes, so every case is a row of a table.
+// The job result text: entries into properties and the split of "result".
 TEST(ResultText, EntriesGiveExactlyTheseProperties)
 {
     const struct {
@@ -184,18 +182,6 @@ TEST(ResultText, EntriesGiveExactlyTheseProperties)
         parseResultEntries(c.text, properties);
         splitResultValue(properties);
         EXPECT_EQ(properties, c.expected) << c.what;
-    }
-}
-
-TEST(ResultText, JobStatusWordsMapToTheirCodes)
-{
-    const std::pair<const char*, std::optional<unsigned>> cases[] = {
-        {"SUBMITTED", 0}, {"QUEUED", 1},   {"DELAYED", 2},   {"PAUSED", 3},      {"IN_PROCESS", 4},
-        {"DELETED", 5},   {"ABORTED", 6},  {"SUCCESS", 7},   {"ZEL_FAILURE", 8}, {"JOB_FAILURE", 9},
-        {"PULLED", 10},   {"success", {}}, {"SUCCESS ", {}}, {"", {}},
-    };
-    for (const auto& [word, code] : cases) {
-        EXPECT_EQ(jobStatusCode(word), code) << word;
     }
 }
 

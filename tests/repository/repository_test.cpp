@@ -83,8 +83,6 @@ TEST_F(RepositoryWire, ItemsResourcesAndTheirTransfers)
         {"add item", on("REP_ADD_ITEM", {{"itemName", "roads.zlw"}, crcOff[0]}), readyAck(),
          [&] { return outcome(repository.addItem(S("roads.zlw"), S(item))); }, 0, "",
          uploadOf("workspace bytes\n", ok("true"))},
-        {"add item checks the name", none, none, [&] { return outcome(repository.addItem(S("dir/a.zlw"), S(item))); },
-         msg::kForbiddenCharacter, ""},
         {"update item lets any name through", on("REP_UPDATE_ITEM", {{"itemName", "dir/a.zlw"}, crcOff[0]}), readyAck(),
          [&] { return outcome(repository.updateItem(S("dir/a.zlw"), S(item))); }, 0, "",
          uploadOf("workspace bytes\n", ok("true"))},
@@ -100,10 +98,6 @@ TEST_F(RepositoryWire, ItemsResourcesAndTheirTransfers)
         {"get item", on("REP_GET_ITEM", {{"itemName", "roads.zlw"}, crcOff[0]}), fileHeader(big.size(), crc32(big)),
          [&] { return outcome(repository.getItem(S("roads.zlw"), S(destination), fresh()), flag, downloaded); }, 0,
          "1 wwwwwwwwwwwwwwwwwwww ", downloadOf(big, ok("true"))},
-        {"an empty item is no item", on("REP_GET_ITEM", {{"itemName", "roads.zlw"}, crcOff[0]}),
-         fileHeader(0, crc32("")),
-         [&] { return outcome(repository.getItem(S("roads.zlw"), S(destination), fresh()), flag, downloaded); },
-         msg::kEmptyDownload, "0 wwwwwwwwwwwwwwwwwwww ", downloadOf("", ok("true"))},
     });
 }
 

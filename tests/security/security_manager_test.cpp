@@ -30,8 +30,8 @@ const Str kAccount("ann");
 // Token, client address and timeout of a token, as one text.
 std::string fieldsOf(const IZELServerUserToken& token)
 {
-    Str text;
-    Str address;
+    Str text("stale");
+    Str address("stale");
     token.getToken(text);
     token.getClientAddress(address);
     return text.str() + "|" + address.str() + "|" + std::to_string(token.getExpirationTimeout());
@@ -86,10 +86,6 @@ TEST_F(SecurityManagerTest, EveryCommandSendsItsBytesAndReadsItsAnswer)
         unsigned code;
         std::string after;  // flag and the caller's token
     } rows[] = {
-        {"exists", account("SEC_USERTOKEN_EXISTS"), reply("SUCCESS", "true"), false,
-         flagCall(&Manager::userTokenExists), 0, 0, "1 mine|::1|60"},
-        {"remove", account("SEC_REMOVE_USERTOKEN"), reply("SUCCESS", "false"), true,
-         flagCall(&Manager::removeUserToken), 0, 0, "0 mine|::1|60"},
         // A body that is no exact truth value keeps the caller's value and is no failure.
         {"expired, no truth value", account("SEC_USERTOKEN_EXPIRED"), reply("SUCCESS", "True"), true,
          flagCall(&Manager::userTokenExpired), 0, 0, "1 mine|::1|60"},
@@ -134,12 +130,7 @@ TEST_F(SecurityManagerTest, EveryCommandSendsItsBytesAndReadsItsAnswer)
 // Every field of a token, as one text.
 std::string allFieldsOf(const ZELServerUserToken& token)
 {
-    ZELServerString text("stale");
-    ZELServerString address("stale");
-    token.getToken(text);
-    token.getClientAddress(address);
-    return text.str() + "|" + address.str() + "|" + std::to_string(token.getExpirationTimeout()) + "|" +
-           token.firstTokenDate() + "|" + token.lastTokenDate() + "|" + token.expirationDate();
+    return fieldsOf(token) + "|" + token.firstTokenDate() + "|" + token.lastTokenDate() + "|" + token.expirationDate();
 }
 
 TEST(UserTokenReader, ReadsTheChildOfTheDocumentElementOrLeavesTheTokenAlone)

@@ -44,11 +44,6 @@ IZELServerStatus* addItem(IZELServerSession& s, const std::string& file, unsigne
     return zelServerOwn(s, s.createRepository())->addItem(t("a.zlw"), t(file + ".zlw"));
 }
 
-// Every download answers the same way: the file header, the content, and the final "true".
-const std::vector<Step> kDownload = {readFrame(), answer(fileHeader(kContent.size(), crc32(kContent))),
-                                     readFrame(), {Step::Write, kContent},
-                                     readFrame(), answer(reply("SUCCESS", "true"))};
-
 const struct {
     const char* name;
     std::vector<Step> cut;  // the exchange whose answer is cut, after the sign-in
@@ -65,9 +60,15 @@ const struct {
       {Step::ReadRaw, {}, kContent.size()},
       answer(reply("SUCCESS", "true"))},
      addItem},
-    {"item", kDownload, getItem},
-    {"item resource", kDownload, getItemResource},
-    {"job log", kDownload, getLogFile},
+    // Every download shares this answer and its reading: the file header, the content, the final "true".
+    {"download",
+     {readFrame(),
+      answer(fileHeader(kContent.size(), crc32(kContent))),
+      readFrame(),
+      {Step::Write, kContent},
+      readFrame(),
+      answer(reply("SUCCESS", "true"))},
+     getItem},
     // Only the answer on the command's own connection: after all of it the library waits for the
     // server's call on the result port, which no hang-up ends.
     {"result port", {readFrame(), answer(reply("SUCCESS", "queued"))}, transactJob},
