@@ -29,10 +29,8 @@ inline const char* kE2eConfig = "[user ann]\npassword = pw-ann\nroles = admin\n"
                                 "[user zed]\npassword = pw-zed\nroles = outsider\n"
                                 "[sharedresource DATA]\npath = shared\n";
 
-// The status number of a request the server answered with an error, and of an argument the library
-// refuses before sending.
+// The status number of a request the server answered with an error.
 constexpr unsigned kRefused = 393625;
-constexpr unsigned kBadArgument = 393619;
 
 // Job status codes of IZELServerTransformationResult::getJobStatus.
 enum JobStatus : unsigned { kQueued = 1, kDelayed = 2, kInProcess = 4, kAborted = 6, kSucceeded = 7, kJobFailed = 9 };
@@ -46,9 +44,8 @@ struct Step {
     Operation operation;
     long expected;  // the flag after success, or minus the status number
 };
-// The outcome of a step the server refuses, and of one the library refuses before sending.
+// The outcome of a step the server refuses.
 constexpr long kDenied = -static_cast<long>(kRefused);
-constexpr long kInvalid = -static_cast<long>(kBadArgument);
 // `operation`, answering the entries of `list` after it.
 template <typename List>
 Operation counting(List& list, std::function<IZELServerStatus*()> operation)

@@ -1,15 +1,14 @@
 // The real executable: its command line, its one stdout line, the generated administrator kept as a
 // hash, and a clean exit on SIGTERM and SIGINT.
 #include <gtest/gtest.h>
-#include <poll.h>
 #include <signal.h>
 #include <sys/stat.h>
 #include <sys/wait.h>
-#include <unistd.h>
 
-#include <chrono>
+#include <cstdio>
+#include <cstdlib>
 #include <regex>
-#include <thread>
+#include <utility>
 
 #include "auth.h"
 #include "support/server_fixture.h"
@@ -19,81 +18,49 @@ namespace {
 
 using namespace std::string_literals;
 
-// A started server with the read ends of its standard output and standard error.
-struct Process {
-    pid_t pid = -1;
-    int out = -1;
-    int err = -1;
-
-    // Reads `fd` until it ends, holds a whole line when `line`, or the time-out passes.
-    static std::string read(int fd, bool line, int timeoutMs = 20000)
+// The server, run by a shell that prints its own process id and then becomes the server; its standard
+// error goes to the file `errors`.
+class Process {
+public:
+    Process(const std::vector<std::string>& args, const std::string& errors)
     {
-        std::string text;
-        auto deadline = std::chrono::steady_clock::now() + std::chrono::milliseconds(timeoutMs);
-        while (!(line && text.find('\n') != std::string::npos) && std::chrono::steady_clock::now() < deadline) {
-            pollfd p{fd, POLLIN, 0};
-            if (::poll(&p, 1, 100) != 1)
-                continue;
-            char buffer[512];
-            ssize_t n = ::read(fd, buffer, sizeof buffer);
-            if (n <= 0)
-                break;
-            text.append(buffer, static_cast<std::size_t>(n));
-        }
-        return text;
+        std::string command = "echo $$; exec " ZELSERVERD_EXECUTABLE;
+        for (const std::string& arg : args)
+            command += " '" + arg + "'";
+        out_ = ::popen((command + " 2>'" + errors + "'").c_str(), "r");
+        pid_ = std::atoi(line().c_str());
+    }
+    // The next line of its standard output; "" at its end.
+    std::string line()
+    {
+        char text[512];
+        return out_ != nullptr && std::fgets(text, sizeof text, out_) != nullptr ? text : "";
     }
     // The port of its "listening on" line, 0 when the line is something else.
-    std::uint16_t port() const
+    std::uint16_t port()
     {
-        std::string line = read(out, true);
         std::smatch match;
-        if (!std::regex_match(line, match, std::regex("^listening on 127\\.0\\.0\\.1:([0-9]+)\n$")))
+        const std::string text = line();
+        if (!std::regex_match(text, match, std::regex("^listening on 127\\.0\\.0\\.1:([0-9]+)\n$")))
             return 0;
         return static_cast<std::uint16_t>(std::stoi(match[1]));
     }
-    // Its exit status once it has ended (-2: killed for not ending in time), and its standard error.
-    std::pair<int, std::string> finish()
+    ~Process() { finish(SIGKILL); }
+    // Sends `signal` (none when 0) and waits for the end; the exit status, -1 for any other end.
+    int finish(int signal = 0)
     {
-        int code = -2;
-        for (int waited = 0; waited < 20000 && code == -2; waited += 20) {
-            int status = 0;
-            if (::waitpid(pid, &status, WNOHANG) == pid)
-                code = WIFEXITED(status) ? WEXITSTATUS(status) : -1;
-            else
-                std::this_thread::sleep_for(std::chrono::milliseconds(20));
-        }
-        if (code == -2) {
-            ::kill(pid, SIGKILL);
-            ::waitpid(pid, nullptr, 0);
-        }
-        std::string errors = read(err, false, 2000);
-        ::close(out);
-        ::close(err);
-        return {code, errors};
+        if (out_ == nullptr)
+            return -1;
+        if (signal != 0 && pid_ > 0)
+            ::kill(pid_, signal);
+        const int status = ::pclose(std::exchange(out_, nullptr));
+        return WIFEXITED(status) ? WEXITSTATUS(status) : -1;
     }
-};
 
-Process spawnServer(std::vector<std::string> args)
-{
-    int outPipe[2], errPipe[2];
-    if (::pipe(outPipe) != 0 || ::pipe(errPipe) != 0)
-        return {};
-    pid_t pid = ::fork();
-    if (pid == 0) {
-        ::dup2(outPipe[1], 1);
-        ::dup2(errPipe[1], 2);
-        std::string exe = ZELSERVERD_EXECUTABLE;
-        std::vector<char*> argv{exe.data()};
-        for (auto& arg : args)
-            argv.push_back(arg.data());
-        argv.push_back(nullptr);
-        ::execv(exe.c_str(), argv.data());
-        ::_exit(127);
-    }
-    ::close(outPipe[1]);
-    ::close(errPipe[1]);
-    return {pid, outPipe[0], errPipe[0]};
-}
+private:
+    FILE* out_ = nullptr;
+    pid_t pid_ = 0;
+};
 
 class Executable : public ::testing::Test {
 protected:
@@ -104,10 +71,10 @@ protected:
 
 TEST_F(Executable, GeneratesAnAdministratorOnceAndStopsOnSigterm)
 {
-    std::string data = root_ + "/data";
-    Process first = spawnServer({"--data", data, "--listen", "127.0.0.1:0"});
-    ASSERT_GT(first.pid, 0);
-    std::uint16_t port = first.port();
+    const std::string data = root_ + "/data";
+    const std::string errors = root_ + "/errors";
+    Process first({"--data", data, "--listen", "127.0.0.1:0"}, errors);
+    const std::uint16_t port = first.port();
     ASSERT_NE(port, 0);
     std::string password = readFile(data + "/admin-password");
     ASSERT_EQ(password.back(), '\n');
@@ -126,20 +93,19 @@ TEST_F(Executable, GeneratesAnAdministratorOnceAndStopsOnSigterm)
         EXPECT_EQ(client.command("SERVER_SESSION_GET_PROP", {{"sessionPropName", "USER_NAME"}}).body, "admin");
         EXPECT_EQ(client.signIn("admin", "admin").status, "ERROR");
     }
-    ::kill(first.pid, SIGTERM);
-    auto [code, log] = first.finish();
-    EXPECT_EQ(code, 0);
+    EXPECT_EQ(first.finish(SIGTERM), 0);
+    const std::string log = readFile(errors);
     for (const std::string& line : {"created user 'admin' with password " + password,
                                     "user=admin command=SERVER_SESSION_GET_PROP outcome=SUCCESS"s,
                                     "user=- command=SERVER_SESSION_INIT outcome=ERROR"s})
         EXPECT_NE(log.find(line), std::string::npos) << log;
 
     // A second start keeps the password and does not print it again; SIGINT also stops it.
-    Process second = spawnServer({"--data", data, "--listen", "127.0.0.1:0", "--quiet"});
+    Process second({"--data", data, "--listen", "127.0.0.1:0", "--quiet"}, errors);
     ASSERT_NE(second.port(), 0);
     EXPECT_EQ(readFile(data + "/admin-password"), password + "\n");
-    ::kill(second.pid, SIGINT);
-    EXPECT_EQ(second.finish(), std::make_pair(0, std::string()));
+    EXPECT_EQ(second.finish(SIGINT), 0);
+    EXPECT_EQ(readFile(errors), "");
 }
 
 TEST_F(Executable, RefusesBadArgumentsAndConfigs)
@@ -161,10 +127,8 @@ TEST_F(Executable, RefusesBadArgumentsAndConfigs)
         {{"--data", root_ + "/d", "--config", root_ + "/missing.conf"}, "cannot read config file", 1},
     };
     for (const Case& c : cases) {
-        Process p = spawnServer(c.args);
-        ASSERT_GT(p.pid, 0);
-        auto [code, err] = p.finish();
-        EXPECT_EQ(code, c.code) << err;
+        EXPECT_EQ(Process(c.args, root_ + "/errors").finish(), c.code);
+        const std::string err = readFile(root_ + "/errors");
         EXPECT_NE(err.find(c.expected), std::string::npos) << err;
     }
 }

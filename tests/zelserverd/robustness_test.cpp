@@ -34,13 +34,12 @@ protected:
 // `inner` wrapped in `levels` elements.
 std::string nested(int levels, const std::string& inner)
 {
-    std::string text;
-    for (int i = 0; i < levels; ++i)
-        text += "<n>";
-    text += inner;
-    for (int i = 0; i < levels; ++i)
-        text += "</n>";
-    return text;
+    std::string open, close;
+    for (int i = 0; i < levels; ++i) {
+        open += "<n>";
+        close += "</n>";
+    }
+    return open + inner + close;
 }
 
 TEST_F(Robustness, FramesUpToTheLimitAreReadLargerOnesCloseOnlyThatConnection)
