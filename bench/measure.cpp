@@ -43,12 +43,24 @@ double median(std::vector<double> values)
     return values.size() % 2 != 0 ? values[mid] : (values[mid - 1] + values[mid]) / 2;
 }
 
-Samples interleave(unsigned rounds, const std::function<void()>& library, const std::function<void()>& raw)
+Samples interleave(unsigned rounds, const std::function<void()>& library, const std::function<void()>& raw,
+                   const std::function<void()>& after)
 {
     Samples samples;
+    const auto timed = [&](const std::function<void()>& work, std::vector<double>& into) {
+        into.push_back(secondsOf(work));
+        if (after) {
+            after();
+        }
+    };
     for (unsigned i = 0; i < rounds; ++i) {
-        samples.library.push_back(secondsOf(library));
-        samples.raw.push_back(secondsOf(raw));
+        if (i % 2 == 0) {
+            timed(library, samples.library);
+            timed(raw, samples.raw);
+        } else {
+            timed(raw, samples.raw);
+            timed(library, samples.library);
+        }
     }
     return samples;
 }

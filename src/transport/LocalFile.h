@@ -57,6 +57,8 @@ public:
     std::optional<std::uint32_t> crc32() const;
 
 private:
+    void unbuffer();
+
     std::string path_;
     Mode mode_;
     std::fstream stream_;          // Mode::Read
