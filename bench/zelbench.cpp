@@ -68,6 +68,7 @@ Options parse(int argc, char** argv)
             o.transferRounds = 3;
             o.calls = 50;
             o.server.jobs = 3;
+            o.server.uploads = 3;
             o.server.seconds = 0.2;
         } else if (arg == "--size-mib") {
             o.transferMiB = std::stoull(next());

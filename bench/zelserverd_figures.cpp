@@ -23,6 +23,8 @@ namespace {
 constexpr const char* kAdmin = "admin";
 constexpr const char* kNoOpWorkspace = "#!/bin/sh\n# @title No-op\n# @description Ends at once.\nexit 0\n";
 constexpr const char* kRepositoryName = "bench";
+constexpr const char* kSharedResource = "DEFAULT";  // the one zelserverd makes without a configuration
+constexpr std::size_t kSmallFileBytes = 64 * 1024;
 
 // zelserverd on a free loopback port with a fresh data directory; stopped and removed on destruction.
 class Zelserverd {
@@ -125,6 +127,71 @@ double noOpJobSeconds(LibraryClient& client)
     return seconds;
 }
 
+// Seconds per acknowledged upload of a small file into the default shared resource.
+std::vector<double> smallUploadSeconds(LibraryClient& client, const std::string& workDir, unsigned count)
+{
+    const std::string local = workDir + "/small.dat";
+    std::ofstream(local, std::ios::binary) << std::string(kSmallFileBytes, 'z');
+    IZELServerSession& session = client.session();
+    IZELServerMountPoint* mountPoint = session.createMountPoint();
+    unsigned found = 0;
+    IZELServerStatus* status =
+        session.getMountPointManager()->getSharedResource(client.text(kSharedResource), *mountPoint, found);
+    IZELServerPath* path = found != 0 ? mountPoint->createPath(client.text("/small.dat")) : nullptr;
+    std::vector<double> samples;
+    for (unsigned i = 0; status == nullptr && path != nullptr && i < count; ++i) {
+        samples.push_back(secondsOf([&] { status = mountPoint->upload(client.text(local), *path, nullptr); }));
+    }
+    if (path != nullptr) {
+        mountPoint->releaseObject(path);
+    }
+    session.destroyMountPoint(&mountPoint);
+    client.check(status, "upload");
+    if (samples.size() != count) {
+        throw std::runtime_error("zelserverd has no shared resource " + std::string(kSharedResource));
+    }
+    return samples;
+}
+
+// A small file written beside `dir`'s other files and renamed into place, as an upload ends, with or
+// without the flushes of the file and of its directory that make it survive a power loss.
+void writeAndRename(const std::string& dir, bool flushed)
+{
+    const std::string temporary = dir + "/.bench-flush", target = dir + "/bench-flush.dat";
+    const std::string content(kSmallFileBytes, 'z');
+    const int fd = ::open(temporary.c_str(), O_WRONLY | O_CREAT | O_TRUNC | O_CLOEXEC, 0644);
+    bool good = fd >= 0 && ::write(fd, content.data(), content.size()) == static_cast<ssize_t>(content.size()) &&
+                (!flushed || ::fsync(fd) == 0);
+    good = fd >= 0 && ::close(fd) == 0 && good && ::rename(temporary.c_str(), target.c_str()) == 0;
+    if (good && flushed) {
+        const int dirFd = ::open(dir.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC);
+        good = dirFd >= 0 && ::fsync(dirFd) == 0;
+        good = dirFd >= 0 && ::close(dirFd) == 0 && good;
+    }
+    if (!good) {
+        throw std::runtime_error("cannot write and rename a file in " + dir);
+    }
+}
+
+void measureDurability(LibraryClient& client, const Zelserverd& server, const ServerFigureOptions& options,
+                       std::vector<Row>& rows)
+{
+    std::vector<double> uploads = smallUploadSeconds(client, options.workDir, options.uploads);
+    std::sort(uploads.begin(), uploads.end());
+    const double uploadMs = median(uploads) * 1e3;
+    rows.push_back({"zelserverd: 64 KiB upload, acknowledged once file and directory are on disk (median of " +
+                        std::to_string(uploads.size()) + ")",
+                    fixed(uploadMs, 2) + " ms", "", "", "", ""});
+    // The same file system as the uploads: flushing is what the acknowledgement waits for.
+    const Samples s = interleave(
+        options.uploads, [&] { writeAndRename(server.dataDir(), true); },
+        [&] { writeAndRename(server.dataDir(), false); });
+    const double flushedMs = median(s.library) * 1e3, plainMs = median(s.raw) * 1e3;
+    rows.push_back({"flush cost on its file system: 64 KiB write + rename with fsync of file and directory, "
+                    "against without",
+                    fixed(flushedMs, 2) + " ms", fixed(plainMs, 2) + " ms", fixed(flushedMs / plainMs, 1), "", ""});
+}
+
 // Commands per second of `sessions` sessions, each on its own thread, asking repositoryExists.
 double throughput(const Zelserverd& server, unsigned sessions, double seconds)
 {
@@ -178,6 +245,7 @@ void measureZelserverd(const ServerFigureOptions& options, std::vector<Row>& row
         {"zelserverd: no-op job, submit to result (median of " + std::to_string(samples.size()) + ")",
          fixed(ms, 2) + " ms (min " + fixed(samples.front() * 1e3, 2) + ", max " + fixed(samples.back() * 1e3, 2) + ")",
          "", "", "<= 5 ms", metText(ms <= 5.0)});
+    measureDurability(*client, server, options, rows);
     for (const unsigned sessions : {1u, 2u, 4u}) {
         const double rate = throughput(server, sessions, options.seconds);
         rows.push_back({"zelserverd: repositoryExists throughput, " + std::to_string(sessions) + " session(s)",
