@@ -37,26 +37,14 @@ void writeCatalogue(const Home& home, const std::string& text)
 
 std::string message(const StatusPtr& status) { return status->getMessage(); }
 
-TEST(ServerStatus, TextsComeFromTheShippedCatalogueWithCodeAndParametersFilledIn)
+// The shipped catalogue's texts with their slots filled are the messages the other suites compare.
+TEST(ServerStatus, AParameterIsInsertedAsItIsAndNoMemoryMakesNoStatus)
 {
     ScopedEnv home("ZEL_SERVERAPI_HOME", nullptr);
-    const struct {
-        StatusPtr status;
-        unsigned number;
-        unsigned code;
-        const char* text;
-    } cases[] = {
-        {StatusPtr(zel::makeStatus(zel::msg::kInvalidArgument, std::vector<std::string>{"keyword", "  "})), 393617, 0,
-         "The argument \"keyword\" has an invalid value: \"  \"."},
-        // A parameter is inserted as it is, its own percent signs and slot-like text included.
-        {StatusPtr(zel::makeStatus(zel::msg::kForbiddenCharacter, "%1%")), 393626, 0,
-         "A name may not contain any of these characters: %1%"},
-    };
-    for (const auto& c : cases) {
-        EXPECT_EQ(message(c.status), c.text);
-        EXPECT_EQ(c.status->getMessageNumber(), c.number) << c.text;
-        EXPECT_EQ(c.status->getCode(), c.code) << c.text;
-    }
+    const StatusPtr status(zel::makeStatus(zel::msg::kForbiddenCharacter, "%1%"));
+    EXPECT_EQ(message(status), "A name may not contain any of these characters: %1%");
+    EXPECT_EQ(status->getMessageNumber(), 393626u);
+    EXPECT_EQ(status->getCode(), 0u);
     zel::heap::failNextAllocations(1);
     EXPECT_EQ(zel::makeStatus(zel::msg::kConnectFailed), nullptr) << "no memory, no status";
 }

@@ -41,7 +41,21 @@ std::string written(const IZELServerIdentity& identity)
     return out.substr(out.find("<R>") + 3, out.size() - out.find("<R>") - 7);
 }
 
-TEST(Identity, ReadsIdFlagAndRolesAndWritesThemBack)
+// A caller's own identity, whose text the library cannot write unless it is UTF-8.
+class ForeignIdentity final : public IZELServerIdentity {
+public:
+    ForeignIdentity(std::string id, std::string role) : id_(std::move(id)), role_(std::move(role)) {}
+    void getId(IZELServerString& out) const override { out.assign(id_.c_str()); }
+    void getRoles(IZELServerStringArray& out) const override { out.append(role_.c_str()); }
+    bool isAuthenticated() const override { return true; }
+    void readFromXml(const xercesc_3_2::DOMElement&) override {}
+
+private:
+    std::string id_;
+    std::string role_;
+};
+
+TEST(Identity, ReadsIdFlagAndRolesAndWritesThemBackUnlessTheyAreNotUtf8)
 {
     const std::pair<const char*, const char*> cases[] = {
         {R"(<IDENTITY id="ann &amp; co"/>)",
@@ -74,6 +88,8 @@ TEST(Identity, ReadsIdFlagAndRolesAndWritesThemBack)
     readInto(identity, R"(<IDENTITY ID="ann" Is_Authenticated="true"><ROLES><ROLE name="r"/></ROLES></IDENTITY>)");
     EXPECT_EQ(written(identity),
               R"(<IDENTITY id="" is_authenticated="false"><ROLES><ROLE name="r"/><ROLE name="r"/></ROLES></IDENTITY>)");
+    EXPECT_EQ(written(ForeignIdentity("caf\xE9", "r")), std::to_string(msg::kXmlFailure));
+    EXPECT_EQ(written(ForeignIdentity("ann", "\xFF")), std::to_string(msg::kXmlFailure));
 }
 
 TEST(SingleSignOnIdentity, StateIsExactlyAKnownWordAndTheDataIsHandedOutOnce)
@@ -86,26 +102,6 @@ TEST(SingleSignOnIdentity, StateIsExactlyAKnownWordAndTheDataIsHandedOutOnce)
     EXPECT_EQ(data.str(), "tok=1&x");
     identity.takeAuthData(data);
     EXPECT_EQ(data.str(), "");
-}
-
-// A caller's own identity, whose text the library cannot write unless it is UTF-8.
-class ForeignIdentity final : public IZELServerIdentity {
-public:
-    ForeignIdentity(std::string id, std::string role) : id_(std::move(id)), role_(std::move(role)) {}
-    void getId(IZELServerString& out) const override { out.assign(id_.c_str()); }
-    void getRoles(IZELServerStringArray& out) const override { out.append(role_.c_str()); }
-    bool isAuthenticated() const override { return true; }
-    void readFromXml(const xercesc_3_2::DOMElement&) override {}
-
-private:
-    std::string id_;
-    std::string role_;
-};
-
-TEST(Identity, AnIdentityWhoseTextIsNotUtf8IsNotWritten)
-{
-    EXPECT_EQ(written(ForeignIdentity("caf\xE9", "r")), std::to_string(msg::kXmlFailure));
-    EXPECT_EQ(written(ForeignIdentity("ann", "\xFF")), std::to_string(msg::kXmlFailure));
 }
 
 }  // namespace

@@ -133,6 +133,15 @@ std::string allFieldsOf(const ZELServerUserToken& token)
     return fieldsOf(token) + "|" + token.firstTokenDate() + "|" + token.lastTokenDate() + "|" + token.expirationDate();
 }
 
+// A caller's own implementation of the interface cannot take the server's dates, so it is refused
+// like a reply without a token.
+class ForeignToken final : public IZELServerUserToken {
+public:
+    void getToken(IZELServerString& out) const override { out.assign("foreign"); }
+    void getClientAddress(IZELServerString& out) const override { out.assign(""); }
+    long long getExpirationTimeout() const override { return 0; }
+};
+
 TEST(UserTokenReader, ReadsTheChildOfTheDocumentElementOrLeavesTheTokenAlone)
 {
     const int unreadable = static_cast<int>(msg::kUnreadableReply);
@@ -158,21 +167,8 @@ TEST(UserTokenReader, ReadsTheChildOfTheDocumentElementOrLeavesTheTokenAlone)
         EXPECT_EQ(readUserTokenReply(c.body, token), c.result) << c.body;
         EXPECT_EQ(allFieldsOf(token), c.fields) << c.body;
     }
-}
-
-// A caller's own implementation of the interface cannot take the server's dates, so it is refused
-// like a reply without a token.
-class ForeignToken final : public IZELServerUserToken {
-public:
-    void getToken(IZELServerString& out) const override { out.assign("foreign"); }
-    void getClientAddress(IZELServerString& out) const override { out.assign(""); }
-    long long getExpirationTimeout() const override { return 0; }
-};
-
-TEST(UserTokenReader, RefusesATokenThatIsNotTheLibrarysOwn)
-{
-    ForeignToken token;
-    EXPECT_EQ(readUserTokenReply(R"(<R><USERTOKEN token="x"/></R>)", token), static_cast<int>(msg::kUnreadableReply));
+    ForeignToken foreign;
+    EXPECT_EQ(readUserTokenReply(R"(<R><USERTOKEN token="x"/></R>)", foreign), unreadable);
 }
 
 }  // namespace

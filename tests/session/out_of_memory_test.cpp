@@ -6,13 +6,11 @@
 
 #include <atomic>
 #include <cstdlib>
-#include <filesystem>
 #include <fstream>
 #include <functional>
 #include <new>
 #include <optional>
 #include <string>
-#include <utility>
 
 #include <gtest/gtest.h>
 #ifdef __SANITIZE_ADDRESS__
@@ -86,37 +84,28 @@ struct Objects {
         service->setName(*text);
         std::ofstream(destination, std::ios::binary) << "old";
     }
-    ~Objects()
+    ~Objects() { area->releaseObject(root); }
+
+    template <class T>
+    ZELServerOwned<T> own(T* object)
     {
-        session.destroyString(&text);
-        session.destroyString(&out);
-        session.destroyStringArray(&list);
-        session.destroyService(&service);
-        session.destroyServiceVector(&services);
-        session.destroyTransformationRequest(&request);
-        session.destroyPropertyAccessor(&accessor);
-        session.destroyRepositoryVector(&repositories);
-        session.destroyRepository(&repository);
-        session.destroyWorkspace(&made);
-        area->releaseObject(root);
-        session.destroyMountPoint(&area);
-        session.destroyFileInfoVector(&entries);
+        return zelServerOwn(session, object);
     }
 
     IZELServerSession& session;
-    IZELServerString* text = session.createString();
-    IZELServerString* out = session.createString();
-    IZELServerStringArray* list = session.createStringArray();
-    IZELServerService* service = session.createService();
-    IZELServerVector<IZELServerService>* services = session.createServiceVector();
-    IZELServerTransformationRequest* request = session.createTransformationRequest(*text, *text);
-    IZELServerPropertyAccessor* accessor = session.createPropertyAccessor();
-    IZELServerVector<IZELServerRepository>* repositories = session.createRepositoryVector();
-    IZELServerRepository* repository = session.createRepository();
-    IZELServerWorkspace* made = nullptr;
-    IZELServerMountPoint* area = session.createMountPoint();
+    ZELServerOwned<IZELServerString> text = own(session.createString());
+    ZELServerOwned<IZELServerString> out = own(session.createString());
+    ZELServerOwned<IZELServerStringArray> list = own(session.createStringArray());
+    ZELServerOwned<IZELServerService> service = own(session.createService());
+    ZELServerOwned<IZELServerVector<IZELServerService>> services = own(session.createServiceVector());
+    ZELServerOwned<IZELServerTransformationRequest> request = own(session.createTransformationRequest(*text, *text));
+    ZELServerOwned<IZELServerPropertyAccessor> accessor = own(session.createPropertyAccessor());
+    ZELServerOwned<IZELServerVector<IZELServerRepository>> repositories = own(session.createRepositoryVector());
+    ZELServerOwned<IZELServerRepository> repository = own(session.createRepository());
+    ZELServerOwned<IZELServerWorkspace> made;
+    ZELServerOwned<IZELServerMountPoint> area = own(session.createMountPoint());
     IZELServerPath* root = area->createPath(*text);
-    IZELServerVector<IZELServerFileInfo>* entries = session.createFileInfoVector();
+    ZELServerOwned<IZELServerVector<IZELServerFileInfo>> entries = own(session.createFileInfoVector());
     unsigned flag = 0;
     std::string destination;
 };
@@ -134,7 +123,7 @@ struct Kind {
 };
 
 const Kind kKinds[] = {
-    {"session factory", nullptr, [](Objects& o) { return o.made = o.session.createWorkspace(), nullptr; },
+    {"session factory", nullptr, [](Objects& o) { return o.made = o.own(o.session.createWorkspace()), nullptr; },
      [](Objects& o) { return std::string(o.made ? "made" : ""); }, "made"},
     {"string", nullptr, [](Objects& o) { return o.out->assign(kLongText.c_str()), nullptr; },
      [](Objects& o) { return textOf(*o.out); }, kLongText},
@@ -142,7 +131,7 @@ const Kind kKinds[] = {
      [](Objects& o) { return std::to_string(o.list->entries()) + o.list->element(2); }, "3east"},
     {"vector", nullptr,
      [](Objects& o) {
-         return o.services->append(std::exchange(o.service, nullptr)), nullptr;  // owned by the vector now
+         return o.services->append(o.service.release()), nullptr;  // owned by the vector now
      },
      [](Objects& o) { return std::to_string(o.services->entries()); }, "1"},
     {"object getter", nullptr, [](Objects& o) { return o.service->getName(*o.out), nullptr; },
@@ -231,19 +220,10 @@ protected:
         // The XML library keeps what it held when memory ran out in the middle of a document (it
         // declares the parser unusable instead of cleaning up), so blocks made during a failing call
         // are not leak-checked; the calls with memory to spare are.
-        const bool ignoreLeaks = n != 0;
-        if (ignoreLeaks) {
-            __lsan_disable();
+        std::optional<__lsan::ScopedDisabler> leaksUnchecked;
+        if (n != 0) {
+            leaksUnchecked.emplace();
         }
-        struct Enable {
-            bool on;
-            ~Enable()
-            {
-                if (on) {
-                    __lsan_enable();
-                }
-            }
-        } enable{ignoreLeaks};
 #endif
         failureMet = false;
         allocationsBeforeFailure = n;

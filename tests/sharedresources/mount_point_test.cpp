@@ -78,12 +78,6 @@ protected:
                                  {pathName, pathValue(keyword, directory, name)},
                                  {"itemFileCRCCheckingEnabled", "true"}});
     }
-    static Bytes twoPaths(const std::string& keyword)
-    {
-        return command(keyword, {{"srName", "DATA"},
-                                 {"srSrcPath", pathValue(keyword, "in", "a.csv")},
-                                 {"srDestPath", pathValue(keyword, "out", "b.csv")}});
-    }
     static std::string absolute(const IZELServerPath& path)
     {
         ZELServerString text;
@@ -143,16 +137,8 @@ TEST_F(MountPointTest, EveryCommandOnTheWire)
     run({
         {"exists refused", on("SR_EXISTS", "", "x"), reply("ERROR", "no rights"),
          [&] { return outcome(area.exists(at("x"), fresh()), flag); }, msg::kServerError, "0 "},
-        {"copy, source first", twoPaths("SR_COPY"), reply("SUCCESS", "true"),
-         [&] { return outcome(area.copy(at("in/a.csv"), at("out/b.csv"))); }, 0, ""},
         {"file info with flags", none, none, [&] { return outcome(area.getFileInfo(at("a"), 3, info)); },
          msg::kInvalidArgument, ""},
-        {"file info", on("SR_GET", "in", "a.csv"), listing("in", {{"FILE", "a.csv"}}),
-         [&] {
-             return outcome(area.getFileInfo(at("in/a.csv"), info),
-                            [&] { return std::to_string(info.getSize()) + " " + absolute(info.getPath()); });
-         },
-         0, "1 in/a.csv "},
         {"file info of nothing", on("SR_GET", "in", "a.csv"), reply("SUCCESS", "<SR_GET/>"),
          [&] { return outcome(area.getFileInfo(at("in/a.csv"), info)); }, msg::kUnreadableReply, ""},
         {"list refused empties the entries", on("SR_LIST", "", "in"), reply("ERROR", "no 'in'"),
