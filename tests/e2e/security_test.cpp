@@ -71,6 +71,12 @@ TEST_F(EndToEnd, TokensAreManagedAndSignInNewSessions)
 // but not write, and a user whose only right is its own token may not even read.
 TEST_F(EndToEnd, RefusalsForWantOfARight)
 {
+    auto refused = [](Client& client, const std::vector<std::pair<const char*, Operation>>& steps) {
+        for (const auto& [what, operation] : steps) {
+            EXPECT_EQ(client.outcome(operation), kDenied) << what;
+            EXPECT_EQ(client.lastCode(), 2u) << what;
+        }
+    };
     Client admin;
     ASSERT_EQ(admin.signIn(server->port(), "ann", "pw-ann"), 0u) << admin.lastMessage();
     ASSERT_EQ(addItem(admin, *admin.repository("shelf"), "item.txt", "item"), 0u);
@@ -84,18 +90,14 @@ TEST_F(EndToEnd, RefusalsForWantOfARight)
     IZELServerPath* folder = area->createPath(vic.text("/made"));
     auto token = vic.own(session.getSecurityManager()->createUserToken());
     EXPECT_EQ(vic.outcome([&](unsigned& f) { return shelf->itemExists(vic.text("item.txt"), f); }), 1);
-    const std::vector<Step> viewer = {
-        {"addItem", [&](unsigned&) { return shelf->addItem(vic.text("new.txt"), vic.text(local("item.txt"))); },
-         kDenied},
-        {"makeDirectory", [&](unsigned&) { return area->makeDirectory(*folder); }, kDenied},
-        {"another account's token",
-         boolean([&](bool& f) { return session.getSecurityManager()->getUserToken(vic.text("ann"), *token, f); }),
-         kDenied},
-    };
-    for (const Step& step : viewer) {
-        EXPECT_EQ(vic.outcome(step.operation), step.expected) << step.what;
-        EXPECT_EQ(vic.lastCode(), 2u) << step.what;
-    }
+    refused(
+        vic,
+        {
+            {"addItem", [&](unsigned&) { return shelf->addItem(vic.text("new.txt"), vic.text(local("item.txt"))); }},
+            {"makeDirectory", [&](unsigned&) { return area->makeDirectory(*folder); }},
+            {"another account's token",
+             boolean([&](bool& f) { return session.getSecurityManager()->getUserToken(vic.text("ann"), *token, f); })},
+        });
     area->releaseObject(folder);
 
     Client zed;
@@ -106,19 +108,13 @@ TEST_F(EndToEnd, RefusalsForWantOfARight)
     auto areas = zed.own(outsider.createMountPointVector());
     auto repositories = zed.own(outsider.createRepositoryVector());
     IZELServerString& text = zed.text("untouched");
-    const std::vector<Step> reader = {
-        {"getSharedResources", [&](unsigned&) { return outsider.getMountPointManager()->getSharedResources(*areas); },
-         kDenied},
-        {"getRepositories", [&](unsigned&) { return manager->getRepositories(nullptr, *repositories); }, kDenied},
-        {"getJobResultString",
-         checking([&](unsigned& f) { return jobs->getJobResultString(1, f, text); },
-                  [&] { return text.equals("untouched"); }),
-         kDenied},
-    };
-    for (const Step& step : reader) {
-        EXPECT_EQ(zed.outcome(step.operation), step.expected) << step.what;
-        EXPECT_EQ(zed.lastCode(), 2u) << step.what;
-    }
+    refused(zed, {
+                     {"getSharedResources",
+                      [&](unsigned&) { return outsider.getMountPointManager()->getSharedResources(*areas); }},
+                     {"getRepositories", [&](unsigned&) { return manager->getRepositories(nullptr, *repositories); }},
+                     {"getJobResultString", checking([&](unsigned& f) { return jobs->getJobResultString(1, f, text); },
+                                                     [&] { return text.equals("untouched"); })},
+                 });
     EXPECT_EQ(zed.outcome(
                   boolean([&](bool& f) { return outsider.getSecurityManager()->userTokenExists(zed.text("zed"), f); })),
               0)

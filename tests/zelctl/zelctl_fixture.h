@@ -26,7 +26,6 @@ struct Outcome {
     int status = -1;
     std::string out;
     std::string err;
-    nlohmann::json json() const { return nlohmann::json::parse(out); }
 };
 
 inline std::string quoted(const std::string& text)

@@ -262,7 +262,6 @@ TEST_F(Commands, SessionsRightsAndTokens)
     // address or expired is refused, and the expiry is kept too.
     const std::string generated = std::regex_replace(admin_->command("SEC_GET_USERTOKEN", of("aud")).body,
                                                      std::regex(".* token=\"([^\"]*)\".*"), "$1");
-    EXPECT_EQ(generated.size(), 48u);
     startServer();
     auto signIn = [&](const std::string& text) {
         return withoutTimes(client.command("SERVER_SESSION_INIT", {{"userToken", text}}).body);

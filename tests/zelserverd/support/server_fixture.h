@@ -59,9 +59,7 @@ protected:
     // Polls until the job has ended (or `eventually` gives up); the last result seen.
     std::map<std::string, std::string> waitForEnd(long id);
     std::map<std::string, std::string> result(long id);
-    // The file `name` in the work directory of job `id`.
     std::string jobFile(long id, const std::string& name) const;
-    // Number of files in the content directory.
     std::size_t storedFiles() { return entriesOf(dataDir_ + "/store").size(); }
 
     std::string root_;  // everything of this test lives below
