@@ -63,4 +63,9 @@ void copyText(std::string_view text, IZELServerString& out)
     }
 }
 
+void handOutText(std::string_view text, IZELServerString& out) noexcept
+{
+    guarded([&] { copyText(text, out); });
+}
+
 }  // namespace zel

@@ -47,4 +47,8 @@ std::string toStdString(const IZELServerString& text);
 // `out` did not take the whole text.
 void copyText(std::string_view text, IZELServerString& out);
 
+// copyText for a getter slot that hands out a text it holds: whatever fails stays inside the library
+// (exception_guard.h), leaving `out` as its own set left it.
+void handOutText(std::string_view text, IZELServerString& out) noexcept;
+
 }  // namespace zel

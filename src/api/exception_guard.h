@@ -11,12 +11,14 @@
 //     {
 //         return guarded([&] { return channel_ ? channel_->close() : nullptr; });
 //     }
-//     void Item::getName(IZELServerString& out) const
+//     void Service::setName(const IZELServerString& name)
 //     {
-//         guarded([&] { copyText(fields_.name, out); });
+//         guarded([&] { fields_.name = toStdString(name); });
 //     }
 //
-// A slot that only reads a number or a pointer it holds cannot throw and is written without it.
+// A getter that only hands out a text it holds calls handOutText (ZELServerString.h), this guard
+// around copyText. A slot that only reads a number or a pointer it holds cannot throw, and one that
+// only forwards to a slot guarding itself need not guard again: both are written without it.
 
 #include <type_traits>
 

@@ -86,10 +86,7 @@ void ZELServerTransformationRequest::setKeyword(const IZELServerString& keyword)
     });
 }
 
-void ZELServerTransformationRequest::getKeyword(IZELServerString& out) const
-{
-    guarded([&] { copyText(keyword_, out); });
-}
+void ZELServerTransformationRequest::getKeyword(IZELServerString& out) const { handOutText(keyword_, out); }
 
 void ZELServerTransformationRequest::setPublishedParameter(const IZELServerString& name, const IZELServerString& value)
 {

@@ -41,10 +41,7 @@ unsigned convertProperty(const ZELServerTransformationResult& result, const std:
 
 // ---- Typed getters of the well-known properties ---------------------------------------------------
 
-void ZELServerTransformationResult::getText(IZELServerString& out) const
-{
-    guarded([&] { copyText(text_, out); });
-}
+void ZELServerTransformationResult::getText(IZELServerString& out) const { handOutText(text_, out); }
 
 unsigned ZELServerTransformationResult::getResult(IZELServerString& out) const
 {

@@ -87,18 +87,9 @@ ZELServerProperty::ZELServerProperty(const ZELServerProperty& other)
       attributes_(other.attributes_)
 {}
 
-void ZELServerProperty::getCategory(IZELServerString& out) const
-{
-    guarded([&] { copyText(category_, out); });
-}
-void ZELServerProperty::getName(IZELServerString& out) const
-{
-    guarded([&] { copyText(name_, out); });
-}
-void ZELServerProperty::getValue(IZELServerString& out) const
-{
-    guarded([&] { copyText(value_, out); });
-}
+void ZELServerProperty::getCategory(IZELServerString& out) const { handOutText(category_, out); }
+void ZELServerProperty::getName(IZELServerString& out) const { handOutText(name_, out); }
+void ZELServerProperty::getValue(IZELServerString& out) const { handOutText(value_, out); }
 
 bool ZELServerProperty::getAttribute(const IZELServerString& name, IZELServerString& value) const
 {

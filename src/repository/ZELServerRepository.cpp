@@ -62,14 +62,8 @@ ZELServerRepository::ZELServerRepository(IZELServerChannel* channel, const IZELS
     fields_.description = toStdString(description);
 }
 
-void ZELServerRepository::getName(IZELServerString& out) const
-{
-    guarded([&] { copyText(fields_.name, out); });
-}
-void ZELServerRepository::getDescription(IZELServerString& out) const
-{
-    guarded([&] { copyText(fields_.description, out); });
-}
+void ZELServerRepository::getName(IZELServerString& out) const { handOutText(fields_.name, out); }
+void ZELServerRepository::getDescription(IZELServerString& out) const { handOutText(fields_.description, out); }
 
 bool ZELServerRepository::readFrom(const XmlElement& element)
 {

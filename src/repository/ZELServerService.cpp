@@ -46,34 +46,22 @@ ZELServerService::ZELServerService(IZELServerChannel* channel, std::string name,
     fields_.templateRegistration = templateRegistration;
 }
 
-void ZELServerService::getName(IZELServerString& out) const
-{
-    guarded([&] { copyText(fields_.name, out); });
-}
+void ZELServerService::getName(IZELServerString& out) const { handOutText(fields_.name, out); }
 void ZELServerService::setName(const IZELServerString& name)
 {
     guarded([&] { fields_.name = toStdString(name); });
 }
-void ZELServerService::getDisplayName(IZELServerString& out) const
-{
-    guarded([&] { copyText(fields_.displayName, out); });
-}
+void ZELServerService::getDisplayName(IZELServerString& out) const { handOutText(fields_.displayName, out); }
 void ZELServerService::setDisplayName(const IZELServerString& displayName)
 {
     guarded([&] { fields_.displayName = toStdString(displayName); });
 }
-void ZELServerService::getDescription(IZELServerString& out) const
-{
-    guarded([&] { copyText(fields_.description, out); });
-}
+void ZELServerService::getDescription(IZELServerString& out) const { handOutText(fields_.description, out); }
 void ZELServerService::setDescription(const IZELServerString& description)
 {
     guarded([&] { fields_.description = toStdString(description); });
 }
-void ZELServerService::getUrlPattern(IZELServerString& out) const
-{
-    guarded([&] { copyText(fields_.urlPattern, out); });
-}
+void ZELServerService::getUrlPattern(IZELServerString& out) const { handOutText(fields_.urlPattern, out); }
 void ZELServerService::setUrlPattern(const IZELServerString& urlPattern)
 {
     guarded([&] { fields_.urlPattern = toStdString(urlPattern); });

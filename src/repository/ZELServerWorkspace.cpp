@@ -70,14 +70,8 @@ IZELServerStatus* sendProperties(IZELServerChannel* channel, const char* keyword
 
 // ---- Feature type -----------------------------------------------------------------------------------
 
-void ZELServerFeatureType::getName(IZELServerString& out) const
-{
-    guarded([&] { copyText(fields_.name, out); });
-}
-void ZELServerFeatureType::getDescription(IZELServerString& out) const
-{
-    guarded([&] { copyText(fields_.description, out); });
-}
+void ZELServerFeatureType::getName(IZELServerString& out) const { handOutText(fields_.name, out); }
+void ZELServerFeatureType::getDescription(IZELServerString& out) const { handOutText(fields_.description, out); }
 
 IZELServerStatus* ZELServerFeatureType::updatePropertyAccessor(const IZELServerPropertyAccessor& accessor)
 {
@@ -97,18 +91,9 @@ bool ZELServerFeatureType::readFrom(const XmlElement& element)
 
 // ---- Dataset ----------------------------------------------------------------------------------------
 
-void ZELServerDataset::getName(IZELServerString& out) const
-{
-    guarded([&] { copyText(fields_.name, out); });
-}
-void ZELServerDataset::getFormat(IZELServerString& out) const
-{
-    guarded([&] { copyText(fields_.format, out); });
-}
-void ZELServerDataset::getLocation(IZELServerString& out) const
-{
-    guarded([&] { copyText(fields_.location, out); });
-}
+void ZELServerDataset::getName(IZELServerString& out) const { handOutText(fields_.name, out); }
+void ZELServerDataset::getFormat(IZELServerString& out) const { handOutText(fields_.format, out); }
+void ZELServerDataset::getLocation(IZELServerString& out) const { handOutText(fields_.location, out); }
 
 IZELServerStatus* ZELServerDataset::updatePropertyAccessor(const IZELServerPropertyAccessor& accessor)
 {
@@ -129,18 +114,9 @@ bool ZELServerDataset::readFrom(const XmlElement& element)
 
 // ---- Workspace --------------------------------------------------------------------------------------
 
-void ZELServerWorkspace::getName(IZELServerString& out) const
-{
-    guarded([&] { copyText(fields_.name, out); });
-}
-void ZELServerWorkspace::getTitle(IZELServerString& out) const
-{
-    guarded([&] { copyText(fields_.title, out); });
-}
-void ZELServerWorkspace::getDescription(IZELServerString& out) const
-{
-    guarded([&] { copyText(fields_.description, out); });
-}
+void ZELServerWorkspace::getName(IZELServerString& out) const { handOutText(fields_.name, out); }
+void ZELServerWorkspace::getTitle(IZELServerString& out) const { handOutText(fields_.title, out); }
+void ZELServerWorkspace::getDescription(IZELServerString& out) const { handOutText(fields_.description, out); }
 
 IZELServerStatus* ZELServerWorkspace::updatePropertyAccessor(const IZELServerPropertyAccessor& accessor)
 {

@@ -98,18 +98,9 @@ unsigned itemTypeOf(std::string_view itemName)
 
 // ---- Workspace summary ------------------------------------------------------------------------------
 
-void ZELServerWorkspaceSummary::getName(IZELServerString& out) const
-{
-    guarded([&] { copyText(fields_.name, out); });
-}
-void ZELServerWorkspaceSummary::getTitle(IZELServerString& out) const
-{
-    guarded([&] { copyText(fields_.title, out); });
-}
-void ZELServerWorkspaceSummary::getDescription(IZELServerString& out) const
-{
-    guarded([&] { copyText(fields_.description, out); });
-}
+void ZELServerWorkspaceSummary::getName(IZELServerString& out) const { handOutText(fields_.name, out); }
+void ZELServerWorkspaceSummary::getTitle(IZELServerString& out) const { handOutText(fields_.title, out); }
+void ZELServerWorkspaceSummary::getDescription(IZELServerString& out) const { handOutText(fields_.description, out); }
 
 bool ZELServerWorkspaceSummary::readFrom(const XmlElement& element)
 {
@@ -119,14 +110,8 @@ bool ZELServerWorkspaceSummary::readFrom(const XmlElement& element)
 
 // ---- Feature type attribute -------------------------------------------------------------------------
 
-void ZELServerAttribute::getName(IZELServerString& out) const
-{
-    guarded([&] { copyText(fields_.name, out); });
-}
-void ZELServerAttribute::getType(IZELServerString& out) const
-{
-    guarded([&] { copyText(fields_.type, out); });
-}
+void ZELServerAttribute::getName(IZELServerString& out) const { handOutText(fields_.name, out); }
+void ZELServerAttribute::getType(IZELServerString& out) const { handOutText(fields_.type, out); }
 
 bool ZELServerAttribute::readFrom(const XmlElement& element)
 {
@@ -136,30 +121,12 @@ bool ZELServerAttribute::readFrom(const XmlElement& element)
 
 // ---- Published parameter ----------------------------------------------------------------------------
 
-void ZELServerParameter::getName(IZELServerString& out) const
-{
-    guarded([&] { copyText(fields_.name, out); });
-}
-void ZELServerParameter::getDescription(IZELServerString& out) const
-{
-    guarded([&] { copyText(fields_.description, out); });
-}
-void ZELServerParameter::getDefaultValue(IZELServerString& out) const
-{
-    guarded([&] { copyText(fields_.defaultValue, out); });
-}
-void ZELServerParameter::getType(IZELServerString& out) const
-{
-    guarded([&] { copyText(fields_.type, out); });
-}
-void ZELServerParameter::getOptionsText(IZELServerString& out) const
-{
-    guarded([&] { copyText(fields_.options, out); });
-}
-void ZELServerParameter::getOptionsType(IZELServerString& out) const
-{
-    guarded([&] { copyText(fields_.optionsType, out); });
-}
+void ZELServerParameter::getName(IZELServerString& out) const { handOutText(fields_.name, out); }
+void ZELServerParameter::getDescription(IZELServerString& out) const { handOutText(fields_.description, out); }
+void ZELServerParameter::getDefaultValue(IZELServerString& out) const { handOutText(fields_.defaultValue, out); }
+void ZELServerParameter::getType(IZELServerString& out) const { handOutText(fields_.type, out); }
+void ZELServerParameter::getOptionsText(IZELServerString& out) const { handOutText(fields_.options, out); }
+void ZELServerParameter::getOptionsType(IZELServerString& out) const { handOutText(fields_.optionsType, out); }
 
 void ZELServerParameter::getOptions(IZELServerStringArray& choices) const
 {
@@ -181,53 +148,23 @@ bool ZELServerParameter::readFrom(const XmlElement& element)
 
 // ---- Item -------------------------------------------------------------------------------------------
 
-void ZELServerItem::getName(IZELServerString& out) const
-{
-    guarded([&] { copyText(fields_.name, out); });
-}
-void ZELServerItem::getRepositoryName(IZELServerString& out) const
-{
-    guarded([&] { copyText(fields_.repositoryName, out); });
-}
-void ZELServerItem::getTitle(IZELServerString& out) const
-{
-    guarded([&] { copyText(fields_.title, out); });
-}
-void ZELServerItem::getDescription(IZELServerString& out) const
-{
-    guarded([&] { copyText(fields_.description, out); });
-}
-void ZELServerItem::getCategory(IZELServerString& out) const
-{
-    guarded([&] { copyText(fields_.category, out); });
-}
-void ZELServerItem::getRequirements(IZELServerString& out) const
-{
-    guarded([&] { copyText(fields_.requirements, out); });
-}
+void ZELServerItem::getName(IZELServerString& out) const { handOutText(fields_.name, out); }
+void ZELServerItem::getRepositoryName(IZELServerString& out) const { handOutText(fields_.repositoryName, out); }
+void ZELServerItem::getTitle(IZELServerString& out) const { handOutText(fields_.title, out); }
+void ZELServerItem::getDescription(IZELServerString& out) const { handOutText(fields_.description, out); }
+void ZELServerItem::getCategory(IZELServerString& out) const { handOutText(fields_.category, out); }
+void ZELServerItem::getRequirements(IZELServerString& out) const { handOutText(fields_.requirements, out); }
 void ZELServerItem::getRequirementsKeyword(IZELServerString& out) const
 {
-    guarded([&] { copyText(fields_.requirementsKeyword, out); });
+    handOutText(fields_.requirementsKeyword, out);
 }
-void ZELServerItem::getUsage(IZELServerString& out) const
-{
-    guarded([&] { copyText(fields_.usage, out); });
-}
-void ZELServerItem::getHistory(IZELServerString& out) const
-{
-    guarded([&] { copyText(fields_.history, out); });
-}
-void ZELServerItem::getLastSaveDate(IZELServerString& out) const
-{
-    guarded([&] { copyText(fields_.lastSaveDate, out); });
-}
-void ZELServerItem::getLastSaveBuild(IZELServerString& out) const
-{
-    guarded([&] { copyText(fields_.lastSaveBuild, out); });
-}
+void ZELServerItem::getUsage(IZELServerString& out) const { handOutText(fields_.usage, out); }
+void ZELServerItem::getHistory(IZELServerString& out) const { handOutText(fields_.history, out); }
+void ZELServerItem::getLastSaveDate(IZELServerString& out) const { handOutText(fields_.lastSaveDate, out); }
+void ZELServerItem::getLastSaveBuild(IZELServerString& out) const { handOutText(fields_.lastSaveBuild, out); }
 void ZELServerItem::getLegalTermsAndConditions(IZELServerString& out) const
 {
-    guarded([&] { copyText(fields_.legalTermsAndConditions, out); });
+    handOutText(fields_.legalTermsAndConditions, out);
 }
 
 bool ZELServerItem::readFrom(const XmlElement& element)
@@ -239,18 +176,9 @@ bool ZELServerItem::readFrom(const XmlElement& element)
 
 // ---- Custom format, custom transformer, template ----------------------------------------------------
 
-void ZELServerCustomFormat::getName(IZELServerString& out) const
-{
-    guarded([&] { copyText(fields_.name, out); });
-}
-void ZELServerCustomFormat::getDescription(IZELServerString& out) const
-{
-    guarded([&] { copyText(fields_.description, out); });
-}
-void ZELServerCustomFormat::getTitle(IZELServerString& out) const
-{
-    guarded([&] { copyText(fields_.title, out); });
-}
+void ZELServerCustomFormat::getName(IZELServerString& out) const { handOutText(fields_.name, out); }
+void ZELServerCustomFormat::getDescription(IZELServerString& out) const { handOutText(fields_.description, out); }
+void ZELServerCustomFormat::getTitle(IZELServerString& out) const { handOutText(fields_.title, out); }
 
 bool ZELServerCustomFormat::readFrom(const XmlElement& element)
 {
@@ -258,18 +186,9 @@ bool ZELServerCustomFormat::readFrom(const XmlElement& element)
     return true;
 }
 
-void ZELServerCustomTransformer::getName(IZELServerString& out) const
-{
-    guarded([&] { copyText(fields_.name, out); });
-}
-void ZELServerCustomTransformer::getDescription(IZELServerString& out) const
-{
-    guarded([&] { copyText(fields_.description, out); });
-}
-void ZELServerCustomTransformer::getTitle(IZELServerString& out) const
-{
-    guarded([&] { copyText(fields_.title, out); });
-}
+void ZELServerCustomTransformer::getName(IZELServerString& out) const { handOutText(fields_.name, out); }
+void ZELServerCustomTransformer::getDescription(IZELServerString& out) const { handOutText(fields_.description, out); }
+void ZELServerCustomTransformer::getTitle(IZELServerString& out) const { handOutText(fields_.title, out); }
 
 bool ZELServerCustomTransformer::readFrom(const XmlElement& element)
 {
@@ -277,18 +196,9 @@ bool ZELServerCustomTransformer::readFrom(const XmlElement& element)
     return true;
 }
 
-void ZELServerTemplate::getName(IZELServerString& out) const
-{
-    guarded([&] { copyText(fields_.name, out); });
-}
-void ZELServerTemplate::getDescription(IZELServerString& out) const
-{
-    guarded([&] { copyText(fields_.description, out); });
-}
-void ZELServerTemplate::getTitle(IZELServerString& out) const
-{
-    guarded([&] { copyText(fields_.title, out); });
-}
+void ZELServerTemplate::getName(IZELServerString& out) const { handOutText(fields_.name, out); }
+void ZELServerTemplate::getDescription(IZELServerString& out) const { handOutText(fields_.description, out); }
+void ZELServerTemplate::getTitle(IZELServerString& out) const { handOutText(fields_.title, out); }
 
 bool ZELServerTemplate::readFrom(const XmlElement& element)
 {
@@ -298,14 +208,8 @@ bool ZELServerTemplate::readFrom(const XmlElement& element)
 
 // ---- Resource ---------------------------------------------------------------------------------------
 
-void ZELServerResource::getName(IZELServerString& out) const
-{
-    guarded([&] { copyText(fields_.name, out); });
-}
-void ZELServerResource::getDescription(IZELServerString& out) const
-{
-    guarded([&] { copyText(fields_.description, out); });
-}
+void ZELServerResource::getName(IZELServerString& out) const { handOutText(fields_.name, out); }
+void ZELServerResource::getDescription(IZELServerString& out) const { handOutText(fields_.description, out); }
 
 bool ZELServerResource::readFrom(const XmlElement& element)
 {

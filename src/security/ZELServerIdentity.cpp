@@ -59,10 +59,7 @@ std::optional<std::string> writeDocument(const IZELServerIdentity& identity, con
 
 }  // namespace
 
-void ZELServerIdentity::getId(IZELServerString& out) const
-{
-    guarded([&] { copyText(fields_.id, out); });
-}
+void ZELServerIdentity::getId(IZELServerString& out) const { handOutText(fields_.id, out); }
 
 void ZELServerIdentity::getRoles(IZELServerStringArray& out) const
 {

@@ -2,7 +2,6 @@
 
 #include <utility>
 
-#include "api/exception_guard.h"
 #include "api/ZELServerString.h"
 #include "transport/attribute_binding.h"
 #include "transport/object_reader.h"
@@ -31,15 +30,9 @@ ZELServerUserToken::ZELServerUserToken(std::string token, std::string clientAddr
     fields_.expirationTimeout = expirationTimeout;
 }
 
-void ZELServerUserToken::getToken(IZELServerString& out) const
-{
-    guarded([&] { copyText(fields_.token, out); });
-}
+void ZELServerUserToken::getToken(IZELServerString& out) const { handOutText(fields_.token, out); }
 
-void ZELServerUserToken::getClientAddress(IZELServerString& out) const
-{
-    guarded([&] { copyText(fields_.clientAddress, out); });
-}
+void ZELServerUserToken::getClientAddress(IZELServerString& out) const { handOutText(fields_.clientAddress, out); }
 
 bool ZELServerUserToken::readFrom(const XmlElement& element)
 {

@@ -101,26 +101,11 @@ void ZELServerConnectionInfo::takeAddress(const IZELServerString& address)
     port_ = parsed.port;
 }
 
-void ZELServerConnectionInfo::getHost(IZELServerString& out) const
-{
-    guarded([&] { copyText(host_, out); });
-}
-void ZELServerConnectionInfo::getUserName(IZELServerString& out) const
-{
-    guarded([&] { copyText(userName_, out); });
-}
-void ZELServerConnectionInfo::getPassword(IZELServerString& out) const
-{
-    guarded([&] { copyText(password_, out); });
-}
-void ZELServerConnectionInfo::getAddress(IZELServerString& out) const
-{
-    guarded([&] { copyText(address_, out); });
-}
-void ZELServerConnectionInfo::getAuxiliaryText(IZELServerString& out) const
-{
-    guarded([&] { copyText(auxiliaryText_, out); });
-}
+void ZELServerConnectionInfo::getHost(IZELServerString& out) const { handOutText(host_, out); }
+void ZELServerConnectionInfo::getUserName(IZELServerString& out) const { handOutText(userName_, out); }
+void ZELServerConnectionInfo::getPassword(IZELServerString& out) const { handOutText(password_, out); }
+void ZELServerConnectionInfo::getAddress(IZELServerString& out) const { handOutText(address_, out); }
+void ZELServerConnectionInfo::getAuxiliaryText(IZELServerString& out) const { handOutText(auxiliaryText_, out); }
 
 bool ZELServerConnectionInfo::getProperty(const IZELServerString& key, IZELServerString& out) const
 {

@@ -1,6 +1,5 @@
 #include "sharedresources/ZELServerFileInfo.h"
 
-#include "api/exception_guard.h"
 #include "api/ZELServerString.h"
 #include "transport/attribute_binding.h"
 #include "transport/xml_navigation.h"
@@ -17,10 +16,7 @@ constexpr AttributeBinding<FileInfoFields> kFileInfoAttributes[] = {
 
 }  // namespace
 
-void ZELServerFileInfo::getDate(IZELServerString& out) const
-{
-    guarded([&] { copyText(fields_.date, out); });
-}
+void ZELServerFileInfo::getDate(IZELServerString& out) const { handOutText(fields_.date, out); }
 
 bool ZELServerFileInfo::readFrom(const XmlElement& element)
 {

@@ -48,20 +48,11 @@ bool canBeRead(const std::string& path)
 
 }  // namespace
 
-void ZELServerMountPoint::getName(IZELServerString& out) const
-{
-    guarded([&] { copyText(fields_.name, out); });
-}
+void ZELServerMountPoint::getName(IZELServerString& out) const { handOutText(fields_.name, out); }
 
-void ZELServerMountPoint::getDisplayName(IZELServerString& out) const
-{
-    guarded([&] { copyText(fields_.displayName, out); });
-}
+void ZELServerMountPoint::getDisplayName(IZELServerString& out) const { handOutText(fields_.displayName, out); }
 
-void ZELServerMountPoint::getDescription(IZELServerString& out) const
-{
-    guarded([&] { copyText(fields_.description, out); });
-}
+void ZELServerMountPoint::getDescription(IZELServerString& out) const { handOutText(fields_.description, out); }
 
 CheckedCommand ZELServerMountPoint::on(const char* keyword, Where where) const
 {

@@ -1,6 +1,5 @@
 #include "sharedresources/ZELServerPath.h"
 
-#include "api/exception_guard.h"
 #include "api/ZELServerString.h"
 #include "transport/attribute_binding.h"
 
@@ -50,20 +49,11 @@ std::string ZELServerPath::joinPath(std::string_view directoryPath, std::string_
     return joined;
 }
 
-void ZELServerPath::getName(IZELServerString& out) const
-{
-    guarded([&] { copyText(fields_.name, out); });
-}
+void ZELServerPath::getName(IZELServerString& out) const { handOutText(fields_.name, out); }
 
-void ZELServerPath::getDirectoryPath(IZELServerString& out) const
-{
-    guarded([&] { copyText(fields_.directoryPath, out); });
-}
+void ZELServerPath::getDirectoryPath(IZELServerString& out) const { handOutText(fields_.directoryPath, out); }
 
-void ZELServerPath::getAbsolutePath(IZELServerString& out) const
-{
-    guarded([&] { copyText(fields_.absolutePath, out); });
-}
+void ZELServerPath::getAbsolutePath(IZELServerString& out) const { handOutText(fields_.absolutePath, out); }
 
 void ZELServerPath::readFrom(const XmlElement& element) { readAttributes(element, fields_, kPathAttributes); }
 
