@@ -13,7 +13,7 @@
 #include "api/message_numbers.h"
 #include "security/ZELServerUserToken.h"
 #include "security/security_factories.h"
-#include "support/signed_in_channel.h"
+#include "support/wire_table.h"
 
 namespace zel {
 namespace {

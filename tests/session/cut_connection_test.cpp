@@ -17,7 +17,6 @@ namespace {
 struct Step {
     enum { Read, ReadRaw, Write } kind;
     Bytes bytes = {};
-    std::size_t count = 0;
 };
 
 Step readFrame() { return {Step::Read}; }
@@ -57,7 +56,7 @@ const struct {
       answer(readyAck()),
       readFrame(),
       answer(readyAck()),
-      {Step::ReadRaw, {}, kContent.size()},
+      {Step::ReadRaw, kContent},
       answer(reply("SUCCESS", "true"))},
      addItem},
     // Every download shares this answer and its reading: the file header, the content, the final "true".
@@ -85,7 +84,7 @@ void script(FakeServer& server, const std::vector<Step>& cut, bool signInFirst, 
         if (step.kind == Step::Read) {
             server.expectAnyFrame();
         } else if (step.kind == Step::ReadRaw) {
-            server.expectRaw(step.count);
+            server.expectRaw(step.bytes);
         } else if (offset < step.bytes.size()) {
             server.sendRaw(step.bytes.substr(0, offset));
             break;

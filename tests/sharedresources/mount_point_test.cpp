@@ -121,7 +121,7 @@ TEST_F(MountPointTest, EveryCommandOnTheWire)
     const std::string source = file("up.csv", "a;b\n1;2\n");
     const fs::path temporaryFolder = dir / "tmp";
     fs::create_directory(temporaryFolder);
-    const ScopedTemporaryFolder redirected(temporaryFolder);
+    const ScopedEnv redirected(kTemporaryFolderVariable, temporaryFolder.string());
     // What a download into no named target left in the temporary folder: the file's name and content.
     const auto leftTemporary = [&] {
         std::string left;

@@ -68,14 +68,12 @@ public:
     std::uint16_t port() const { return listenPort; }
 
     // Script steps, added before start(); each returns the server for chaining.
-    // Reads one frame whose payload must equal `payload` byte for byte.
+    // Reads one frame whose payload must equal `payload` byte for byte, or that `predicate` accepts.
     FakeServer& expectFrame(Bytes payload);
-    // Reads one frame that `predicate` must accept; `what` names it in reports.
     FakeServer& expectFrameWhere(std::string what, Predicate predicate);
     FakeServer& expectAnyFrame();
-    // Reads `count` unframed bytes (file content) of any value, or exactly `bytes`.
-    FakeServer& expectRaw(std::size_t count);
-    FakeServer& expectRawBytes(Bytes bytes);
+    // Reads exactly `bytes`, unframed (file content).
+    FakeServer& expectRaw(Bytes bytes);
     // Waits until the client closes the connection; a byte arriving first is a failure.
     FakeServer& expectPeerClose();
     // Sends one frame in one write, or bytes as they are (a torn frame, file content, garbage).
@@ -84,26 +82,20 @@ public:
     FakeServer& closeConnection();
     // Closes the current connection when still open and accepts the next one.
     FakeServer& acceptNext();
-    // Connects to 127.0.0.1 at the port named by the value `portValueName` of the last frame received
-    // and sends one frame on that new connection, which stays open until the run ends.
-    FakeServer& connectBackAndSend(Bytes payload, std::string portValueName = "requesterResultPort");
-    // The same, leaving from `sourceAddress` (a dotted IPv4 address of this machine, e.g. "127.0.0.2").
-    FakeServer& connectBackFromAndSend(std::string sourceAddress, Bytes payload,
-                                       std::string portValueName = "requesterResultPort");
+    // Connects to the port named by "requesterResultPort" in the last frame received, from
+    // `sourceAddress` (a dotted IPv4 address of this machine) when given, and sends one frame on that
+    // connection, which stays open until the run ends.
+    FakeServer& connectBackAndSend(Bytes payload, std::string sourceAddress = "");
     // expectFrame(expected), then sendFrame(answer).
     FakeServer& exchange(Bytes expected, Bytes answer);
 
     // Starts the thread that runs the script; once, after the steps.
     void start();
     // Waits for the script, closes every connection, joins the thread and checks for unaccepted
-    // connections. Safe to call more than once. Returns passed().
+    // connections. Safe to call more than once. True when nothing failed.
     bool finish();
-    // finish(), as an assertion result that carries the failure report.
+    // finish(), as an assertion result that carries the first failure.
     ::testing::AssertionResult verify();
-
-    bool passed() const { return failure().empty(); }
-    // Description of the first failure; empty when none.
-    std::string failure() const;
 
 private:
     class Run;
@@ -115,6 +107,7 @@ private:
 
     FakeServer& add(std::string what, std::function<bool(Run&)> act);
     void fail(std::string message);
+    std::string failure() const;
 
     Socket listener;
     std::uint16_t listenPort = 0;

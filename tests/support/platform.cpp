@@ -1,5 +1,7 @@
 #include "support/platform.h"
 
+#include <filesystem>
+
 #if defined(_WIN32)
 #include <windows.h>
 #endif
@@ -17,16 +19,5 @@ std::string programFolder()
     return std::filesystem::canonical("/proc/self/exe").parent_path().string() + "/";
 #endif
 }
-
-// Windows takes the temporary folder from "TMP" before "TEMP"; POSIX systems from "TMPDIR".
-#if defined(_WIN32)
-constexpr const char* kTemporaryFolderVariable = "TMP";
-#else
-constexpr const char* kTemporaryFolderVariable = "TMPDIR";
-#endif
-
-ScopedTemporaryFolder::ScopedTemporaryFolder(const std::filesystem::path& folder)
-    : variable_(kTemporaryFolderVariable, folder.string())
-{}
 
 }  // namespace zeltest

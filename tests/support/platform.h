@@ -1,11 +1,8 @@
 #pragma once
-// What differs between POSIX and Windows for the tests: where the running program lies, how the
-// system's temporary folder is redirected, and whether a case applies at all.
+// What differs between POSIX and Windows for the tests: where the running program lies, where the
+// temporary folder comes from, and whether a case applies at all.
 
-#include <filesystem>
 #include <string>
-
-#include "support/environment.h"
 
 namespace zeltest {
 
@@ -20,14 +17,8 @@ inline constexpr bool kWindows = false;
 // folder beside the library and its catalogue.
 std::string programFolder();
 
-// Points the system's temporary folder (what std::filesystem::temp_directory_path gives, and so the
-// library's temporary files) at `folder` while the object lives.
-class ScopedTemporaryFolder {
-public:
-    explicit ScopedTemporaryFolder(const std::filesystem::path& folder);
-
-private:
-    ScopedEnv variable_;
-};
+// What the system's temporary folder (std::filesystem::temp_directory_path, and so the library's
+// temporary files) is taken from: Windows reads "TMP" before "TEMP", POSIX systems "TMPDIR".
+inline constexpr const char* kTemporaryFolderVariable = kWindows ? "TMP" : "TMPDIR";
 
 }  // namespace zeltest

@@ -1,20 +1,70 @@
 #pragma once
-// Table-driven wire tests of the managers on the signed-in channel. A row is one call: the command
-// bytes it must send with the server's answer (no command: the call must send nothing at all), then
-// the status number and the out values the call must leave. One test body runs a whole table in order
-// on one connection, so a row also shows that the session stays usable after the rows before it.
+// Wire tests of the managers on a channel signed in to the fake server as "ann". SignedInChannelTest
+// scripts the handshake in SetUp, so a test scripts only its own commands and then calls signIn().
+// WireTableTest runs a table of rows, each one call: the command bytes it must send with the server's
+// answer (no command: the call must send nothing at all), then the status number and the out values
+// the call must leave. One body runs a whole table in order on one connection, so a row also shows
+// that the session stays usable after the rows before it.
 
 #include <functional>
+#include <memory>
 #include <ostream>
 #include <string>
 #include <type_traits>
 #include <vector>
 
+#include <gtest/gtest.h>
 #include <zelserverapi/IZELServerVector.h>
 
-#include "support/signed_in_channel.h"
+#include "api/ZELServerString.h"
+#include "session/ZELServerConnectionInfo.h"
+#include "support/fake_server.h"
+#include "support/helpers.h"
+#include "transport/ZELServerTCPIPChannel.h"
 
 namespace zeltest {
+
+using StatusPtr = std::unique_ptr<IZELServerStatus>;
+
+class SignedInChannelTest : public ::testing::Test {
+protected:
+    void SetUp() override
+    {
+        server.exchange(request("SERVER_SESSION_INIT", {{"clientID", ""}, {"userID", "ann"}, {"userPassword", "pw1"}}),
+                        reply("SUCCESS", R"(<SESSION><IDENTITY id="ann" is_authenticated="true"/></SESSION>)"));
+    }
+
+    // Starts the script and signs in; every step of the test must be scripted before.
+    void signIn()
+    {
+        server.start();
+        const zel::ZELServerConnectionInfo info(zel::ZELServerString("127.0.0.1"), server.port(),
+                                                zel::ZELServerString("ann"), zel::ZELServerString("pw1"));
+        const StatusPtr status(channel->open(info, nullptr));
+        ASSERT_EQ(status, nullptr) << describe(status.get());
+    }
+
+    // A command of the signed-in session: the identity document named after the keyword, the empty
+    // client identifier, then the command's own values.
+    static Bytes command(const std::string& keyword, const Values& values = {})
+    {
+        Values all{{"identityObject",
+                    xmlDocument(keyword, R"(<IDENTITY id="ann" is_authenticated="true"><ROLES/></IDENTITY>)")},
+                   {"clientID", ""}};
+        all.insert(all.end(), values.begin(), values.end());
+        return request(keyword, all);
+    }
+
+    // A payload document as the library writes it: declaration, then a root element named after
+    // the command around `content`.
+    static std::string xmlDocument(const std::string& root, const std::string& content)
+    {
+        return R"(<?xml version="1.0" encoding="UTF-8" standalone="no" ?><)" + root + ">" + content + "</" + root + ">";
+    }
+
+    FakeServer server;
+    std::unique_ptr<zel::ZELServerTCPIPChannel> channel{new zel::ZELServerTCPIPChannel()};
+};
 
 // What a call left: its status number (0 for none) and its out values, each followed by a space.
 struct Outcome {
@@ -80,9 +130,7 @@ Outcome outcome(IZELServerStatus* raw, Outs&&... outs)
 inline std::function<void(FakeServer&)> uploadOf(const std::string& content, const Bytes& answer)
 {
     return [=](FakeServer& server) {
-        server.exchange(fileHeader(content.size(), crc32(content)), readyAck())
-            .expectRawBytes(content)
-            .sendFrame(answer);
+        server.exchange(fileHeader(content.size(), crc32(content)), readyAck()).expectRaw(content).sendFrame(answer);
     };
 }
 

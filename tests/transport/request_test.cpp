@@ -98,11 +98,13 @@ TEST(RequestXmlValue, FailedDocumentsAddNothingAndLeaveTheRequestUsable)
     EXPECT_EQ(request.addRepositoryPayload("repositoryObject", ZELServerString("r"), ZELServerString("\x01")),
               kSerializeFailed);
     EXPECT_EQ(textOf(request), "K\0clientID="s);
-    // Nothing of the failed documents is left behind in the next ones; local text is converted.
-    EXPECT_EQ(request.addXmlValue("good", ItemXml("a<b"), "ROOT"), 0);
+    // Nothing of the failed documents is left behind in the next ones; local text is converted, and
+    // markup and the white space a reader would normalise are escaped.
+    EXPECT_EQ(request.addXmlValue("good", ItemXml("a<b>c & \"q\" &amp; \t\n\r"), "ROOT"), 0);
     EXPECT_EQ(request.addRepositoryPayload("repositoryObject", ZELServerString("Caf\xE9"), ZELServerString("")), 0);
     EXPECT_EQ(textOf(request),
-              "K\0clientID=\0good="s + kDeclaration + R"(<ROOT><ITEM value="a&lt;b"/></ROOT>)" +
+              "K\0clientID=\0good="s + kDeclaration +
+                  R"(<ROOT><ITEM value="a&lt;b>c &amp; &quot;q&quot; &amp;amp; &#x9;&#xA;&#xD;"/></ROOT>)" +
                   "\0repositoryObject="s + kDeclaration +
                   "<REP_ADD_REPOSITORY><REPOSITORY description=\"\" name=\"Caf\xC3\xA9\"/></REP_ADD_REPOSITORY>");
 }

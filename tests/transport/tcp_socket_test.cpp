@@ -51,17 +51,6 @@ TEST(TcpSocket, SendToAClosedPeerFailsWithoutASignal)
     EXPECT_TRUE(server.verify());
 }
 
-TEST(TcpSocket, ClientConnectsByName)
-{
-    FakeServer server;
-    server.expectPeerClose().start();
-    TcpSocket client("localhost", server.port());
-    EXPECT_EQ(client.errorCode, 0);
-    EXPECT_EQ(client.getPeerAddress(), nullptr);
-    client.close();
-    EXPECT_TRUE(server.verify());
-}
-
 TEST(TcpSocket, FixedPortCanBeListenedOnAgainWhileTheOldConnectionLingers)
 {
     std::uint16_t port = zeltest::releasedPort();

@@ -42,14 +42,15 @@ protected:
 
 TEST_F(XmlReaderTest, ChildrenAreFoundIgnoringCaseButAttributesExactly)
 {
-    XmlElement* root = parsed(R"(<R a="1">text<!--IDENTITY--><?IDENTITY x?><OTHER><IDENTITY n='deep'/></OTHER>)"
-                              R"(<identity n='first'/><IDENTITY n='second'/></R>)");
+    XmlElement* root =
+        parsed(R"(<R a="&lt;1&#x9;&#10;&quot;">text<!--IDENTITY--><?IDENTITY x?><OTHER><IDENTITY n='deep'/></OTHER>)"
+               R"(<identity n='first'/><IDENTITY n='second'/></R>)");
     ASSERT_NE(root, nullptr);
     std::string value = "stale";
     EXPECT_FALSE(getAttribute(root, "A", value));
     EXPECT_EQ(value, "");
     EXPECT_TRUE(getAttribute(root, "a", value));
-    EXPECT_EQ(value, "1");
+    EXPECT_EQ(value, "<1\t\n\"");
     EXPECT_EQ(describe({findChild(root, "Identity")}, "n"), Strings{"first"});
     EXPECT_EQ(findChild(root, "MISSING"), nullptr);
     EXPECT_EQ(findChild(findChild(root, "OTHER"), "OTHER"), nullptr);
