@@ -5,10 +5,12 @@
 
 #include <gtest/gtest.h>
 
+#include <atomic>
 #include <filesystem>
 #include <fstream>
 #include <memory>
 #include <string>
+#include <thread>
 #include <vector>
 
 #include "api/ZELServerStatus.h"
@@ -101,6 +103,37 @@ TEST(ServerStatus, DestroyingAnyTokenHolderTearsTheDatabaseDown)
     second.reset();
     EXPECT_FALSE(zel::messageDatabaseStarted());
     EXPECT_EQ(message(StatusPtr(zel::makeStatus(zel::msg::kRequiredValueMissing))), "second text");
+}
+
+// Statuses built and destroyed on several threads at once, with the library's catalogue and the
+// framework's catalogue giving different texts: a teardown slipping in between one status's start-up
+// and its look-up would send that look-up to the framework's catalogue, which shows in the text.
+TEST(MessageCatalogue, EveryStatusOnEveryThreadReadsTheLibrarysOwnCatalogue)
+{
+    const Home library("zel-library");
+    const Home framework("zel-framework");
+    writeCatalogue(library, "393623 library %1\n");
+    writeCatalogue(framework, "393623 framework %1\n");
+    const ScopedEnv home("ZEL_SERVERAPI_HOME", library.path().string());
+    const ScopedEnv frameworkHome("ZEL_HOME", framework.path().string());
+
+    std::atomic<int> wrong{0};
+    std::vector<std::thread> threads;
+    for (int t = 0; t < 4; ++t) {
+        threads.emplace_back([&wrong, t] {
+            for (int i = 0; i < 1000; ++i) {
+                const std::string name = std::string("f").append(std::to_string(t * 1000 + i));
+                if (message(StatusPtr(zel::makeStatus(zel::msg::kLocalFileRead, name))) != "library " + name) {
+                    ++wrong;
+                }
+            }
+        });
+    }
+    for (std::thread& thread : threads) {
+        thread.join();
+    }
+    EXPECT_EQ(wrong.load(), 0);
+    EXPECT_FALSE(zel::messageDatabaseStarted());
 }
 
 TEST(Catalogue, FillsTheTextOrRefusesAMalformedLine)
