@@ -21,6 +21,10 @@ constexpr std::string_view kServiceColumns =
     "id, name, display_name, description, url_pattern, enabled, reg_workspace, "
     "reg_customformat, reg_customtransformer, reg_template";
 
+RepositoryRecord repositoryFrom(const Statement& row) { return {row.text(0), row.text(1)}; }
+
+ResourceRecord resourceFrom(const Statement& row) { return {row.text(0), row.text(1), row.integer(2)}; }
+
 ItemRecord itemFrom(const Statement& row)
 {
     return {row.integer(0), row.text(1), row.text(2), row.text(3), row.integer(4), row.text(5)};
@@ -128,11 +132,8 @@ std::vector<std::string> RepositoryStore::blobsOfItems(std::string_view where, c
 std::vector<RepositoryRecord> RepositoryStore::repositories()
 {
     std::lock_guard lock(db_.mutex());
-    std::vector<RepositoryRecord> out;
     Statement all(db_, "SELECT name, description FROM repositories ORDER BY name");
-    while (all.step())
-        out.push_back({all.text(0), all.text(1)});
-    return out;
+    return all.rows(repositoryFrom);
 }
 
 std::optional<RepositoryRecord> RepositoryStore::repository(const std::string& name)
@@ -140,9 +141,7 @@ std::optional<RepositoryRecord> RepositoryStore::repository(const std::string& n
     std::lock_guard lock(db_.mutex());
     Statement one(db_, "SELECT name, description FROM repositories WHERE name = ?");
     one.bind(1, name);
-    if (!one.step())
-        return std::nullopt;
-    return RepositoryRecord{one.text(0), one.text(1)};
+    return one.firstRow(repositoryFrom);
 }
 
 std::string RepositoryStore::addRepository(const RepositoryRecord& record)
@@ -176,22 +175,16 @@ bool RepositoryStore::removeRepository(const std::string& name)
 std::vector<ItemRecord> RepositoryStore::items(const std::string& repository)
 {
     std::lock_guard lock(db_.mutex());
-    std::vector<ItemRecord> out;
     Statement all(db_, "SELECT " + std::string(kItemColumns) + " FROM items WHERE repository = ? ORDER BY name");
     all.bind(1, repository);
-    while (all.step())
-        out.push_back(itemFrom(all));
-    return out;
+    return all.rows(itemFrom);
 }
 
 std::vector<ItemRecord> RepositoryStore::allItems()
 {
     std::lock_guard lock(db_.mutex());
-    std::vector<ItemRecord> out;
     Statement all(db_, "SELECT " + std::string(kItemColumns) + " FROM items ORDER BY repository, name");
-    while (all.step())
-        out.push_back(itemFrom(all));
-    return out;
+    return all.rows(itemFrom);
 }
 
 std::optional<ItemRecord> RepositoryStore::item(const std::string& repository, const std::string& name)
@@ -199,9 +192,7 @@ std::optional<ItemRecord> RepositoryStore::item(const std::string& repository, c
     std::lock_guard lock(db_.mutex());
     Statement one(db_, "SELECT " + std::string(kItemColumns) + " FROM items WHERE repository = ? AND name = ?");
     one.bind(1, repository).bind(2, name);
-    if (!one.step())
-        return std::nullopt;
-    return itemFrom(one);
+    return one.firstRow(itemFrom);
 }
 
 std::optional<ItemRecord> RepositoryStore::itemById(std::int64_t id)
@@ -209,9 +200,7 @@ std::optional<ItemRecord> RepositoryStore::itemById(std::int64_t id)
     std::lock_guard lock(db_.mutex());
     Statement one(db_, "SELECT " + std::string(kItemColumns) + " FROM items WHERE id = ?");
     one.bind(1, id);
-    if (!one.step())
-        return std::nullopt;
-    return itemFrom(one);
+    return one.firstRow(itemFrom);
 }
 
 std::string RepositoryStore::putItem(const std::string& repository, const std::string& name, TempFile& content,
@@ -276,12 +265,9 @@ bool RepositoryStore::removeItem(const std::string& repository, const std::strin
 std::vector<ResourceRecord> RepositoryStore::resources(std::int64_t itemId)
 {
     std::lock_guard lock(db_.mutex());
-    std::vector<ResourceRecord> out;
     Statement all(db_, "SELECT name, blob, filesize FROM resources WHERE item_id = ? ORDER BY name");
     all.bind(1, itemId);
-    while (all.step())
-        out.push_back({all.text(0), all.text(1), all.integer(2)});
-    return out;
+    return all.rows(resourceFrom);
 }
 
 std::optional<ResourceRecord> RepositoryStore::resource(std::int64_t itemId, const std::string& name)
@@ -289,9 +275,7 @@ std::optional<ResourceRecord> RepositoryStore::resource(std::int64_t itemId, con
     std::lock_guard lock(db_.mutex());
     Statement one(db_, "SELECT name, blob, filesize FROM resources WHERE item_id = ? AND name = ?");
     one.bind(1, itemId).bind(2, name);
-    if (!one.step())
-        return std::nullopt;
-    return ResourceRecord{one.text(0), one.text(1), one.integer(2)};
+    return one.firstRow(resourceFrom);
 }
 
 std::string RepositoryStore::putResource(std::int64_t itemId, const std::string& name, TempFile& content,
@@ -349,11 +333,8 @@ bool RepositoryStore::removeResource(std::int64_t itemId, const std::string& nam
 std::vector<ServiceRecord> RepositoryStore::services()
 {
     std::lock_guard lock(db_.mutex());
-    std::vector<ServiceRecord> out;
     Statement all(db_, "SELECT " + std::string(kServiceColumns) + " FROM services ORDER BY name");
-    while (all.step())
-        out.push_back(serviceFrom(all));
-    return out;
+    return all.rows(serviceFrom);
 }
 
 std::optional<ServiceRecord> RepositoryStore::service(const std::string& name)
@@ -361,9 +342,7 @@ std::optional<ServiceRecord> RepositoryStore::service(const std::string& name)
     std::lock_guard lock(db_.mutex());
     Statement one(db_, "SELECT " + std::string(kServiceColumns) + " FROM services WHERE name = ?");
     one.bind(1, name);
-    if (!one.step())
-        return std::nullopt;
-    return serviceFrom(one);
+    return one.firstRow(serviceFrom);
 }
 
 std::optional<ServiceRecord> RepositoryStore::serviceById(std::int64_t id)
@@ -371,9 +350,7 @@ std::optional<ServiceRecord> RepositoryStore::serviceById(std::int64_t id)
     std::lock_guard lock(db_.mutex());
     Statement one(db_, "SELECT " + std::string(kServiceColumns) + " FROM services WHERE id = ?");
     one.bind(1, id);
-    if (!one.step())
-        return std::nullopt;
-    return serviceFrom(one);
+    return one.firstRow(serviceFrom);
 }
 
 std::string RepositoryStore::addService(const ServiceRecord& record)
@@ -448,26 +425,20 @@ bool RepositoryStore::deregisterItem(std::int64_t serviceId, std::int64_t itemId
 std::vector<ItemRecord> RepositoryStore::registeredItems(std::int64_t serviceId)
 {
     std::lock_guard lock(db_.mutex());
-    std::vector<ItemRecord> out;
     Statement all(db_, "SELECT i.id, i.repository, i.name, i.blob, i.filesize, i.saved_at "
                        "FROM items i JOIN registrations r ON r.item_id = i.id "
                        "WHERE r.service_id = ? ORDER BY i.repository, i.name");
     all.bind(1, serviceId);
-    while (all.step())
-        out.push_back(itemFrom(all));
-    return out;
+    return all.rows(itemFrom);
 }
 
 std::vector<std::int64_t> RepositoryStore::servicesOfItem(std::int64_t itemId)
 {
     std::lock_guard lock(db_.mutex());
-    std::vector<std::int64_t> out;
     Statement all(db_, "SELECT r.service_id FROM registrations r JOIN services s "
                        "ON s.id = r.service_id WHERE r.item_id = ? ORDER BY s.name");
     all.bind(1, itemId);
-    while (all.step())
-        out.push_back(all.integer(0));
-    return out;
+    return all.rows([](const Statement& row) { return row.integer(0); });
 }
 
 std::vector<PropertyRecord> RepositoryStore::properties(const std::string& ownerKey)

@@ -59,6 +59,24 @@ public:
     std::int64_t integer(int column) const;
     std::string error() const;
 
+    // The next row as `from` reads it; nullopt when there is none (at the end or on error).
+    template <class From>
+    auto firstRow(From from) -> std::optional<decltype(from(*this))>
+    {
+        if (!step())
+            return std::nullopt;
+        return from(*this);
+    }
+    // Every remaining row as `from` reads it.
+    template <class From>
+    auto rows(From from) -> std::vector<decltype(from(*this))>
+    {
+        std::vector<decltype(from(*this))> read;
+        while (step())
+            read.push_back(from(*this));
+        return read;
+    }
+
 private:
     Database& db_;
     sqlite3_stmt* stmt_ = nullptr;
