@@ -52,6 +52,23 @@ void forEachElement(const XmlElement* scope, Visit visit)
     }
 }
 
+// forEachElement over the elements tagged exactly `tag`; none for a null scope or a tag that does
+// not transcode.
+template <class Visit>
+void forEachNamed(const XmlElement* scope, std::string_view tag, Visit visit)
+{
+    if (scope == nullptr) {
+        return;
+    }
+    const XmlText wanted(tag);
+    if (!wanted.valid()) {
+        return;
+    }
+    forEachElement(scope, [&](DOMElement* element) {
+        return !xercesc::XMLString::equals(element->getTagName(), wanted.get()) || visit(element);
+    });
+}
+
 template <class Match>
 std::vector<XmlElement*> collectChildren(const XmlElement* parent, Match match)
 {
@@ -110,18 +127,9 @@ std::vector<XmlElement*> childElements(const XmlElement* parent, std::string_vie
 std::vector<XmlElement*> elementsNamed(const XmlElement* scope, std::string_view tag)
 {
     std::vector<XmlElement*> found;
-    if (scope == nullptr) {
-        return found;
-    }
-    const XmlText wanted(tag);
-    if (!wanted.valid()) {
-        return found;
-    }
-    forEachElement(scope, [&](DOMElement* element) {
-        if (xercesc::XMLString::equals(element->getTagName(), wanted.get())) {
-            if (XmlElement* wrapper = scope->owner().wrap(element)) {
-                found.push_back(wrapper);
-            }
+    forEachNamed(scope, tag, [&](DOMElement* element) {
+        if (XmlElement* wrapper = scope->owner().wrap(element)) {
+            found.push_back(wrapper);
         }
         return true;
     });
@@ -131,19 +139,9 @@ std::vector<XmlElement*> elementsNamed(const XmlElement* scope, std::string_view
 XmlElement* firstElementNamed(const XmlElement* scope, std::string_view tag)
 {
     XmlElement* found = nullptr;
-    if (scope == nullptr) {
-        return found;
-    }
-    const XmlText wanted(tag);
-    if (!wanted.valid()) {
-        return found;
-    }
-    forEachElement(scope, [&](DOMElement* element) {
-        if (xercesc::XMLString::equals(element->getTagName(), wanted.get())) {
-            found = scope->owner().wrap(element);
-            return false;
-        }
-        return true;
+    forEachNamed(scope, tag, [&](DOMElement* element) {
+        found = scope->owner().wrap(element);
+        return false;
     });
     return found;
 }
