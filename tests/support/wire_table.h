@@ -28,11 +28,12 @@ using StatusPtr = std::unique_ptr<IZELServerStatus>;
 
 class SignedInChannelTest : public ::testing::Test {
 protected:
-    void SetUp() override
-    {
-        server.exchange(request("SERVER_SESSION_INIT", {{"clientID", ""}, {"userID", "ann"}, {"userPassword", "pw1"}}),
-                        reply("SUCCESS", R"(<SESSION><IDENTITY id="ann" is_authenticated="true"/></SESSION>)"));
-    }
+    static inline const Bytes kHandshake =
+        request("SERVER_SESSION_INIT", {{"clientID", ""}, {"userID", "ann"}, {"userPassword", "pw1"}});
+    static inline const Bytes kSignedIn =
+        reply("SUCCESS", R"(<SESSION><IDENTITY id="ann" is_authenticated="true"/></SESSION>)");
+
+    void SetUp() override { server.exchange(kHandshake, kSignedIn); }
 
     // Starts the script and signs in; every step of the test must be scripted before.
     void signIn()

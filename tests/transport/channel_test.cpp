@@ -21,48 +21,22 @@
 #include "platform/net.h"
 #include "session/ZELServerConnectionInfo.h"
 #include "support/environment.h"
-#include "support/fake_server.h"
-#include "support/helpers.h"
 #include "support/sockets.h"
+#include "support/wire_table.h"
 #include "transport/IZELServerRequest.h"
 #include "transport/IZELServerResponse.h"
 #include "transport/TcpSocket.h"
 
-namespace zel {
+namespace zeltest {
 namespace {
 
 namespace fs = std::filesystem;
 using namespace std::string_literals;
-using zeltest::Bytes;
-using zeltest::describe;
-using zeltest::FakeServer;
-using zeltest::pattern;
-using zeltest::ProgressLog;
-using zeltest::reply;
-using zeltest::Values;
-
-using StatusPtr = std::unique_ptr<IZELServerStatus>;
+using namespace zel;
 using RequestPtr = std::unique_ptr<IZELServerRequest>;
 using ResponsePtr = std::unique_ptr<IZELServerResponse>;
 using Strings = std::vector<std::string>;
-using namespace msg;
-
-const std::string kIdentity =
-    R"(<IDENTITY id="ann" is_authenticated="true"><ROLES><ROLE name="admin"/><ROLE name="ops"/></ROLES></IDENTITY>)";
-const Bytes kSignedIn = reply("SUCCESS", R"(<SESSION security_enabled="true">)" + kIdentity + "</SESSION>");
-const Bytes kFirstHandshake =
-    zeltest::request("SERVER_SESSION_INIT", {{"clientID", ""}, {"userID", "ann"}, {"userPassword", "pw1"}});
-
-// A command of the signed-in session: the identity document named after the keyword, the client
-// identifier, then the command's own values.
-Bytes command(const std::string& keyword, const Values& values = {}, const std::string& clientId = "")
-{
-    Values all{{"identityObject", R"(<?xml version="1.0" encoding="UTF-8" standalone="no" ?><)" + keyword + ">" +
-                                      kIdentity + "</" + keyword + ">"},
-               {"clientID", clientId}};
-    all.insert(all.end(), values.begin(), values.end());
-    return zeltest::request(keyword, all);
-}
+using namespace zel::msg;
 
 // Success for number 0, else that message number (and code, when given).
 ::testing::AssertionResult gives(const StatusPtr& status, unsigned number, std::optional<unsigned> code = {})
@@ -74,7 +48,8 @@ Bytes command(const std::string& keyword, const Values& values = {}, const std::
     return ::testing::AssertionFailure() << "got " << describe(status.get());
 }
 
-class ChannelTest : public ::testing::Test {
+// Signed in by the fixture's script (SetUp) unless a test runs a server of its own.
+class ChannelTest : public SignedInChannelTest {
 protected:
     // ann / pw1 without properties; otherwise only the properties.
     static StatusPtr openOn(ZELServerTCPIPChannel& channel, std::uint16_t port, const Strings& properties = {},
@@ -86,13 +61,6 @@ protected:
                                : new ZELServerConnectionInfo(host, port, ZELServerStringArray(properties)));
         const ZELServerStringArray optionList(options);
         return StatusPtr(channel.open(*info, options.empty() ? nullptr : &optionList));
-    }
-
-    // Starts the script and signs in; it must begin with the first handshake.
-    void open(const Strings& options = {})
-    {
-        server.start();
-        ASSERT_TRUE(gives(openOn(*channel, server.port(), {}, options), 0));
     }
 
     static StatusPtr withBody(IZELServerStatus* status, IZELServerResponse& response, std::string* body)
@@ -121,50 +89,57 @@ protected:
         return withBody(channel->transferFile(*request, *response, path, direction, progress), *response, body);
     }
 
-    StatusPtr resultPort(const Strings& directives, const Strings& notifications = {}, std::string* body = nullptr)
+    StatusPtr resultPort(const Strings& directives, std::string* body = nullptr)
     {
         const RequestPtr request(
-            channel->createRequest("JOB", ZELServerStringArray(directives), ZELServerStringArray(notifications)));
+            channel->createRequest("JOB", ZELServerStringArray(directives), ZELServerStringArray()));
         const ResponsePtr response(channel->createResponse());
         return withBody(channel->sendRequest(*request, *response, kResultPortRequest), *response, body);
     }
 
     std::string file(const std::string& name, const std::string& content) const
     {
-        zeltest::spew(dir / name, content);
+        spew(dir / name, content);
         return (dir / name).string();
     }
 
-    FakeServer server;
-    std::unique_ptr<ZELServerTCPIPChannel> channel{new ZELServerTCPIPChannel()};
-    const zeltest::TempDir scratch{"zel-channel"};
+    const TempDir scratch{"zel-channel"};
     const fs::path dir{scratch.path()};
 };
 
 // ---- Sign-in and connection -------------------------------------------------------------------------
 
-// A second open on the live connection repeats the handshake, now with the identity, and keeps the
-// identity object.
+// The first handshake on the wire as it is, byte for byte; later requests carry the identity with its
+// roles and the client identifier, and a second open on the live connection repeats the handshake
+// with them, keeping the identity object.
 TEST_F(ChannelTest, HandshakesAreByteExactAndLaterRequestsCarryIdentityAndClientId)
 {
-    server
+    const std::string identity =
+        R"(<IDENTITY id="ann" is_authenticated="true"><ROLES><ROLE name="admin"/><ROLE name="ops"/></ROLES></IDENTITY>)";
+    const Bytes welcome = reply("SUCCESS", "<SESSION>" + identity + "</SESSION>");
+    const auto signedIn = [&](const std::string& keyword, Values values) {
+        values.insert(values.begin(), {{"identityObject", xmlDocument(keyword, identity)}, {"clientID", "tool-7"}});
+        return request(keyword, values);
+    };
+    FakeServer first;
+    first
         .expectRaw("\x00\x00\x00\x4C"
                    "APIVERSION=1\0SERVER_SESSION_INIT\0clientID=tool-7\0userID=ann\0userPassword=pw1"s)
-        .sendFrame(kSignedIn)
-        .exchange(command("SERVER_SESSION_GET_PROP", {{"sessionPropName", "version"}}, "tool-7"),
-                  reply("SUCCESS", "2.1"))
-        .exchange(command("SERVER_SESSION_INIT", {{"userID", "ann"}, {"userPassword", "pw1"}}, "tool-7"), kSignedIn);
-    open({"IGNORED", "x", "CLIENT_ID", "tool-7"});
+        .sendFrame(welcome)
+        .exchange(signedIn("SERVER_SESSION_GET_PROP", {{"sessionPropName", "version"}}), reply("SUCCESS", "2.1"))
+        .exchange(signedIn("SERVER_SESSION_INIT", {{"userID", "ann"}, {"userPassword", "pw1"}}), welcome)
+        .start();
+    ASSERT_TRUE(gives(openOn(*channel, first.port(), {}, {"IGNORED", "x", "CLIENT_ID", "tool-7"}), 0));
     std::string body;
     EXPECT_TRUE(gives(plain("SERVER_SESSION_GET_PROP", {{"sessionPropName", "version"}}, &body), 0));
     EXPECT_EQ(body, "2.1");
     ZELServerStringArray roles;
-    IZELServerIdentity* identity = channel->getIdentity();
-    identity->getRoles(roles);
+    IZELServerIdentity* const before = channel->getIdentity();
+    before->getRoles(roles);
     EXPECT_EQ(roles.items(), (Strings{"admin", "ops"}));
-    EXPECT_TRUE(gives(openOn(*channel, server.port(), {}, {"CLIENT_ID", "tool-7"}), 0));
-    EXPECT_EQ(channel->getIdentity(), identity);
-    EXPECT_TRUE(server.verify());
+    EXPECT_TRUE(gives(openOn(*channel, first.port(), {}, {"CLIENT_ID", "tool-7"}), 0));
+    EXPECT_EQ(channel->getIdentity(), before);
+    EXPECT_TRUE(first.verify());
 }
 
 TEST_F(ChannelTest, SignInValuesFollowTheAuthenticationKindAndRefusalsLeaveAnEmptyIdentity)
@@ -188,9 +163,9 @@ TEST_F(ChannelTest, SignInValuesFollowTheAuthenticationKindAndRefusalsLeaveAnEmp
         {{}, password, "SUCCESS\0"s, kReplyWithoutBody, 0},
     };
     for (const auto& c : cases) {
-        SCOPED_TRACE(zeltest::printable(c.answer));
+        SCOPED_TRACE(printable(c.answer));
         FakeServer caseServer;
-        caseServer.exchange(zeltest::request("SERVER_SESSION_INIT", c.values), c.answer).start();
+        caseServer.exchange(request("SERVER_SESSION_INIT", c.values), c.answer).start();
         ZELServerTCPIPChannel caseChannel;
         EXPECT_TRUE(gives(openOn(caseChannel, caseServer.port(), c.properties), c.number, c.code));
         ASSERT_NE(caseChannel.getIdentity(), nullptr);
@@ -202,13 +177,13 @@ TEST_F(ChannelTest, SignInValuesFollowTheAuthenticationKindAndRefusalsLeaveAnEmp
 
 TEST_F(ChannelTest, ConnectFailureThenCloseAndFailuresOfAnOpenConnection)
 {
-    const zeltest::ClosedPort closed;
+    const ClosedPort closed;
     EXPECT_TRUE(gives(openOn(*channel, closed.port()), kConnectFailed, SOCK_CONNECT_FAILED));
     EXPECT_EQ(channel->getIdentity(), nullptr);
 
     // The failed socket is replaced by the next open; close hangs up.
-    server.exchange(kFirstHandshake, kSignedIn).expectPeerClose();
-    open();
+    server.expectPeerClose();
+    signIn();
     EXPECT_TRUE(gives(StatusPtr(channel->close()), 0));
     EXPECT_TRUE(server.verify());
     EXPECT_TRUE(gives(plain("PING"), kNotConnected));
@@ -239,11 +214,10 @@ TEST_F(ChannelTest, RepliesAreClassifiedByTheirStatusWord)
         {"no NUL", "SUCCESS"s, kReplyWithoutBody, 0, "SUCCESS", ""},
         {"unknown status word", "success\0x"s, kUnexpectedReply, 0, "success", ""},
     };
-    server.exchange(kFirstHandshake, kSignedIn);
     for (const auto& c : cases) {
         server.exchange(command("CMD", {{"case", c.name}}), c.answer);
     }
-    open();
+    signIn();
     for (const auto& c : cases) {
         SCOPED_TRACE(c.name);
         std::string body = "not read";
@@ -254,17 +228,16 @@ TEST_F(ChannelTest, RepliesAreClassifiedByTheirStatusWord)
             EXPECT_TRUE(c.number == kServerError ? message == c.message : message.find(c.message) != std::string::npos)
                 << message;
         }
-        EXPECT_EQ(body, c.body) << zeltest::printable(body);
+        EXPECT_EQ(body, c.body) << printable(body);
     }
     EXPECT_TRUE(server.verify());
 }
 
 TEST_F(ChannelTest, RequestTextThatIsNotUtf8IsSentAsUtf8FromLatin1)
 {
-    server.exchange(kFirstHandshake, kSignedIn);
     server.exchange(command("CMD", {{"name", "caf\xC3\xA9"}}), reply("SUCCESS", "1"))
         .exchange(command("CMD", {{"name", "caf\xC3\xA9"}}), reply("SUCCESS", "2"));
-    open();
+    signIn();
     EXPECT_TRUE(gives(plain("CMD", {{"name", "caf\xE9"}}), 0));
     EXPECT_TRUE(gives(plain("CMD", {{"name", "caf\xC3\xA9"}}), 0));
     EXPECT_TRUE(server.verify());
@@ -281,17 +254,15 @@ TEST_F(ChannelTest, UploadSendsHeaderAndContentBetweenTwoAcknowledgements)
         {0, {"total 0", "start", "finish"}},
         {300000, {"total 300000", "start", "at 0", "at 131072", "at 262144", "finish"}},
     };
-    server.exchange(kFirstHandshake, kSignedIn);
     for (const auto& c : cases) {
         const std::string content = pattern(c.size);
-        server.exchange(command("XFER"), zeltest::readyAck())
-            .exchange(zeltest::fileHeader(c.size, zeltest::crc32(content)), zeltest::readyAck());
+        server.exchange(command("XFER"), readyAck()).exchange(fileHeader(c.size, crc32(content)), readyAck());
         if (c.size > 0) {
             server.expectRaw(content);
         }
         server.sendFrame(reply("SUCCESS", "stored"));
     }
-    open();
+    signIn();
     for (const auto& c : cases) {
         ProgressLog progress;
         std::string body;
@@ -315,18 +286,17 @@ TEST_F(ChannelTest, UploadStopsAtARefusedAcknowledgementAndStaysInStep)
         {true, "SUCCESS"s, kReplyWithoutBody, 0},
         {true, "ERROR\0quota"s, kServerError, 0},
     };
-    server.exchange(kFirstHandshake, kSignedIn);
     for (const auto& c : cases) {
         server.expectFrame(command("XFER"));
         if (c.atSecond) {
-            server.sendFrame(zeltest::readyAck()).expectFrame(zeltest::fileHeader(4, zeltest::crc32("data")));
+            server.sendFrame(readyAck()).expectFrame(fileHeader(4, crc32("data")));
         }
         server.sendFrame(c.answer);
     }
-    open();
+    signIn();
     const std::string path = file("f", "data");
     for (const auto& c : cases) {
-        EXPECT_TRUE(gives(transfer(path, kUpload), c.number, c.code)) << zeltest::printable(c.answer);
+        EXPECT_TRUE(gives(transfer(path, kUpload), c.number, c.code)) << printable(c.answer);
     }
     EXPECT_TRUE(server.verify());
 }
@@ -345,8 +315,7 @@ TEST_F(ChannelTest, LocalFileProblemsSendNothing)
         {error ? (dir / "missing").string() : huge, kUpload, kLocalFileRead},
         {(dir / "no" / "such" / "dir" / "f").string(), kDownload, kLocalFileWrite},
     };
-    server.exchange(kFirstHandshake, kSignedIn);
-    open();
+    signIn();
     for (const auto& c : cases) {
         ProgressLog progress;
         const StatusPtr status = transfer(c.path, c.direction, &progress);
@@ -375,14 +344,14 @@ TEST_F(ChannelTest, DownloadReplacesTheDestinationOnlyAfterAWholeSuccessfulExcha
     } cases[] = {
         {"no file", reply("SUCCESS", "nothing to send"), "", 0, "old", "false", {}},
         {"refused after the file",
-         zeltest::fileHeader(5, zeltest::crc32("fresh")),
+         fileHeader(5, crc32("fresh")),
          reply("ERROR", "disk full"),
          kServerError,
          "old",
          "disk full",
          {"total 5", "start", "at 0", "finish"}},
         {"complete",
-         zeltest::fileHeader(5, zeltest::crc32("fresh")),
+         fileHeader(5, crc32("fresh")),
          reply("SUCCESS", "true"),
          0,
          "fresh",
@@ -390,21 +359,20 @@ TEST_F(ChannelTest, DownloadReplacesTheDestinationOnlyAfterAWholeSuccessfulExcha
          {"total 5", "start", "at 0", "finish"}},
         {"unusable header", "fileLength=3"s, "", kReplyWithoutBody, "old", "", {}},
     };
-    server.exchange(kFirstHandshake, kSignedIn);
     for (const auto& c : cases) {
         server.exchange(command("XFER"), c.first);
         if (!c.last.empty()) {
-            server.expectFrame(zeltest::readyAck()).sendRaw("fresh").exchange(zeltest::readyAck(), c.last);
+            server.expectFrame(readyAck()).sendRaw("fresh").exchange(readyAck(), c.last);
         }
     }
-    open();
+    signIn();
     for (const auto& c : cases) {
         SCOPED_TRACE(c.name);
         const std::string destination = file("kept", "old");
         ProgressLog progress;
         std::string body = "not read";
         EXPECT_TRUE(gives(transfer(destination, kDownload, &progress, &body), c.number));
-        EXPECT_EQ(zeltest::slurp(destination), c.content);
+        EXPECT_EQ(slurp(destination), c.content);
         EXPECT_EQ(std::distance(fs::directory_iterator(dir), {}), 1) << "no temporary file";
         EXPECT_EQ(body, c.body);
         EXPECT_EQ(progress.calls, c.progress);
@@ -418,22 +386,22 @@ TEST_F(ChannelTest, DownloadReplacesTheDestinationOnlyAfterAWholeSuccessfulExcha
 // listened on, and is sent again behind them.
 TEST_F(ChannelTest, ResultPortListensWhereAskedAndTakesTheResultFromTheServersCall)
 {
-    const std::string wanted = std::to_string(zeltest::releasedPort());
+    const std::string wanted = std::to_string(releasedPort());
     TcpSocket probe("127.0.0.1", 9);  // only for its localHostAddress; the connect may fail
     char host[50] = {};
     probe.localHostAddress(host, sizeof host);
     const Bytes result = "<RESULT id=\"7\"/>\0tail"s;
-    server.exchange(kFirstHandshake, kSignedIn)
+    server
         .exchange(command("JOB", {{"requesterResultPort", wanted},
                                   {"requesterHost", host},
                                   {"requesterResultPort", wanted},
                                   {"tag", "x"}}),
                   reply("SUCCESS", "queued"))
         .connectBackAndSend(result);
-    open();
+    signIn();
     std::string body;
-    EXPECT_TRUE(gives(resultPort({"requesterResultPort", wanted, "tag", "x"}, {}, &body), 0));
-    EXPECT_EQ(body, result) << zeltest::printable(body);
+    EXPECT_TRUE(gives(resultPort({"requesterResultPort", wanted, "tag", "x"}, &body), 0));
+    EXPECT_EQ(body, result) << printable(body);
     EXPECT_TRUE(server.verify());
 }
 
@@ -454,7 +422,7 @@ TEST_F(ChannelTest, ResultPortCallersOutsideTheTrustedListAreSkipped)
         }
         SCOPED_TRACE(c.trusted);
         FakeServer caseServer;
-        caseServer.exchange(kFirstHandshake, kSignedIn)
+        caseServer.exchange(kHandshake, kSignedIn)
             .expectAnyFrame()
             .sendFrame(reply("SUCCESS", "queued"))
             .connectBackAndSend("from a stranger", "127.0.0.2")
@@ -463,7 +431,7 @@ TEST_F(ChannelTest, ResultPortCallersOutsideTheTrustedListAreSkipped)
         channel.reset(new ZELServerTCPIPChannel());
         ASSERT_TRUE(gives(openOn(*channel, caseServer.port(), {}, {"TRUSTED_HOST_NAMES", c.trusted}), 0));
         std::string body;
-        EXPECT_TRUE(gives(resultPort({}, {}, &body), 0));
+        EXPECT_TRUE(gives(resultPort({}, &body), 0));
         EXPECT_EQ(body, "trusted");
         EXPECT_TRUE(caseServer.verify());
     }
@@ -475,8 +443,7 @@ TEST_F(ChannelTest, ResultPortThatCannotBeOpenedSendsNothing)
     std::uint16_t busyPort = 0;
     TcpSocket busy(busyPort);
     ASSERT_EQ(busy.errorCode, 0);
-    server.exchange(kFirstHandshake, kSignedIn);
-    open();
+    signIn();
     const struct {
         std::string port;
         unsigned number;
@@ -497,11 +464,13 @@ TEST_F(ChannelTest, ResultPortThatCannotBeOpenedSendsNothing)
 // untrusted callers come is given up after RESULT_PORT_TIMEOUT.
 TEST_F(ChannelTest, SendsAndTheResultPortWaitOnlyAsLongAsTheTimeOuts)
 {
-    server.exchange(zeltest::request("SERVER_SESSION_INIT", {{"clientID", ""}, {"userID", ""}, {"userPassword", ""}}),
-                    kSignedIn);
-    server.expectAnyFrame().sendFrame(reply("SUCCESS", "queued")).connectBackAndSend("from a stranger");
-    server.start();
-    ASSERT_TRUE(gives(openOn(*channel, server.port(), {"IO_TIMEOUT", "0.3", "RESULT_PORT_TIMEOUT", "0.3"},
+    FakeServer own;
+    own.exchange(request("SERVER_SESSION_INIT", {{"clientID", ""}, {"userID", ""}, {"userPassword", ""}}), kSignedIn)
+        .expectAnyFrame()
+        .sendFrame(reply("SUCCESS", "queued"))
+        .connectBackAndSend("from a stranger")
+        .start();
+    ASSERT_TRUE(gives(openOn(*channel, own.port(), {"IO_TIMEOUT", "0.3", "RESULT_PORT_TIMEOUT", "0.3"},
                              {"TRUSTED_HOST_NAMES", "10.255.255.1"}),
                       0));
     EXPECT_TRUE(gives(resultPort({}), kResultPortAcceptFailed));
@@ -510,4 +479,4 @@ TEST_F(ChannelTest, SendsAndTheResultPortWaitOnlyAsLongAsTheTimeOuts)
 }
 
 }  // namespace
-}  // namespace zel
+}  // namespace zeltest
