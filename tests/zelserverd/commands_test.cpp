@@ -165,7 +165,7 @@ TEST_F(Commands, ServicesRegistrationsAndPropertiesSurviveARestart)
     // The workspace view comes from the header, with the properties of each owner by its id; it and
     // everything else survive a restart, and a stray file in the content directory (as a crash
     // between rename and commit leaves) goes.
-    writeFile(dataDir_ + "/store/orphan", "x");
+    spew(dataDir_ + "/store/orphan", "x");
     startServer();
     EXPECT_EQ(storedFiles(), 3u);
     converse({{"REP_GET_WORKSPACEVIEW", repo({{"workspaceName", "roads.zlw"}}),

@@ -43,7 +43,7 @@ bool contains(const std::string& text, const std::string& part) { return text.fi
 // Gone, or a zombie nobody has reaped yet: either way no longer running.
 bool processGone(const std::string& pid)
 {
-    const std::string text = readFile("/proc/" + pid + "/stat");
+    const std::string text = slurp("/proc/" + pid + "/stat");
     std::size_t paren = text.rfind(')');
     return text.empty() || (paren != std::string::npos && text.substr(paren + 2, 1) == "Z");
 }
@@ -61,7 +61,7 @@ TEST_F(Jobs, FinishedJobsReportTheirOutcomeAndLeaveALog)
                   "\0result=0:Translation was successful\0resultSuccess=true\0serviceSuccess=true"
                   "\0serviceMsg=Translation was successful"s);
     // The default of GREETING, the given TARGET, and the job's own directory.
-    EXPECT_EQ(readFile(jobFile(id, "out.txt")), "hello\n");
+    EXPECT_EQ(slurp(jobFile(id, "out.txt")), "hello\n");
     std::string text = log(id);
     std::string dir = std::filesystem::canonical(dataDir_).string() + "/jobs/" + job;
     for (const std::string& line : {"say hello moon\n"s, "job " + job + " in " + dir + "/work\n",
@@ -86,8 +86,7 @@ TEST_F(Jobs, EndingAJobKillsEverythingItStarted)
         long id = submit(abort ? "hang.zlw" : "escape.zlw");
         const std::string job = std::to_string(id);
         std::string pid;
-        ASSERT_TRUE(
-            eventually([&] { return !(pid = readFile(jobFile(id, "child.pid"))).empty() && pid.back() == '\n'; }));
+        ASSERT_TRUE(eventually([&] { return !(pid = slurp(jobFile(id, "child.pid"))).empty() && pid.back() == '\n'; }));
         pid.pop_back();
         if (abort) {
             ASSERT_EQ(onJob("ABORT_JOB_REQUEST", job).body, "true");
@@ -134,7 +133,7 @@ TEST_F(Jobs, JobsOfARootServerCannotReadOrWriteTheServersFiles)
                     .ok());
     long id = submit("peek.zlw", {{"DATA", dataDir_}});
     EXPECT_EQ(waitForEnd(id)["result"], "5:workspace exited with status 5");
-    EXPECT_NE(readFile(jobFile(id, "uid.txt")), "0\n");
+    EXPECT_NE(slurp(jobFile(id, "uid.txt")), "0\n");
     EXPECT_FALSE(std::filesystem::exists(dataDir_ + "/intruder"));
 }
 

@@ -64,9 +64,8 @@ private:
 
 class Executable : public ::testing::Test {
 protected:
-    void SetUp() override { root_ = makeTempDir(); }
-    void TearDown() override { removeTree(root_); }
-    std::string root_;
+    const TempDir dir_{"zelserverd-test"};
+    const std::string root_ = dir_.string();
 };
 
 TEST_F(Executable, GeneratesAnAdministratorOnceAndStopsOnSigterm)
@@ -76,14 +75,14 @@ TEST_F(Executable, GeneratesAnAdministratorOnceAndStopsOnSigterm)
     Process first({"--data", data, "--listen", "127.0.0.1:0"}, errors);
     const std::uint16_t port = first.port();
     ASSERT_NE(port, 0);
-    std::string password = readFile(data + "/admin-password");
+    std::string password = slurp(data + "/admin-password");
     ASSERT_EQ(password.back(), '\n');
     password.pop_back();
     struct stat info {};
     ASSERT_EQ(::stat((data + "/admin-password").c_str(), &info), 0);
     EXPECT_EQ(info.st_mode & 0777, 0600u);
     EXPECT_EQ(password.size(), 24u);
-    const std::string stored = readFile(data + "/admin-password.hash");
+    const std::string stored = slurp(data + "/admin-password.hash");
     EXPECT_EQ(stored.find(password), std::string::npos);
     EXPECT_TRUE(zelserverd::passwordMatches(stored.substr(0, stored.size() - 1), password));
     {
@@ -94,7 +93,7 @@ TEST_F(Executable, GeneratesAnAdministratorOnceAndStopsOnSigterm)
         EXPECT_EQ(client.signIn("admin", "admin").status, "ERROR");
     }
     EXPECT_EQ(first.finish(SIGTERM), 0);
-    const std::string log = readFile(errors);
+    const std::string log = slurp(errors);
     for (const std::string& line : {"created user 'admin' with password " + password,
                                     "user=admin command=SERVER_SESSION_GET_PROP outcome=SUCCESS"s,
                                     "user=- command=SERVER_SESSION_INIT outcome=ERROR"s})
@@ -103,9 +102,9 @@ TEST_F(Executable, GeneratesAnAdministratorOnceAndStopsOnSigterm)
     // A second start keeps the password and does not print it again; SIGINT also stops it.
     Process second({"--data", data, "--listen", "127.0.0.1:0", "--quiet"}, errors);
     ASSERT_NE(second.port(), 0);
-    EXPECT_EQ(readFile(data + "/admin-password"), password + "\n");
+    EXPECT_EQ(slurp(data + "/admin-password"), password + "\n");
     EXPECT_EQ(second.finish(SIGINT), 0);
-    EXPECT_EQ(readFile(errors), "");
+    EXPECT_EQ(slurp(errors), "");
 }
 
 TEST_F(Executable, RefusesBadArgumentsAndConfigs)
@@ -115,7 +114,7 @@ TEST_F(Executable, RefusesBadArgumentsAndConfigs)
         std::string expected;
         int code;
     };
-    writeFile(root_ + "/bad.conf", "[server]\nworkers = many\n");
+    spew(root_ + "/bad.conf", "[server]\nworkers = many\n");
     const Case cases[] = {
         {{}, "--data DIR is required", 2},
         {{"--data"}, "--data: 1 required TEXT missing", 2},
@@ -128,7 +127,7 @@ TEST_F(Executable, RefusesBadArgumentsAndConfigs)
     };
     for (const Case& c : cases) {
         EXPECT_EQ(Process(c.args, root_ + "/errors").finish(), c.code);
-        const std::string err = readFile(root_ + "/errors");
+        const std::string err = slurp(root_ + "/errors");
         EXPECT_NE(err.find(c.expected), std::string::npos) << err;
     }
 }

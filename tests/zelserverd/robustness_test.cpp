@@ -89,7 +89,7 @@ TEST_F(Robustness, MalformedRequestsCloseTheConnectionAndSplitFramesAreReassembl
 // there is swept at the next start.
 TEST_F(Robustness, VanishedUploadsLeaveNoFile)
 {
-    writeFile(areaDir_ + "/.zelserverd-notes", "a user's own file");
+    spew(areaDir_ + "/.zelserverd-notes", "a user's own file");
     auto shared = uploading("fileLength=100000\0fileCRC=1"s);
     ASSERT_TRUE(shared->sendRaw(std::string(40000, 'x')));
     auto item = connectAs("admin");
@@ -108,7 +108,7 @@ TEST_F(Robustness, VanishedUploadsLeaveNoFile)
     EXPECT_TRUE(eventually([&] { return entriesOf(dataDir_ + "/tmp").empty() && storedFiles() == 0; }));
     EXPECT_EQ(admin_->command("REP_ITEMEXISTS", {{"repositoryName", "REPO"}, {"itemName", "cut.zds"}}).body, "false");
     EXPECT_EQ(entriesOf(areaDir_), std::vector<std::string>{".zelserverd-notes"});
-    writeFile(dataDir_ + "/tmp/.zelserverd-crashed", "left by a crash");
+    spew(dataDir_ + "/tmp/.zelserverd-crashed", "left by a crash");
     startServer();
     EXPECT_TRUE(entriesOf(dataDir_ + "/tmp").empty());
 }
@@ -118,7 +118,7 @@ TEST_F(Robustness, BadFileHeadersAndMissingAcknowledgementsCloseTheConnectionWit
     for (const std::string& header :
          {"fileLength=abc\0fileCRC=1"s, "APIVERSION=1\0SR_LIST"s, "fileLength=99999999999\0fileCRC=1"s})
         EXPECT_TRUE(uploading(header, "")->closedByPeer());
-    writeFile(areaDir_ + "/f.txt", "content");
+    spew(areaDir_ + "/f.txt", "content");
     auto client = connectAs("ann");
     ASSERT_TRUE(
         client->sendFrame(requestPayload("SR_DOWNLOAD", {{"srName", "AREA"}, {"srSrcPath", pathDocument("f.txt")}})));
@@ -232,7 +232,7 @@ TEST_F(Robustness, RepeatedSignInFailuresLockTheAccountAndTheAddressForAWhile)
 TEST_F(Robustness, StopWaitsForNoOne)
 {
     restartWith("io_timeout_seconds = 3600");
-    writeFile(areaDir_ + "/big.bin", std::string(32u << 20, 'x'));
+    spew(areaDir_ + "/big.bin", std::string(32u << 20, 'x'));
     auto idle = connectAs("vic");
     auto uploader = uploading("fileLength=1000\0fileCRC=0"s);
     ASSERT_TRUE(uploader->sendRaw(std::string(10, 'x')));
@@ -240,7 +240,7 @@ TEST_F(Robustness, StopWaitsForNoOne)
     ASSERT_TRUE(
         reader->sendFrame(requestPayload("SR_DOWNLOAD", {{"srName", "AREA"}, {"srSrcPath", pathDocument("big.bin")}})));
     ASSERT_TRUE(reader->readFrame().has_value());
-    ASSERT_TRUE(reader->sendFrame("SUCCESS\0ready_to_transfer"s));
+    ASSERT_TRUE(reader->sendFrame(readyAck()));
     auto start = std::chrono::steady_clock::now();
     stopServer();
     EXPECT_LT(std::chrono::steady_clock::now() - start, std::chrono::seconds(10));

@@ -56,7 +56,7 @@ TEST_F(Shared, PathsCannotLeaveTheArea)
 {
     std::string outside = root_ + "/outside";
     fs::create_directories(outside);
-    writeFile(outside + "/secret.txt", "secret");
+    spew(outside + "/secret.txt", "secret");
     fs::create_directory_symlink(outside, areaDir_ + "/escape");
     fs::create_symlink(outside + "/secret.txt", areaDir_ + "/secret-link");
     fs::create_symlink(root_ + "/nowhere", areaDir_ + "/dangling");
@@ -85,10 +85,10 @@ TEST_F(Shared, PathsCannotLeaveTheArea)
         EXPECT_EQ(down.reply.body, expected);
     }
     EXPECT_EQ(entriesOf(outside), std::vector<std::string>{"secret.txt"});
-    EXPECT_EQ(readFile(outside + "/secret.txt"), "secret");
+    EXPECT_EQ(slurp(outside + "/secret.txt"), "secret");
     // A link that stays inside the area is fine, and the listing leaves out links that point outside.
     EXPECT_TRUE(upload("inner-link/ok.txt", "ok").ok());
-    EXPECT_EQ(readFile(areaDir_ + "/inner/ok.txt"), "ok");
+    EXPECT_EQ(slurp(areaDir_ + "/inner/ok.txt"), "ok");
     EXPECT_EQ(withoutTimes(onPath("SR_LIST", "").body),
               document("<SR_LIST>" + fileInfo("DIR", "0", "inner", "") + fileInfo("DIR", "0", "inner-link", "") +
                        "</SR_LIST>"));

@@ -1,44 +1,13 @@
 #include "server_fixture.h"
 
-#include <unistd.h>
-
 #include <algorithm>
 #include <chrono>
-#include <cstdlib>
 #include <filesystem>
-#include <fstream>
-#include <iterator>
 #include <regex>
 #include <sstream>
 #include <thread>
 
 namespace zeltest {
-
-std::string makeTempDir()
-{
-    std::string pattern = (std::filesystem::temp_directory_path() / "zelserverd-test-XXXXXX").string();
-    if (!::mkdtemp(pattern.data()))
-        return {};
-    return pattern;
-}
-
-void removeTree(const std::string& path)
-{
-    std::error_code ec;
-    std::filesystem::remove_all(path, ec);
-}
-
-std::string readFile(const std::string& path)
-{
-    std::ifstream in(path, std::ios::binary);
-    return std::string(std::istreambuf_iterator<char>(in), {});
-}
-
-void writeFile(const std::string& path, const std::string& content)
-{
-    std::ofstream out(path, std::ios::binary | std::ios::trunc);
-    out << content;
-}
 
 std::vector<std::string> entriesOf(const std::string& dir)
 {
@@ -70,15 +39,13 @@ std::string withoutTimes(const std::string& text)
 
 void ServerFixture::SetUp()
 {
-    root_ = makeTempDir();
-    ASSERT_FALSE(root_.empty());
     dataDir_ = root_ + "/data";
     areaDir_ = root_ + "/area";
     configPath_ = root_ + "/zelserverd.conf";
     std::filesystem::create_directories(areaDir_);
-    writeFile(configPath_, std::string("[server]\nworkers = 2\nmax_request_bytes = 65536\n"
-                                       "sso_secret = ") +
-                               kSsoSecret + R"(
+    spew(configPath_, std::string("[server]\nworkers = 2\nmax_request_bytes = 65536\n"
+                                  "sso_secret = ") +
+                          kSsoSecret + R"(
 [role auditor]
 rights = sharedresources.read
 [user admin]
@@ -106,11 +73,7 @@ description = Files of the test
     ASSERT_TRUE(added.ok()) << added.body;
 }
 
-void ServerFixture::TearDown()
-{
-    stopServer();
-    removeTree(root_);
-}
+void ServerFixture::TearDown() { stopServer(); }
 
 void ServerFixture::startServer()
 {
@@ -137,7 +100,7 @@ void ServerFixture::stopServer()
 
 void ServerFixture::restartWith(const std::string& settings)
 {
-    writeFile(configPath_, readFile(configPath_) + "\n[server]\n" + settings + "\n");
+    spew(configPath_, slurp(configPath_) + "\n[server]\n" + settings + "\n");
     startServer();
 }
 

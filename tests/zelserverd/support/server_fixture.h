@@ -12,6 +12,8 @@
 #include <vector>
 
 #include "server.h"
+#include "support/environment.h"
+#include "support/helpers.h"
 #include "test_client.h"
 
 namespace zeltest {
@@ -20,10 +22,6 @@ namespace zeltest {
 // vic/vicpw (viewer), aud/audpw (the custom role "auditor": shared resources read only).
 constexpr const char* kSsoSecret = "sso-shared-secret";
 
-std::string makeTempDir();
-void removeTree(const std::string& path);
-std::string readFile(const std::string& path);
-void writeFile(const std::string& path, const std::string& content);
 // The names in a directory, temporary files included, sorted.
 std::vector<std::string> entriesOf(const std::string& dir);
 // Polls `condition` for up to twenty seconds; for what a server thread does after the test's last
@@ -62,7 +60,8 @@ protected:
     std::string jobFile(long id, const std::string& name) const;
     std::size_t storedFiles() { return entriesOf(dataDir_ + "/store").size(); }
 
-    std::string root_;  // everything of this test lives below
+    const TempDir dir_{"zelserverd-test"};
+    const std::string root_ = dir_.string();  // everything of this test lives below
     std::string dataDir_;
     std::string areaDir_;  // the shared resource "AREA"
     std::string configPath_;

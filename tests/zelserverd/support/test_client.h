@@ -5,12 +5,10 @@
 #include <cstdint>
 #include <optional>
 #include <string>
-#include <utility>
-#include <vector>
+
+#include "support/fake_server.h"
 
 namespace zeltest {
-
-using Values = std::vector<std::pair<std::string, std::string>>;
 
 struct WireReply {
     std::string status;  // "SUCCESS", "ERROR", or "" when no reply came
@@ -18,10 +16,9 @@ struct WireReply {
     bool ok() const { return status == "SUCCESS"; }
 };
 
-std::string requestPayload(const std::string& keyword, const Values& values);
-std::string frame(const std::string& payload);
+// A request with an empty client ID before `values`.
+std::string requestPayload(const std::string& keyword, Values values);
 WireReply splitReply(const std::string& payload);
-std::uint32_t crc32(const std::string& data);
 // A "PATH" document for shared resource commands.
 std::string pathDocument(const std::string& path);
 
@@ -33,13 +30,7 @@ struct Download {
 
 class TestClient {
 public:
-    TestClient() = default;
-    TestClient(const TestClient&) = delete;
-    TestClient& operator=(const TestClient&) = delete;
-    ~TestClient();
-
     bool connect(std::uint16_t port);
-    void close();
     bool sendRaw(const std::string& bytes);
     bool sendFrame(const std::string& payload) { return sendRaw(frame(payload)); }
     std::optional<std::string> readFrame(int timeoutMs = 5000);
@@ -59,10 +50,9 @@ public:
     Download download(const std::string& keyword, const Values& values);
 
 private:
-    bool waitReadable(int timeoutMs);
     bool recvExact(char* data, std::size_t size, int timeoutMs);
 
-    int fd_ = -1;
+    Socket socket_;
 };
 
 }  // namespace zeltest
