@@ -8,6 +8,8 @@ namespace {
 // The connection properties are a handful of keys; the table starts small.
 constexpr std::size_t kInitialBuckets = 17;
 
+}  // namespace
+
 // Read through getElement so that keys and values keep embedded NULs, whatever the list's class.
 std::string elementBytes(const IZELServerStringArray& list, unsigned index)
 {
@@ -15,17 +17,6 @@ std::string elementBytes(const IZELServerStringArray& list, unsigned index)
     list.getElement(index, value);
     return value.str();
 }
-
-template <class Store>
-void forEachPair(const IZELServerStringArray& pairs, Store store)
-{
-    const unsigned count = pairs.entries();
-    for (unsigned i = 1; i < count; i += 2) {
-        store(elementBytes(pairs, i - 1), elementBytes(pairs, i));
-    }
-}
-
-}  // namespace
 
 StringDict::StringDict() : entries_(kInitialBuckets) {}
 

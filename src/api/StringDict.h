@@ -41,6 +41,19 @@ private:
     Map entries_;
 };
 
+// The bytes of one element of any implementation of the list, embedded NULs included.
+std::string elementBytes(const IZELServerStringArray& list, unsigned index);
+
+// Calls store(name, value) for each pair of the flat list in order; an odd last element is ignored.
+template <class Store>
+void forEachPair(const IZELServerStringArray& pairs, Store store)
+{
+    const unsigned count = pairs.entries();
+    for (unsigned i = 1; i < count; i += 2) {
+        store(elementBytes(pairs, i - 1), elementBytes(pairs, i));
+    }
+}
+
 // Sets every pair of the flat list into `into`; an odd last element is ignored and a later pair
 // replaces an earlier one with the same key.
 void insertPairs(const IZELServerStringArray& pairs, ZELServerStringDict& into);

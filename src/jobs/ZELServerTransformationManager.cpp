@@ -63,13 +63,6 @@ CheckedJobInput checkJobInput(const IZELServerString& keyword, const IZELServerS
 // The server reads job IDs as signed 32-bit numbers, so the top half of the range goes out negative.
 std::string jobIdText(unsigned jobId) { return decimalText(static_cast<std::int32_t>(jobId)); }
 
-std::string elementBytes(const IZELServerStringArray& list, unsigned index)
-{
-    ZELServerString value;
-    list.getElement(index, value);
-    return value.str();
-}
-
 // What a job request object hands the manager; read afresh for every operation.
 struct RequestParts {
     ZELServerString keyword;
@@ -188,9 +181,9 @@ IZELServerStatus* ZELServerTransformationManager::submit(const IZELServerString&
         .add("request", input.request)
         .addList("directives", directives);
     if (notifications != nullptr) {
-        for (unsigned i = 1; i < notifications->entries(); i += 2) {
-            command.add("notificationMsg", elementBytes(*notifications, i - 1) + ":" + elementBytes(*notifications, i));
-        }
+        forEachPair(*notifications, [&command](const std::string& topic, const std::string& message) {
+            command.add("notificationMsg", topic + ":" + message);
+        });
     }
     return command.run([&jobId](Command& exchange) -> IZELServerStatus* {
         if (IZELServerStatus* status = exchange.send(kPlainRequestAlias)) {
