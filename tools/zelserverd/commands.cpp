@@ -2,6 +2,9 @@
 
 #include <map>
 
+#include "server.h"
+#include "transfer.h"
+
 namespace zelserverd {
 
 std::optional<std::string> CommandContext::required(std::string_view name, Reply& failure) const
@@ -12,6 +15,28 @@ std::optional<std::string> CommandContext::required(std::string_view name, Reply
         return std::nullopt;
     }
     return *value;
+}
+
+std::optional<Reply> receiveCommandUpload(CommandContext& context, std::string_view crcFlag, UploadResult& upload)
+{
+    const bool checkCrc = context.request.get(crcFlag) == "true";
+    upload = receiveUpload(context.io, context.server.tempDir, checkCrc, context.server.config.maxFileBytes);
+    if (upload.outcome == TransferOutcome::Lost)
+        return Reply::close();
+    if (upload.outcome == TransferOutcome::Refused)
+        return Reply::error(upload.message);
+    return std::nullopt;
+}
+
+Reply sendCommandDownload(CommandContext& context, int fd, const std::string& refusalPrefix)
+{
+    std::string message;
+    const TransferOutcome outcome = sendDownload(context.io, fd, message);
+    if (outcome == TransferOutcome::Lost)
+        return Reply::close();
+    if (outcome == TransferOutcome::Refused)
+        return Reply::error(refusalPrefix + message);
+    return Reply::ok();
 }
 
 namespace {

@@ -16,6 +16,7 @@
 namespace zelserverd {
 
 struct ServerState;
+struct UploadResult;
 
 struct Session {
     std::optional<Principal> principal;
@@ -97,6 +98,13 @@ struct Target {
 
 // Fills `target` with what `needs` names; the failure reply, or nothing.
 std::optional<Reply> resolveTarget(CommandContext& context, const Needs& needs, Target& target);
+
+// The file a command receives, into the server's temporary folder and within its size limit,
+// checked against its CRC when the request's `crcFlag` value is "true": the reply for a transfer
+// lost or refused, or nothing with the file in `upload`.
+std::optional<Reply> receiveCommandUpload(CommandContext& context, std::string_view crcFlag, UploadResult& upload);
+// Sends the open file: the reply for the transfer, a refusal's reason following `refusalPrefix`.
+Reply sendCommandDownload(CommandContext& context, int fd, const std::string& refusalPrefix);
 
 using Handler = Reply (*)(CommandContext&, const Target&);
 

@@ -6,7 +6,6 @@
 #include "commands.h"
 #include "jobs.h"
 #include "server.h"
-#include "transfer.h"
 #include "util.h"
 #include "xml.h"
 
@@ -94,13 +93,7 @@ Reply logFile(CommandContext& context, const Target& t)
     UniqueFd fd(::open(context.server.jobs->logPath(id).c_str(), O_RDONLY | O_CLOEXEC));
     if (!fd.valid())
         return Reply::error("job " + std::to_string(id) + " has no log");
-    std::string message;
-    TransferOutcome outcome = sendDownload(context.io, fd.get(), message);
-    if (outcome == TransferOutcome::Lost)
-        return Reply::close();
-    if (outcome == TransferOutcome::Refused)
-        return Reply::error(message);
-    return Reply::ok();
+    return sendCommandDownload(context, fd.get(), "");
 }
 
 }  // namespace

@@ -104,13 +104,9 @@ Reply putItem(CommandContext& context, const Target& t, bool replace)
     if (exists != replace)
         return Reply::error("item '" + name + (exists ? "' already exists" : "' does not exist") + " in '" + repo +
                             "'");
-    bool checkCrc = context.request.get("itemFileCRCCheckingEnabled") == "true";
-    UploadResult upload =
-        receiveUpload(context.io, context.server.tempDir, checkCrc, context.server.config.maxFileBytes);
-    if (upload.outcome == TransferOutcome::Lost)
-        return Reply::close();
-    if (upload.outcome == TransferOutcome::Refused)
-        return Reply::error(upload.message);
+    UploadResult upload;
+    if (auto failure = receiveCommandUpload(context, "itemFileCRCCheckingEnabled", upload))
+        return *failure;
     if (itemKindOf(name) == ItemKind::Workspace)
         error = checkWorkspaceContent(upload.file.fd());
     if (error.empty())
@@ -126,13 +122,7 @@ Reply sendFile(CommandContext& context, UniqueFd fd, const std::string& what)
 {
     if (!fd.valid())
         return Reply::error("cannot open " + what);
-    std::string message;
-    TransferOutcome outcome = sendDownload(context.io, fd.get(), message);
-    if (outcome == TransferOutcome::Lost)
-        return Reply::close();
-    if (outcome == TransferOutcome::Refused)
-        return Reply::error(what + ": " + message);
-    return Reply::ok();
+    return sendCommandDownload(context, fd.get(), what + ": ");
 }
 
 // A refusal here is one "ERROR" frame in place of the file header, which clients read as
@@ -166,13 +156,9 @@ Reply putResource(CommandContext& context, const Target& t, bool replace)
     if (exists != replace)
         return Reply::error("resource '" + name + (exists ? "' already exists" : "' does not exist") + " on '" +
                             item.name + "'");
-    bool checkCrc = context.request.get("resourceFileCRCCheckingEnabled") == "true";
-    UploadResult upload =
-        receiveUpload(context.io, context.server.tempDir, checkCrc, context.server.config.maxFileBytes);
-    if (upload.outcome == TransferOutcome::Lost)
-        return Reply::close();
-    if (upload.outcome == TransferOutcome::Refused)
-        return Reply::error(upload.message);
+    UploadResult upload;
+    if (auto failure = receiveCommandUpload(context, "resourceFileCRCCheckingEnabled", upload))
+        return *failure;
     error =
         context.server.repos.putResource(item.id, name, upload.file, static_cast<std::int64_t>(upload.length), replace);
     return error.empty() ? Reply::ok() : Reply::error(error);

@@ -220,13 +220,9 @@ Reply upload(CommandContext& context, const Target& t)
     struct stat info {};
     if (statPath(t.destination, info) && S_ISDIR(info.st_mode))
         return Reply::error("'" + t.destination.relative + "' is a directory");
-    bool checkCrc = context.request.get("itemFileCRCCheckingEnabled") == "true";
-    UploadResult result =
-        receiveUpload(context.io, context.server.tempDir, checkCrc, context.server.config.maxFileBytes);
-    if (result.outcome == TransferOutcome::Lost)
-        return Reply::close();
-    if (result.outcome == TransferOutcome::Refused)
-        return Reply::error(result.message);
+    UploadResult result;
+    if (auto failure = receiveCommandUpload(context, "itemFileCRCCheckingEnabled", result))
+        return *failure;
     std::string error = result.file.commit(t.destination.full);
     return error.empty() ? Reply::ok() : Reply::error(error);
 }
@@ -236,13 +232,7 @@ Reply download(CommandContext& context, const Target& t)
     UniqueFd fd(::open(t.source.full.c_str(), O_RDONLY | O_CLOEXEC));
     if (!fd.valid())
         return Reply::error("cannot open '" + t.source.relative + "'");
-    std::string message;
-    TransferOutcome outcome = sendDownload(context.io, fd.get(), message);
-    if (outcome == TransferOutcome::Lost)
-        return Reply::close();
-    if (outcome == TransferOutcome::Refused)
-        return Reply::error("'" + t.source.relative + "': " + message);
-    return Reply::ok();
+    return sendCommandDownload(context, fd.get(), "'" + t.source.relative + "': ");
 }
 
 }  // namespace
