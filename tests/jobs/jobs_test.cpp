@@ -36,9 +36,12 @@ namespace {
 ZELServerString str(const std::string& text) { return ZELServerString(text); }
 ZELServerStringArray list(std::vector<std::string> items) { return ZELServerStringArray(std::move(items)); }
 
-std::string emptyRequestText(const std::string& path)
+// The request text the server receives for a workspace path and the document's elements.
+std::string textFor(const std::string& path, const std::string& elements)
 {
-    return path + R"( -XML_PARAMETER <?xml version="1.0" encoding="UTF-8" standalone="no" ?><TRANSFORMATION_REQUEST/>)";
+    const std::string document = elements.empty() ? "<TRANSFORMATION_REQUEST/>"
+                                                  : "<TRANSFORMATION_REQUEST>" + elements + "</TRANSFORMATION_REQUEST>";
+    return path + " -XML_PARAMETER " + R"(<?xml version="1.0" encoding="UTF-8" standalone="no" ?>)" + document;
 }
 
 class TransformationManagerWire : public WireTableTest {
@@ -109,7 +112,7 @@ TEST_F(TransformationManagerWire, EveryCommandOnTheWire)
          0, "42 "},
         {"submit sends directives, then one notification per pair in name order",
          command("JOB_REQUEST", {{"keyword", "svc"},
-                                 {"request", emptyRequestText("R/w/w.zlw")},
+                                 {"request", textFor("R/w/w.zlw", "")},
                                  {"priority", "5"},
                                  {"notificationMsg", "A:x"},
                                  {"notificationMsg", "B:y"}}),
@@ -140,13 +143,13 @@ TEST_F(TransformationManagerWire, EveryCommandOnTheWire)
                  [&] { return std::to_string(result.isSuccess()); });
          },
          0, "jobStatus=SUCCESS\0id=3 1 "s,
-         transaction({{"keyword", "svc"}, {"request", emptyRequestText("R/w/w.zlw")}},
+         transaction({{"keyword", "svc"}, {"request", textFor("R/w/w.zlw", "")}},
                      {{"priority", "5"}, {"notificationMsg", "A:x"}, {"notificationMsg", "B:y"}},
                      reply("SUCCESS", "accepted"), "jobStatus=SUCCESS\0id=3"s)},
         {"refused transaction leaves the result alone", none, none,
          [&] { return outcome(manager.transactJob(job, result), [&] { return resultText(); }); }, msg::kServerError,
          "jobStatus=SUCCESS\0id=3 "s,
-         transaction({{"keyword", "svc"}, {"request", emptyRequestText("R/w/w.zlw")}},
+         transaction({{"keyword", "svc"}, {"request", textFor("R/w/w.zlw", "")}},
                      {{"priority", "5"}, {"notificationMsg", "A:x"}, {"notificationMsg", "B:y"}},
                      reply("ERROR", "Authorization Error: no rights"))},
         {"refused transaction hands out the server's text", none, none,
@@ -238,13 +241,6 @@ std::string requestText(const IZELServerTransformationRequest& request)
     ZELServerString out;
     request.getRequestText(out);
     return out.str();
-}
-
-std::string textFor(const std::string& path, const std::string& elements)
-{
-    const std::string document = elements.empty() ? "<TRANSFORMATION_REQUEST/>"
-                                                  : "<TRANSFORMATION_REQUEST>" + elements + "</TRANSFORMATION_REQUEST>";
-    return path + " -XML_PARAMETER " + R"(<?xml version="1.0" encoding="UTF-8" standalone="no" ?>)" + document;
 }
 
 std::string parameter(const std::string& name, const std::string& value)

@@ -191,11 +191,6 @@ TEST_F(RepositoryWire, ManagerAndServiceCommands)
          [&] { return outcome(manager.addService(unsaved)); }, 0, ""},
         {"repository exists checks no characters", command("REP_REPOSITORYEXISTS", {{"repositoryName", "a/b"}}),
          ok("false"), [&] { return outcome(manager.repositoryExists(S("a/b"), fresh()), flag); }, 0, "0 "},
-        {"add repository",
-         command("REP_ADD_REPOSITORY",
-                 {{"repositoryObject", xmlDocument("REP_ADD_REPOSITORY",
-                                                   R"(<REPOSITORY description="Roads &lt;2024>" name="Samples"/>)")}}),
-         ok("true"), [&] { return outcome(manager.addRepository(S("Samples"), S("Roads <2024>"))); }, 0, ""},
         {"repositories refuse directives", none, none,
          [&] { return outcome(manager.getRepositories(&lowerCase, repositories)); }, msg::kRequiredValueMissing, ""},
         {"repositories at any depth", command("REP_GET_REPOSITORIES", {{"enableFilter", "All"}}),
@@ -483,7 +478,6 @@ TEST(ServiceSettings, RegistrationFlagsApplyPerItemTypeOnly)
     const auto flags = [&] {
         return joined(6, [&](unsigned type) { return std::to_string(service.isRegistrationAllowed(type)); });
     };
-    EXPECT_EQ(service.serviceId(), "-1");
     service.setRegistrationAllowed(4, 1);
     service.setRegistrationAllowed(5, 1);
     service.setRegistrationAllowed(0, 1);
