@@ -83,7 +83,6 @@ protected:
     ZELServerString text{"before"};
     ZELServerTransformationResult result;
     ZELServerLogFileInfo info;
-    const TempDir scratch{"zel-jobs"};
     const std::string log = (scratch.path() / "job.log").string();
 };
 

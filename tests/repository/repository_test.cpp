@@ -51,17 +51,11 @@ protected:
         return command(keyword, values);
     }
     static Bytes ok(const std::string& body) { return reply("SUCCESS", body); }
-    std::string file(const std::string& name, const std::string& content) const
-    {
-        spew(scratch.path() / name, content);
-        return (scratch.path() / name).string();
-    }
 
     ZELServerRepositoryManager manager{channel.get()};
     ZELServerRepository repository{channel.get(), S("Samples"), S("sample workspaces")};
     ZELServerService service{channel.get(), "download", "Data Download", "", "", false, true, false, false, false};
     ProgressLog progress;
-    const TempDir scratch{"zel-repo"};
 };
 
 TEST_F(RepositoryWire, ItemsResourcesAndTheirTransfers)

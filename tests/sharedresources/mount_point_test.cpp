@@ -96,11 +96,6 @@ protected:
     {
         return joined(entries.entries(), [&](unsigned i) { return absolute(entries.element(i)->getPath()); });
     }
-    std::string file(const std::string& name, const std::string& content) const
-    {
-        spew(dir / name, content);
-        return (dir / name).string();
-    }
 
     ZELServerMountPoint area{nullptr};
     ZELServerMountPointManager manager{channel.get()};
@@ -110,8 +105,6 @@ protected:
     MountPoints mountPoints;
     ZELServerMountPoint found{nullptr};
     ProgressLog progress;
-    const TempDir scratch{"zel-mountpoint"};
-    const fs::path& dir = scratch.path();
 };
 
 TEST_F(MountPointTest, EveryCommandOnTheWire)

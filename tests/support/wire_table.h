@@ -6,6 +6,7 @@
 // the call must leave. One body runs a whole table in order on one connection, so a row also shows
 // that the session stays usable after the rows before it.
 
+#include <filesystem>
 #include <functional>
 #include <memory>
 #include <ostream>
@@ -18,6 +19,7 @@
 
 #include "api/ZELServerString.h"
 #include "session/ZELServerConnectionInfo.h"
+#include "support/environment.h"
 #include "support/fake_server.h"
 #include "support/helpers.h"
 #include "transport/ZELServerTCPIPChannel.h"
@@ -63,8 +65,17 @@ protected:
         return R"(<?xml version="1.0" encoding="UTF-8" standalone="no" ?><)" + root + ">" + content + "</" + root + ">";
     }
 
+    // A file in the test's own folder; its path.
+    std::string file(const std::string& name, const std::string& content) const
+    {
+        spew(dir / name, content);
+        return (dir / name).string();
+    }
+
     FakeServer server;
     std::unique_ptr<zel::ZELServerTCPIPChannel> channel{new zel::ZELServerTCPIPChannel()};
+    const TempDir scratch{"zel-wire"};
+    const std::filesystem::path dir{scratch.path()};
 };
 
 // What a call left: its status number (0 for none) and its out values, each followed by a space.

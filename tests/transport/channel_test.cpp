@@ -96,15 +96,6 @@ protected:
         const ResponsePtr response(channel->createResponse());
         return withBody(channel->sendRequest(*request, *response, kResultPortRequest), *response, body);
     }
-
-    std::string file(const std::string& name, const std::string& content) const
-    {
-        spew(dir / name, content);
-        return (dir / name).string();
-    }
-
-    const TempDir scratch{"zel-channel"};
-    const fs::path dir{scratch.path()};
 };
 
 // ---- Sign-in and connection -------------------------------------------------------------------------
