@@ -58,7 +58,6 @@ protected:
         return message.c_str();
     }
 
-    // The result text of a job, read as text.
     std::string resultText(unsigned id)
     {
         IZELServerString& text = client.text();

@@ -28,7 +28,6 @@ protected:
     }
 
     IZELServerString& t(const std::string& value) { return client.text(value); }
-    // A check that the local file `name` holds `content`.
     std::function<bool()> holds(const std::string& name, const std::string& content)
     {
         return [this, name, content] { return slurp(local(name)) == content; };

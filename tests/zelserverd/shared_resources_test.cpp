@@ -17,11 +17,6 @@ protected:
         ServerFixture::SetUp();
         ann_ = connectAs("ann");
     }
-    void TearDown() override
-    {
-        ann_.reset();
-        ServerFixture::TearDown();
-    }
     WireReply onPath(const std::string& keyword, const std::string& path)
     {
         return ann_->command(keyword, {{"srName", "AREA"}, {"srPath", pathDocument(path)}});

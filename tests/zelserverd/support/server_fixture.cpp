@@ -62,8 +62,6 @@ password = audpw
 roles = auditor
 [sharedresource AREA]
 path = area
-display_name = Test area
-description = Files of the test
 [jobservice zeljob]
 )");
     startServer();
