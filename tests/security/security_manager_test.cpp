@@ -54,11 +54,6 @@ std::string tokenElement(const std::string& token, const std::string& address, c
 
 using Call = std::function<IZELServerStatus*(Manager&, bool&, IZELServerUserToken&)>;
 
-Call flagCall(IZELServerStatus* (Manager::*operation)(const IZELServerString&, bool&))
-{
-    return [operation](Manager& m, bool& flag, IZELServerUserToken&) { return (m.*operation)(kAccount, flag); };
-}
-
 Call addCall(const char* token, const char* address, long long timeout)
 {
     return [=](Manager& m, bool&, IZELServerUserToken&) {
@@ -80,6 +75,9 @@ TEST_F(SecurityManagerTest, EveryCommandSendsItsBytesAndReadsItsAnswer)
 {
     const Call get = [](Manager& m, bool& found, IZELServerUserToken& t) { return m.getUserToken(kAccount, t, found); };
     const Call update = [](Manager& m, bool&, IZELServerUserToken& t) { return m.updateUserToken(kAccount, t); };
+    const Call expired = [](Manager& m, bool& flag, IZELServerUserToken&) {
+        return m.userTokenExpired(kAccount, flag);
+    };
     const std::string dated[3] = {"2024-01-01", "2024-01-02", "2024-02-01"};
     const struct {
         const char* name;
@@ -92,10 +90,10 @@ TEST_F(SecurityManagerTest, EveryCommandSendsItsBytesAndReadsItsAnswer)
         std::string after;  // flag and the caller's token
     } rows[] = {
         // A body that is no exact truth value keeps the caller's value and is no failure.
-        {"expired, no truth value", account("SEC_USERTOKEN_EXPIRED"), reply("SUCCESS", "True"), true,
-         flagCall(&Manager::userTokenExpired), 0, 0, "1 mine|::1|60"},
+        {"expired, no truth value", account("SEC_USERTOKEN_EXPIRED"), reply("SUCCESS", "True"), true, expired, 0, 0,
+         "1 mine|::1|60"},
         {"expired, refused", account("SEC_USERTOKEN_EXPIRED"), reply("ERROR", "Authorization Error: not yours"), false,
-         flagCall(&Manager::userTokenExpired), msg::kServerError, 2, "0 mine|::1|60"},
+         expired, msg::kServerError, 2, "0 mine|::1|60"},
         {"get, no token element", account("SEC_GET_USERTOKEN"), reply("SUCCESS", "<SEC_GET_USERTOKEN/>"), true, get, 0,
          0, "0 mine|::1|60"},
         {"get, refused", account("SEC_GET_USERTOKEN"), reply("ERROR", "unknown user account 'ann'"), true, get,

@@ -9,7 +9,6 @@
 #include <memory>
 #include <optional>
 #include <set>
-#include <sstream>
 #include <string>
 #include <vector>
 
@@ -96,8 +95,6 @@ std::string native(std::string path)
     return path;
 }
 
-std::optional<std::string> env(const char* name) { return zel::platform::getEnvironmentVariable(name); }
-
 TEST(HomeDirectories, LibraryHomeIsTheVariableWithASeparatorOrTheModuleFolder)
 {
     for (const char* value : {"/opt/zel/x", "/opt/zel/x/"}) {
@@ -116,27 +113,23 @@ TEST(HomeDirectories, FrameworkHomeIsTheModuleFolderWhenNothingIsSet)
     ScopedEnv override("ZEL_HOME_OVERRIDE", nullptr);
     ScopedEnv zelHome("ZEL_HOME", nullptr);
     EXPECT_EQ(zel::frameworkHomeDirectory(), zeltest::programFolder());
-    EXPECT_EQ(env("ZEL_HOME"), zeltest::programFolder());
+    EXPECT_EQ(zel::platform::getEnvironmentVariable("ZEL_HOME"), zeltest::programFolder());
 }
 
 // The shared library must export its three entry points and nothing else: any other symbol would
 // become part of the binary interface that clients can bind to.
 #if !defined(_WIN32)  // the DLL's exports: the zel_dll_exports test
-// The defined dynamic symbols of a shared object, as nm lists them.
+// The defined dynamic symbols of a shared object, as nm lists them. Version definition entries (type
+// A, absolute) name the version node, not code or data.
 std::set<std::string> exportedSymbols(const std::string& library)
 {
-    const std::string command = "nm -D --defined-only --format=posix '" + library + "' 2>&1";
+    const std::string command =
+        "nm -D --defined-only --format=posix '" + library + "' | awk '$2 != \"A\" { print $1 }'";
     const std::unique_ptr<FILE, int (*)(FILE*)> pipe(::popen(command.c_str(), "r"), ::pclose);
     std::set<std::string> names;
-    char line[4096];
-    while (pipe && std::fgets(line, sizeof line, pipe.get())) {
-        std::istringstream fields(line);
-        std::string name, type;
-        fields >> name >> type;
-        // Version definition entries (type A, absolute) name the version node, not code or data.
-        if (!name.empty() && type != "A") {
-            names.insert(name);
-        }
+    char name[4096];
+    while (pipe && std::fscanf(pipe.get(), "%4095s", name) == 1) {
+        names.insert(name);
     }
     return names;
 }
