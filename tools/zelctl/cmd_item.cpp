@@ -145,17 +145,12 @@ Outcome resources(Context& context, const std::string& name, const std::string& 
         return complaint("out of memory for the list");
     Outcome failure =
         context.connection.check(repository.get().getItemResourcesView(context.connection.text(item), nullptr, *list));
-    nlohmann::ordered_json rows = nlohmann::ordered_json::array();
-    for (unsigned i = 0; !failure && i < list->entries(); ++i) {
-        const IZELServerResource& resource = *list->element(i);
-        rows.push_back(
-            {{"resource", context.connection.read([&](IZELServerString& out) { resource.getName(out); })},
-             {"description", context.connection.read([&](IZELServerString& out) { resource.getDescription(out); })},
-             {"size", resource.getFileSize()}});
-    }
-    if (!failure)
-        context.output.print(rows);
-    return failure;
+    return printRows(context, failure, *list, [&](const IZELServerResource& resource) {
+        return nlohmann::ordered_json{
+            {"resource", context.connection.read([&](IZELServerString& out) { resource.getName(out); })},
+            {"description", context.connection.read([&](IZELServerString& out) { resource.getDescription(out); })},
+            {"size", resource.getFileSize()}};
+    });
 }
 
 struct Arguments {

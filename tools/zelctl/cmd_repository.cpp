@@ -33,12 +33,8 @@ Outcome list(Context& context)
     if (!repositories)
         return complaint("out of memory for the list");
     Outcome failure = context.connection.check(session.getRepositoryManager()->getRepositories(nullptr, *repositories));
-    nlohmann::ordered_json rows = nlohmann::ordered_json::array();
-    for (unsigned i = 0; !failure && i < repositories->entries(); ++i)
-        rows.push_back(describe(context.connection, *repositories->element(i)));
-    if (!failure)
-        context.output.print(rows);
-    return failure;
+    return printRows(context, failure, *repositories,
+                     [&](const IZELServerRepository& r) { return describe(context.connection, r); });
 }
 
 Outcome show(Context& context, const std::string& name)

@@ -57,12 +57,8 @@ Outcome list(Context& context, const std::string& filter)
     ZELServerStringDict directives;
     directives.insert("ENABLE_FILTER", filter == "enabled" ? "ENABLED" : filter == "disabled" ? "DISABLED" : "ALL");
     Outcome failure = context.connection.check(session.getRepositoryManager()->getServices(&directives, *services));
-    nlohmann::ordered_json rows = nlohmann::ordered_json::array();
-    for (unsigned i = 0; !failure && i < services->entries(); ++i)
-        rows.push_back(describe(context.connection, *services->element(i)));
-    if (!failure)
-        context.output.print(rows);
-    return failure;
+    return printRows(context, failure, *services,
+                     [&](const IZELServerService& s) { return describe(context.connection, s); });
 }
 
 Outcome show(Context& context, const std::string& name)

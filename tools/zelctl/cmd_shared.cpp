@@ -75,17 +75,12 @@ Outcome resources(Context& context)
     if (!areas)
         return complaint("out of memory for the list");
     Outcome failure = context.connection.check(session.getMountPointManager()->getSharedResources(*areas));
-    nlohmann::ordered_json rows = nlohmann::ordered_json::array();
-    for (unsigned i = 0; !failure && i < areas->entries(); ++i) {
-        const IZELServerMountPoint& area = *areas->element(i);
-        rows.push_back(
-            {{"shared_resource", context.connection.read([&](IZELServerString& out) { area.getName(out); })},
-             {"display_name", context.connection.read([&](IZELServerString& out) { area.getDisplayName(out); })},
-             {"description", context.connection.read([&](IZELServerString& out) { area.getDescription(out); })}});
-    }
-    if (!failure)
-        context.output.print(rows);
-    return failure;
+    return printRows(context, failure, *areas, [&](const IZELServerMountPoint& area) {
+        return nlohmann::ordered_json{
+            {"shared_resource", context.connection.read([&](IZELServerString& out) { area.getName(out); })},
+            {"display_name", context.connection.read([&](IZELServerString& out) { area.getDisplayName(out); })},
+            {"description", context.connection.read([&](IZELServerString& out) { area.getDescription(out); })}};
+    });
 }
 
 Outcome list(Context& context, const Arguments& a)
@@ -97,12 +92,8 @@ Outcome list(Context& context, const Arguments& a)
     if (!entries)
         return complaint("out of memory for the list");
     Outcome failure = context.connection.check(area.get().list(area.path(a.path), *entries));
-    nlohmann::ordered_json rows = nlohmann::ordered_json::array();
-    for (unsigned i = 0; !failure && i < entries->entries(); ++i)
-        rows.push_back(describe(context.connection, *entries->element(i)));
-    if (!failure)
-        context.output.print(rows);
-    return failure;
+    return printRows(context, failure, *entries,
+                     [&](const IZELServerFileInfo& info) { return describe(context.connection, info); });
 }
 
 Outcome stat(Context& context, const Arguments& a)

@@ -27,20 +27,15 @@ Outcome list(Context& context, const std::string& name, const std::string& filte
     ZELServerStringDict directives;
     directives.insert("ENABLE_FILTER", filterDirective(filter));
     Outcome failure = context.connection.check(repository.get().getWorkspaceSummariesView(&directives, *summaries));
-    nlohmann::ordered_json rows = nlohmann::ordered_json::array();
-    for (unsigned i = 0; !failure && i < summaries->entries(); ++i) {
-        const IZELServerWorkspaceSummary& s = *summaries->element(i);
+    return printRows(context, failure, *summaries, [&](const IZELServerWorkspaceSummary& s) {
         auto read = [&](void (IZELServerWorkspaceSummary::*getter)(IZELServerString&) const) {
             return context.connection.read([&](IZELServerString& out) { (s.*getter)(out); });
         };
-        rows.push_back({{"workspace", read(&IZELServerWorkspaceSummary::getName)},
-                        {"title", read(&IZELServerWorkspaceSummary::getTitle)},
-                        {"enabled", s.isEnabled()},
-                        {"description", read(&IZELServerWorkspaceSummary::getDescription)}});
-    }
-    if (!failure)
-        context.output.print(rows);
-    return failure;
+        return nlohmann::ordered_json{{"workspace", read(&IZELServerWorkspaceSummary::getName)},
+                                      {"title", read(&IZELServerWorkspaceSummary::getTitle)},
+                                      {"enabled", s.isEnabled()},
+                                      {"description", read(&IZELServerWorkspaceSummary::getDescription)}};
+    });
 }
 
 nlohmann::ordered_json parameters(Connection& connection, IZELServerVector<IZELServerParameter>& list)
@@ -69,25 +64,21 @@ nlohmann::ordered_json parameters(Connection& connection, IZELServerVector<IZELS
 
 nlohmann::ordered_json featureTypes(Connection& connection, IZELServerVector<IZELServerFeatureType>& list)
 {
-    nlohmann::ordered_json rows = nlohmann::ordered_json::array();
-    for (unsigned i = 0; i < list.entries(); ++i) {
-        const IZELServerFeatureType& f = *list.element(i);
-        rows.push_back({{"name", connection.read([&](IZELServerString& out) { f.getName(out); })},
-                        {"description", connection.read([&](IZELServerString& out) { f.getDescription(out); })}});
-    }
-    return rows;
+    return rowsOf(list, [&](const IZELServerFeatureType& f) {
+        return nlohmann::ordered_json{
+            {"name", connection.read([&](IZELServerString& out) { f.getName(out); })},
+            {"description", connection.read([&](IZELServerString& out) { f.getDescription(out); })}};
+    });
 }
 
 nlohmann::ordered_json datasets(Connection& connection, IZELServerVector<IZELServerDataset>& list)
 {
-    nlohmann::ordered_json rows = nlohmann::ordered_json::array();
-    for (unsigned i = 0; i < list.entries(); ++i) {
-        const IZELServerDataset& d = *list.element(i);
-        rows.push_back({{"name", connection.read([&](IZELServerString& out) { d.getName(out); })},
-                        {"format", connection.read([&](IZELServerString& out) { d.getFormat(out); })},
-                        {"location", connection.read([&](IZELServerString& out) { d.getLocation(out); })}});
-    }
-    return rows;
+    return rowsOf(list, [&](const IZELServerDataset& d) {
+        return nlohmann::ordered_json{
+            {"name", connection.read([&](IZELServerString& out) { d.getName(out); })},
+            {"format", connection.read([&](IZELServerString& out) { d.getFormat(out); })},
+            {"location", connection.read([&](IZELServerString& out) { d.getLocation(out); })}};
+    });
 }
 
 Outcome show(Context& context, const std::string& name, const std::string& workspaceName)

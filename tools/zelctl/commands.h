@@ -37,4 +37,23 @@ inline void on(CLI::App* command, Action& chosen, Action action)
 // The client's own complaint, with no message number.
 inline Failure complaint(const std::string& text) { return Failure{0, text}; }
 
+// One row per element of the library's list, as `row` makes it.
+template <class List, class Row>
+nlohmann::ordered_json rowsOf(List& list, Row row)
+{
+    nlohmann::ordered_json rows = nlohmann::ordered_json::array();
+    for (unsigned i = 0; i < list.entries(); ++i)
+        rows.push_back(row(*list.element(i)));
+    return rows;
+}
+
+// Prints the rows of the list that the call which returned `failure` filled, unless it failed.
+template <class List, class Row>
+Outcome printRows(Context& context, Outcome failure, List& list, Row row)
+{
+    if (!failure)
+        context.output.print(rowsOf(list, row));
+    return failure;
+}
+
 }  // namespace zelctl
