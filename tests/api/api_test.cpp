@@ -1,9 +1,8 @@
 // The library's own value types (strings with embedded NULs, string lists and their token splitters,
 // the owning vector of interface pointers, the older string types statuses are filled through, the
-// UTF-8 check and Latin-1 conversion of text bound for the wire, the number and truth-value readers,
-// the reply splitter); status objects and the message catalogue; and the slot layout of the public
-// interfaces. Each case runs in its own process, so the process-wide database and the show-numbers
-// flag start fresh.
+// UTF-8 check and Latin-1 conversion of text bound for the wire, the number and truth-value readers);
+// status objects and the message catalogue; and the slot layout of the public interfaces. Each case
+// runs in its own process, so the process-wide database and the show-numbers flag start fresh.
 
 #include <gtest/gtest.h>
 #include <zelserverapi/interfaces.h>
@@ -29,7 +28,6 @@
 #include "api/status.h"
 #include "api/string_adapters.h"
 #include "api/text_encoding.h"
-#include "api/text_split.h"
 #include "session/ZELLocalizedMessageDatabase.h"
 #include "session/message_startup.h"
 #include "support/environment.h"
@@ -221,22 +219,6 @@ TEST(BooleanConversion, FirstLetterThenNumber)
     };
     for (const auto& c : cases) {
         EXPECT_EQ(zel::toBoolean(c.text), c.expected) << c.text;
-    }
-}
-
-// How the transport cuts a reply: the status word, then the body verbatim (the reply splitter's own
-// table has the rest).
-TEST(SplitOnce, StatusWordThenTheBodyVerbatim)
-{
-    const std::pair<std::string, Items> cases[] = {
-        {"\0\0SUCCESS\0a\0b"s, {"SUCCESS", "a\0b"s}},  // leading NULs skipped, the body keeps its NULs
-        {"\0\0"s, {}},
-    };
-    for (const auto& [text, expected] : cases) {
-        Items out{"kept"};
-        EXPECT_EQ(zel::splitOnce(text, "\0"s, 2, out), expected.size()) << text;
-        out.erase(out.begin());
-        EXPECT_EQ(out, expected) << text;
     }
 }
 

@@ -27,6 +27,7 @@ TEST(WireReply, SplitsIntoStatusWordAndBody)
     const Case cases[] = {
         {"plain", "SUCCESS\0<R/>"s, Reply{"SUCCESS", "<R/>"}},
         {"body starting with NUL kept verbatim", "SUCCESS\0\0x"s, Reply{"SUCCESS", "\0x"s}},
+        {"leading NULs skipped, NULs in the body kept", "\0\0SUCCESS\0a\0b"s, Reply{"SUCCESS", "a\0b"s}},
         {"no NUL", "SUCCESS"s, std::nullopt},
         {"nothing after the NUL", "SUCCESS\0"s, std::nullopt},
         {"only NULs after the word", "SUCCESS\0\0\0"s, std::nullopt},
