@@ -83,17 +83,14 @@ nlohmann::ordered_json describe(Connection& connection, const IZELServerTransfor
     unsigned code = 0;
     result.getID(id);
     const bool hasCode = result.getJobStatus(code) != 0;
-    auto text = [&](unsigned (IZELServerTransformationResult::*getter)(IZELServerString&) const) {
-        return connection.read([&](IZELServerString& out) { (result.*getter)(out); });
-    };
     return {{"job", id},
             {"status", hasCode ? statusWord(code) : ""},
             {"success", result.isSuccess() != 0},
-            {"message", text(&IZELServerTransformationResult::getStatusMessage)},
-            {"result", text(&IZELServerTransformationResult::getResult)},
-            {"requested", text(&IZELServerTransformationResult::getTimeRequested)},
-            {"started", text(&IZELServerTransformationResult::getTimeStarted)},
-            {"finished", text(&IZELServerTransformationResult::getTimeFinished)}};
+            {"message", connection.read(result, &IZELServerTransformationResult::getStatusMessage)},
+            {"result", connection.read(result, &IZELServerTransformationResult::getResult)},
+            {"requested", connection.read(result, &IZELServerTransformationResult::getTimeRequested)},
+            {"started", connection.read(result, &IZELServerTransformationResult::getTimeStarted)},
+            {"finished", connection.read(result, &IZELServerTransformationResult::getTimeFinished)}};
 }
 
 // How an ended job ends zelctl: the job's own failure or abort has an exit status of its own.

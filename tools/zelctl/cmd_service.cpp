@@ -37,15 +37,12 @@ Outcome fetch(Connection& connection, const std::string& name, Service& service)
 
 nlohmann::ordered_json describe(Connection& connection, const IZELServerService& service)
 {
-    auto read = [&](void (IZELServerService::*getter)(IZELServerString&) const) {
-        return connection.read([&](IZELServerString& out) { (service.*getter)(out); });
-    };
-    return {{"service", read(&IZELServerService::getName)},
-            {"display_name", read(&IZELServerService::getDisplayName)},
+    return {{"service", connection.read(service, &IZELServerService::getName)},
+            {"display_name", connection.read(service, &IZELServerService::getDisplayName)},
             {"enabled", service.isEnabled() != 0},
-            {"url_pattern", read(&IZELServerService::getUrlPattern)},
+            {"url_pattern", connection.read(service, &IZELServerService::getUrlPattern)},
             {"workspace_registration", service.isWorkspaceRegistrationAllowed() != 0},
-            {"description", read(&IZELServerService::getDescription)}};
+            {"description", connection.read(service, &IZELServerService::getDescription)}};
 }
 
 Outcome list(Context& context, const std::string& filter)

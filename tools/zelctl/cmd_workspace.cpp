@@ -28,24 +28,17 @@ Outcome list(Context& context, const std::string& name, const std::string& filte
     directives.insert("ENABLE_FILTER", filterDirective(filter));
     Outcome failure = context.connection.check(repository.get().getWorkspaceSummariesView(&directives, *summaries));
     return printRows(context, failure, *summaries, [&](const IZELServerWorkspaceSummary& s) {
-        auto read = [&](void (IZELServerWorkspaceSummary::*getter)(IZELServerString&) const) {
-            return context.connection.read([&](IZELServerString& out) { (s.*getter)(out); });
-        };
-        return nlohmann::ordered_json{{"workspace", read(&IZELServerWorkspaceSummary::getName)},
-                                      {"title", read(&IZELServerWorkspaceSummary::getTitle)},
-                                      {"enabled", s.isEnabled()},
-                                      {"description", read(&IZELServerWorkspaceSummary::getDescription)}};
+        return nlohmann::ordered_json{
+            {"workspace", context.connection.read(s, &IZELServerWorkspaceSummary::getName)},
+            {"title", context.connection.read(s, &IZELServerWorkspaceSummary::getTitle)},
+            {"enabled", s.isEnabled()},
+            {"description", context.connection.read(s, &IZELServerWorkspaceSummary::getDescription)}};
     });
 }
 
 nlohmann::ordered_json parameters(Connection& connection, IZELServerVector<IZELServerParameter>& list)
 {
-    nlohmann::ordered_json rows = nlohmann::ordered_json::array();
-    for (unsigned i = 0; i < list.entries(); ++i) {
-        const IZELServerParameter& p = *list.element(i);
-        auto read = [&](void (IZELServerParameter::*getter)(IZELServerString&) const) {
-            return connection.read([&](IZELServerString& out) { (p.*getter)(out); });
-        };
+    return rowsOf(list, [&](const IZELServerParameter& p) {
         const auto options = connection.own(connection.session().createStringArray());
         nlohmann::ordered_json choices = nlohmann::ordered_json::array();
         if (options) {
@@ -53,13 +46,12 @@ nlohmann::ordered_json parameters(Connection& connection, IZELServerVector<IZELS
             for (unsigned j = 0; j < options->entries(); ++j)
                 choices.push_back(options->element(j));
         }
-        rows.push_back({{"name", read(&IZELServerParameter::getName)},
-                        {"type", read(&IZELServerParameter::getType)},
-                        {"default", read(&IZELServerParameter::getDefaultValue)},
-                        {"choices", choices},
-                        {"description", read(&IZELServerParameter::getDescription)}});
-    }
-    return rows;
+        return nlohmann::ordered_json{{"name", connection.read(p, &IZELServerParameter::getName)},
+                                      {"type", connection.read(p, &IZELServerParameter::getType)},
+                                      {"default", connection.read(p, &IZELServerParameter::getDefaultValue)},
+                                      {"choices", choices},
+                                      {"description", connection.read(p, &IZELServerParameter::getDescription)}};
+    });
 }
 
 nlohmann::ordered_json featureTypes(Connection& connection, IZELServerVector<IZELServerFeatureType>& list)

@@ -79,6 +79,12 @@ public:
         getter(out);
         return out.c_str();
     }
+    // The same through a getter of `object`: read(service, &IZELServerService::getName).
+    template <typename Object, typename Getter>
+    std::string read(const Object& object, Getter getter)
+    {
+        return read([&](IZELServerString& out) { (object.*getter)(out); });
+    }
 
 private:
     // Connects and runs the handshake, signed in or with empty credentials.
