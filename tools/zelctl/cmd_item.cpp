@@ -20,9 +20,9 @@ Outcome collect(Context& context, const char* kind, ZELServerOwned<IZELServerVec
     Outcome failure = context.connection.check(view(*items));
     for (unsigned i = 0; !failure && i < items->entries(); ++i) {
         const Item& item = *items->element(i);
-        rows.push_back({{"item", context.connection.read([&](IZELServerString& out) { item.getName(out); })},
+        rows.push_back({{"item", context.connection.read(item, &Item::getName)},
                         {"type", kind},
-                        {"title", context.connection.read([&](IZELServerString& out) { item.getTitle(out); })},
+                        {"title", context.connection.read(item, &Item::getTitle)},
                         {"size", static_cast<long long>(item.getFileSize())}});
     }
     return failure;
@@ -147,8 +147,8 @@ Outcome resources(Context& context, const std::string& name, const std::string& 
         context.connection.check(repository.get().getItemResourcesView(context.connection.text(item), nullptr, *list));
     return printRows(context, failure, *list, [&](const IZELServerResource& resource) {
         return nlohmann::ordered_json{
-            {"resource", context.connection.read([&](IZELServerString& out) { resource.getName(out); })},
-            {"description", context.connection.read([&](IZELServerString& out) { resource.getDescription(out); })},
+            {"resource", context.connection.read(resource, &IZELServerResource::getName)},
+            {"description", context.connection.read(resource, &IZELServerResource::getDescription)},
             {"size", resource.getFileSize()}};
     });
 }

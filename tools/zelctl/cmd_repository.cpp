@@ -22,8 +22,8 @@ namespace {
 
 nlohmann::ordered_json describe(Connection& connection, const IZELServerRepository& repository)
 {
-    return {{"repository", connection.read([&](IZELServerString& out) { repository.getName(out); })},
-            {"description", connection.read([&](IZELServerString& out) { repository.getDescription(out); })}};
+    return {{"repository", connection.read(repository, &IZELServerRepository::getName)},
+            {"description", connection.read(repository, &IZELServerRepository::getDescription)}};
 }
 
 Outcome list(Context& context)

@@ -71,9 +71,8 @@ Outcome show(Context& context, const std::string& name)
     nlohmann::ordered_json registered = nlohmann::ordered_json::array();
     for (unsigned i = 0; !failure && i < items->entries(); ++i) {
         const IZELServerItem& item = *items->element(i);
-        registered.push_back(
-            {{"repository", context.connection.read([&](IZELServerString& out) { item.getRepositoryName(out); })},
-             {"item", context.connection.read([&](IZELServerString& out) { item.getName(out); })}});
+        registered.push_back({{"repository", context.connection.read(item, &IZELServerItem::getRepositoryName)},
+                              {"item", context.connection.read(item, &IZELServerItem::getName)}});
     }
     if (failure)
         return failure;

@@ -19,7 +19,7 @@ Outcome whoami(Context& context)
     nlohmann::ordered_json list = nlohmann::ordered_json::array();
     for (unsigned i = 0; i < roles->entries(); ++i)
         list.push_back(roles->element(i));
-    context.output.print({{"account", context.connection.read([&](IZELServerString& out) { identity->getId(out); })},
+    context.output.print({{"account", context.connection.read(*identity, &IZELServerIdentity::getId)},
                           {"authenticated", identity->isAuthenticated()},
                           {"roles", list}});
     return std::nullopt;

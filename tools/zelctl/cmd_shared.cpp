@@ -61,11 +61,11 @@ private:
 
 nlohmann::ordered_json describe(Connection& connection, const IZELServerFileInfo& info)
 {
-    return {{"name", connection.read([&](IZELServerString& out) { info.getPath().getName(out); })},
+    return {{"name", connection.read(info.getPath(), &IZELServerPath::getName)},
             {"type", info.isDirectory() ? "dir" : "file"},
             {"size", info.getSize()},
-            {"date", connection.read([&](IZELServerString& out) { info.getDate(out); })},
-            {"path", connection.read([&](IZELServerString& out) { info.getPath().getAbsolutePath(out); })}};
+            {"date", connection.read(info, &IZELServerFileInfo::getDate)},
+            {"path", connection.read(info.getPath(), &IZELServerPath::getAbsolutePath)}};
 }
 
 Outcome resources(Context& context)
@@ -77,9 +77,9 @@ Outcome resources(Context& context)
     Outcome failure = context.connection.check(session.getMountPointManager()->getSharedResources(*areas));
     return printRows(context, failure, *areas, [&](const IZELServerMountPoint& area) {
         return nlohmann::ordered_json{
-            {"shared_resource", context.connection.read([&](IZELServerString& out) { area.getName(out); })},
-            {"display_name", context.connection.read([&](IZELServerString& out) { area.getDisplayName(out); })},
-            {"description", context.connection.read([&](IZELServerString& out) { area.getDescription(out); })}};
+            {"shared_resource", context.connection.read(area, &IZELServerMountPoint::getName)},
+            {"display_name", context.connection.read(area, &IZELServerMountPoint::getDisplayName)},
+            {"description", context.connection.read(area, &IZELServerMountPoint::getDescription)}};
     });
 }
 

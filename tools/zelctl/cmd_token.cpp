@@ -37,8 +37,8 @@ Outcome show(Context& context, const std::string& account)
         return failure;
     Connection& c = context.connection;
     context.output.print({{"account", account},
-                          {"token", c.read([&](IZELServerString& out) { token->getToken(out); })},
-                          {"client_address", c.read([&](IZELServerString& out) { token->getClientAddress(out); })},
+                          {"token", c.read(*token, &IZELServerUserToken::getToken)},
+                          {"client_address", c.read(*token, &IZELServerUserToken::getClientAddress)},
                           {"expires_after", token->getExpirationTimeout()}});
     return std::nullopt;
 }
@@ -67,7 +67,7 @@ Outcome set(Context& context, const Arguments& a)
     ZELServerOwned<IZELServerUserToken> made;
     if (Outcome failure = fetch(context, a.account, made))
         return failure;
-    const std::string value = c.read([&](IZELServerString& out) { made->getToken(out); });
+    const std::string value = c.read(*made, &IZELServerUserToken::getToken);
     if (context.output.json())
         context.output.print({{"done", verb}, {"account", a.account}, {"token", value}});
     else

@@ -57,19 +57,17 @@ nlohmann::ordered_json parameters(Connection& connection, IZELServerVector<IZELS
 nlohmann::ordered_json featureTypes(Connection& connection, IZELServerVector<IZELServerFeatureType>& list)
 {
     return rowsOf(list, [&](const IZELServerFeatureType& f) {
-        return nlohmann::ordered_json{
-            {"name", connection.read([&](IZELServerString& out) { f.getName(out); })},
-            {"description", connection.read([&](IZELServerString& out) { f.getDescription(out); })}};
+        return nlohmann::ordered_json{{"name", connection.read(f, &IZELServerFeatureType::getName)},
+                                      {"description", connection.read(f, &IZELServerFeatureType::getDescription)}};
     });
 }
 
 nlohmann::ordered_json datasets(Connection& connection, IZELServerVector<IZELServerDataset>& list)
 {
     return rowsOf(list, [&](const IZELServerDataset& d) {
-        return nlohmann::ordered_json{
-            {"name", connection.read([&](IZELServerString& out) { d.getName(out); })},
-            {"format", connection.read([&](IZELServerString& out) { d.getFormat(out); })},
-            {"location", connection.read([&](IZELServerString& out) { d.getLocation(out); })}};
+        return nlohmann::ordered_json{{"name", connection.read(d, &IZELServerDataset::getName)},
+                                      {"format", connection.read(d, &IZELServerDataset::getFormat)},
+                                      {"location", connection.read(d, &IZELServerDataset::getLocation)}};
     });
 }
 
@@ -88,9 +86,9 @@ Outcome show(Context& context, const std::string& name, const std::string& works
         failure = complaint("no workspace '" + workspaceName + "' in '" + name + "'");
     if (!failure) {
         IZELServerWorkspace& w = *workspace;
-        context.output.print({{"workspace", c.read([&](IZELServerString& out) { w.getName(out); })},
-                              {"title", c.read([&](IZELServerString& out) { w.getTitle(out); })},
-                              {"description", c.read([&](IZELServerString& out) { w.getDescription(out); })},
+        context.output.print({{"workspace", c.read(w, &IZELServerWorkspace::getName)},
+                              {"title", c.read(w, &IZELServerWorkspace::getTitle)},
+                              {"description", c.read(w, &IZELServerWorkspace::getDescription)},
                               {"enabled", w.isEnabled()},
                               {"size", w.getFileSize()},
                               {"parameters", parameters(c, w.getParameters())},
