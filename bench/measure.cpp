@@ -1,5 +1,7 @@
 #include "measure.h"
 
+#include <sched.h>
+
 #include <sys/utsname.h>
 #include <unistd.h>
 
@@ -63,6 +65,32 @@ Samples interleave(unsigned rounds, const std::function<void()>& library, const 
         }
     }
     return samples;
+}
+
+OneCpu::OneCpu() : saved_(sizeof(cpu_set_t))
+{
+    auto* before = reinterpret_cast<cpu_set_t*>(saved_.data());
+    if (::sched_getaffinity(0, sizeof(cpu_set_t), before) != 0) {
+        text_ = "left to the scheduler (no affinity mask)";
+        return;
+    }
+    int first = 0;
+    while (first < CPU_SETSIZE && !CPU_ISSET(first, before)) {
+        ++first;
+    }
+    cpu_set_t one;
+    CPU_ZERO(&one);
+    CPU_SET(first, &one);
+    pinned_ = first < CPU_SETSIZE && ::sched_setaffinity(0, sizeof one, &one) == 0;
+    text_ = pinned_ ? "CPU " + std::to_string(first) : "left to the scheduler (cannot pin)";
+}
+
+void OneCpu::release()
+{
+    if (pinned_) {
+        ::sched_setaffinity(0, sizeof(cpu_set_t), reinterpret_cast<const cpu_set_t*>(saved_.data()));
+        pinned_ = false;
+    }
 }
 
 long residentBytes() { return statusField("VmRSS"); }

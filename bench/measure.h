@@ -23,6 +23,26 @@ struct Samples {
 Samples interleave(unsigned rounds, const std::function<void()>& library, const std::function<void()>& raw,
                    const std::function<void()>& after = {});
 
+// Keeps the calling thread, and every process and thread it starts meanwhile, on one CPU until
+// destroyed or released. On a small virtual machine a wake-up on another core costs about 30 µs and
+// comes and goes with where the scheduler happens to place the server's thread, run by run: with
+// client and server sharing one CPU each figure compares the work both sides do, not their luck.
+class OneCpu {
+public:
+    OneCpu();
+    ~OneCpu() { release(); }
+    OneCpu(const OneCpu&) = delete;
+    OneCpu& operator=(const OneCpu&) = delete;
+    void release();
+    // "CPU 0", or why the placement was left to the scheduler.
+    const std::string& text() const { return text_; }
+
+private:
+    bool pinned_ = false;
+    std::vector<unsigned char> saved_;  // the cpu_set_t before pinning
+    std::string text_;
+};
+
 // Resident set size and its peak since the last resetPeakResident(), in bytes (Linux /proc).
 long residentBytes();
 long peakResidentBytes();
