@@ -168,16 +168,7 @@ IZELServerStatus* ZELServerRepository::removeItem(const IZELServerString& itemNa
 IZELServerStatus* ZELServerRepository::itemResourceExists(const IZELServerString& itemName,
                                                           const IZELServerString& resourceName, unsigned& exists)
 {
-    return guarded([&] {
-        return on("REP_ITEMRESOURCEEXISTS")
-            .require(itemName)
-            .require(resourceName)
-            .check(allowedName(itemName))
-            .check(allowedName(resourceName))
-            .add("itemName", itemName)
-            .add("resourceName", resourceName)
-            .askFlag(exists);
-    });
+    return guarded([&] { return askItemResource("REP_ITEMRESOURCEEXISTS", itemName, resourceName, exists); });
 }
 
 IZELServerStatus* ZELServerRepository::getItemResource(const IZELServerString& itemName,
@@ -219,6 +210,21 @@ IZELServerStatus* ZELServerRepository::getItemResourceView(const IZELServerStrin
             .add("resourceName", resourceName)
             .askObject(found, [&](const IZELServerResponse& response) { return response.readResource(resource); });
     });
+}
+
+// Asking whether a resource exists and removing it differ only in their keyword.
+IZELServerStatus* ZELServerRepository::askItemResource(const char* keyword, const IZELServerString& itemName,
+                                                       const IZELServerString& resourceName, unsigned& answer,
+                                                       Where where)
+{
+    return on(keyword, where)
+        .require(itemName)
+        .require(resourceName)
+        .check(allowedName(itemName))
+        .check(allowedName(resourceName))
+        .add("itemName", itemName)
+        .add("resourceName", resourceName)
+        .askFlag(answer);
 }
 
 // Adding and replacing a resource differ only in their keyword.
@@ -275,16 +281,7 @@ IZELServerStatus* ZELServerRepository::updateItemResource(const IZELServerString
 IZELServerStatus* ZELServerRepository::removeItemResource(const IZELServerString& itemName,
                                                           const IZELServerString& resourceName, unsigned& removed)
 {
-    return guarded([&] {
-        return on("REP_REMOVE_ITEMRESOURCE")
-            .require(itemName)
-            .require(resourceName)
-            .check(allowedName(itemName))
-            .check(allowedName(resourceName))
-            .add("itemName", itemName)
-            .add("resourceName", resourceName)
-            .askFlag(removed);
-    });
+    return guarded([&] { return askItemResource("REP_REMOVE_ITEMRESOURCE", itemName, resourceName, removed); });
 }
 
 // ---- Views ------------------------------------------------------------------------------------------

@@ -106,6 +106,9 @@ public:
 private:
     // A command of this repository: `keyword` with "repositoryName" as its first value.
     CheckedCommand on(const char* keyword, Where where = Where::current()) const;
+    IZELServerStatus* askItemResource(const char* keyword, const IZELServerString& itemName,
+                                      const IZELServerString& resourceName, unsigned& answer,
+                                      Where where = Where::current());
     IZELServerStatus* sendItemResource(const char* keyword, const IZELServerString& itemName,
                                        const IZELServerString& resourceName, const IZELServerString& sourcePath,
                                        IZELServerProgressListener* listener, Where where = Where::current());

@@ -41,7 +41,7 @@ constexpr AttributeBinding<MountPointFields> kMountPointAttributes[] = {
 // first read, which would be after the command had gone out.
 bool canBeRead(const std::string& path)
 {
-    LocalFile file(path, LocalFile::Mode::Read);
+    LocalFile file(path);
     char probe = 0;
     return file.isOpen() && file.read(&probe, 1).has_value();
 }

@@ -18,10 +18,11 @@ class LocalFile : public HeapObject {
 public:
     enum class Mode {
         Read,   // an existing file, from its start
-        Write,  // created, or emptied when it exists
+        Write,  // through a stream the caller opened
     };
 
-    LocalFile(std::string path, Mode mode);
+    // Reads an existing file from its start (Mode::Read).
+    explicit LocalFile(std::string path);
     // Writes through a stream the caller opened (Mode::Write); the file takes it over and closes it.
     LocalFile(std::string path, std::FILE* writer);
     ~LocalFile();
@@ -57,8 +58,6 @@ public:
     std::optional<std::uint32_t> crc32() const;
 
 private:
-    void unbuffer();
-
     std::string path_;
     Mode mode_;
     std::fstream stream_;          // Mode::Read

@@ -416,7 +416,7 @@ IZELServerStatus* ZELServerTCPIPChannel::transferFile(IZELServerRequest& request
                                                       IZELServerProgressListener* progress)
 {
     if (direction == kUpload) {
-        LocalFile file(localPath, LocalFile::Mode::Read);
+        LocalFile file(localPath);
         if (!file.isOpen()) {
             return makeStatus(msg::kLocalFileRead, localPath);
         }
